@@ -1,0 +1,35 @@
+# What every target of the project is built with.
+
+find_program(QUILLMARCH_CCACHE ccache)
+if(QUILLMARCH_CCACHE AND NOT CMAKE_CXX_COMPILER_LAUNCHER)
+    set(CMAKE_CXX_COMPILER_LAUNCHER ${QUILLMARCH_CCACHE})
+endif()
+
+if(QUILLMARCH_SANITIZE)
+    add_compile_options(-fsanitize=${QUILLMARCH_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+    add_link_options(-fsanitize=${QUILLMARCH_SANITIZE})
+endif()
+
+# quillmarch_warnings(<target>): warnings are errors in everything written here.
+function(quillmarch_warnings target)
+    target_compile_options(${target} PRIVATE
+        -Wall -Wextra -Wpedantic -Werror -Wshadow -Wconversion -Wnon-virtual-dtor -Wold-style-cast
+        -Wcast-align -Woverloaded-virtual -Wnull-dereference -Wformat=2 -Wimplicit-fallthrough)
+    if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND QUILLMARCH_SANITIZE)
+        # The sanitizers' instrumentation makes gcc see null pointers and unset values that are not there.
+        target_compile_options(${target} PRIVATE -Wno-null-dereference -Wno-maybe-uninitialized)
+    endif()
+endfunction()
+
+# quillmarch_room([SOURCES file...] [HEADERS file...]): adds this folder's sources to the library and lists
+# the headers that are installed with it.
+function(quillmarch_room)
+    cmake_parse_arguments(arg "" "" "SOURCES;HEADERS" ${ARGN})
+    foreach(source IN LISTS arg_SOURCES)
+        target_sources(quillmarch_edit PRIVATE ${CMAKE_CURRENT_SOURCE_DIR}/${source})
+    endforeach()
+    file(RELATIVE_PATH room ${PROJECT_SOURCE_DIR} ${CMAKE_CURRENT_SOURCE_DIR})
+    foreach(header IN LISTS arg_HEADERS)
+        set_property(GLOBAL APPEND PROPERTY QUILLMARCH_PUBLIC_HEADERS ${room}/${header})
+    endforeach()
+endfunction()

@@ -1,0 +1,60 @@
+#pragma once
+
+#include "edit/model/managed_cel.h"
+#include "platform/media/level_store.h"
+#include "platform/store/tag_bag.h"
+
+/// The level envelope of one audio channel: a store of nodes with its channel's stamp. Copying shares the
+/// store; `clone` makes one of its own.
+class QM_API AudLevelsCel {
+public:
+    using Store = Aud::DynamicLevelControl::Store;
+    using Range = cel::Range;
+
+    AudLevelsCel() = default;
+    [[nodiscard]] static AudLevelsCel createInvalid() { return {}; }
+    /// A new, empty one with a fresh channel stamp.
+    [[nodiscard]] static AudLevelsCel create();
+    ~AudLevelsCel();
+
+    [[nodiscard]] const IdStamp& id() const { return m_id; }
+    void id(const IdStamp& id) { m_id = id; }
+    [[nodiscard]] bool valid() const { return m_contents != nullptr; }
+    /// True for one that is invalid or has no node: it changes nothing that is heard.
+    [[nodiscard]] bool is_dummy() const;
+    [[nodiscard]] AudLevelsCel clone() const;
+
+    /// The nodes. An invalid one has none.
+    [[nodiscard]] const Store& getNodeStore() const;
+    /// The nodes, to be changed; counts as a change. Must be valid.
+    Store& changeNodeStore();
+    /// False for an invalid one.
+    bool insertNode(double time, float level);
+    [[nodiscard]] Range getExtents(Editable::ExtentType type = Editable::Everything,
+                                   bool fromZero = false) const;
+    bool insert(const AudLevelsCel& source, const Range& sourceRange, double at);
+    bool remove(const Range& range);
+    bool replace(const AudLevelsCel& source, const Range& sourceRange, double at);
+    bool simplify();
+
+    [[nodiscard]] bool changed() const;
+    void setChanged(bool changed);
+
+    /// Brings nodes of an older revision up to date with the channel that they belong to. False if nothing
+    /// was to do.
+    bool checkNodesRevision(const AudCel& audio);
+    /// Rebuilds the nodes that come from the clips' own levels.
+    bool replaceClipNodes(const AudCel& audio);
+
+    /// Lends the levels to the store under their stamp's text.
+    void writeToStore(TagBag& store) const;
+    /// The levels with a stamp; an invalid one if the store has none that reads.
+    [[nodiscard]] static AudLevelsCel createFromStore(const IdStamp& id, TagBag& store);
+    /// Ends the lending after a save.
+    void extractFromStore(TagBag& store) const;
+
+private:
+    class Contents;
+    Qx::Ptr<Contents> m_contents;
+    IdStamp m_id;
+};

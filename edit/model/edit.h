@@ -1,0 +1,374 @@
+#pragma once
+
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/channel_types.h"
+#include "edit/model/edit_modification.h"
+#include "edit/model/edit_ptr.h"
+#include "edit/model/managed_cel.h"
+#include "platform/base/critical_section.h"
+#include "platform/base/vector.h"
+#include "platform/media/frame_rate.h"
+#include "platform/media/tv_standard.h"
+#include "platform/notify/notifier.h"
+#include "platform/notify/val_server.h"
+#include "platform/store/configb.h"
+#include "platform/store/tag_bag.h"
+
+#include <atomic>
+#include <memory>
+
+class TextFile;
+
+/// What kind of item an edit is. The numbers appear in project records: do not change them.
+enum edit_log_type_t : int {
+    kLogNone = 0,
+    kLogShot = 1,
+    kLogEdit = 2,
+    kLogGhost3 = 3, ///< 3 to 7: ghost variants of a shot
+    kLogGhost4 = 4,
+    kLogGhost5 = 5,
+    kLogGhost6 = 6,
+    kLogGhost7 = 7,
+    kLogMagic = 8,
+    kLogReel = 9,
+    kLogTemplate = 10
+};
+
+/// The forms of an edit file, by its name.
+enum QxEditFileType : int {
+    kUnknownFile = 0,
+    kObjectStoreFile = 1,
+    kObjectStoreEd3File = 2,
+    kLegacyTextFile = 4
+};
+/// The form that a file's name stands for, without regard to case.
+QM_API QxEditFileType getEditFileTypeFromFileName(const WString& name);
+
+/// Why a revision of an edit is replaced by another.
+enum RevisionChangeType : int { kRevisionBackup = 1, kRevisionUndo = 2, kRevisionRedo = 3 };
+
+/// Position of a caller on one channel. Equal when the channels are.
+class QM_API EditChanTimeInfo {
+public:
+    EditChanTimeInfo() = default;
+    EditChanTimeInfo(const IdStamp& chan, double current, bool markValid, double mark)
+        : m_chan(chan), m_current(current), m_markValid(markValid), m_mark(mark) {}
+    [[nodiscard]] bool valid() const { return m_chan.valid(); }
+    [[nodiscard]] const IdStamp& getChanId() const { return m_chan; }
+    void setChanId(const IdStamp& chan) { m_chan = chan; }
+    [[nodiscard]] double getCurrentTime() const { return m_current; }
+    void setCurrentTime(double time) { m_current = time; }
+    [[nodiscard]] double getMarkTime() const { return m_mark; }
+    [[nodiscard]] bool isMarkValid() const { return m_markValid; }
+    bool operator==(const EditChanTimeInfo& other) const { return m_chan == other.m_chan; }
+
+private:
+    IdStamp m_chan;
+    double m_current = 0;
+    bool m_markValid = false;
+    double m_mark = 0;
+};
+
+/// One edit in memory: a header of named properties and an ordered set of channels, each with its cel.
+///
+/// The class is the face that callers know; the work is done in parts with one job each: header accessors
+/// (edit_header.cpp), the channel set (channel_set.h), dirt, changes and notification (edit_changes.cpp), the
+/// file (edit/persist). Its operations take no lock; callers that share one edit between threads use
+/// `section()`. Notifications run synchronously on the thread that makes a change. Queries for an unknown
+/// index or stamp answer `NO_CHAN`, the null stamp, a null cel or (`NoChan`, `INVALID`) and never fail
+/// otherwise.
+class QM_API Edit : public Notifier, public Dirtiable {
+public:
+    struct ChanType {
+        Edit_Chan_Type type = NoChan;
+        Edit_Chan_SubType subtype = Edit_Chan_SubType::INVALID;
+        bool operator==(const ChanType&) const = default;
+    };
+    enum ReadFileRC : int { kReadOk = 0, kReadFailed = 1 };
+    enum Permissions : int { kPermissionsNone = 0, kPermissionsRead = 1, kPermissionsAll = 2 };
+
+    /// An empty edit with the defaults of a new one; clean.
+    Edit();
+    /// An edit read from a file; `isBad()` tells whether it could be. See `readFile` and
+    /// `readFromLegacyFile`.
+    Edit(const WString& path, eEditOpenBehaviour behaviour);
+    ~Edit() override;
+
+    /// How many edits were ever constructed in this process.
+    [[nodiscard]] static uint64_t numConstructed();
+
+    /// \name Handles (used by `EditPtr` alone)
+    /// @{
+    int32_t incRefCount();
+    int32_t decRefCount();
+    [[nodiscard]] int32_t refCount() const { return m_refCount.load(); }
+    /// @}
+
+    /// \name Conversions
+    /// @{
+    [[nodiscard]] static Edit_Chan_Type edit_chan_type_from_cookie_type(Cookie_Type kind);
+    [[nodiscard]] static Edit_Chan_Type edit_chan_type_from_name(char letter);
+    [[nodiscard]] static Edit_Chan_Type edit_chan_type_from_name(wchar_t letter);
+    [[nodiscard]] static Edit_Chan_Letter edit_chan_letter_from_type(Edit_Chan_Type type,
+                                                                     Edit_Chan_SubType subtype);
+    /// "SUBTYPE:ALIAS" and so on, as the files write it.
+    [[nodiscard]] static const char* subTypeText(Edit_Chan_SubType subtype);
+    /// @}
+
+    /// \name Identity and header
+    /// @{
+    [[nodiscard]] const cookie& get_cookie() const { return m_cookie; }
+    void set_cookie(const cookie& item) { m_cookie = item; }
+    [[nodiscard]] String get_cookie_str() const { return m_cookie.asString(); }
+    /// The header store. A change to it dirties the edit.
+    [[nodiscard]] configb& Opts() { return m_header; }
+    [[nodiscard]] const configb& Opts() const { return m_header; }
+    /// The edit's name, header key "NAME"; UTF-8.
+    [[nodiscard]] String getName() const;
+    void setName(const String& name);
+
+    [[nodiscard]] bool get_read_only() const;
+    void set_read_only(bool readOnly);
+    [[nodiscard]] int get_backup() const;
+    void set_backup(int backup);
+    [[nodiscard]] int get_hidden() const;
+    void set_hidden(int hidden);
+    [[nodiscard]] int get_search_edit() const;
+    void set_search_edit(int search);
+    [[nodiscard]] int get_original_material() const;
+    void set_original_material(int original);
+    [[nodiscard]] int get_entire_medium() const { return m_entireMedium; }
+    void set_entire_medium(int entire);
+    [[nodiscard]] cookie get_undo_cookie() const;
+    void set_undo_cookie(const cookie& item);
+    [[nodiscard]] cookie get_redo_cookie() const;
+    void set_redo_cookie(const cookie& item);
+    [[nodiscard]] int getCreationTime() const;
+    [[nodiscard]] String getCreationProgram() const;
+    void setCreationDetails();
+    [[nodiscard]] int getModificationTime() const;
+    [[nodiscard]] String getModificationProgram() const;
+    void setModificationDetails();
+    [[nodiscard]] uint64_t getModificationCount() const;
+    void incModificationCount();
+    [[nodiscard]] Permissions getPermissions() const;
+    void setPermissions(Permissions permissions);
+    [[nodiscard]] int get_ed2_revision() const;
+    void set_ed2_revision(int revision);
+    [[nodiscard]] Qx::FrameRate getFrameRate() const;
+    void setFrameRate(Qx::FrameRate rate);
+    [[nodiscard]] double get_frame_time() const;
+    [[nodiscard]] double getSourceMediumDuration() const;
+    void setSourceMediumDuration(double seconds);
+    [[nodiscard]] int getSourceMedium() const;
+    void setSourceMedium(int medium);
+    [[nodiscard]] int getTransfer() const;
+    void setTransfer(int transfer);
+    [[nodiscard]] double get_elapsed_time_origin() const;
+    void set_elapsed_time_origin(double seconds);
+    [[nodiscard]] String getOwner() const;
+    void setOwner(const String& owner, bool notify);
+    /// Drops what is cached of the header, so that the next question reads it.
+    void clear_cache_flags();
+    /// @}
+
+    /// \name Kind of item
+    /// @{
+    [[nodiscard]] edit_log_type_t get_log_type() const;
+    [[nodiscard]] edit_log_type_t log_type_get_m() const;
+    edit_log_type_t redetermineLogType();
+    [[nodiscard]] bool isShot() const;
+    [[nodiscard]] bool isEdit() const;
+    [[nodiscard]] bool is_original() const;
+    [[nodiscard]] bool is_kemroll() const;
+    [[nodiscard]] static String log_type_string_get_ms(edit_log_type_t type);
+    [[nodiscard]] static edit_log_type_t getLogTypeFromString(std::string_view text);
+    /// @}
+
+    /// \name Channels
+    /// Indices run over effects, video, audio, then levels channels; they shift when channels come and go,
+    /// stamps do not.
+    /// @{
+    [[nodiscard]] int getNumChans() const;
+    [[nodiscard]] uint16_t getNumChans(Edit_Chan_Type type) const;
+    [[nodiscard]] uint16_t getNumChans(Edit_Chan_Type type, Edit_Chan_SubType subtype) const;
+    [[nodiscard]] IdStamp getId(int index) const;
+    [[nodiscard]] int getIdx(const IdStamp& chan) const;
+    [[nodiscard]] int getIndexWithinType(const IdStamp& chan) const;
+    [[nodiscard]] int getIndexWithinType(int index) const;
+    [[nodiscard]] Edit_Chan_Type getChanType(int index) const;
+    [[nodiscard]] Edit_Chan_SubType getChanSubtype(int index) const;
+    [[nodiscard]] Edit_Chan_Type getChanType(const IdStamp& chan) const;
+    [[nodiscard]] Edit_Chan_SubType getChanSubtype(const IdStamp& chan) const;
+    [[nodiscard]] ChanType getChanTypeAndSubType(const IdStamp& chan) const;
+    [[nodiscard]] bool chanValid(int index, Edit_Chan_Type type = AnyChan) const;
+    [[nodiscard]] bool chanValid(const IdStamp& chan, Edit_Chan_Type type = AnyChan) const;
+    [[nodiscard]] int getFirstChan(Edit_Chan_Type type = AnyChan,
+                                   Edit_Chan_SubType subtype = Edit_Chan_SubType::ANY) const;
+    /// Moves `index` to the next channel that passes the filter, or to `NO_CHAN`, and returns it.
+    int getNextChan(int& index, Edit_Chan_Type type = AnyChan,
+                    Edit_Chan_SubType subtype = Edit_Chan_SubType::ANY) const;
+    void getChans(Vector<int>& chans, Edit_Chan_Type type = AnyChan,
+                  Edit_Chan_SubType subtype = Edit_Chan_SubType::ANY) const;
+    void getChans(Vector<IdStamp>& chans, Edit_Chan_Type type = AnyChan,
+                  Edit_Chan_SubType subtype = Edit_Chan_SubType::ANY) const;
+    [[nodiscard]] cel* getCel(const IdStamp& chan) const;
+    [[nodiscard]] cel* get_edit_cel_p(int index) const;
+    [[nodiscard]] cel* get_play_cel_p(int index) const { return get_edit_cel_p(index); }
+    [[nodiscard]] bool sameType(const IdStamp& a, const IdStamp& b) const;
+    [[nodiscard]] bool isEmpty(int index) const;
+    [[nodiscard]] bool isEmpty(const IdStamp& chan) const;
+    /// True if every channel is.
+    [[nodiscard]] bool isEmpty() const;
+    /// The typed forms, sharing the channel's cel; invalid ones for an unknown stamp or another type.
+    [[nodiscard]] VidCel getVidCel(const IdStamp& chan) const;
+    [[nodiscard]] VFXCel getVFXCel(const IdStamp& chan) const;
+    [[nodiscard]] AudCel getAudCel(const IdStamp& chan) const;
+    [[nodiscard]] AudLevelsCel getLevelsCel(const IdStamp& chan) const;
+    /// Changes the audio properties of a channel (output, cross-fades, levels channel). False if it is none.
+    bool setAudCel(const AudCel& audio);
+
+    /// The channel's own name (UTF-8, may be empty), the name shown ("V1", "A2", "FX1" unless it has its own)
+    /// and the first channel whose shown name is `name`; the null stamp if none.
+    [[nodiscard]] String getChanName(const IdStamp& chan) const;
+    bool setChanName(const IdStamp& chan, const String& name);
+    [[nodiscard]] String getChanDisplayName(const IdStamp& chan) const;
+    [[nodiscard]] IdStamp getChanWithName(const String& name) const;
+    [[nodiscard]] String getMaterialInfo(const IdStamp& chan) const;
+    bool setMaterialInfo(const IdStamp& chan, const String& text);
+
+    bool insertChans(Edit_Chan_Type type, Edit_Chan_SubType subtype, int at, unsigned count, bool before,
+                     bool notify, double time);
+    /// Returns the new index, or `NO_CHAN` on failure. The edit takes over `content` (null and 1 mean none).
+    int addChan(Edit_Chan_Type type, cel* content = nullptr, bool notify = true,
+                Edit_Chan_SubType subtype = Edit_Chan_SubType::NONE, bool unused = false, double time = 0);
+    /// Removes one channel, an audio channel with its levels. False for an unknown stamp.
+    bool removeChan(const IdStamp& chan, bool notify);
+    /// Removes every channel. False if there was none.
+    bool removeChans(bool notify);
+    /// Puts a cel (taken over) in the place of a channel's own. False for a levels channel or no channel.
+    bool set_edit_cel_p(int index, cel* content);
+    /// Makes the channel map answer with a cel. False for an unknown stamp.
+    bool cacheCelForTrack(const IdStamp& chan, cel* content);
+    /// Gives a channel another stamp. False if the stamp is null or taken.
+    bool setChannelID(const IdStamp& chan, const IdStamp& newId);
+    /// Adds a levels channel and pairs it with an audio channel; null stamp on failure.
+    IdStamp addLevelsChan(const IdStamp& audio, const AudLevelsCel& levels);
+    /// Adds a channel that was read, with its stamp, name and material text; an invalid or taken stamp is
+    /// replaced by a fresh one. The null stamp for a type that an edit does not hold.
+    IdStamp setupEditChannel(ChanType type, Qx::Ptr<cel> content);
+    /// Earliest start (`start` true) or latest end of the channels; 0 without any. `withLevels` counts levels
+    /// channels too.
+    [[nodiscard]] double get_start_or_end_time(bool start, bool withLevels) const;
+    [[nodiscard]] double getStartTime() const { return get_start_or_end_time(true, false); }
+    [[nodiscard]] double getEndTime() const { return get_start_or_end_time(false, false); }
+    /// Sync loss of a channel in seconds, 0 if none is recorded.
+    [[nodiscard]] double getSyncLoss(const IdStamp& chan) const;
+    bool setSyncLoss(const IdStamp& chan, double seconds);
+    /// @}
+
+    /// \name Current time and mark (seconds)
+    /// An edit has one of each; the channel argument is accepted and not used.
+    /// @{
+    [[nodiscard]] double get_current_time(int chan = NO_CHAN) const;
+    void set_current_time(int chan, double time);
+    void set_current_time_raw(int chan, double time);
+    [[nodiscard]] double get_mark_time(int chan = NO_CHAN) const;
+    void set_mark_time(int chan, double time);
+    void set_mark_time_raw(int chan, double time);
+    [[nodiscard]] bool mark_is_valid(int chan = NO_CHAN) const;
+    void mark_invalidate(int chan = NO_CHAN);
+    /// @}
+
+    /// \name Dirt and changes
+    /// @{
+    void init_dirty();
+    [[nodiscard]] bool get_dirty() const;
+    void set_dirty(bool dirty);
+    [[nodiscard]] bool isDirty(bool deep) const;
+    bool needsToBeWritten();
+    void onConfigbDirty() override;
+    void setTemporary(bool temporary) { m_temporary = temporary; }
+    [[nodiscard]] bool isTemporary() const { return m_temporary; }
+    void setWriteSuppressed(bool suppressed) { m_writeSuppressed = suppressed; }
+    [[nodiscard]] bool isWriteSuppressed() const { return m_writeSuppressed; }
+    void setChangeDescription(const EditModification& modification, bool notify);
+    void setChangeDescription(EditModificationType type, bool notify);
+    [[nodiscard]] EditModification getChangeDescription() const;
+    void resetChangeDescription();
+    [[nodiscard]] ValServer<EditModification>& getChangeDescriptionServer() { return m_changes; }
+    void notifyEditDelete();
+    void notifyImpendingRevisionChange(RevisionChangeType type);
+    void notifyRevisionChange(RevisionChangeType type);
+    void notifyShotSoundAltered(const IdStamp& chan);
+    [[nodiscard]] static NotifyMsgType getEditChangedNotifyMsgType();
+    [[nodiscard]] static NotifyMsgType getEditDeleteNotifyMsgType();
+    [[nodiscard]] static NotifyMsgType getChanAddedNotifyMsgType();
+    [[nodiscard]] static NotifyMsgType getChanDeletedNotifyMsgType();
+    [[nodiscard]] static NotifyMsgType getShotSoundAlteredNotifyMsgType();
+    [[nodiscard]] static NotifyMsgType getImpendingRevChangeMsgType();
+    [[nodiscard]] static NotifyMsgType getRevChangeMsgType();
+    [[nodiscard]] bool debugMode() const { return m_debug; }
+    void setDebugMode(bool on) { m_debug = on; }
+    static void setDefaultDebugMode(bool on);
+    [[nodiscard]] criticalSection& section() const { return m_section; }
+    /// @}
+
+    /// \name File (defined in edit/persist)
+    /// @{
+    ReadFileRC read_file(const cookie& item, eEditOpenBehaviour behaviour);
+    ReadFileRC readFile(const WString& path, eEditOpenBehaviour behaviour);
+    /// Why the last read or write failed: one sentence, empty after a success.
+    [[nodiscard]] const String& lastFileError() const { return m_fileError; }
+    bool write_file();
+    bool write_file(const WString& path);
+    bool writeToFile(const WString& path, QxEditFileType type);
+    bool writeToLegacyFile(const WString& path);
+    bool readFromLegacyFile(const WString& path);
+    /// True until a read succeeds, for an edit that was made to be read.
+    [[nodiscard]] bool isBad() const { return m_bad; }
+    [[nodiscard]] bool isLoading() const { return m_loading; }
+    [[nodiscard]] size_t getNumStoredObjects() const;
+    /// The objects bound to the edit.
+    [[nodiscard]] TagBag& objectStore() { return m_store; }
+    /// @}
+
+    /// Undocumented parts of the façade, each in a file of its own.
+    class ChannelSet;
+
+private:
+    friend class EditFile;
+
+    void init();
+    bool store(const WString& path);
+    bool retrieve();
+    void updateHeaderBeforeWrite();
+    void m_load_edit_bits_from_header();
+    void getInfoFromHeader();
+    bool doEditConversions();
+    [[nodiscard]] bool isReadOnlyForUser() const;
+
+    std::atomic<int32_t> m_refCount{0};
+    configb m_header;
+    std::unique_ptr<ChannelSet> m_channels;
+    cookie m_cookie;
+    double m_currentTime = 0;
+    double m_markTime = Qx::kNoTime;
+    bool m_dirty = false;
+    bool m_initialising = false;
+    bool m_temporary = false;
+    bool m_writeSuppressed = false;
+    bool m_bad = false;
+    bool m_loading = false;
+    bool m_writing = false;
+    bool m_debug = false;
+    int m_entireMedium = 0;
+    mutable Qx::FrameRate m_frameRate;
+    mutable bool m_frameRateValid = false;
+    mutable uint32_t m_revision = UINT32_MAX;
+    mutable double m_sourceMediumDuration = Qx::kNoTime;
+    TagBag m_store;
+    ValServer<EditModification> m_changes;
+    String m_fileError;
+    mutable criticalSection m_section;
+};

@@ -1,0 +1,55 @@
+#pragma once
+
+#include "platform/services/files.h"
+
+namespace Qx {
+
+/// Writes a file whole, so that at every instant its name holds the old file or the new one: a temporary
+/// name in the same folder, the bytes, sync, rename over the name, sync of the folder. Everything in the
+/// library that writes a file goes through here.
+///
+///     AtomicFile file(path);
+///     if (auto error = file.write(bytes, size)) return error;   // any number of writes
+///     return file.commit();
+///
+/// Unless `commit` succeeded, the destructor removes the temporary file and the old file is as it was. A
+/// temporary name that is taken already is left alone and another one used; a folder, link, FIFO or device in
+/// the place of the file is refused, never followed. If the sync of the folder fails after the rename, commit
+/// reports that error and `replaced()` is true: the name holds the new, whole file, which may not yet be
+/// durable. One object is used on one thread.
+class QM_API AtomicFile {
+public:
+    /// Nothing is touched before the first write.
+    explicit AtomicFile(String path);
+    ~AtomicFile();
+    AtomicFile(const AtomicFile&) = delete;
+    AtomicFile& operator=(const AtomicFile&) = delete;
+
+    FileError write(const void* from, size_t size);
+    FileError write(std::string_view text) { return write(text.data(), text.size()); }
+    /// Overwrites bytes written before, at `offset` from the start; the position then returns to the end.
+    FileError overwrite(uint64_t offset, const void* from, size_t size);
+    /// How many bytes were written.
+    [[nodiscard]] uint64_t size() const { return m_size; }
+
+    /// Makes the new file take the name. With `durable` false the two syncs are left out (for files that can
+    /// be made again, and for measuring).
+    FileError commit(bool durable = true);
+    [[nodiscard]] bool replaced() const { return m_replaced; }
+
+private:
+    FileError openTemporary();
+    void discard();
+
+    String m_path;
+    String m_temporary;
+    std::unique_ptr<OpenFile> m_file;
+    uint64_t m_size = 0;
+    bool m_replaced = false;
+    FileError m_failed; ///< the first failure; later calls repeat it
+};
+
+/// True for the names that `AtomicFile` gives its temporary files; a listing of a folder passes them over.
+QM_API bool isTemporaryName(std::string_view fileName);
+
+} // namespace Qx

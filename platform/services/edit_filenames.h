@@ -1,0 +1,11 @@
+#pragma once
+
+#include "platform/base/cookie.h"
+#include "platform/base/export.h"
+
+/// The extension of edit files, ".qme", or without its dot "qme".
+QM_API String getEditFilenameExt(bool withDot = true);
+
+/// The path of an item's file: the current project's folder, the cookie's text, the edit extension. Empty for
+/// a cookie that is not storable.
+QM_API String getFilenameForCookie(const cookie& item);

@@ -1,0 +1,77 @@
+#pragma once
+
+#include "platform/base/export.h"
+#include "platform/base/qx_string.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <span>
+#include <vector>
+
+/// A stream of packed values in memory. Writing appends to the stream's own buffer; reading walks a span that
+/// the caller keeps alive. Numbers are little-endian, a `double` is its IEEE bits, a string is a 32-bit
+/// length and that many bytes. These forms live in files: do not change them.
+///
+/// Every read is checked against what is left. A short or refused read sets the error state and yields zero
+/// or an empty text; from then on every read does so and nothing more is consumed. The state is checked once,
+/// at the end of an object, by whoever unpacks it.
+class QM_API PStream {
+public:
+    /// For writing.
+    PStream() = default;
+    /// For reading `bytes`, which must outlive the stream.
+    explicit PStream(std::span<const std::byte> bytes) : m_input(bytes), m_reading(true) {}
+
+    /// \name Writing
+    /// @{
+    void setUnsignedLong(uint32_t value);
+    void setLong(int32_t value);
+    void setUnsignedLongLong(uint64_t value);
+    void setCookedChar(uint8_t value);
+    void setUnsignedShort(uint16_t value);
+    void setFloat(float value);
+    void setDouble(double value);
+    void setString(std::string_view text);
+    /// Bytes as they are, without a length.
+    void setRaw(const void* from, size_t size);
+    /// Room for `size` more bytes is made ahead.
+    void reserve(size_t size) { m_output.reserve(m_output.size() + size); }
+    /// Overwrites four bytes written before, for a length known only afterwards.
+    void patchUnsignedLong(size_t at, uint32_t value);
+    [[nodiscard]] const std::vector<std::byte>& bytes() const { return m_output; }
+    [[nodiscard]] size_t size() const { return m_output.size(); }
+    /// Empties the buffer and keeps its memory.
+    void clear() { m_output.clear(); }
+    /// @}
+
+    /// \name Reading
+    /// @{
+    uint32_t getUnsignedLong();
+    int32_t getLong();
+    uint64_t getUnsignedLongLong();
+    uint8_t getCookedChar();
+    uint16_t getUnsignedShort();
+    float getFloat();
+    double getDouble();
+    String getString();
+    /// Copies `size` bytes out. False, with nothing copied and the error state set, when fewer are left.
+    bool getRaw(void* to, size_t size);
+    /// A view of the next `size` bytes, which are passed over; empty with the error state set if fewer are
+    /// left.
+    std::span<const std::byte> getSpan(size_t size);
+    /// A count of items that each take at least `leastSize` bytes: a count that what is left cannot hold
+    /// sets the error state and gives 0, before anybody reserves memory for it.
+    uint32_t getCount(size_t leastSize);
+    [[nodiscard]] size_t remaining() const { return m_input.size() - m_position; }
+    [[nodiscard]] bool good() const { return !m_failed; }
+    /// Sets the error state, for a value that makes no sense.
+    void fail() { m_failed = true; }
+    /// @}
+
+private:
+    std::vector<std::byte> m_output;
+    std::span<const std::byte> m_input;
+    size_t m_position = 0;
+    bool m_reading = false;
+    bool m_failed = false;
+};

@@ -1,0 +1,95 @@
+#pragma once
+
+#include "platform/base/cookie.h"
+#include "platform/base/id_stamp.h"
+#include "platform/base/open_behaviour.h"
+#include "platform/base/status.h"
+#include "platform/store/streamable.h"
+
+#include <functional>
+#include <memory>
+#include <vector>
+
+/// A store of tagged objects, one file. It owns the objects that are bound to it and knows their bytes; it
+/// knows nothing of edits, undo or notification.
+///
+/// An object is found by its tag: a name, or an `IdStamp` (kept under its text). An object is in one of two
+/// states: *held* as a live `Streamable` that the store owns or that is lent to it for a save, or *stored* as
+/// bytes. Objects whose class is not known to this program stay bytes and are written again as they are.
+///
+/// The file's form is docs/file-format.md. Writing is atomic (`Qx::AtomicFile`). Not thread-safe: one bag is
+/// used by one thread at a time.
+class QM_API TagBag {
+public:
+    /// Outcome of `open`. The first three values are fixed.
+    enum OpenResult {
+        Opened = 0,    ///< the file was read and every checksum holds
+        NotOpened = 1, ///< the file system refused, or the name is no regular file; see `openError`
+        NewStore = 2,  ///< there was no file, or behaviour 1 was asked: the store is open and empty
+        Missing = 3,   ///< there is no file and behaviour 0 was asked
+        Foreign = 4,   ///< not an object store
+        Newer = 5,     ///< an object store of a format version from the future
+        Damaged = 6    ///< an object store that is truncated, has a wrong checksum or contradicts itself
+    };
+
+    TagBag();
+    ~TagBag();
+    TagBag(const TagBag&) = delete;
+    TagBag& operator=(const TagBag&) = delete;
+
+    /// Opens the store of an item: the file of the cookie's text and `extension` (with its dot) in `folder`.
+    /// The whole file is checked, every checksum included, before this returns. Behaviour 0 opens what
+    /// exists, 1 starts empty whatever is there, 2 opens or starts empty. On a result other than 0 and 2 the
+    /// bag is closed and `openError` tells why. What it held before is dropped.
+    OpenResult open(const cookie& item, const String& folder, eEditOpenBehaviour behaviour,
+                    const String& extension);
+    /// One sentence for a person: the path, what is wrong and what can be done. Empty after a success.
+    [[nodiscard]] const String& openError() const;
+    [[nodiscard]] bool isOpen() const;
+    void close();
+
+    [[nodiscard]] const cookie& id() const;
+    void setId(const cookie& item);
+    [[nodiscard]] const String& folder() const;
+    void setFolder(const String& folder);
+    [[nodiscard]] String path() const;
+
+    /// Binds an object under a name; the bag owns it, and a former object of that name goes. It counts as
+    /// changed.
+    void storeObject(std::string_view name, std::unique_ptr<Streamable> object);
+    /// Lends an object to the bag until `extractObject` or `releaseLent`; the caller keeps ownership. With
+    /// `changed` false, and bytes known for the name, those are kept and the object is not packed.
+    void lendObject(std::string_view name, const Streamable& object, bool changed);
+    void releaseLent();
+
+    /// The object under a name, as a live object that the bag owns: unpacked from its bytes on the first
+    /// call. Null when there is none or its bytes do not make one; `objectError` then tells which.
+    [[nodiscard]] Streamable* openObject(std::string_view name);
+    /// The same, handed over: the bag knows the bytes still (see `lendObject`) but owns no object any more.
+    [[nodiscard]] std::unique_ptr<Streamable> extractObject(std::string_view name);
+    /// Unpacks the bytes under a name into an object that the caller has. False when there are none or they
+    /// do not fit; the object is then as its `unpack` promises.
+    [[nodiscard]] bool readObject(std::string_view name, Streamable& object);
+    [[nodiscard]] const String& objectError() const;
+
+    /// Declares a held object changed, so that the next flush packs it.
+    void markChanged(std::string_view name);
+    /// Removes an object and its bytes. False when there is none.
+    bool removeObject(std::string_view name);
+
+    [[nodiscard]] bool contains(std::string_view name) const;
+    [[nodiscard]] size_t numObjects() const;
+    /// The names, in the order of the file.
+    [[nodiscard]] std::vector<String> names() const;
+
+    /// Writes every object to the file, atomically and durably. The same objects give the same bytes. On
+    /// failure the old file is untouched and everything still counts as changed.
+    Qx::Status flush();
+    /// How many objects the last `flush` packed, and how many it took over as bytes.
+    [[nodiscard]] size_t numPacked() const;
+    [[nodiscard]] size_t numKept() const;
+
+private:
+    class Contents;
+    std::unique_ptr<Contents> m_contents;
+};
