@@ -8,5 +8,5 @@
 #define QM_API __declspec(dllimport)
 #endif
 #else
-#define QM_API __attribute__((visibility("default")))
+#define QM_API [[gnu::visibility("default")]]
 #endif
