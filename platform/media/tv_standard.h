@@ -6,8 +6,11 @@
 
 namespace Qx::Ed2Support {
 
-/// A television standard as legacy edits name it: codes of frame rate, picture format and medium. A plain
-/// value.
+/// A television standard as legacy edits name it. A plain value.
+///
+/// The frame rate is a `FrameRate` code. The picture format is 1 for 625 lines and 2 for 525. The medium is 1
+/// for 625-line video, 3 for 525-line video and 24 for film at 24 frames a second. All are 0 for a standard
+/// that is not known.
 struct TVStd {
     int frameRateCode = 0;
     int formatCode = 0;
@@ -17,7 +20,8 @@ struct TVStd {
 };
 
 /// The standard for a text ("pal", "ntsc", "ntsc_drop_frame", "pal_24", "ntsc_24", "ntsc_drop_frame_24"); one
-/// that is not known for any other.
+/// that is not known for any other. Blanks around the text and the case of its letters do not count. The two
+/// NTSC texts are 29.97 frames a second, the three of 24 frames exactly 24.
 QM_API TVStd tvStdFromText(std::string_view text);
 /// The text of the current project's standard; empty for a rate that has none.
 QM_API String tvStdTextForProject();
