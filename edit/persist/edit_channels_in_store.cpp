@@ -1,5 +1,4 @@
 #include "edit/model/channel_group_list.h"
-#include "edit/model/cue_list.h"
 #include "edit/persist/detail/edit_file.h"
 #include "platform/base/attrib_value_pair.h"
 #include "platform/services/log.h"
@@ -215,7 +214,7 @@ Qx::Status EditFile::readCels(Edit& edit) {
                                        " could not be joined to their audio channel");
         }
     }
-    convertCues(edit);
+    edit.convertCues();
     return {};
 }
 
@@ -231,28 +230,11 @@ Qx::Status EditFile::readGroups(Edit& edit) {
 }
 
 Qx::Status EditFile::readCues(Edit& edit) {
-    if (!edit.m_store.contains(EditKeys::kCues)) {
-        return {};
-    }
-    cue_list stored;
-    if (!edit.m_store.readObject(EditKeys::kCues, stored)) {
+    if (!edit.retrieveCues()) {
         return Qx::Status::failure("object " + String(EditKeys::kCues) + " is not a cue list that reads (" +
                                    edit.m_store.objectError() + ")");
     }
-    cue_list& cues = edit.get_cues();
-    cues.delete_all_cues();
-    for (size_t i = 0; i < stored.get_num_cue_points(0); ++i) {
-        cues.add_cue_point(*stored.get_cue_point(i, 0));
-    }
     return {};
-}
-
-void EditFile::convertCues(Edit& edit) {
-    Vector<cel*> cels;
-    for (int i = 0; i < edit.getNumChans(); ++i) {
-        cels.push_back(edit.get_edit_cel_p(i));
-    }
-    edit.get_cues().convert(cels);
 }
 
 // ---- writing
@@ -267,14 +249,6 @@ Qx::Ptr<cel> EditFile::sharedCel(const Edit& edit, const IdStamp& chan) {
     }
     return type.subtype == Edit_Chan_SubType::ALIAS ? edit.getVFXCel(chan).sharedCel()
                                                     : edit.getVidCel(chan).sharedCel();
-}
-
-void EditFile::lendCues(Edit& edit, cue_list& stored) {
-    const cue_list& cues = edit.get_cues();
-    for (size_t i = 0; i < cues.get_num_cue_points(CueFlag::kKept); ++i) {
-        stored.add_cue_point(*cues.get_cue_point(i, CueFlag::kKept));
-    }
-    edit.m_store.lendObject(EditKeys::kCues, stored, true);
 }
 
 void EditFile::lendCels(Edit& edit) {
@@ -350,6 +324,7 @@ void EditFile::reset(Edit& edit) {
         const Quiet quiet(edit);
         edit.removeChans(false);
         edit.get_cues().delete_all_cues();
+        edit.forgetGroups();
         edit.m_storedCels.reset();
     }
     const cookie item = edit.m_cookie;
