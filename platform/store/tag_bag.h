@@ -4,6 +4,7 @@
 #include "platform/base/id_stamp.h"
 #include "platform/base/open_behaviour.h"
 #include "platform/base/status.h"
+#include "platform/store/object_store_info.h"
 #include "platform/store/streamable.h"
 
 #include <functional>
@@ -43,6 +44,11 @@ public:
     /// bag is closed and `openError` tells why. What it held before is dropped.
     OpenResult open(const cookie& item, const String& folder, eEditOpenBehaviour behaviour,
                     const String& extension);
+    /// Opens what can be saved of a damaged store: the objects whose bytes are sound are there, the others are
+    /// told of in `lost`. Possible while the table of the file is whole (`examineStore`); otherwise the bag is
+    /// closed, `openError` tells why and the result is that of `open`. The bag has no id, so that a flush
+    /// cannot replace the damaged file before `setId` (and `setFolder`) tell where the salvage shall go.
+    OpenResult openSalvaging(const String& path, std::vector<StoredObjectInfo>& lost);
     /// One sentence for a person: the path, what is wrong and what can be done. Empty after a success.
     [[nodiscard]] const String& openError() const;
     [[nodiscard]] bool isOpen() const;
@@ -91,5 +97,6 @@ public:
 
 private:
     class Contents;
+    OpenResult openFile(eEditOpenBehaviour behaviour);
     std::unique_ptr<Contents> m_contents;
 };
