@@ -1,11 +1,17 @@
 #pragma once
 
 #include "platform/base/critical_section.h"
+#include "platform/base/subscriber_list.h"
 #include "platform/notify/notifier.h"
 
 /// A value that observers can follow. Setting it informs them synchronously with the same promises as
 /// `Notifier`. Each observer is handed a copy of the value as it was set, so it may set another one
-/// meanwhile.
+/// meanwhile, or destroy the server.
+///
+/// Every value that is set reaches every observer: none is skipped because a later one was set. Where an
+/// observer sets a value while it is told one, the observers after it hear the inner value first; likewise
+/// for values that are set on two threads at once. `getValue` gives the latest in any case. `T` is copyable
+/// and has a default.
 template <typename T>
 class ValServer {
 public:
@@ -13,6 +19,8 @@ public:
 
     ValServer() = default;
     explicit ValServer(T value) : m_value(std::move(value)) {}
+    ValServer(const ValServer&) = delete;
+    ValServer& operator=(const ValServer&) = delete;
 
     [[nodiscard]] T getValue() const {
         const std::lock_guard<criticalSection> hold(m_section);
@@ -22,33 +30,25 @@ public:
     /// Stores the value without telling anybody.
     void setValueSilently(T value) {
         const std::lock_guard<criticalSection> hold(m_section);
-        m_value = std::move(value);
+        // The old value is destroyed with the parameter, after the lock is released.
+        std::swap(m_value, value);
     }
 
     /// Stores the value and informs every observer.
     void setValue(T value) {
         setValueSilently(value);
-        Told told{this, &value};
-        m_notifier.notify(told);
+        m_subscribers.tell(value);
     }
 
     /// Hears each value that is set until the guard goes.
     [[nodiscard]] Qx::Ptr<Qx::Guard> addListener(Listener listener) {
-        return m_notifier.addListener(NotifyMsgType(),
-                                      [listener = std::move(listener)](const NotifyMsg& message) {
-                                          listener(*static_cast<const Told&>(message).value);
-                                      });
+        return Qx::guardFor(m_subscribers.add(std::move(listener)));
     }
 
-    [[nodiscard]] size_t numListeners() const { return m_notifier.numListeners(); }
+    [[nodiscard]] size_t numListeners() const { return m_subscribers.size(); }
 
 private:
-    struct Told : NotifyMsg {
-        Told(const void*, const T* told) : value(told) {}
-        const T* value;
-    };
-
     mutable criticalSection m_section;
     T m_value{};
-    Notifier m_notifier;
+    Qx::SubscriberList<const T&> m_subscribers;
 };

@@ -17,6 +17,10 @@ namespace Qx {
 /// the place of the file is refused, never followed. If the sync of the folder fails after the rename, commit
 /// reports that error and `replaced()` is true: the name holds the new, whole file, which may not yet be
 /// durable. One object is used on one thread.
+///
+/// The file keeps the permission bits of the one it replaces, where the file system can. The bytes go to the
+/// system as they come: a caller with many small pieces gathers them first. While an `AtomicBatch` is open on
+/// the thread, `commit` enrols the file there instead of renaming it.
 class QM_API AtomicFile {
 public:
     /// Nothing is touched before the first write.
@@ -33,12 +37,17 @@ public:
     [[nodiscard]] uint64_t size() const { return m_size; }
 
     /// Makes the new file take the name. With `durable` false the two syncs are left out (for files that can
-    /// be made again, and for measuring).
+    /// be made again, and for measuring). Without any write before it, the new file is empty. After a success
+    /// the object is done: another commit is a success that does nothing, a write fails.
     FileError commit(bool durable = true);
+    /// True once the name holds the new file.
     [[nodiscard]] bool replaced() const { return m_replaced; }
 
 private:
     FileError openTemporary();
+    FileError finishTemporary(bool sync);
+    FileError replace(bool durable);
+    FileError fail(FileError error);
     void discard();
 
     String m_path;
@@ -46,10 +55,15 @@ private:
     std::unique_ptr<OpenFile> m_file;
     uint64_t m_size = 0;
     bool m_replaced = false;
-    FileError m_failed; ///< the first failure; later calls repeat it
+    bool m_done = false; ///< committed: renamed, or handed to a batch
+    FileError m_failed;  ///< the first failure; later calls repeat it
 };
 
 /// True for the names that `AtomicFile` gives its temporary files; a listing of a folder passes them over.
 QM_API bool isTemporaryName(std::string_view fileName);
+
+/// Removes the temporary files that a process which died left in a folder: those whose last change is at
+/// least `age` seconds ago. Returns how many went; a folder that cannot be listed has none.
+QM_API unsigned removeStaleTemporaries(const String& folder, int64_t age = 24 * 3600);
 
 } // namespace Qx

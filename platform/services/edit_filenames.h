@@ -7,5 +7,5 @@
 QM_API String getEditFilenameExt(bool withDot = true);
 
 /// The path of an item's file: the current project's folder, the cookie's text, the edit extension. Empty for
-/// a cookie that is not storable.
+/// a cookie that is not storable and while there is no project folder.
 QM_API String getFilenameForCookie(const cookie& item);

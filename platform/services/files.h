@@ -32,9 +32,11 @@ struct FileInfo {
     FileKind kind = FileKind::Missing;
     uint64_t size = 0;
     int64_t modifiedNs = 0; ///< nanoseconds since 1970, UTC
+    int64_t accessedNs = 0; ///< likewise, of the last access
     uint64_t device = 0;
     uint64_t inode = 0;
     int links = 0;
+    uint32_t permissions = 0; ///< the nine permission bits (and set-id and sticky bits)
 };
 
 /// How a file is opened. None of them follows a link in the last component or blocks on a FIFO; opening
@@ -59,13 +61,19 @@ public:
     /// Makes the file's bytes durable.
     virtual FileError sync() = 0;
     virtual FileError info(FileInfo& info) = 0;
+    /// Sets the permission bits.
+    virtual FileError setPermissions(uint32_t permissions) = 0;
     /// Takes (or, without `wait`, tries to take) an exclusive advisory lock that dies with the process.
     /// `taken` tells whether the lock is held.
     virtual FileError lock(bool wait, bool& taken) = 0;
+    /// Gives the file back to the system. The object is closed whatever the answer; closing again is a
+    /// success.
     virtual FileError close() = 0;
 };
 
-/// The file system. Thread-safe. Paths are bytes as the system takes them.
+/// The file system. Thread-safe. Paths are bytes as the system takes them. A call that a signal interrupts
+/// fails with EINTR and has done nothing; the helpers below, and everything that the library builds on them,
+/// try again.
 class QM_API FileSystem {
 public:
     virtual ~FileSystem();
@@ -82,6 +90,9 @@ public:
     virtual FileError list(const String& path, std::vector<String>& names) = 0;
     /// Makes the names in a folder durable.
     virtual FileError syncFolder(const String& path) = 0;
+    /// Makes everything durable that was written to the file system which holds the folder: one call for any
+    /// number of files, at the cost of waiting for the writes of others.
+    virtual FileError syncAll(const String& folder) = 0;
     /// Sets the times of last access and, unless `accessOnly`, of last change to now.
     virtual FileError touch(const String& path, bool accessOnly) = 0;
 };
@@ -97,6 +108,9 @@ QM_API FileSystem* setFileSystem(FileSystem* replacement);
 /// \name Built on the seam
 /// @{
 
+/// The system's number for a call that a signal interrupted (EINTR).
+QM_API int interruptedCode();
+
 /// Folder and name joined by the system's separator.
 QM_API String joinPath(std::string_view folder, std::string_view name);
 /// What precedes the last separator ("." if there is none), and what follows it.
@@ -108,6 +122,20 @@ QM_API String extensionOf(std::string_view name);
 
 /// True if the name stands for a regular file.
 QM_API bool fileExists(const String& path);
+
+/// Calls an operation of the seam again as long as a signal interrupts it.
+template <typename Operation>
+FileError retryInterrupted(Operation operation) {
+    FileError error = operation();
+    while (error.code == interruptedCode()) {
+        error = operation();
+    }
+    return error;
+}
+
+/// Reads exactly `size` bytes at the file's position, retrying interrupted and short reads. The file's end
+/// before that is a failure with EIO.
+QM_API FileError readAll(OpenFile& file, void* to, size_t size);
 
 /// Reads a whole regular file, retrying interrupted and short reads. `limit` is the greatest size accepted; a
 /// larger file fails with EFBIG before anything is read. On failure `bytes` is empty.

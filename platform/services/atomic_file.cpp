@@ -1,0 +1,244 @@
+#include "platform/services/atomic_file.h"
+
+#include "platform/base/id_stamp.h"
+#include "platform/services/atomic_batch.h"
+#include "platform/services/clock.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <unistd.h>
+
+namespace Qx {
+
+namespace {
+
+constexpr std::string_view kTemporaryEnd = ".tmp";
+constexpr size_t kRandomDigits = 16;
+/// What is kept of a file's name in its temporary name, so that the latter is at most 255 bytes long.
+constexpr size_t kNameKept = 200;
+/// How many temporary names are tried before giving up.
+constexpr int kTries = 100;
+
+String temporaryFor(const String& path) {
+    // A stamp differs on every thread and after every fork, so two writers do not wait for each other's
+    // names.
+    const IdStamp stamp = IdStamp::fresh(IdStampMagic::EffectNode);
+    const String name = fileNameOf(path).substr(0, kNameKept);
+    const String temporary =
+        String::format(".%s.%ld-%08x%08x.tmp", name.c_str(), static_cast<long>(::getpid()),
+                       stamp.word(0) ^ stamp.word(1), stamp.word(2));
+    return path.find('/') == String::npos ? temporary : joinPath(folderOf(path), temporary);
+}
+
+/// Refuses anything but a regular file, or nothing, in the place of the file.
+FileError examineTarget(const String& path, FileInfo& info) {
+    if (auto error = retryInterrupted([&] { return fileSystem().info(path, info); })) {
+        return error;
+    }
+    switch (info.kind) {
+    case FileKind::Missing:
+    case FileKind::Regular:
+        return {};
+    case FileKind::Folder:
+        return {EISDIR, "replace", path};
+    case FileKind::Link:
+        return {ELOOP, "replace", path};
+    case FileKind::Other:
+        break;
+    }
+    return {ENXIO, "replace", path};
+}
+
+bool allOf(std::string_view text, std::string_view set) {
+    return !text.empty() && text.find_first_not_of(set) == std::string_view::npos;
+}
+
+} // namespace
+
+AtomicFile::AtomicFile(String path) : m_path(std::move(path)) {}
+
+AtomicFile::~AtomicFile() {
+    discard();
+}
+
+FileError AtomicFile::openTemporary() {
+    if (m_file) {
+        return {};
+    }
+    const String name = fileNameOf(m_path);
+    if (name.empty() || name == "." || name == ".." || m_path.find('\0') != String::npos) {
+        return {EINVAL, "write", m_path};
+    }
+    FileInfo info;
+    if (auto error = examineTarget(m_path, info)) {
+        return error;
+    }
+    FileError error;
+    for (int i = 0; i < kTries; ++i) {
+        const String temporary = temporaryFor(m_path);
+        error = retryInterrupted([&] { return fileSystem().open(temporary, OpenMode::CreateNew, m_file); });
+        if (!error) {
+            m_temporary = temporary;
+            return {};
+        }
+        if (error.code != EEXIST) {
+            break;
+        }
+    }
+    return error;
+}
+
+FileError AtomicFile::fail(FileError error) {
+    if (error) {
+        m_failed = error;
+        discard();
+    }
+    return error;
+}
+
+FileError AtomicFile::write(const void* from, size_t size) {
+    if (m_failed) {
+        return m_failed;
+    }
+    if (m_done) {
+        return {EBADF, "write", m_path};
+    }
+    if (auto error = openTemporary()) {
+        return fail(error);
+    }
+    if (auto error = writeAll(*m_file, from, size)) {
+        error.path = m_path;
+        return fail(error);
+    }
+    m_size += size;
+    return {};
+}
+
+FileError AtomicFile::overwrite(uint64_t offset, const void* from, size_t size) {
+    if (m_failed) {
+        return m_failed;
+    }
+    if (m_done) {
+        return {EBADF, "write", m_path};
+    }
+    if (offset > m_size || size > m_size - offset) {
+        return fail({EINVAL, "write past the end of", m_path});
+    }
+    if (size == 0) {
+        return {};
+    }
+    if (auto error = retryInterrupted([&] { return m_file->seek(offset); })) {
+        return fail(error);
+    }
+    if (auto error = writeAll(*m_file, from, size)) {
+        error.path = m_path;
+        return fail(error);
+    }
+    return fail(retryInterrupted([&] { return m_file->seek(m_size); }));
+}
+
+FileError AtomicFile::finishTemporary(bool sync) {
+    if (auto error = openTemporary()) {
+        return error;
+    }
+    FileInfo old;
+    if (auto error = examineTarget(m_path, old)) {
+        return error;
+    }
+    if (old.kind == FileKind::Regular) {
+        auto error = retryInterrupted([&] { return m_file->setPermissions(old.permissions); });
+        // A file system without permission bits has none to keep.
+        if (error && error.code != EPERM && error.code != ENOTSUP && error.code != ENOSYS) {
+            return error;
+        }
+    }
+    if (sync) {
+        if (auto error = retryInterrupted([&] { return m_file->sync(); })) {
+            return error;
+        }
+    }
+    auto error = retryInterrupted([&] { return m_file->close(); });
+    m_file.reset();
+    return error;
+}
+
+FileError AtomicFile::replace(bool durable) {
+    if (auto error = retryInterrupted([&] { return fileSystem().rename(m_temporary, m_path); })) {
+        return fail(error);
+    }
+    m_temporary.clear();
+    m_replaced = true;
+    m_done = true;
+    if (durable) {
+        m_failed = retryInterrupted([&] { return fileSystem().syncFolder(folderOf(m_path)); });
+    }
+    return m_failed;
+}
+
+FileError AtomicFile::commit(bool durable) {
+    if (m_failed || m_done) {
+        return m_failed;
+    }
+    AtomicBatch* batch = AtomicBatch::current();
+    if (auto error = finishTemporary(durable && batch == nullptr)) {
+        return fail(error);
+    }
+    if (batch != nullptr) {
+        batch->enrol(std::move(m_temporary), m_path, durable);
+        m_temporary.clear();
+        m_done = true;
+        return {};
+    }
+    return replace(durable);
+}
+
+void AtomicFile::discard() {
+    m_file.reset();
+    if (m_temporary.empty()) {
+        return;
+    }
+    const auto error = retryInterrupted([&] { return fileSystem().remove(m_temporary); });
+    if (!error || error.code == ENOENT) {
+        m_temporary.clear();
+    }
+}
+
+bool isTemporaryName(std::string_view fileName) {
+    if (fileName.size() <= kTemporaryEnd.size() + 1 || fileName.front() != '.' ||
+        !fileName.ends_with(kTemporaryEnd)) {
+        return false;
+    }
+    fileName.remove_suffix(kTemporaryEnd.size());
+    const size_t dot = fileName.rfind('.');
+    const std::string_view tail = fileName.substr(dot + 1);
+    const size_t dash = tail.find('-');
+    return dot > 1 && dash != std::string_view::npos && allOf(tail.substr(0, dash), "0123456789") &&
+           tail.size() - dash - 1 == kRandomDigits && allOf(tail.substr(dash + 1), "0123456789abcdef");
+}
+
+unsigned removeStaleTemporaries(const String& folder, int64_t age) {
+    FileSystem& system = fileSystem();
+    std::vector<String> names;
+    if (retryInterrupted([&] { return system.list(folder, names); })) {
+        return 0;
+    }
+    const int64_t newest = nowSeconds() - age;
+    unsigned removed = 0;
+    for (const String& name : names) {
+        if (!isTemporaryName(name)) {
+            continue;
+        }
+        const String path = joinPath(folder, name);
+        FileInfo info;
+        const auto error = retryInterrupted([&] { return system.info(path, info); });
+        if (error || info.kind != FileKind::Regular || info.modifiedNs / 1000000000 > newest) {
+            continue;
+        }
+        if (!retryInterrupted([&] { return system.remove(path); })) {
+            ++removed;
+        }
+    }
+    return removed;
+}
+
+} // namespace Qx

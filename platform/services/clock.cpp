@@ -1,0 +1,39 @@
+#include "platform/services/clock.h"
+
+#include <chrono>
+#include <mutex>
+#include <utility>
+
+namespace Qx {
+
+namespace {
+
+struct State {
+    std::mutex mutex;
+    Clock clock; ///< empty: the machine's
+};
+
+State& state() {
+    static auto& shared = *new State;
+    return shared;
+}
+
+} // namespace
+
+int64_t nowSeconds() {
+    {
+        const std::lock_guard hold(state().mutex);
+        if (state().clock) {
+            return state().clock();
+        }
+    }
+    const auto since = std::chrono::system_clock::now().time_since_epoch();
+    return std::chrono::duration_cast<std::chrono::seconds>(since).count();
+}
+
+Clock setClock(Clock clock) {
+    const std::lock_guard hold(state().mutex);
+    return std::exchange(state().clock, std::move(clock));
+}
+
+} // namespace Qx
