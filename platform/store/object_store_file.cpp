@@ -35,8 +35,8 @@ StoreVerdict judgeSignature(std::span<const std::byte> bytes) {
         return StoreVerdict::damaged("it is cut off after " + number(bytes.size()) + " bytes");
     }
     // The letters stand but what surrounds them does not: line ends were changed, or the eighth bit cut.
-    const bool letters = bytes.size() >= 4 && std::equal(bytes.begin() + 1, bytes.begin() + 4,
-                                                         signature.begin() + 1);
+    const bool letters =
+        bytes.size() >= 4 && std::equal(bytes.begin() + 1, bytes.begin() + 4, signature.begin() + 1);
     if (letters) {
         return StoreVerdict::damaged("its signature is changed, as by a transfer as text");
     }
@@ -141,8 +141,7 @@ StoreHeader decodeStoreHeader(std::span<const std::byte> bytes) {
 
 StoreVerdict judgeStoreHeader(std::span<const std::byte> bytes, uint64_t fileSize) {
     const std::span<const std::byte> signature = signatureBytes();
-    if (bytes.size() < signature.size() ||
-        !std::equal(signature.begin(), signature.end(), bytes.begin())) {
+    if (bytes.size() < signature.size() || !std::equal(signature.begin(), signature.end(), bytes.begin())) {
         return judgeSignature(bytes);
     }
     if (bytes.size() < kStoreHeaderSize) {
@@ -335,8 +334,8 @@ bool StoreSource::open(const StoreIdentity& identity) {
                         !file->info(info) && !readFully(*file, header, got);
     const FileInfo& was = identity.info;
     const bool same = opened && info.device == was.device && info.inode == was.inode &&
-                      info.size == was.size && info.modifiedNs == was.modifiedNs &&
-                      got == header.size() && header == identity.header;
+                      info.size == was.size && info.modifiedNs == was.modifiedNs && got == header.size() &&
+                      header == identity.header;
     if (same) {
         m_file = std::move(file);
     }

@@ -22,7 +22,7 @@ struct StoredObjectInfo {
 /// Lists what is in the file of an object store, in the order of the file, even when parts of it are damaged:
 /// the header may be wrong and objects may be unsound, but the table must be whole. Nothing is changed.
 ///
-/// `damage` is set to one sentence that tells why `TagBag::open` would refuse the file, and to nothing when it
-/// would not. A failure means that the file cannot be read or that nothing can be told of its objects, for
+/// `damage` is set to one sentence that tells why `TagBag::open` would refuse the file, and to nothing when
+/// it would not. A failure means that the file cannot be read or that nothing can be told of its objects, for
 /// the reason given; `objects` is then empty. Safe on any thread.
 QM_API Qx::Status examineStore(const String& path, std::vector<StoredObjectInfo>& objects, String& damage);

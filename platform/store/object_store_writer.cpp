@@ -72,7 +72,8 @@ Status StoreWriter::add(const StoredLabel& label, StoreSource& source, const Sto
     RunningChecksum sum;
     uint64_t done = 0;
     while (done < from.length) {
-        const std::span<std::byte> bytes = std::span(piece).first(std::min<uint64_t>(piece.size(), from.length - done));
+        const std::span<std::byte> bytes =
+            std::span(piece).first(std::min<uint64_t>(piece.size(), from.length - done));
         intact = source.read(from.offset + done, bytes);
         if (!intact) {
             return {};
@@ -92,7 +93,8 @@ Status StoreWriter::add(const StoredLabel& label, StoreSource& source, const Sto
 
 Status StoreWriter::endObject(const StoredLabel& label, uint64_t start, uint64_t sum, StoredPlace& place) {
     if (++m_count > kMaxStoredObjects) {
-        return Status::failure(m_path + " would hold more than " + std::to_string(kMaxStoredObjects) + " objects");
+        return Status::failure(m_path + " would hold more than " + std::to_string(kMaxStoredObjects) +
+                               " objects");
     }
     place = {start, position() - start, sum};
     m_table.setString(label.name);

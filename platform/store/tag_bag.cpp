@@ -89,7 +89,8 @@ TagBag::OpenResult TagBag::openFile(eEditOpenBehaviour behaviour) {
     Contents& bag = *m_contents;
     const String name = bag.path();
     if (name.empty()) {
-        bag.openError = "the item " + quoted(bag.id.asString()) + " has no file: its identity cannot form a name";
+        bag.openError =
+            "the item " + quoted(bag.id.asString()) + " has no file: its identity cannot form a name";
         return NotOpened;
     }
     const OpenResult seen = lookAt(name, bag.openError);
@@ -134,7 +135,8 @@ TagBag::OpenResult TagBag::openSalvaging(const String& file, std::vector<StoredO
     if (const Qx::Status status = salvageStore(file, bag.image, objects, complaints, verdict); !status) {
         bag.image.drop();
         bag.openError = status.reason();
-        return verdict.isSound() ? (bag.image.identity().known ? Damaged : NotOpened) : resultOf(verdict.state);
+        return verdict.isSound() ? (bag.image.identity().known ? Damaged : NotOpened)
+                                 : resultOf(verdict.state);
     }
     for (size_t i = 0; i < objects.size(); ++i) {
         if (!complaints[i].empty()) {
@@ -191,6 +193,7 @@ void TagBag::storeObject(std::string_view name, std::unique_ptr<Streamable> obje
         return;
     }
     Contents::Entry& entry = m_contents->findOrAdd(name);
+    m_contents->forgetBytes(entry);
     entry.lent = nullptr;
     entry.owned = std::move(object);
     entry.changed = true;

@@ -124,15 +124,23 @@ void TagBag::Contents::dropMemory(Entry& entry) {
     if (!entry.inMemory || !entry.onFile) {
         return;
     }
-    const bool inImage = entry.copied.empty();
+    forgetBytes(entry);
+    entry.onFile = true;
+    thinImage();
+}
+
+void TagBag::Contents::forgetBytes(Entry& entry) {
+    if (entry.inMemory && entry.copied.empty()) {
+        m_imageBytesInUse -= entry.memory.size();
+    }
     entry.inMemory = false;
+    entry.onFile = false;
     entry.memory = {};
     entry.copied = {};
-    if (!inImage) {
-        return;
-    }
-    m_imageBytesInUse -= entry.place.length;
-    if (m_imageBytesInUse >= image.bytes().size() / kLeastPartInUse) {
+}
+
+void TagBag::Contents::thinImage() {
+    if (image.bytes().empty() || m_imageBytesInUse > image.bytes().size() / kLeastPartInUse) {
         return;
     }
     for (Entry& other : entries) {
@@ -216,7 +224,8 @@ Qx::Status TagBag::Contents::write(bool keepFromSource, bool& retry) {
     return status;
 }
 
-void TagBag::Contents::adopt(std::vector<Written>& written, const StoreIdentity& identity, bool durable) {
+void TagBag::Contents::adopt(const std::vector<Written>& written, const StoreIdentity& identity,
+                             bool durable) {
     source = identity;
     numPacked = 0;
     numKept = 0;
@@ -227,24 +236,12 @@ void TagBag::Contents::adopt(std::vector<Written>& written, const StoreIdentity&
             entry.layer = entry.live()->layerName();
             entry.major = row.revision.major;
             entry.minor = row.revision.minor;
-            if (entry.inMemory && entry.copied.empty()) {
-                m_imageBytesInUse -= entry.memory.size();
-            }
-            entry.inMemory = false;
-            entry.memory = {};
-            entry.copied = {};
+            forgetBytes(entry);
         }
         entry.place = row.place;
         entry.onFile = identity.known;
         // Where the file could not be looked at again, a live object is packed the next time.
         entry.changed = entry.changed && !durable;
     }
-    if (m_imageBytesInUse == 0 && !image.bytes().empty()) {
-        for (Entry& entry : entries) {
-            if (entry.inMemory && entry.copied.empty()) {
-                entry.memory = {}; // of an object without bytes
-            }
-        }
-        image.drop();
-    }
+    thinImage();
 }

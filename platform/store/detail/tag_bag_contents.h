@@ -52,6 +52,8 @@ public:
     std::unique_ptr<Streamable> build(const Entry& entry);
     /// Forgets an object's bytes in memory if the file has them.
     void dropMemory(Entry& entry);
+    /// Forgets an object's bytes wherever they are.
+    void forgetBytes(Entry& entry);
 
     [[nodiscard]] String path() const;
     /// Writes the file once. `retry` is set when bytes could not be taken over from `source`: then nothing
@@ -74,7 +76,8 @@ private:
     struct Written;
     Qx::Status writeEntry(Qx::detail::StoreWriter& writer, Entry& entry, Written& written,
                           Qx::detail::StoreSource* from, bool& intact);
-    void adopt(std::vector<Written>& written, const Qx::detail::StoreIdentity& identity, bool durable);
+    void thinImage();
+    void adopt(const std::vector<Written>& written, const Qx::detail::StoreIdentity& identity, bool durable);
 
     std::unordered_map<std::string_view, Entries::iterator> m_index; ///< keys lie in the entries
     size_t m_imageBytesInUse = 0;
