@@ -340,6 +340,15 @@ public:
     bool writeToFile(const WString& path, QxEditFileType type);
     bool writeToLegacyFile(const WString& path);
     bool readFromLegacyFile(const WString& path);
+    /// The sections of the legacy text; its form is docs/ed2-format.md. The writers append to a text, the
+    /// readers search it. `writeED2Config` returns the television standard it wrote, `writeED2Cels` the
+    /// number of channels. `readED2Cels` fails, naming the line, for a section that does not read and for too
+    /// many channels; the edit then has the channels read before it.
+    Qx::Ed2Support::TVStd writeED2Config(TextFile& file) const;
+    unsigned writeED2Cels(TextFile& file, Qx::Ed2Support::TVStd standard) const;
+    Qx::Status readED2Cels(const TextFile& file);
+    void writeED2Cues(TextFile& file) const;
+    void readED2Cues(const TextFile& file);
     /// True until a read succeeds, for an edit that was made to be read.
     [[nodiscard]] bool isBad() const { return m_bad; }
     [[nodiscard]] bool isLoading() const { return m_loading; }
@@ -442,6 +451,7 @@ public:
 
 private:
     friend class EditFile;
+    struct StoredCels;
 
     void init();
     bool store(const WString& path);
@@ -541,6 +551,7 @@ private:
     cue_list m_cues;
     bool m_celCuesLoaded = false;
     mutable TagBag m_store;
+    std::shared_ptr<StoredCels> m_storedCels; ///< which cel the store holds under which name
     mutable std::atomic<ChannelGroupList*> m_groups{nullptr};
     ValServer<EditModification> m_changes;
     String m_fileError;
