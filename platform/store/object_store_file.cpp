@@ -320,6 +320,7 @@ FileError StoreImage::read(const String& path, bool headerMustHold, StoreVerdict
     m_identity.path = path;
     m_identity.info = info;
     m_identity.known = m_size >= kStoreHeaderSize;
+    m_identity.infoKnown = true;
     std::memcpy(m_identity.header.data(), m_bytes.get(), headerSize);
     return {};
 }
@@ -333,9 +334,10 @@ bool StoreSource::open(const StoreIdentity& identity) {
     const bool opened = identity.known && !fileSystem().open(identity.path, OpenMode::Read, file) &&
                         !file->info(info) && !readFully(*file, header, got);
     const FileInfo& was = identity.info;
-    const bool same = opened && info.device == was.device && info.inode == was.inode &&
-                      info.size == was.size && info.modifiedNs == was.modifiedNs && got == header.size() &&
-                      header == identity.header;
+    const bool unmoved = !identity.infoKnown || (info.device == was.device && info.inode == was.inode &&
+                                                 info.size == was.size && info.modifiedNs == was.modifiedNs);
+    const bool same = opened && unmoved && got == header.size() && header == identity.header &&
+                      info.size == decodeStoreHeader(header).fileSize;
     if (same) {
         m_file = std::move(file);
     }

@@ -127,8 +127,9 @@ Status StoreWriter::commit(StoreIdentity& identity, bool& replaced) {
     const FileError error = m_file.commit();
     replaced = !error || m_file.replaced();
     if (replaced) {
-        identity = {m_path, {}, bytes, false};
-        identity.known = !fileSystem().info(m_path, identity.info);
+        identity = {m_path, {}, bytes, true, false};
+        // Within a batch the name still holds the old file.
+        identity.infoKnown = m_file.replaced() && !fileSystem().info(m_path, identity.info);
     }
     return error ? Status::failure(error.text()) : Status();
 }

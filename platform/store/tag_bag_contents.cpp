@@ -240,7 +240,6 @@ void TagBag::Contents::adopt(const std::vector<Written>& written, const StoreIde
         }
         entry.place = row.place;
         entry.onFile = identity.known;
-        // Where the file could not be looked at again, a live object is packed the next time.
         entry.changed = entry.changed && !durable;
     }
     thinImage();

@@ -83,12 +83,15 @@ String judgeStoredObject(std::span<const std::byte> file, const StoredObject& ob
 /// All of the above.
 StoreVerdict judgeStore(std::span<const std::byte> file, std::vector<StoredObject>& objects);
 
-/// A file that was read or written, known again by these.
+/// A file that was read or written, known again by these. Its header tells its size and, through the table's
+/// checksum, the checksum of each object, so that it alone vouches for the contents; the other marks are
+/// compared where they are known.
 struct StoreIdentity {
     String path;
     FileInfo info;
     StoreHeaderBytes header{};
     bool known = false;
+    bool infoKnown = false;
 };
 
 /// A whole file in memory.
