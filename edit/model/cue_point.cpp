@@ -137,12 +137,13 @@ bool cue_point::slide(double seconds) {
 
 /// Keeps what finds the event again after a change.
 void cue_point::remember() {
-    if (m_event.valid() == 0) {
+    const channel_event* event = m_event.get_chan_evnt_ptr();
+    if (event == nullptr) {
         return;
     }
     const cel& its = *m_event.get_its_cel();
     const int in = m_event.index() & ~1;
-    m_eventId = its.getChanEventPtr(m_event.index())->id;
+    m_eventId = event->id;
     const channel_event* out = its.getChanEventPtr(in + 1);
     m_outId = out != nullptr ? out->id : IdStamp();
     const Span span(its, in);
