@@ -52,8 +52,8 @@ String unescaped(std::string_view text) {
 }
 
 String channelField(std::string_view name) {
-    const String field = escaped(name);
-    return name.starts_with('A') ? field : String(kForeignName) + field;
+    String field(name.starts_with('A') ? std::string_view() : kForeignName);
+    return field += escaped(name);
 }
 
 String channelName(std::string_view field) {

@@ -38,6 +38,7 @@ struct EditFile::LoadedCel {
 struct EditFile::LoadedLevels {
     AudLevelsCel levels;
     IdStamp audio;
+    String name; ///< empty unless the levels channel has one of its own
 };
 
 namespace {
@@ -132,6 +133,7 @@ Qx::Status EditFile::loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
             return Qx::Status::failure("object " + pair.attrib() + " is not a level envelope that reads (" +
                                        edit.m_store.objectError() + ")");
         }
+        loaded.name = edit.m_header.getString(EditKeys::numbered(EditKeys::kLevelsName, m));
         levels.push_back(std::move(loaded));
     }
 }
@@ -209,10 +211,12 @@ Qx::Status EditFile::readCels(Edit& edit) {
     }
     for (LoadedLevels& loaded : levels) {
         loaded.levels.checkNodesRevision(edit.getAudCel(loaded.audio));
-        if (!edit.addLevelsChan(loaded.audio, loaded.levels).valid()) {
+        const IdStamp id = edit.addLevelsChan(loaded.audio, loaded.levels);
+        if (!id.valid()) {
             return Qx::Status::failure("the levels " + loaded.levels.id().asString() +
                                        " could not be joined to their audio channel");
         }
+        edit.setChanName(id, loaded.name);
     }
     edit.convertCues();
     return {};
@@ -293,9 +297,17 @@ void EditFile::lendCels(Edit& edit) {
             levels.writeToStore(store);
             header.setString(EditKeys::numbered(EditKeys::kLevels, m),
                              Qx::AttribValuePair(levels.id().asString(), id.asString()).asString());
+            const String levelsName = EditKeys::numbered(EditKeys::kLevelsName, m);
+            const String name = edit.getChanName(levels.id());
+            if (name.empty()) {
+                header.remove(levelsName);
+            } else {
+                header.setString(levelsName, name);
+            }
             ++m;
         }
     }
+    EditKeys::removeNumbered(header, EditKeys::kLevelsName, m);
     EditKeys::removeNumbered(header, EditKeys::kCelKind, n);
     EditKeys::removeNumbered(header, EditKeys::kLevels, m);
     for (int gone = n; store.removeObject(EditKeys::numbered(EditKeys::kCelid, gone)); ++gone) {

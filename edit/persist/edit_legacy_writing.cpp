@@ -96,6 +96,7 @@ Qx::Ed2Support::TVStd Edit::writeED2Config(TextFile& file) const {
     // These tell of the objects of an object store; the standard is written below.
     EditKeys::removeNumbered(header, EditKeys::kCelKind, 0);
     EditKeys::removeNumbered(header, EditKeys::kLevels, 0);
+    EditKeys::removeNumbered(header, EditKeys::kLevelsName, 0);
     header.remove(EditKeys::kTvType);
     header.writeTo(file);
 

@@ -13,6 +13,7 @@ inline constexpr const char* kSoundOutput = "SOUND_OUTPUT_FLAG";       ///< foll
 inline constexpr const char* kSoundOutputXFade = "SOUND_OUTPUT_XFADE"; ///< followed by the old index
 inline constexpr const char* kEntireMedium = "ENTIRE_MEDIUM";
 inline constexpr const char* kLevels = "Levels";   ///< followed by a counter
+inline constexpr const char* kLevelsName = "LevelsName"; ///< followed by the counter of a Levels key
 inline constexpr const char* kCelKind = "CelKind"; ///< followed by the counter of a Celid object
 inline constexpr const char* kCelid = "Celid";     ///< name of a cel object, followed by a counter
 inline constexpr const char* kCues = "CueId";      ///< name of the cue object
