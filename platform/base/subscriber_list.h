@@ -16,8 +16,8 @@ namespace Qx {
 
 /// One subscription: whether it is ended, and which threads are inside its function.
 ///
-/// Invariants: once `m_ended` is set no thread enters; `m_inside` holds a thread once for each call that it is
-/// in the middle of. Guarded by `m_mutex`, which is never held while the function runs.
+/// Invariants: once `m_ended` is set no thread enters; `m_inside` holds a thread once for each call that it
+/// is in the middle of. Guarded by `m_mutex`, which is never held while the function runs.
 class QM_API Subscription {
 public:
     Subscription() = default;
@@ -29,8 +29,8 @@ public:
     [[nodiscard]] bool enter();
     void leave();
     /// Lets nobody in any more and waits until no other thread is inside. Threads that would wait for each
-    /// other, each inside a function whose subscription another one ends, do not all wait: the one that closes
-    /// the circle goes on at once.
+    /// other, each inside a function whose subscription another one ends, do not all wait: the one that
+    /// closes the circle goes on at once.
     void end();
 
 protected:
@@ -53,10 +53,10 @@ private:
     bool m_awaited = false; ///< whoever ended it waits, and drops the function
 };
 
-/// A list of functions that are told something, with the promises of `Notifier`: they are called on the teller's
-/// thread in the order of their addition; they may tell, add, end (themselves or others) and destroy the list
-/// meanwhile; no lock is held while one runs. Thread-safe. Telling allocates nothing
-/// but room for the threads that are inside one function at the same time.
+/// A list of functions that are told something, with the promises of `Notifier`: they are called on the
+/// teller's thread in the order of their addition; they may tell, add, end (themselves or others) and destroy
+/// the list meanwhile; no lock is held while one runs. Thread-safe. Telling allocates nothing but room for
+/// the threads that are inside one function at the same time.
 template <typename... Arguments>
 class SubscriberList {
 public:
@@ -82,7 +82,7 @@ public:
         const std::shared_ptr<const Entries> told = state->entries();
         for (const std::shared_ptr<Entry>& entry : *told) {
             const Inside inside(*entry);
-            if (inside.entered && state->isOpen()) {
+            if (inside.entered && state->isOpen() && entry->function) {
                 entry->function(arguments...);
             }
         }
@@ -140,7 +140,8 @@ private:
     };
 
     struct Handle {
-        Handle(std::shared_ptr<State> s, std::shared_ptr<Entry> e) : state(std::move(s)), entry(std::move(e)) {}
+        Handle(std::shared_ptr<State> s, std::shared_ptr<Entry> e)
+            : state(std::move(s)), entry(std::move(e)) {}
         ~Handle() {
             state->remove(entry);
             entry->end();

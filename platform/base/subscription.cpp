@@ -4,9 +4,9 @@
 
 namespace Qx {
 
-/// Which thread waits for which subscription to be left. Its lock is taken before a subscription's, never while
-/// one is held. Every subscription in it is ended, so that the threads inside can only become fewer, and a
-/// circle is complete when its last thread comes in here.
+/// Which thread waits for which subscription to be left. Its lock is taken before a subscription's, never
+/// while one is held. Every subscription in it is ended, so that the threads inside can only become fewer,
+/// and a circle is complete when its last thread comes in here.
 struct Subscription::Waits {
     std::mutex mutex;
     std::map<std::thread::id, Subscription*> awaited;

@@ -10,7 +10,8 @@ namespace {
 
 class SubscriptionGuard : public Guard {
 public:
-    explicit SubscriptionGuard(std::shared_ptr<void> subscription) : m_subscription(std::move(subscription)) {}
+    explicit SubscriptionGuard(std::shared_ptr<void> subscription)
+        : m_subscription(std::move(subscription)) {}
 
 private:
     std::shared_ptr<void> m_subscription;
@@ -29,7 +30,7 @@ public:
     Qx::SubscriberList<const NotifyMsg&> subscribers;
 };
 
-Notifier::Notifier() : m_observers(std::make_shared<Observers>()) {}
+Notifier::Notifier() : m_observers(std::make_unique<Observers>()) {}
 
 Notifier::~Notifier() = default;
 

@@ -25,9 +25,10 @@ QM_API Ptr<Guard> guardFor(std::shared_ptr<void> subscription);
 /// which they subscribed. An observer may change what it observes, notify again, subscribe and unsubscribe
 /// (itself or others) while it is being told: one that was removed is not called any more, one that was added
 /// hears from the next message on. Once a guard's destructor returns, its listener is not running on another
-/// thread and will never be called again, and what the listener held is let go. A guard's destructor must not be
-/// waited for by the listener itself, so do not hold a lock over it that the listener takes. (Where threads, each
-/// inside a listener, end each other's subscriptions in a circle, one of them goes on without waiting.)
+/// thread and will never be called again, and what the listener held is let go. A guard's destructor must not
+/// be waited for by the listener itself, so do not hold a lock over it that the listener takes. (Where
+/// threads, each inside a listener, end each other's subscriptions in a circle, one of them goes on without
+/// waiting.)
 ///
 /// The notifier may be destroyed by one of its observers; those that were not told yet are then not told.
 /// Observers of one message may hear an inner message, sent by an observer before them, first.

@@ -8,9 +8,10 @@
 /// `Notifier`. Each observer is handed a copy of the value as it was set, so it may set another one
 /// meanwhile, or destroy the server.
 ///
-/// Every value that is set reaches every observer: none is skipped because a later one was set. Where an observer
-/// sets a value while it is told one, the observers after it hear the inner value first; likewise for values that
-/// are set on two threads at once. `getValue` gives the latest in any case. `T` is copyable and has a default.
+/// Every value that is set reaches every observer: none is skipped because a later one was set. Where an
+/// observer sets a value while it is told one, the observers after it hear the inner value first; likewise
+/// for values that are set on two threads at once. `getValue` gives the latest in any case. `T` is copyable
+/// and has a default.
 template <typename T>
 class ValServer {
 public:

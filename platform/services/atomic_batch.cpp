@@ -2,6 +2,7 @@
 
 #include <iterator>
 #include <set>
+#include <utility>
 
 namespace Qx {
 
@@ -72,8 +73,8 @@ FileError AtomicBatch::replaceAll() {
         auto error = retryInterrupted([&] { return fileSystem().rename(entry.temporary, entry.path); });
         if (error) {
             removeTemporaries(i);
-            error.operation = String::format("replace (%zu of %zu files hold their new contents)", m_numReplaced,
-                                             count);
+            error.operation =
+                String::format("replace (%zu of %zu files hold their new contents)", m_numReplaced, count);
             return error;
         }
         ++m_numReplaced;

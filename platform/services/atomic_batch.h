@@ -5,8 +5,8 @@
 namespace Qx {
 
 /// Makes many files durable for the price of about one. While a batch is open, `AtomicFile::commit` on this
-/// thread closes its temporary file and enrols it; `commit` of the batch then makes all of them durable with one
-/// call a folder, renames them in the order in which they were enrolled and makes the folders durable.
+/// thread closes its temporary file and enrols it; `commit` of the batch then makes all of them durable with
+/// one call a folder, renames them in the order in which they were enrolled and makes the folders durable.
 ///
 ///     AtomicBatch batch;
 ///     for (...) { AtomicFile file(path); ... file.commit() ... }   // names still hold the old files
@@ -16,8 +16,8 @@ namespace Qx {
 /// single name holds its old or its new file at every instant; the names together do not change in one step.
 /// Destroyed without a commit, the batch removes its temporary files and no name has changed.
 ///
-/// A batch that is opened inside another hands its files over to the outer one when it commits. A batch is used
-/// on the thread that made it, as a local variable. It belongs to no other batch or thread.
+/// A batch that is opened inside another hands its files over to the outer one when it commits. A batch is
+/// used on the thread that made it, as a local variable. It belongs to no other batch or thread.
 class QM_API AtomicBatch {
 public:
     AtomicBatch();
@@ -25,11 +25,11 @@ public:
     AtomicBatch(const AtomicBatch&) = delete;
     AtomicBatch& operator=(const AtomicBatch&) = delete;
 
-    /// Replaces all files. On a failure before the first rename, every temporary file is removed and nothing has
-    /// changed. A failure among the renames leaves the names before it with their new files, removes the other
-    /// temporary files, and says in its text how many names hold new files. If only the sync of a folder fails,
-    /// all names hold their new files, which may not yet be durable. The batch is empty afterwards and may be
-    /// filled again.
+    /// Replaces all files. On a failure before the first rename, every temporary file is removed and nothing
+    /// has changed. A failure among the renames leaves the names before it with their new files, removes the
+    /// other temporary files, and says in its text how many names hold new files. If only the sync of a
+    /// folder fails, all names hold their new files, which may not yet be durable. The batch is empty
+    /// afterwards and may be filled again.
     FileError commit();
 
     /// How many files wait for the commit.

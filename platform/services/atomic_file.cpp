@@ -20,11 +20,13 @@ constexpr size_t kNameKept = 200;
 constexpr int kTries = 100;
 
 String temporaryFor(const String& path) {
-    // A stamp differs on every thread and after every fork, so two writers do not wait for each other's names.
+    // A stamp differs on every thread and after every fork, so two writers do not wait for each other's
+    // names.
     const IdStamp stamp = IdStamp::fresh(IdStampMagic::EffectNode);
     const String name = fileNameOf(path).substr(0, kNameKept);
-    const String temporary = String::format(".%s.%ld-%08x%08x.tmp", name.c_str(), static_cast<long>(::getpid()),
-                                            stamp.word(0) ^ stamp.word(1), stamp.word(2));
+    const String temporary =
+        String::format(".%s.%ld-%08x%08x.tmp", name.c_str(), static_cast<long>(::getpid()),
+                       stamp.word(0) ^ stamp.word(1), stamp.word(2));
     return path.find('/') == String::npos ? temporary : joinPath(folderOf(path), temporary);
 }
 
@@ -74,8 +76,7 @@ FileError AtomicFile::openTemporary() {
     FileError error;
     for (int i = 0; i < kTries; ++i) {
         const String temporary = temporaryFor(m_path);
-        error =
-            retryInterrupted([&] { return fileSystem().open(temporary, OpenMode::CreateNew, m_file); });
+        error = retryInterrupted([&] { return fileSystem().open(temporary, OpenMode::CreateNew, m_file); });
         if (!error) {
             m_temporary = temporary;
             return {};

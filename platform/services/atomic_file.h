@@ -19,8 +19,8 @@ namespace Qx {
 /// durable. One object is used on one thread.
 ///
 /// The file keeps the permission bits of the one it replaces, where the file system can. The bytes go to the
-/// system as they come: a caller with many small pieces gathers them first. While an `AtomicBatch` is open on the
-/// thread, `commit` enrols the file there instead of renaming it.
+/// system as they come: a caller with many small pieces gathers them first. While an `AtomicBatch` is open on
+/// the thread, `commit` enrols the file there instead of renaming it.
 class QM_API AtomicFile {
 public:
     /// Nothing is touched before the first write.
@@ -56,14 +56,14 @@ private:
     uint64_t m_size = 0;
     bool m_replaced = false;
     bool m_done = false; ///< committed: renamed, or handed to a batch
-    FileError m_failed; ///< the first failure; later calls repeat it
+    FileError m_failed;  ///< the first failure; later calls repeat it
 };
 
 /// True for the names that `AtomicFile` gives its temporary files; a listing of a folder passes them over.
 QM_API bool isTemporaryName(std::string_view fileName);
 
-/// Removes the temporary files that a process which died left in a folder: those whose last change is at least
-/// `age` seconds ago. Returns how many went; a folder that cannot be listed has none.
+/// Removes the temporary files that a process which died left in a folder: those whose last change is at
+/// least `age` seconds ago. Returns how many went; a folder that cannot be listed has none.
 QM_API unsigned removeStaleTemporaries(const String& folder, int64_t age = 24 * 3600);
 
 } // namespace Qx

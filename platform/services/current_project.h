@@ -17,8 +17,8 @@ struct CurrentProject {
     int outputImageRate = 0;   ///< code of the output image rate
     String user;               ///< the current user's name, UTF-8
 
-    /// The folder that holds the project's edit files. Empty without a root folder, or when the project is not
-    /// storable.
+    /// The folder that holds the project's edit files. Empty without a root folder, or when the project is
+    /// not storable.
     [[nodiscard]] String folder() const;
 };
 

@@ -9,8 +9,8 @@ namespace Qx {
 
 namespace {
 
-/// The holder's text fills this many bytes of the file, with blanks behind it, so that a shorter text covers a
-/// longer one.
+/// The holder's text fills this many bytes of the file, with blanks behind it, so that a shorter text covers
+/// a longer one.
 constexpr size_t kHolderSize = 160;
 
 String programName() {
@@ -103,7 +103,8 @@ String FileLock::holder(const String& path) {
     if (readWholeFile(path, text, 4096)) {
         return {};
     }
-    text = text.substr(0, std::min(text.find('\n'), kHolderSize)).trimmed();
+    text.resize(std::min({text.size(), text.find('\n'), kHolderSize}));
+    text = text.trimmed();
     const bool printable = std::all_of(text.begin(), text.end(), [](unsigned char c) { return c >= ' '; });
     return printable && isUtf8(text) ? text : String();
 }

@@ -5,9 +5,9 @@
 
 namespace Qx {
 
-/// Mutual exclusion between processes, and between the threads of one, by an advisory lock on a file. The lock
-/// dies with the process: one that crashes leaves nothing to clear up. While it is held the file says who holds
-/// it. The file stays when the lock is released.
+/// Mutual exclusion between processes, and between the threads of one, by an advisory lock on a file. The
+/// lock dies with the process: one that crashes leaves nothing to clear up. While it is held the file says
+/// who holds it. The file stays when the lock is released.
 ///
 /// The lock is not recursive: a second object for the same file waits, also on the same thread. One object is
 /// used on one thread at a time.
@@ -20,8 +20,8 @@ public:
     FileLock(const FileLock&) = delete;
     FileLock& operator=(const FileLock&) = delete;
 
-    /// Takes the lock, making the file if it is missing; its folder must exist. Without `wait`, a lock that is
-    /// held elsewhere is a failure that names the holder. A lock that this object holds is a success.
+    /// Takes the lock, making the file if it is missing; its folder must exist. Without `wait`, a lock that
+    /// is held elsewhere is a failure that names the holder. A lock that this object holds is a success.
     Status take(bool wait = true);
     void release();
     [[nodiscard]] bool isHeld() const { return m_file != nullptr; }

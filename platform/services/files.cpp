@@ -47,7 +47,8 @@ FileError kindError(FileKind kind, const String& path) {
 }
 
 /// Opens a file for reading and learns its size, which is at most `limit`.
-FileError openForReading(const String& path, uint64_t limit, std::unique_ptr<OpenFile>& file, uint64_t& size) {
+FileError openForReading(const String& path, uint64_t limit, std::unique_ptr<OpenFile>& file,
+                         uint64_t& size) {
     FileSystem& system = fileSystem();
     if (auto error = retryInterrupted([&] { return system.open(path, OpenMode::Read, file); })) {
         return error;

@@ -66,12 +66,14 @@ public:
     /// Takes (or, without `wait`, tries to take) an exclusive advisory lock that dies with the process.
     /// `taken` tells whether the lock is held.
     virtual FileError lock(bool wait, bool& taken) = 0;
-    /// Gives the file back to the system. The object is closed whatever the answer; closing again is a success.
+    /// Gives the file back to the system. The object is closed whatever the answer; closing again is a
+    /// success.
     virtual FileError close() = 0;
 };
 
-/// The file system. Thread-safe. Paths are bytes as the system takes them. A call that a signal interrupts fails
-/// with EINTR and has done nothing; the helpers below, and everything that the library builds on them, try again.
+/// The file system. Thread-safe. Paths are bytes as the system takes them. A call that a signal interrupts
+/// fails with EINTR and has done nothing; the helpers below, and everything that the library builds on them,
+/// try again.
 class QM_API FileSystem {
 public:
     virtual ~FileSystem();

@@ -4,10 +4,10 @@
 
 namespace Qx::Network {
 
-/// Carries messages between seats inside one process: each object is a seat, and hears what the other seats of
-/// its net send, never what it sends itself. Messages are delivered on the sender's thread before `send` returns.
-/// A listener may send, listen and stop listening while it is told; once what `listen` returned is destroyed, the
-/// listener is not running on another thread and will not be called again. Thread-safe.
+/// Carries messages between seats inside one process: each object is a seat, and hears what the other seats
+/// of its net send, never what it sends itself. Messages are delivered on the sender's thread before `send`
+/// returns. A listener may send, listen and stop listening while it is told; once what `listen` returned is
+/// destroyed, the listener is not running on another thread and will not be called again. Thread-safe.
 class QM_API LocalService : public Service {
 public:
     /// The first seat of a net of its own.

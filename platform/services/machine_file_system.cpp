@@ -8,6 +8,7 @@
 #include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
+#include <utility>
 
 namespace Qx {
 
@@ -64,7 +65,7 @@ public:
             return failed("seek in", m_path, EINVAL);
         }
         return ::lseek(m_descriptor, static_cast<off_t>(offset), SEEK_SET) < 0 ? failed("seek in", m_path)
-                                                                                : FileError();
+                                                                               : FileError();
     }
 
     FileError sync() override { return ::fsync(m_descriptor) != 0 ? failed("sync", m_path) : FileError(); }
