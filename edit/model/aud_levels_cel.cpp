@@ -180,9 +180,9 @@ bool AudLevelsCel::replaceClipNodes(const AudCel& audio) {
     const cel& clips = *audio.getCel();
     Store built = m_contents->nodes;
     bool found = false;
-    for (int pair = 0; pair < clips.numPairs(); ++pair) {
-        const channel_event& in = *clips.getChanEventPtr(2 * pair);
-        const channel_event& out = *clips.getChanEventPtr(2 * pair + 1);
+    for (int i = 0; i + 1 < clips.numEvents(); i += 2) {
+        const channel_event in = clips.get_event(i);
+        const channel_event out = clips.get_event(i + 1);
         const double length = out.editTime - in.editTime;
         const bool ownLevels = in.level != 1.0f || out.level != 1.0f;
         if (in.strip.isBlack() || !ownLevels || !(length > Store::kStep)) {
