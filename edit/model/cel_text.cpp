@@ -200,6 +200,6 @@ Qx::Status cel::buildFrom(const TextFile& file, unsigned first) {
     m_events.swap(built.m_events);
     m_resolution = built.m_resolution;
     m_materialInfo.swap(built.m_materialInfo);
-    m_changed = true;
+    changedNow();
     return {};
 }
