@@ -1,7 +1,9 @@
 #pragma once
 
 #include "edit/model/aud_levels_cel.h"
+#include "edit/model/channel_group_list.h"
 #include "edit/model/channel_types.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit_modification.h"
 #include "edit/model/edit_ptr.h"
 #include "edit/model/managed_cel.h"
@@ -16,6 +18,7 @@
 
 #include <atomic>
 #include <memory>
+#include <optional>
 
 class TextFile;
 
@@ -87,12 +90,24 @@ public:
     enum ReadFileRC : int { kReadOk = 0, kReadFailed = 1 };
     enum Permissions : int { kPermissionsNone = 0, kPermissionsRead = 1, kPermissionsAll = 2 };
 
+    /// The revision of the content that this library writes. It lives in files.
+    static constexpr int kCurrentRevision = 602;
+    /// The version of the program as headers name it.
+    static constexpr const char* kProgramVersion = "11.1.0.0";
+    /// The transfer code of an edit whose header names none.
+    static constexpr int kDefaultTransfer = 3;
+
     /// An empty edit with the defaults of a new one; clean.
     Edit();
     /// An edit read from a file; `isBad()` tells whether it could be. See `readFile` and
     /// `readFromLegacyFile`.
     Edit(const WString& path, eEditOpenBehaviour behaviour);
     ~Edit() override;
+
+    /// A deep copy: header, channels with their names, stamps, levels and sync losses, objects, groups, cues
+    /// and times. Its cookie is invalid, so that no save of it can meet the original's file; it is clean, not
+    /// temporary, and has no observers. Objects that cannot be read are left out and logged.
+    [[nodiscard]] EditPtr copy() const;
 
     /// How many edits were ever constructed in this process.
     [[nodiscard]] static uint64_t numConstructed();
@@ -325,6 +340,15 @@ public:
     bool writeToFile(const WString& path, QxEditFileType type);
     bool writeToLegacyFile(const WString& path);
     bool readFromLegacyFile(const WString& path);
+    /// The sections of the legacy text; its form is docs/ed2-format.md. The writers append to a text, the
+    /// readers search it. `writeED2Config` returns the television standard it wrote, `writeED2Cels` the
+    /// number of channels. `readED2Cels` fails, naming the line, for a section that does not read and for too
+    /// many channels; the edit then has the channels read before it.
+    Qx::Ed2Support::TVStd writeED2Config(TextFile& file) const;
+    unsigned writeED2Cels(TextFile& file, Qx::Ed2Support::TVStd standard) const;
+    Qx::Status readED2Cels(const TextFile& file);
+    void writeED2Cues(TextFile& file) const;
+    void readED2Cues(const TextFile& file);
     /// True until a read succeeds, for an edit that was made to be read.
     [[nodiscard]] bool isBad() const { return m_bad; }
     [[nodiscard]] bool isLoading() const { return m_loading; }
@@ -333,11 +357,101 @@ public:
     [[nodiscard]] TagBag& objectStore() { return m_store; }
     /// @}
 
-    /// Undocumented parts of the façade, each in a file of its own.
+    /// \name Cues (edit_cues.cpp)
+    /// A *cel cue* is one that was brought in from the material of an event: attached and not kept in the
+    /// file. The operations here that change cues record a change of type `kCuesChanged` with notification;
+    /// changes through `get_cues` are recorded by whoever makes them.
+    /// @{
+    [[nodiscard]] cue_list& get_cues() { return m_cues; }
+    [[nodiscard]] const cue_list& get_cues() const { return m_cues; }
+    /// Whether the cel cues are loaded and shown. The setters record no change.
+    [[nodiscard]] bool get_cel_cues_loaded() const { return m_celCuesLoaded; }
+    void set_cel_cues_loaded(bool loaded) { m_celCuesLoaded = loaded; }
+    /// Removes the cel cues. False if there was none.
+    bool delete_all_cel_cues();
+    /// Removes the cel cues and marks them as not loaded. False if there was none.
+    bool cel_cues_off();
+    /// Removes the cues of a channel, by index; all of them for a negative one or `kAnyCueChan`. False if
+    /// there was none.
+    bool deleteCues(int chan);
+    /// Removes one cue, by its place in the list. False if there is none.
+    bool deleteCue(size_t index);
+    /// Lets the attached cues follow their events, after cels were changed. False if none had to move.
+    bool updateCues();
+    /// Attaches the cues to the channels' cels, after loading or when cels were replaced. Records no change.
+    void convertCues();
+    /// The channel numbers of cues at or after `firstChan` move by `count`, for channels that were inserted
+    /// there. Records no change: it is a part of the insertion's.
+    void shuffleCueChans(int firstChan, int count);
+    /// Puts the cues that are kept in the file into the object store, under "CueId".
+    void storeCues();
+    /// Takes the stored cues over in the place of the edit's own, unattached until `convertCues`; without any
+    /// the edit has none. False, changing nothing, when what is stored cannot be read.
+    bool retrieveCues();
+    /// @}
+
+    /// \name Channel groups (edit_channel_groups.cpp)
+    /// Operations that change groups record a change of type `kGroupsChanged` with notification.
+    /// @{
+    /// The edit's groups, opened or made on first use; null when the stored ones cannot be read, which then
+    /// stay in the file as they are. Lives as long as the edit or until it is read again. A change made
+    /// through the pointer is saved but not recorded.
+    [[nodiscard]] ChannelGroupList* retrieveGroupsList() const;
+    /// The default grouping of a shot; null if none is stored.
+    [[nodiscard]] ChannelGroupList* retrieveDefaultGroupsList() const;
+    /// Ties channels into one group, in the given order; where one is in a group already, that group's
+    /// members come in its place and that group goes. What is no channel's stamp is left out, and no group is
+    /// made of fewer than two. False, changing nothing, for fewer than two stamps or without a list.
+    bool groupChannels(const Vector<IdStamp>& chans, ChannelGroup::eType type);
+    /// Dissolves the channel's group. False if it is in none.
+    bool ungroupChannels(const IdStamp& chan);
+    /// Removes every group. False only without a list.
+    bool ungroupAllChannels();
+    /// Takes a channel out of its group; a group left with one member dissolves. False if it is in none.
+    bool removeFromGroup(const IdStamp& chan);
+    [[nodiscard]] bool isGrouped(const IdStamp& chan) const;
+    /// Appends the members of a channel's group, or the channel itself when it is in none; nothing for what
+    /// is no channel of the edit.
+    void getGroupContainingChan(const IdStamp& chan, Vector<IdStamp>& members) const;
+    /// The stamp itself when it is in no group.
+    [[nodiscard]] IdStamp getFirstInGroup(const IdStamp& chan) const;
+    [[nodiscard]] IdStamp getLastInGroup(const IdStamp& chan) const;
+    [[nodiscard]] bool isFirstInGroup(const IdStamp& chan) const { return getFirstInGroup(chan) == chan; }
+    [[nodiscard]] bool isLastInGroup(const IdStamp& chan) const { return getLastInGroup(chan) == chan; }
+    /// The number of groups; the type is accepted and not used.
+    [[nodiscard]] unsigned numGroups(Edit_Chan_Type type = AnyChan) const;
+    /// Null for an index out of range. Valid until the next change of groups.
+    [[nodiscard]] const ChannelGroup* getTrackGroup(unsigned index) const;
+    /// True if both are in one and the same group.
+    [[nodiscard]] bool sameGroup(const IdStamp& a, const IdStamp& b) const;
+    /// True if both are in groups, of equal type and size.
+    [[nodiscard]] bool similarGroups(const IdStamp& a, const IdStamp& b) const;
+    /// A name for the channel's group from its members' letters and numbers in group order, runs joined:
+    /// "A1-A4", "V1,A1-A2". With `withType` a group that is not plain has its kind before it:
+    /// "Stereo A1-A2". The channel's own for one that is in no group; empty for what is no channel.
+    [[nodiscard]] String getGroupName(const IdStamp& chan, bool withType) const;
+    /// The same with the channels' own names where they have them: "Boom,A2-A3".
+    [[nodiscard]] String getGroupDisplayName(const IdStamp& chan, bool withType) const;
+    /// True only for a shot (log type 1) with at least one default group.
+    [[nodiscard]] bool isDefaultGroupingPresent() const;
+    /// The shot's default groups, as far as their channels exist, take the place of its groups. False,
+    /// changing nothing, when no default grouping is present.
+    bool applyDefaultGrouping();
+    /// The shot's groups become its default grouping; without groups it has none. False for what is no shot,
+    /// when that is its default grouping already, and when a stored one cannot be read, which then stays.
+    bool updateDefaultGroupingForShot();
+    /// Turns the header text "CHAN_GRPS" of older files into groups and removes it.
+    void updateChannelGroups();
+    /// The "CHAN_GRPS" text; empty if there is none.
+    [[nodiscard]] String getGroupTextFromED2() const;
+    /// @}
+
+    /// The channels, in a file of their own; not for callers.
     class ChannelSet;
 
 private:
     friend class EditFile;
+    struct StoredCels;
 
     void init();
     bool store(const WString& path);
@@ -347,6 +461,69 @@ private:
     void getInfoFromHeader();
     bool doEditConversions();
     [[nodiscard]] bool isReadOnlyForUser() const;
+    /// Read-only for the user or by its header.
+    [[nodiscard]] bool isReadOnly() const;
+
+    /// While one lives, changes of the header do not dirty the edit.
+    class QuietHeader {
+    public:
+        explicit QuietHeader(Edit& edit) : m_edit(edit) { ++m_edit.m_quietHeader; }
+        ~QuietHeader();
+        QuietHeader(const QuietHeader&) = delete;
+        QuietHeader& operator=(const QuietHeader&) = delete;
+
+    private:
+        Edit& m_edit;
+    };
+
+    /// Holds the edit while observers are told, if anybody holds it: one of them may drop the last handle.
+    class KeepAlive {
+    public:
+        explicit KeepAlive(Edit& edit);
+
+    private:
+        EditPtr m_handle;
+    };
+
+    /// \name The gate through which every operation records its change
+    /// Nothing is recorded while the edit is initialised or loaded.
+    /// @{
+    /// A change of its own: counted, described, dirtied, announced with `notify`.
+    void recordChange(const EditModification& change, bool notify);
+    /// A part of a greater change, which its caller describes: dirtied only.
+    void recordUndescribed();
+    /// @}
+    void announceDirt();
+    void writeDescription();
+    void updateProjectRecord();
+    void sendChannelMessage(NotifyMsgType message, Edit_Chan_Type type, int index, int count);
+
+    void initHeader();
+    /// Forgets what was derived from the header or the channels.
+    void dropDerivedValues();
+
+    /// `wanted`, or a fresh stamp where it is null or taken.
+    [[nodiscard]] IdStamp usableStamp(const IdStamp& wanted) const;
+    [[nodiscard]] size_t insertionPosition(Edit_Chan_Type type, Edit_Chan_SubType subtype, int at,
+                                           bool before) const;
+    /// `insertChans`, with content (taken over) for a single channel. Returns the first new stamp, or null.
+    IdStamp insertChannels(ChanType type, int at, unsigned count, bool before, bool notify, double time,
+                           cel* content);
+    [[nodiscard]] static bool isGivenCel(const cel* content);
+
+    /// A channel that had an index goes, or is gone: it leaves its group, in the groups and the default ones,
+    /// its cues go and those of the channels after it are renumbered. To be called while its cel exists.
+    void channelRemoved(const IdStamp& chan, int index);
+    /// A channel's stamp changes: its groups follow.
+    void channelRenamed(const IdStamp& from, const IdStamp& to);
+    /// A channel's cel is replaced: its cues follow to the events with the same stamps.
+    void celReplaced(const cel* from, cel* to);
+    /// Before a save: tells the object store which group lists changed.
+    void storeGroups();
+    /// When the object store was opened or emptied: the group list is looked up anew.
+    void forgetGroups();
+    void cuesChanged();
+    void groupsChanged();
 
     std::atomic<int32_t> m_refCount{0};
     configb m_header;
@@ -362,12 +539,20 @@ private:
     bool m_loading = false;
     bool m_writing = false;
     bool m_debug = false;
+    bool m_networkNotified = false;
+    int m_quietHeader = 0;
     int m_entireMedium = 0;
     mutable Qx::FrameRate m_frameRate;
     mutable bool m_frameRateValid = false;
     mutable uint32_t m_revision = UINT32_MAX;
+    mutable std::optional<int> m_sourceMedium;
+    mutable std::optional<int> m_transfer;
     mutable double m_sourceMediumDuration = Qx::kNoTime;
-    TagBag m_store;
+    cue_list m_cues;
+    bool m_celCuesLoaded = false;
+    mutable TagBag m_store;
+    std::shared_ptr<StoredCels> m_storedCels; ///< which cel the store holds under which name
+    mutable std::atomic<ChannelGroupList*> m_groups{nullptr};
     ValServer<EditModification> m_changes;
     String m_fileError;
     mutable criticalSection m_section;

@@ -41,9 +41,26 @@ Label labelOf(int64_t frames, FrameRate rate, bool dropFrame) {
             static_cast<int>(frames % nominal)};
 }
 
+void appendTwoDigits(String& text, int number) {
+    text += static_cast<char>('0' + number / 10);
+    text += static_cast<char>('0' + number % 10);
+}
+
+// Without `printf`: reports and lists show a timecode or four in every line.
 String labelText(const Label& label, bool dropFrame) {
-    return String::format("%02lld:%02d:%02d%c%02d", static_cast<long long>(label.hours), label.minutes,
-                          label.seconds, dropFrame ? ';' : ':', label.frames);
+    String text;
+    if (label.hours < 100) {
+        appendTwoDigits(text, static_cast<int>(label.hours));
+    } else {
+        text += std::to_string(label.hours);
+    }
+    text += ':';
+    appendTwoDigits(text, label.minutes);
+    text += ':';
+    appendTwoDigits(text, label.seconds);
+    text += dropFrame ? ';' : ':';
+    appendTwoDigits(text, label.frames);
+    return text;
 }
 
 // Reads at most two digits at `at` and moves past them.
