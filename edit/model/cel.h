@@ -163,6 +163,15 @@ public:
     void pack(PStream& stream) const override;
     void unpack(PStream& stream) override;
     [[nodiscard]] std::unique_ptr<Streamable> clone(BuilderType type = BuilderType::Copy) const override;
+
+    /// Appends the cel's lines of a legacy text: resolution, material text and every field of every event,
+    /// one event a line, so that `buildFrom` makes the same bits again. Name, stamp and subtype stand in the
+    /// line of the channel. The form is docs/ed2-format.md. Times are written in seconds whatever the
+    /// standard.
+    void writeToED2(TextFile& file, Qx::Ed2Support::TVStd standard) const;
+    /// Reads those lines from line `first` on. A failure names the line (from 1) and what is wrong with it,
+    /// and leaves the cel as it was.
+    Qx::Status buildFrom(const TextFile& file, unsigned first);
     /// @}
 
 private:

@@ -18,6 +18,7 @@
 
 #include <atomic>
 #include <memory>
+#include <optional>
 
 class TextFile;
 
@@ -89,12 +90,24 @@ public:
     enum ReadFileRC : int { kReadOk = 0, kReadFailed = 1 };
     enum Permissions : int { kPermissionsNone = 0, kPermissionsRead = 1, kPermissionsAll = 2 };
 
+    /// The revision of the content that this library writes. It lives in files.
+    static constexpr int kCurrentRevision = 602;
+    /// The version of the program as headers name it.
+    static constexpr const char* kProgramVersion = "11.1.0.0";
+    /// The transfer code of an edit whose header names none.
+    static constexpr int kDefaultTransfer = 3;
+
     /// An empty edit with the defaults of a new one; clean.
     Edit();
     /// An edit read from a file; `isBad()` tells whether it could be. See `readFile` and
     /// `readFromLegacyFile`.
     Edit(const WString& path, eEditOpenBehaviour behaviour);
     ~Edit() override;
+
+    /// A deep copy: header, channels with their names, stamps, levels and sync losses, objects, groups, cues
+    /// and times. Its cookie is invalid, so that no save of it can meet the original's file; it is clean, not
+    /// temporary, and has no observers. Objects that cannot be read are left out and logged.
+    [[nodiscard]] EditPtr copy() const;
 
     /// How many edits were ever constructed in this process.
     [[nodiscard]] static uint64_t numConstructed();
@@ -327,6 +340,15 @@ public:
     bool writeToFile(const WString& path, QxEditFileType type);
     bool writeToLegacyFile(const WString& path);
     bool readFromLegacyFile(const WString& path);
+    /// The sections of the legacy text; its form is docs/ed2-format.md. The writers append to a text, the
+    /// readers search it. `writeED2Config` returns the television standard it wrote, `writeED2Cels` the
+    /// number of channels. `readED2Cels` fails, naming the line, for a section that does not read and for too
+    /// many channels; the edit then has the channels read before it.
+    Qx::Ed2Support::TVStd writeED2Config(TextFile& file) const;
+    unsigned writeED2Cels(TextFile& file, Qx::Ed2Support::TVStd standard) const;
+    Qx::Status readED2Cels(const TextFile& file);
+    void writeED2Cues(TextFile& file) const;
+    void readED2Cues(const TextFile& file);
     /// True until a read succeeds, for an edit that was made to be read.
     [[nodiscard]] bool isBad() const { return m_bad; }
     [[nodiscard]] bool isLoading() const { return m_loading; }
@@ -424,11 +446,12 @@ public:
     [[nodiscard]] String getGroupTextFromED2() const;
     /// @}
 
-    /// Undocumented parts of the façade, each in a file of its own.
+    /// The channels, in a file of their own; not for callers.
     class ChannelSet;
 
 private:
     friend class EditFile;
+    struct StoredCels;
 
     void init();
     bool store(const WString& path);
@@ -438,6 +461,55 @@ private:
     void getInfoFromHeader();
     bool doEditConversions();
     [[nodiscard]] bool isReadOnlyForUser() const;
+    /// Read-only for the user or by its header.
+    [[nodiscard]] bool isReadOnly() const;
+
+    /// While one lives, changes of the header do not dirty the edit.
+    class QuietHeader {
+    public:
+        explicit QuietHeader(Edit& edit) : m_edit(edit) { ++m_edit.m_quietHeader; }
+        ~QuietHeader();
+        QuietHeader(const QuietHeader&) = delete;
+        QuietHeader& operator=(const QuietHeader&) = delete;
+
+    private:
+        Edit& m_edit;
+    };
+
+    /// Holds the edit while observers are told, if anybody holds it: one of them may drop the last handle.
+    class KeepAlive {
+    public:
+        explicit KeepAlive(Edit& edit);
+
+    private:
+        EditPtr m_handle;
+    };
+
+    /// \name The gate through which every operation records its change
+    /// Nothing is recorded while the edit is initialised or loaded.
+    /// @{
+    /// A change of its own: counted, described, dirtied, announced with `notify`.
+    void recordChange(const EditModification& change, bool notify);
+    /// A part of a greater change, which its caller describes: dirtied only.
+    void recordUndescribed();
+    /// @}
+    void announceDirt();
+    void writeDescription();
+    void updateProjectRecord();
+    void sendChannelMessage(NotifyMsgType message, Edit_Chan_Type type, int index, int count);
+
+    void initHeader();
+    /// Forgets what was derived from the header or the channels.
+    void dropDerivedValues();
+
+    /// `wanted`, or a fresh stamp where it is null or taken.
+    [[nodiscard]] IdStamp usableStamp(const IdStamp& wanted) const;
+    [[nodiscard]] size_t insertionPosition(Edit_Chan_Type type, Edit_Chan_SubType subtype, int at,
+                                           bool before) const;
+    /// `insertChans`, with content (taken over) for a single channel. Returns the first new stamp, or null.
+    IdStamp insertChannels(ChanType type, int at, unsigned count, bool before, bool notify, double time,
+                           cel* content);
+    [[nodiscard]] static bool isGivenCel(const cel* content);
 
     /// A channel that had an index goes, or is gone: it leaves its group, in the groups and the default ones,
     /// its cues go and those of the channels after it are renumbered. To be called while its cel exists.
@@ -467,14 +539,19 @@ private:
     bool m_loading = false;
     bool m_writing = false;
     bool m_debug = false;
+    bool m_networkNotified = false;
+    int m_quietHeader = 0;
     int m_entireMedium = 0;
     mutable Qx::FrameRate m_frameRate;
     mutable bool m_frameRateValid = false;
     mutable uint32_t m_revision = UINT32_MAX;
+    mutable std::optional<int> m_sourceMedium;
+    mutable std::optional<int> m_transfer;
     mutable double m_sourceMediumDuration = Qx::kNoTime;
     cue_list m_cues;
     bool m_celCuesLoaded = false;
     mutable TagBag m_store;
+    std::shared_ptr<StoredCels> m_storedCels; ///< which cel the store holds under which name
     mutable std::atomic<ChannelGroupList*> m_groups{nullptr};
     ValServer<EditModification> m_changes;
     String m_fileError;

@@ -1,0 +1,140 @@
+#include "edit/manager/revision_chain.h"
+
+#include "platform/services/edit_filenames.h"
+#include "platform/services/files.h"
+
+#include <algorithm>
+
+namespace {
+
+Qx::Status asStatus(const Qx::FileError& error) {
+    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+}
+
+const char* marker(RevisionChain::Kind kind) {
+    return kind == RevisionChain::Undo ? "U" : "R";
+}
+
+} // namespace
+
+RevisionChain::RevisionChain(const cookie& item, Kind kind, int depth)
+    : RevisionChain(getFilenameForCookie(item), kind, depth) {}
+
+RevisionChain::RevisionChain(const String& file, Kind kind, int depth)
+    : m_file(file), m_kind(kind), m_depth(std::max(depth, 1)) {}
+
+String RevisionChain::extension(Kind kind, int number) {
+    return number < 0 ? String::format("%s*", marker(kind)) : String::format("%s%d", marker(kind), number);
+}
+
+String RevisionChain::path(int number) const {
+    return m_file + "." + extension(m_kind, number);
+}
+
+bool RevisionChain::has(int number) const {
+    return !m_file.empty() && Qx::fileExists(path(number));
+}
+
+bool RevisionChain::exists() const {
+    return !numbers().empty();
+}
+
+std::vector<int> RevisionChain::numbers() const {
+    std::vector<String> names;
+    if (m_file.empty() || Qx::fileSystem().list(Qx::folderOf(m_file), names)) {
+        return {};
+    }
+    const String start = Qx::fileNameOf(m_file) + "." + marker(m_kind);
+    std::vector<int> found;
+    for (const String& name : names) {
+        int number = 0;
+        // A number with a leading zero or a sign is not a name of this chain.
+        if (name.rfind(start, 0) == 0 && Qx::textToInt(std::string_view(name).substr(start.size()), number) &&
+            number > 0 && name == start + std::to_string(number) && has(number)) {
+            found.push_back(number);
+        }
+    }
+    std::sort(found.begin(), found.end());
+    return found;
+}
+
+Qx::Status RevisionChain::move(int from, int to) const {
+    return asStatus(Qx::fileSystem().rename(path(from), path(to)));
+}
+
+Qx::Status RevisionChain::rotate() {
+    if (m_depth == 1) {
+        return {};
+    }
+    if (has(m_depth)) {
+        if (Qx::Status status = asStatus(Qx::fileSystem().remove(path(m_depth))); !status) {
+            return status;
+        }
+    }
+    for (int number = m_depth - 1; number >= 1; --number) {
+        if (!has(number)) {
+            continue;
+        }
+        if (Qx::Status status = move(number, number + 1); !status) {
+            return status;
+        }
+    }
+    return {};
+}
+
+Qx::Status RevisionChain::push() {
+    if (!Qx::fileExists(m_file)) {
+        return Qx::Status::failure("there is no file " + m_file + " to keep as a backup");
+    }
+    if (Qx::Status status = rotate(); !status) {
+        return status;
+    }
+    return asStatus(Qx::fileSystem().rename(m_file, path(1)));
+}
+
+int RevisionChain::restoreNewest() {
+    int newest = 1;
+    while (newest <= m_depth && !has(newest)) {
+        ++newest;
+    }
+    if (newest > m_depth || Qx::fileSystem().rename(path(newest), m_file)) {
+        return 0;
+    }
+    for (int number = newest + 1; number <= m_depth; ++number) {
+        if (has(number) && !move(number, number - newest)) {
+            break; // what is left keeps its order; a hole is passed over
+        }
+    }
+    return newest;
+}
+
+Qx::Status RevisionChain::pop() {
+    if (!has(1)) {
+        return Qx::Status::failure("there is no backup " + path(1));
+    }
+    if (Qx::Status status = asStatus(Qx::fileSystem().rename(path(1), m_file)); !status) {
+        return status;
+    }
+    for (int number = 2; number <= m_depth; ++number) {
+        if (has(number) && !move(number, number - 1)) {
+            break;
+        }
+    }
+    return {};
+}
+
+void RevisionChain::deleteTail(int keep) {
+    for (int number = std::max(keep, 0) + 1; number <= m_depth; ++number) {
+        if (Qx::fileSystem().remove(path(number))) {
+            break;
+        }
+    }
+}
+
+String getUndoExtension(int number) {
+    return RevisionChain::extension(RevisionChain::Undo, number);
+}
+
+String getRedoExtension(int number) {
+    return RevisionChain::extension(RevisionChain::Redo, number);
+}

@@ -1,0 +1,69 @@
+#pragma once
+
+#include "platform/base/cookie.h"
+#include "platform/base/export.h"
+#include "platform/base/qx_string.h"
+#include "platform/base/status.h"
+
+#include <vector>
+
+/// The numbered revisions of one edit beside its file: undo backups ".U1" (newest) to ".UD" and redo backups
+/// ".R1" to ".RD", where D is the depth.
+///
+/// The room moves and deletes whole files and knows nothing of edits in memory. Every step is one rename or
+/// one deletion, in an order in which a crash between any two loses no revision: a name is vacated before
+/// another file takes it, and a hole that a crash leaves is passed over and closed by what comes next.
+/// Holding the manager's lock, and keeping other processes away, is the caller's business.
+class QM_API RevisionChain {
+public:
+    enum Kind { Undo, Redo };
+
+    /// The chain of an item's file in the current project. The depth is at least 1.
+    RevisionChain(const cookie& item, Kind kind, int depth);
+    /// The chain beside a file of any place; `file` is the edit file's path.
+    RevisionChain(const String& file, Kind kind, int depth);
+
+    /// The text after an edit file's name for backup `number`, without its dot: "U3", "R1"; a negative number
+    /// gives the pattern "U*", "R*".
+    [[nodiscard]] static String extension(Kind kind, int number);
+    /// The path of backup `number`.
+    [[nodiscard]] String path(int number) const;
+    /// The edit file that the chain belongs to.
+    [[nodiscard]] const String& file() const { return m_file; }
+    [[nodiscard]] int depth() const { return m_depth; }
+
+    /// True if backup `number` is there.
+    [[nodiscard]] bool has(int number) const;
+    /// True if any backup is there, in the depth or beyond it.
+    [[nodiscard]] bool exists() const;
+    /// The numbers that are there, newest first.
+    [[nodiscard]] std::vector<int> numbers() const;
+
+    /// Makes room for a backup 1: deletes the oldest of a full chain and moves each k to k + 1, from the
+    /// oldest down. With depth 1 only backup 1 is deleted when the edit file replaces it. On a failure the
+    /// moves made so far stay: every revision is still there, some one place further on.
+    Qx::Status rotate();
+    /// Rotates, then moves the edit file to backup 1.
+    Qx::Status push();
+    /// Moves the newest backup that is there over the edit file's name and closes the gap: for k beyond it,
+    /// backup k moves to k - n. Returns its number n; 0 when there is none or it could not be moved, with
+    /// nothing changed.
+    int restoreNewest();
+    /// Moves backup 1 over the edit file's name and each k to k - 1. Fails, with nothing changed, without a
+    /// backup 1.
+    Qx::Status pop();
+    /// Deletes the backups from `keep` + 1 on; stops at the first that cannot be deleted or after the depth.
+    void deleteTail(int keep);
+
+private:
+    [[nodiscard]] Qx::Status move(int from, int to) const;
+
+    String m_file;
+    Kind m_kind;
+    int m_depth;
+};
+
+/// The undo chain's extension for a number, such as "U1", and the redo chain's. A negative number gives the
+/// pattern for all.
+[[nodiscard]] QM_API String getUndoExtension(int number);
+[[nodiscard]] QM_API String getRedoExtension(int number);

@@ -1,0 +1,108 @@
+#pragma once
+
+#include "edit/model/edit.h"
+
+class cue_list;
+
+/// Names in edit files. They live in files: do not change them.
+namespace EditKeys {
+inline constexpr const char* kNumChans = "NUM_CHANS";
+inline constexpr const char* kCurrentTime = "CURRENT_TIME";
+inline constexpr const char* kMarkTime = "MARK_TIME";
+inline constexpr const char* kSyncLoss = "SyncLoss";                   ///< followed by the channel index
+inline constexpr const char* kSyncError = "SYNC_ERROR";                ///< followed by the old index
+inline constexpr const char* kSoundOutput = "SOUND_OUTPUT_FLAG";       ///< followed by the old index
+inline constexpr const char* kSoundOutputXFade = "SOUND_OUTPUT_XFADE"; ///< followed by the old index
+inline constexpr const char* kEntireMedium = "ENTIRE_MEDIUM";
+inline constexpr const char* kLevels = "Levels";   ///< followed by a counter
+inline constexpr const char* kCelKind = "CelKind"; ///< followed by the counter of a Celid object
+inline constexpr const char* kCelid = "Celid";     ///< name of a cel object, followed by a counter
+inline constexpr const char* kCues = "CueId";      ///< name of the cue object
+inline constexpr const char* kTvType = "tvtype";
+inline constexpr const char* kFrameRate = "FRAME_RATE";
+inline constexpr const char* kRevision = "ED2_REVISION";
+inline constexpr const char* kFrameBased = "FRAME_BASED";
+inline constexpr const char* kTransfer = "TRANSFER";
+inline constexpr const char* kSequence = "SEQUENCE";
+inline constexpr const char* kTransferAudioMedium = "TRANSFER_AUDIO_MEDIUM";
+inline constexpr const char* kHeaderEnd = "END_EDIT_HEADER";
+
+/// A name followed by a number.
+[[nodiscard]] String numbered(const char* name, int number);
+/// Removes every key that is `name` followed by a number of at least `from`.
+void removeNumbered(configb& header, const char* name, int from);
+} // namespace EditKeys
+
+/// What reading and writing do inside an edit. The steps are called in the order in which they are declared;
+/// a step that fails says why in one sentence.
+class EditFile {
+public:
+    /// While it lives, changes of the header and of channels do not dirty the edit: for changes that a load
+    /// or a save itself makes.
+    class Quiet {
+    public:
+        explicit Quiet(Edit& edit) : m_edit(edit), m_before(edit.m_initialising) {
+            edit.m_initialising = true;
+        }
+        ~Quiet() { m_edit.m_initialising = m_before; }
+        Quiet(const Quiet&) = delete;
+        Quiet& operator=(const Quiet&) = delete;
+
+    private:
+        Edit& m_edit;
+        bool m_before;
+    };
+
+    /// Records why a read or write failed; always false.
+    static bool fail(Edit& edit, String reason);
+    /// No channels, no cues, the header of a new edit; the cookie and the store stay.
+    static void reset(Edit& edit);
+    /// The clean state after a load or a save: nothing is marked as changed.
+    static void markWritten(Edit& edit);
+    /// The content of a channel that has a cel; null for others.
+    [[nodiscard]] static Qx::Ptr<cel> sharedCel(const Edit& edit, const IdStamp& chan);
+    /// The number that legacy headers give a channel: 0 the video channel, 1 the first audio channel and so
+    /// on.
+    [[nodiscard]] static int oldIndex(const Edit& edit, const IdStamp& audio);
+
+    /// \name Reading from the open store
+    /// @{
+    static Qx::Status readHeader(Edit& edit);
+    static Qx::Status readCues(Edit& edit);
+    static Qx::Status readCels(Edit& edit);
+    static Qx::Status readGroups(Edit& edit);
+    /// @}
+
+    /// \name Writing
+    /// @{
+    /// A failure for an edit whose file could not be read again.
+    static Qx::Status checkStorable(const Edit& edit);
+    /// Directs the store to a path, opening it when it is not open; objects bound to it stay.
+    static Qx::Status openStore(Edit& edit, const String& path);
+    /// What the header says of channels, times and flags, for a file that has the channels `order`.
+    static void updateHeader(const Edit& edit, configb& header, const Vector<IdStamp>& order);
+    /// Fills `stored` with the cues that are kept in the file and lends it to the store.
+    static void lendCues(Edit& edit, cue_list& stored);
+    static void lendCels(Edit& edit);
+    /// Ends the lending. Afterwards the edit alone owns its cels.
+    static void extractCelsFromStore(Edit& edit, bool written);
+    /// @}
+
+    /// \name Legacy text
+    /// @{
+    /// The first video channel and the audio channels: what a legacy text holds. Empty without video.
+    [[nodiscard]] static Vector<IdStamp> legacyChannels(const Edit& edit);
+    static Qx::Status readLegacy(Edit& edit, const String& path);
+    /// Re-attaches the cues to the events of the channels.
+    static void convertCues(Edit& edit);
+    /// @}
+
+    struct LoadedCel;
+    struct LoadedLevels;
+
+private:
+    static Qx::Status loadCels(Edit& edit, std::vector<LoadedCel>& cels);
+    static Qx::Status loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
+                                 std::vector<LoadedLevels>& levels);
+    static Qx::Status setupChannels(Edit& edit, std::vector<LoadedCel>& cels);
+};

@@ -1,0 +1,184 @@
+#include "edit/persist/detail/edit_file.h"
+#include "edit/persist/detail/legacy_upgrades.h"
+#include "platform/services/edit_filenames.h"
+#include "platform/services/files.h"
+#include "platform/services/log.h"
+#include "platform/store/edit_header_proxy.h"
+
+#include <exception>
+
+namespace {
+
+// The item that a file is named after.
+cookie cookieOfPath(const String& path) {
+    return cookie(std::string_view(Qx::withoutExtension(Qx::fileNameOf(path))));
+}
+
+bool isNoItem(const cookie& item) {
+    return !item.is_valid() || (item.word(0) == 0 && item.word(1) == 0 && item.word(2) == 0);
+}
+
+} // namespace
+
+Edit::Edit(const WString& path, eEditOpenBehaviour behaviour) : Edit() {
+    m_bad = true;
+    if (getEditFileTypeFromFileName(path) == kLegacyTextFile && behaviour == eOpenExisting) {
+        if (!readFromLegacyFile(path)) {
+            return;
+        }
+        m_bad = false;
+        LegacyUpgrades::removeShotSoundRamps(*this);
+        LegacyUpgrades::initialiseAudioVarispeeds(*this);
+        LegacyUpgrades::updateLegacyFileLabels(*this);
+        set_dirty(true);
+        return;
+    }
+    if (readFile(path, behaviour) == kReadOk) {
+        m_bad = false;
+    }
+}
+
+Edit::ReadFileRC Edit::read_file(const cookie& item, eEditOpenBehaviour behaviour) {
+    return readFile(Qx::widen(getFilenameForCookie(item)), behaviour);
+}
+
+Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviour) {
+    incRefCount();
+    m_loading = true;
+    const String file = Qx::narrow(path);
+    const cookie item = cookieOfPath(file);
+    if (isNoItem(item)) {
+        // The reference stays held and the edit stays flagged as loading: whoever asked for such a name must
+        // not find the edit usable or see it go.
+        EditFile::fail(*this, "cannot read an edit from \"" + file +
+                                  "\": its name is not that of an item; rename the file to its cookie");
+        return kReadFailed;
+    }
+    m_cookie = item;
+
+    ReadFileRC result = kReadFailed;
+    const String name = Qx::fileNameOf(file);
+    switch (m_store.open(item, Qx::folderOf(file), behaviour, Qx::extensionOf(name))) {
+    case TagBag::Opened:
+        if (retrieve()) {
+            try {
+                doEditConversions();
+                result = kReadOk;
+            } catch (const std::exception& error) {
+                m_bad = true;
+                EditFile::fail(*this, file + " was read, but bringing it up to date failed: " + error.what());
+            }
+        }
+        break;
+    case TagBag::NewStore: {
+        const EditFile::Quiet quiet(*this);
+        if (getNumChans(VideoChan, Edit_Chan_SubType::NONE) == 0) {
+            addChan(VideoChan, nullptr, false, Edit_Chan_SubType::NONE, false, -1.0);
+        }
+        result = kReadOk;
+        break;
+    }
+    default:
+        herc_printf("Edit::readFile( %s ) : Failed to open store\n", cookie_string(item).c_str());
+        EditFile::fail(*this, m_store.openError());
+        EditFile::reset(*this);
+        m_bad = true;
+        break;
+    }
+    if (result == kReadOk) {
+        m_bad = false;
+        m_fileError.clear();
+    }
+    m_loading = false;
+    decRefCount();
+    return result;
+}
+
+bool Edit::retrieve() {
+    EditFile::reset(*this);
+    Qx::Status status;
+    {
+        const EditFile::Quiet quiet(*this);
+        status = EditFile::readHeader(*this);
+        if (status) {
+            status = EditFile::readCues(*this);
+        }
+        if (status) {
+            status = EditFile::readCels(*this);
+        }
+        if (status) {
+            status = EditFile::readGroups(*this);
+        }
+        if (status) {
+            getInfoFromHeader();
+        }
+    }
+    if (!status) {
+        const String path = m_store.path();
+        EditFile::reset(*this);
+        m_store.close();
+        m_bad = true;
+        return EditFile::fail(*this, "cannot read " + path + ": " + status.reason() +
+                                         "; restore a backup of the edit");
+    }
+    EditFile::markWritten(*this);
+    return true;
+}
+
+Qx::Status EditFile::readHeader(Edit& edit) {
+    EditHeaderProxy header;
+    const bool read = edit.m_store.readObject(EditHeaderProxy::EditHeaderId, header);
+    if (edit.m_debug) {
+        herc_printf(read ? "Loaded the configb \n" : "Failed to load the configb \n");
+    }
+    if (!read) {
+        const String why = edit.m_store.objectError();
+        return Qx::Status::failure("it has no header that reads" +
+                                   (why.empty() ? String() : " (" + why + ")"));
+    }
+    edit.m_header = header.header();
+    edit.clear_cache_flags();
+    return {};
+}
+
+void Edit::getInfoFromHeader() {
+    m_load_edit_bits_from_header();
+    m_changes.setValueSilently(getChangeDescription());
+}
+
+void Edit::m_load_edit_bits_from_header() {
+    m_entireMedium = m_header.getInt(EditKeys::kEntireMedium, 0);
+    if (!m_header.contains("quality_string") && m_header.contains("quality")) {
+        m_header.setString("quality_string", String::format("%d mins", m_header.getInt("quality")));
+    }
+    if (m_header.contains(EditKeys::kCurrentTime)) {
+        m_currentTime = m_header.getDouble(EditKeys::kCurrentTime);
+    }
+    m_markTime = m_header.getDouble(EditKeys::kMarkTime, Qx::kNoTime);
+
+    Vector<IdStamp> chans;
+    getChans(chans, AudioChan);
+    for (const IdStamp& chan : chans) {
+        const int index = EditFile::oldIndex(*this, chan);
+        AudCel audio = getAudCel(chan);
+        audio.setSoundOutputEnabled(m_header.getInt(EditKeys::numbered(EditKeys::kSoundOutput, index), 1) !=
+                                    0);
+        audio.setXFadesEnabled(m_header.getInt(EditKeys::numbered(EditKeys::kSoundOutputXFade, index), 0) !=
+                               0);
+        setAudCel(audio);
+        const String syncError = EditKeys::numbered(EditKeys::kSyncError, index);
+        if (m_header.contains(syncError)) {
+            setSyncLoss(chan, m_header.getDouble(syncError));
+        }
+    }
+    for (int i = 0; i < getNumChans(); ++i) {
+        const String syncLoss = EditKeys::numbered(EditKeys::kSyncLoss, i);
+        if (m_header.contains(syncLoss)) {
+            setSyncLoss(getId(i), m_header.getDouble(syncLoss));
+        }
+    }
+}
+
+size_t Edit::getNumStoredObjects() const {
+    return m_store.numObjects();
+}
