@@ -105,6 +105,22 @@ Qx::Ed2Support::TVStd getTvStandard(const configb& header) {
     }
 }
 
+Qx::Ed2Support::TVStd getNamedStandard(const TextFile& file) {
+    // Only the header's own lines count: a text further on may begin with anything.
+    const int end = file.find(EditKeys::kHeaderEnd, 0, true);
+    const auto valueOf = [&](const String& start) {
+        const int at = file.find(start, 0, true);
+        return at >= 0 && at < end ? String(file[static_cast<unsigned>(at)].substr(start.size())) : String();
+    };
+    configb header;
+    header.setString(EditKeys::kTvType, valueOf(String(EditKeys::kTvType) + ":textdata "));
+    int code = 0;
+    if (Qx::textToInt(valueOf(String(EditKeys::kFrameRate) + ":int "), code)) {
+        header.setInt(EditKeys::kFrameRate, code);
+    }
+    return getTvStandard(header);
+}
+
 RememberedFlags::RememberedFlags(const Edit& edit)
     : m_hadSequence(edit.Opts().contains(EditKeys::kSequence)),
       m_hadFrameBased(edit.Opts().contains(EditKeys::kFrameBased)),

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "edit/model/edit.h"
+#include "platform/services/files.h"
 #include "platform/store/text_file.h"
 
 #include <random>
@@ -8,6 +9,12 @@
 namespace test {
 
 inline constexpr const char* kItem = "E0001000";
+
+/// A file's bytes; "(missing)" when it cannot be read.
+inline String bytesOf(const String& path) {
+    String text;
+    return Qx::readWholeFile(path, text, uint64_t{1} << 30) ? String("(missing)") : text;
+}
 
 inline String chanText(const Edit& edit, int index) {
     const IdStamp id = edit.getId(index);
@@ -38,7 +45,7 @@ inline String chanText(const Edit& edit, int index) {
 }
 
 /// Everything that a file keeps of an edit, as text.
-inline String stateOf(const Edit& edit) {
+inline std::string stateOf(const Edit& edit) {
     TextFile header;
     edit.Opts().writeTo(header);
     String text = edit.get_cookie_str() + "\n" + header.text();
