@@ -7,7 +7,7 @@
 namespace Qx {
 
 /// What the application says of the project that is open. A plain value.
-struct CurrentProject {
+struct QM_API CurrentProject {
     cookie project = cookie("P0001000");
     String rootFolder; ///< the projects' base folder; each project has a folder of its cookie's text in it
     String name;
