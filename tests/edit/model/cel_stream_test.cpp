@@ -109,7 +109,7 @@ TEST(CelStream, RandomDamageNeverMakesABadCel) {
     for (unsigned seed = 1; seed <= 4000; ++seed) {
         std::mt19937 random(seed);
         Bytes bytes = whole;
-        for (unsigned changes = 1 + random() % 4; changes > 0; --changes) {
+        for (auto changes = 1 + random() % 4; changes > 0; --changes) {
             bytes[random() % bytes.size()] = static_cast<std::byte>(random() & 0xff);
         }
         cel its;

@@ -10,6 +10,9 @@
 
 namespace {
 
+/// Names a case of a table after itself.
+constexpr auto caseName = [](const auto& tested) { return std::string(tested.param.name); };
+
 using layout::draw;
 using layout::drawStrips;
 using layout::make;
@@ -82,7 +85,7 @@ INSTANTIATE_TEST_SUITE_P(Cel, Rescaling,
                                          RescaleCase{"Frozen", 0, 3, 4, 4, "BBB", "444"},
                                          RescaleCase{"BeyondTheEnd", 0, 4, 7, 11, "CC", "78"},
                                          RescaleCase{"Nothing", 0, 4, 20, 24, "", ""}),
-                         [](const auto& info) { return std::string(info.param.name); });
+                         caseName);
 
 TEST(CelTransforms, RescalingTakesLevelsAlongAndRefusesNonsense) {
     const cel its = make("AAAA");

@@ -86,7 +86,7 @@ TEST(LevelStore, OperationsAgreeWithFunctionsOfTime) {
         Store store;
         for (int step = 0; step < 400; ++step) {
             Store source;
-            for (unsigned nodes = random() % 6; nodes > 0; --nodes) {
+            for (auto nodes = random() % 6; nodes > 0; --nodes) {
                 source.insertNode(second(20), static_cast<float>(random() % 9) / 4);
             }
             const bool own = random() % 5 == 0;
@@ -95,7 +95,7 @@ TEST(LevelStore, OperationsAgreeWithFunctionsOfTime) {
             const double from = second(15);
             const double length = 1 + second(6);
             const double at = second(30);
-            const unsigned operation = store.size() > 60 ? 1 : random() % 4;
+            const auto operation = store.size() > 60 ? 1 : random() % 4;
             Envelope expected;
             if (operation == 0) {
                 store.insert(own ? store : source, {from, from + length}, at);
