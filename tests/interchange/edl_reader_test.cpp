@@ -131,7 +131,7 @@ TEST(EdlReader, SizesThatAreHostile) {
 TEST(EdlReader, FilesThatAreRefusedUnread) {
     const test::TemporaryFolder folder;
     const String path = folder.write("big.edl", "");
-    std::filesystem::resize_file(path, kMaxEdlBytes + 1); // a hole: nothing is written
+    std::filesystem::resize_file(path.c_str(), kMaxEdlBytes + 1); // a hole: nothing is written
     EdlList list;
     LossReport report;
     Qx::Status status = readEdlFile(path, kPal, list, report);
