@@ -19,7 +19,7 @@ struct QM_API CurrentProject {
 
     /// The folder that holds the project's edit files. Empty without a root folder, or when the project is
     /// not storable.
-    [[nodiscard]] String folder() const;
+    [[nodiscard]] QM_API String folder() const;
 };
 
 /// A copy of what is set. Safe on any thread. Before the first call of `setCurrentProject` the root folder is
