@@ -1,1 +1,3 @@
 quillmarch_fuzz(edl quillmarch_interchange)
+quillmarch_fuzz(edit_file)
+quillmarch_fuzz(legacy_text)
