@@ -1,0 +1,2 @@
+quillmarch_fuzz(cues)
+quillmarch_fuzz(groups)
