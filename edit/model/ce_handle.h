@@ -76,6 +76,10 @@ public:
     void set_audioRamp_CurveType(Aud::GainCurve::eCurveType type);
 
 private:
+    [[nodiscard]] channel_event* event() const;
+    template <typename Change>
+    void change(Change&& apply);
+
     cel* m_cel = nullptr;
     int m_index = -1;
 };
@@ -98,3 +102,6 @@ private:
     ce_handle m_in;
     ce_handle m_out;
 };
+
+// The handle's inline members need the cel.
+#include "edit/model/cel.h"

@@ -34,6 +34,13 @@ public:
     using IdMap = std::map<IdStamp, IdStamp>;
     using Range = NumRange<double, Ordered>;
 
+    /// \name What an event may hold: the greatest absolute edit time and strip time in seconds, and velocity
+    /// @{
+    static constexpr double kGreatestTime = 1e9;
+    static constexpr double kGreatestStripTime = 1e12;
+    static constexpr double kGreatestVelocity = 1e6;
+    /// @}
+
     cel();
     ~cel() override;
     cel(const cel& other);
@@ -52,6 +59,8 @@ public:
     /// Changed since it was last written.
     [[nodiscard]] bool changed() const { return m_changed; }
     void setChanged(bool changed) { m_changed = changed; }
+    /// Goes up with every change of the events: who keeps something worked out from them compares it.
+    [[nodiscard]] uint64_t changeCount() const { return m_changeCount; }
     /// Room for `pairs` pairs is made ahead.
     void reserve(int pairs);
 
@@ -117,20 +126,22 @@ public:
     /// A flag of `extract`.
     static constexpr unsigned KeepTimes = 1; ///< the part stays at its edit times instead of starting at 0
     [[nodiscard]] std::unique_ptr<cel> extract(double from, double to, unsigned flags = 0) const;
-    bool insert(const cel* source, const Range& sourceRange, double at, IdMap& ids);
-    bool remove(const Range& range);
+    bool insert(const cel* source, const Range& sourceRange, double at, IdMap& ids, IdMap* splits = nullptr);
+    bool remove(const Range& range, IdMap* splits = nullptr);
     /// With `materialOnly` the events of the destination stay, stamps, fades and levels too, and only what
     /// they play changes.
     bool replace(const cel* source, const Range& sourceRange, double at, IdMap& ids,
-                 bool materialOnly = false);
+                 bool materialOnly = false, IdMap* splits = nullptr);
     bool weld(const cel* other, double at);
     [[nodiscard]] std::unique_ptr<cel> add_black_to_ends(int seconds, char ends) const;
     [[nodiscard]] std::unique_ptr<cel> quantise() const;
-    [[nodiscard]] std::unique_ptr<cel> rescale(double fromEditRate, double toEditRate, double fromStripRate,
-                                               double toStripRate, double editOffset, double stripOffset,
-                                               int quantiseResult) const;
+    [[nodiscard]] std::unique_ptr<cel> rescale(double editIn, double editOut, double stripIn, double stripOut,
+                                               double levelIn, double levelOut, int quantiseResult) const;
     void set_resolution(double quantum);
     [[nodiscard]] double resolution() const { return m_resolution; }
+    /// Flags of `chequerboard`.
+    static constexpr int ChequerWiden = 1; ///< the pairs of the parts are lengthened to their reach
+    static constexpr int ChequerFill = 2;  ///< the gaps of the parts are filled with black
     int chequerboard(cel** parts, int& numParts, int maxParts, double overlap, int flags,
                      SoftCuts softCuts) const;
     /// Fills the channel with black from its end to `time`. False if it reaches that far already.
@@ -175,6 +186,13 @@ public:
     /// @}
 
 private:
+    friend class ce_handle;
+
+    void changedNow() {
+        m_changed = true;
+        ++m_changeCount;
+    }
+
     std::vector<channel_event> m_events;
     String m_name;
     IdStamp m_id;
@@ -184,4 +202,72 @@ private:
     uint8_t m_major = 1;
     uint8_t m_minor = 0;
     bool m_changed = false;
+    uint64_t m_changeCount = 0;
 };
+
+// Stepping and reading a handle is what every walk over a channel does for each pair, so it is inline.
+
+inline int ce_handle::valid() const {
+    return m_cel != nullptr && m_cel->getChanEventPtr(m_index) != nullptr ? 1 : 0;
+}
+
+inline ce_handle ce_handle::matching_in_ceh() const {
+    return valid() != 0 ? ce_handle(m_cel, m_index & ~1) : ce_handle(m_cel, -1);
+}
+
+inline ce_handle ce_handle::matching_out_ceh() const {
+    return valid() != 0 ? ce_handle(m_cel, m_index | 1) : ce_handle(m_cel, -1);
+}
+
+inline void ce_handle::increment(ce_info kind) {
+    if (m_cel == nullptr) {
+        return;
+    }
+    const int at = m_index < 0 ? -1 : m_index;
+    const int end = m_cel->numEvents();
+    const bool ins = (kind & CE_IN_POINT) != 0;
+    const bool outs = (kind & CE_OUT_POINT) != 0;
+    int to = end;
+    if (ins && outs) {
+        to = at + 1;
+    } else if (ins) {
+        to = (at + 2) & ~1;
+    } else if (outs) {
+        to = (at + 1) | 1;
+    }
+    m_index = to < end ? to : end;
+}
+
+inline void ce_handle::decrement(ce_info kind) {
+    if (m_cel == nullptr) {
+        return;
+    }
+    const int end = m_cel->numEvents();
+    const int at = m_index > end ? end : m_index;
+    const bool ins = (kind & CE_IN_POINT) != 0;
+    const bool outs = (kind & CE_OUT_POINT) != 0;
+    int to = -1;
+    if (ins && outs) {
+        to = at - 1;
+    } else if (ins) {
+        to = (at - 1) & ~1;
+    } else if (outs) {
+        to = ((at - 2) | 1);
+    }
+    m_index = at <= 0 || to < 0 ? -1 : to;
+}
+
+inline ce_handle& ce_handle::operator++() {
+    increment(CE_ANY);
+    return *this;
+}
+
+inline ce_handle& ce_handle::operator--() {
+    decrement(CE_ANY);
+    return *this;
+}
+
+inline double ce_handle::get_edit_time() const {
+    const channel_event* its = m_cel != nullptr ? m_cel->getChanEventPtr(m_index) : nullptr;
+    return its != nullptr ? its->editTime : 0;
+}
