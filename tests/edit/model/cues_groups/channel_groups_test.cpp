@@ -304,13 +304,9 @@ TEST(ChannelGroups, RandomChannelAndGroupChangesKeepTheInvariants) {
         std::mt19937 random(seed);
         const Tracks t(4, 24, 32);
         Edit& edit = *t.edit;
+        const auto below = [&random](unsigned n) { return static_cast<unsigned>(random() % n); };
         const auto anyChan = [&] {
-            return edit.getNumChans() == 0
-                       ? IdStamp()
-                       : edit.getId(
-                             static_cast<int>(random()) % edit.getNumChans() < 0
-                                 ? 0
-                                 : static_cast<int>(random() % static_cast<unsigned>(edit.getNumChans())));
+            return edit.getId(static_cast<int>(below(static_cast<unsigned>(edit.getNumChans()))));
         };
         for (int i = 0; i < edit.getNumChans(); ++i) {
             edit.get_cues().add_cue_point(test::marker(edit.getId(i).asString().c_str(), i, i));
@@ -318,13 +314,13 @@ TEST(ChannelGroups, RandomChannelAndGroupChangesKeepTheInvariants) {
         NaiveGroups naive;
         for (int step = 0; step < 300; ++step) {
             const IdStamp chan = anyChan();
-            switch (random() % 6) {
+            switch (below(6)) {
             case 0: {
-                const auto type = random() % 2 != 0 ? VideoChan : AudioChan;
-                const auto sub = type == VideoChan && random() % 2 != 0 ? Edit_Chan_SubType::ALIAS
-                                                                        : Edit_Chan_SubType::NONE;
+                const auto type = below(2) != 0 ? VideoChan : AudioChan;
+                const auto sub =
+                    type == VideoChan && below(2) != 0 ? Edit_Chan_SubType::ALIAS : Edit_Chan_SubType::NONE;
                 test::RecordingLog quiet;
-                edit.insertChans(type, sub, edit.getIdx(chan), 1 + random() % 3, random() % 2 != 0, true, 0);
+                edit.insertChans(type, sub, edit.getIdx(chan), 1 + below(3), below(2) != 0, true, 0);
                 break;
             }
             case 1:
@@ -344,7 +340,7 @@ TEST(ChannelGroups, RandomChannelAndGroupChangesKeepTheInvariants) {
                 break;
             default: {
                 Vector<IdStamp> chans;
-                for (unsigned n = 2 + random() % 4; n > 0; --n) {
+                for (unsigned n = 2 + below(4); n > 0; --n) {
                     chans.push_back(anyChan());
                 }
                 ASSERT_TRUE(edit.groupChannels(chans, ChannelGroup::ePlain));

@@ -2,6 +2,7 @@
 #include "edit/model/edit_registry.h"
 #include "support/temporary_folder.h"
 
+#include <cmath>
 #include <fstream>
 #include <gtest/gtest.h>
 #include <limits>
