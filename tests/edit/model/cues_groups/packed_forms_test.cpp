@@ -86,7 +86,7 @@ TEST(PackedCues, BadFormsLeaveTheListAsItWas) {
                  {"a cue of no revision", with(4, {0})},
                  {"a text from the future", with(5, {9})},
                  {"a text beyond the stream", with(6, {255, 255, 255, 127})},
-                 {"a time that is not finite", with(35, {0, 0, 0, 0, 0, 0, 0xF0, 0x7F})},
+                 {"a time that is not finite", with(29, {0, 0, 0, 0, 0, 0, 0xF0, 0x7F})},
                  {"another terminator", with(last, {1})},
                  {"no terminator", {good.begin(), good.end() - 4}},
                  {"nothing", {}}};
