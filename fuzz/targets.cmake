@@ -1,0 +1,1 @@
+quillmarch_fuzz(edl quillmarch_interchange)

@@ -47,7 +47,7 @@ TEST(WideText, AnyBytesComeBack) {
     std::mt19937 random(20261);
     for (int round = 0; round < 2000; ++round) {
         String bytes;
-        for (unsigned i = random() % 12; i > 0; --i) {
+        for (auto i = random() % 12; i > 0; --i) {
             // Mostly bytes that begin or continue a sequence, where a decoder goes wrong.
             bytes.push_back(static_cast<char>(random() % 3 == 0 ? random() % 256 : 0x80 + random() % 128));
         }
