@@ -1,3 +1,5 @@
-quillmarch_fuzz(edl quillmarch_interchange)
+quillmarch_fuzz(cues)
 quillmarch_fuzz(edit_file)
+quillmarch_fuzz(edl quillmarch_interchange)
+quillmarch_fuzz(groups)
 quillmarch_fuzz(legacy_text)
