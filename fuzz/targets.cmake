@@ -1,0 +1,2 @@
+quillmarch_fuzz(header_text)
+quillmarch_fuzz(object_store xxhash::header)
