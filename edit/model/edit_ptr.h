@@ -22,8 +22,7 @@ public:
 
     /// Releases, then opens as the constructor does.
     EditPtr& open(const cookie& item, eEditOpenBehaviour behaviour);
-    /// Releases first, then holds the other. Assigning a handle that holds the only reference to an edit from
-    /// that edit is not guarded.
+    /// Releases first, then holds the other; for the edit that is held already nothing happens.
     EditPtr& operator=(const EditPtr& other);
     EditPtr& operator=(EditPtr&& other) noexcept;
     EditPtr& operator=(Edit* edit);

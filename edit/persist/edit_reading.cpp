@@ -55,6 +55,8 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
         return kReadFailed;
     }
     m_cookie = item;
+    forgetGroups();
+    m_storedCels.reset();
 
     ReadFileRC result = kReadFailed;
     const String name = Qx::fileNameOf(file);

@@ -182,6 +182,10 @@ void TagBag::setFolder(const String& inFolder) {
     m_contents->folder = inFolder;
 }
 
+void TagBag::setExtension(const String& extension) {
+    m_contents->extension = extension;
+}
+
 String TagBag::path() const {
     return m_contents->path();
 }
