@@ -1,3 +1,5 @@
+quillmarch_fuzz(header_text)
+quillmarch_fuzz(object_store xxhash::header)
 quillmarch_fuzz(edl quillmarch_interchange)
 quillmarch_fuzz(cues)
 quillmarch_fuzz(groups)
