@@ -1,0 +1,2 @@
+quillmarch_fuzz(cel)
+quillmarch_fuzz(levels)
