@@ -1,2 +1,5 @@
 quillmarch_fuzz(cel)
 quillmarch_fuzz(levels)
+quillmarch_fuzz(edl quillmarch_interchange)
+quillmarch_fuzz(cues)
+quillmarch_fuzz(groups)
