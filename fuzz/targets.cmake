@@ -1,5 +1,7 @@
 quillmarch_fuzz(header_text)
 quillmarch_fuzz(object_store xxhash::header)
+quillmarch_fuzz(cel)
+quillmarch_fuzz(levels)
 quillmarch_fuzz(edl quillmarch_interchange)
 quillmarch_fuzz(cues)
 quillmarch_fuzz(groups)
