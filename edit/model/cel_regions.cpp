@@ -60,10 +60,8 @@ void appendRight(Events& block, const Events& events, const Cut& cut, bool split
         in.id = channel_event::newId();
         noteSplit(splits, old, in.id);
     }
-    // Rounding may bring the cut below the time at which the left part ends.
-    const double least = block.empty() ? in.editTime + shift : block.back().editTime;
-    in.editTime = std::max(in.editTime + shift, least);
-    out.editTime = std::max(out.editTime + shift, in.editTime);
+    in.editTime += shift;
+    out.editTime += shift;
     block.push_back(in);
     block.push_back(out);
 }
@@ -87,13 +85,6 @@ void splice(Events& events, size_t first, size_t last, const Events& block, doub
             events[i - fewer].editTime += shift;
         }
         events.resize(size - fewer);
-    }
-    // What closes up never overlaps what it closes up to, whatever the rounding.
-    const double end = !block.empty() ? block.back().editTime
-                       : first > 0    ? events[first - 1].editTime
-                                      : -kGreatestTime;
-    for (size_t i = first + block.size(); i < events.size() && events[i].editTime < end; ++i) {
-        events[i].editTime = end;
     }
     std::copy(block.begin(), block.end(), events.begin() + static_cast<std::ptrdiff_t>(first));
 }
