@@ -39,6 +39,7 @@ int importFile(const ImportOptions& options, cookie& item) {
 
     interchange::ImportOptions importing;
     importing.rate = rate.valid() ? rate : Qx::projectFrameRate();
+    importing.strict = options.strict;
     interchange::Import import;
     if (const Qx::Status read = interchange::importEdl(file, importing, import); !read)
         return failed(read);
@@ -51,7 +52,7 @@ int importFile(const ImportOptions& options, cookie& item) {
         return failed(created);
     if (const Qx::Status saved = interchange::saveImport(import); !saved)
         return failed(saved);
-    item = import.edit->get_cookie();
+    item = import.sequence->get_cookie();
     return kDone;
 }
 

@@ -1,5 +1,7 @@
 #include "tools/qmedit/edit_json.h"
 
+#include "interchange/marker_colour.h"
+
 #include <cmath>
 #include <ctime>
 #include <nlohmann/json.hpp>
@@ -90,6 +92,9 @@ Json cueJson(const EditReport& report, const CueReport& cue) {
     addTime(json, "time", report, cue.time);
     addTime(json, "length", report, cue.length);
     json["text"] = cue.text;
+    json["code"] = cue.code;
+    const std::string_view colour = interchange::markerColourName(cue.code);
+    json["colour"] = colour.empty() ? Json() : Json(std::string(colour));
     const bool hasChannel = cue.channel >= 0 && static_cast<size_t>(cue.channel) < report.channels.size();
     json["channel"] =
         hasChannel ? Json(report.channels[static_cast<size_t>(cue.channel)].id.asString()) : Json();

@@ -1,7 +1,10 @@
 #include "tools/qmedit/edit_report.h"
 
+#include "interchange/edl_records.h"
 #include "platform/media/timecode.h"
+#include "platform/services/current_project.h"
 
+#include <algorithm>
 #include <cmath>
 #include <unordered_map>
 
@@ -14,14 +17,17 @@ SourceKind kindOf(const cookie& strip) {
         return SourceKind::Effect;
     if (strip.isInput())
         return SourceKind::Input;
-    return strip.isMagic() ? SourceKind::Magic : SourceKind::Shot;
+    if (strip.isMagic())
+        return SourceKind::Magic;
+    const bool media = strip.type() == Cookie_Type::Video || strip.type() == Cookie_Type::Sound;
+    return media ? SourceKind::Media : SourceKind::Shot;
 }
 
 /// Numbers the sources of one edit in the order in which they are met.
 class SourceTable {
 public:
-    SourceTable(const Edit& edit, std::vector<SourceReport>& sources, const SourceNamer& namer)
-        : m_edit(edit), m_sources(sources), m_namer(namer) {}
+    SourceTable(const Edit& edit, EditReport& report, const SourceNamer& namer)
+        : m_edit(edit), m_sources(report.sources), m_namer(namer), m_dropFrame(report.dropFrame) {}
 
     size_t indexOf(const channel_event& event) {
         // An event whose stamp is a channel's shows that channel.
@@ -31,7 +37,7 @@ public:
             return m_lastIndex;
         const auto [place, added] = m_strips.try_emplace(event.strip, m_sources.size());
         if (added) {
-            m_sources.push_back({event.strip, kindOf(event.strip), {}, {}});
+            m_sources.push_back({event.strip, kindOf(event.strip), {}, {}, m_dropFrame});
             if (m_namer && m_sources.back().kind == SourceKind::Shot)
                 m_namer(m_sources.back());
         }
@@ -45,13 +51,15 @@ private:
     size_t indexOfAlias(const channel_event& event) {
         const auto [place, added] = m_channels.try_emplace(event.id, m_sources.size());
         if (added)
-            m_sources.push_back({event.strip, SourceKind::Alias, m_edit.getChanDisplayName(event.id), {}});
+            m_sources.push_back(
+                {event.strip, SourceKind::Alias, m_edit.getChanDisplayName(event.id), {}, m_dropFrame});
         return place->second;
     }
 
     const Edit& m_edit;
     std::vector<SourceReport>& m_sources;
     const SourceNamer& m_namer;
+    bool m_dropFrame;
     std::unordered_map<cookie, size_t> m_strips;
     std::unordered_map<IdStamp, size_t> m_channels;
     cookie m_lastStrip;
@@ -67,8 +75,37 @@ void takePairs(const cel& content, double quarterFrame, SourceTable& table, std:
         if (in == nullptr || out == nullptr)
             return;
         pairs.push_back({in->editTime, out->editTime, in->stripTime, out->stripTime, in->velocity,
-                         in->rampQFrames * quarterFrame, out->rampQFrames * quarterFrame, table.indexOf(*in)});
+                         in->rampQFrames * quarterFrame, out->rampQFrames * quarterFrame,
+                         table.indexOf(*in)});
     }
+}
+
+/// The timecode of edit time 0: what an import found, else the elapsed time's origin.
+void takeTimecode(const Edit& edit, EditReport& report) {
+    const configb& header = edit.Opts();
+    report.dropFrame = header.getBool(interchange::EdlKey::kDropFrame, Qx::currentProject().dropFrame) &&
+                       report.rate.hasDropFrame();
+    report.origin = header.contains(interchange::EdlKey::kStart)
+                        ? report.rate.toSeconds(header.getInt64(interchange::EdlKey::kStart))
+                        : edit.get_elapsed_time_origin();
+}
+
+void takeCues(const Edit& edit, std::vector<CueReport>& cues) {
+    const cue_list& list = edit.get_cues();
+    const size_t count = list.get_num_cue_points(0);
+    cues.reserve(count);
+    for (size_t i = 0; i < count; ++i)
+        if (const cue_point* cue = list.get_cue_point(i, 0); cue != nullptr)
+            cues.push_back({cue->editTime(), cue->secondTime() - cue->editTime(), cue->text(), cue->code(),
+                            cue->channel() == kAnyCueChan ? -1 : cue->channel(), cue->attached()});
+    std::stable_sort(cues.begin(), cues.end(),
+                     [](const CueReport& a, const CueReport& b) { return a.time < b.time; });
+}
+
+void takeGroups(const Edit& edit, std::vector<GroupReport>& groups) {
+    for (unsigned i = 0; i < edit.numGroups(); ++i)
+        if (const ChannelGroup* group = edit.getTrackGroup(i); group != nullptr)
+            groups.push_back({group->getType(), {group->getChans().begin(), group->getChans().end()}});
 }
 
 } // namespace
@@ -85,8 +122,8 @@ String EditReport::recordTimecode(double editTime) const {
     return Qx::timecodeText(frames(origin) + frames(editTime), rate, dropFrame);
 }
 
-String EditReport::sourceTimecode(double stripTime) const {
-    return Qx::timecodeText(frames(stripTime), rate, dropFrame);
+String EditReport::sourceTimecode(const SourceReport& source, double stripTime) const {
+    return Qx::timecodeText(frames(stripTime), rate, source.dropFrame);
 }
 
 String EditReport::lengthText(double seconds) const {
@@ -99,13 +136,13 @@ EditReport reportOf(const Edit& edit, const SourceNamer& namer) {
     report.name = edit.getName();
     report.type = edit.get_log_type();
     report.rate = edit.getFrameRate();
-    report.origin = edit.get_elapsed_time_origin();
+    takeTimecode(edit, report);
     report.start = edit.getStartTime();
     report.end = edit.getEndTime();
     report.modified = edit.getModificationTime();
 
     const double quarterFrame = report.rate.frameDuration() / 4;
-    SourceTable table(edit, report.sources, namer);
+    SourceTable table(edit, report, namer);
     const int count = edit.getNumChans();
     report.channels.reserve(static_cast<size_t>(count));
     for (int i = 0; i < count; ++i) {
@@ -118,6 +155,8 @@ EditReport reportOf(const Edit& edit, const SourceNamer& namer) {
             takePairs(*content, quarterFrame, table, channel.pairs);
         report.channels.push_back(std::move(channel));
     }
+    takeCues(edit, report.cues);
+    takeGroups(edit, report.groups);
     return report;
 }
 
@@ -125,6 +164,8 @@ const char* sourceKindText(SourceKind kind) {
     switch (kind) {
     case SourceKind::Shot:
         return "shot";
+    case SourceKind::Media:
+        return "media";
     case SourceKind::Black:
         return "black";
     case SourceKind::Effect:

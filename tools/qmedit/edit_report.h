@@ -10,14 +10,23 @@
 /// all drawn from this. Times are seconds.
 
 /// What a pair plays.
-enum class SourceKind { Shot, Black, Effect, Alias, Input, Magic };
+enum class SourceKind {
+    Shot,  ///< an item of the project, with a file and a name of its own
+    Media, ///< picture or sound itself, as a shot plays it
+    Black,
+    Effect,
+    Alias, ///< another channel of the edit
+    Input,
+    Magic ///< another magic item
+};
 
 /// One source that the pairs of an edit name.
 struct SourceReport {
     cookie strip;
     SourceKind kind = SourceKind::Shot;
-    String name;    ///< the item's own name, any bytes; empty for what has none
-    String problem; ///< why the name could not be read; empty if it could
+    String name;            ///< the item's own name, any bytes; empty for what has none
+    String problem;         ///< why the name could not be read; empty if it could
+    bool dropFrame = false; ///< its timecode is counted in drop frame
 };
 
 /// One pair of a channel.
@@ -47,7 +56,8 @@ struct ChannelReport {
 struct CueReport {
     double time = 0;
     double length = 0;
-    String text;      ///< any bytes
+    String text; ///< any bytes
+    int code = 0;
     int channel = -1; ///< index into `EditReport::channels`; -1 for any channel
     bool attached = false;
 };
@@ -75,13 +85,14 @@ struct EditReport {
     [[nodiscard]] double duration() const { return end - start; }
     /// Frames of a length or an edit time; 0 for what is not finite.
     [[nodiscard]] int64_t frames(double seconds) const;
-    /// Timecode text of an edit time, of a source time, and of a length.
+    /// Timecode text of an edit time, of a time of a source, and of a length.
     [[nodiscard]] String recordTimecode(double editTime) const;
-    [[nodiscard]] String sourceTimecode(double stripTime) const;
+    [[nodiscard]] String sourceTimecode(const SourceReport& source, double stripTime) const;
     [[nodiscard]] String lengthText(double seconds) const;
 };
 
-/// Looks up the name of a source once for each source: fills `name`, or `problem`.
+/// Looks up what its own file says of a source: fills `name` and `dropFrame`, or `problem`. Asked once a
+/// source.
 using SourceNamer = std::function<void(SourceReport&)>;
 
 /// Takes out everything. `namer` may be empty: then no name is looked up.

@@ -1,6 +1,6 @@
 #include "tools/qmedit/event_table.h"
 
-#include "platform/media/timecode.h"
+#include "interchange/marker_colour.h"
 #include "tools/qmedit/safe_text.h"
 #include "tools/qmedit/track_picture.h"
 
@@ -13,19 +13,16 @@ using Ink = Console::Ink;
 
 constexpr double kTolerance = 1e-6;
 constexpr int kTimecodeColumns = 11;
+constexpr int kLeastNameColumns = 8;
 
 /// A length without the hours and minutes that it does not reach: "4:12", "1:04:12".
 String shortLength(const EditReport& report, double seconds) {
     String text = report.lengthText(seconds);
     const size_t sign = text.starts_with('-') ? 1 : 0;
-    size_t leading = 0;
-    while (leading < 6 && sign + leading < text.size() &&
-           (text[sign + leading] == '0' || text[sign + leading] == ':' || text[sign + leading] == ';'))
-        ++leading;
-    // The seconds keep one digit before their colon.
-    const size_t seconds1 = text.find_last_of(":;");
-    const size_t keep = seconds1 == String::npos || seconds1 < sign + 1 ? sign : seconds1 - 1;
-    text.erase(sign, std::min(sign + leading, keep) - sign);
+    const size_t frames = text.find_last_of(":;");
+    const size_t digit = text.find_first_not_of("0:;", sign);
+    if (frames != String::npos && frames > sign)
+        text.erase(sign, std::min(digit, frames - 1) - sign);
     return text;
 }
 
@@ -56,7 +53,7 @@ private:
     void addEvent(const ChannelReport& channel, size_t index, const String& length);
     [[nodiscard]] Ink inkOf(const SourceReport& source) const;
     void addCues();
-    void addName(String name, int used, Ink ink);
+    void addName(String name, const String& notes, int used, Ink ink);
 
     const EditReport& m_report;
     const Console& m_console;
@@ -64,14 +61,14 @@ private:
     std::vector<String> m_labels;
     int m_numberColumns = 0;
     int m_lengthColumns = 0;
-    bool m_speeds = false;
     String m_text;
 };
 
-void Table::addName(String name, int used, Ink ink) {
+void Table::addName(String name, const String& notes, int used, Ink ink) {
+    const int room = m_console.width() - used - safe_text::columns(notes);
     if (m_options.fitToWidth)
-        name = safe_text::fitted(name, std::max(m_console.width() - used, 8), m_console.ellipsis());
-    m_text += m_console.inked(ink, name) + "\n";
+        name = safe_text::fitted(name, std::max(room, kLeastNameColumns), m_console.ellipsis());
+    m_text += m_console.inked(ink, name) + m_console.inked(Ink::Dim, notes) + "\n";
 }
 
 Ink Table::inkOf(const SourceReport& source) const {
@@ -85,34 +82,30 @@ void Table::addEvent(const ChannelReport& channel, size_t index, const String& l
     m_text += "  " + m_report.recordTimecode(pair.in) + "  " + m_report.recordTimecode(pair.out);
     const bool sourceTimes = source.kind != SourceKind::Black;
     const String none(kTimecodeColumns, ' ');
-    m_text += "  " + (sourceTimes ? m_report.sourceTimecode(pair.stripIn) : none);
-    m_text += "  " + (sourceTimes ? m_report.sourceTimecode(pair.stripOut) : none);
+    m_text += "  " + (sourceTimes ? m_report.sourceTimecode(source, pair.stripIn) : none);
+    m_text += "  " + (sourceTimes ? m_report.sourceTimecode(source, pair.stripOut) : none);
     m_text += "  " + safe_text::padded(length, m_lengthColumns, "", true) + "  ";
-    if (m_speeds)
-        m_text +=
-            safe_text::padded(pair.velocity == 1 ? String() : speedText(pair.velocity), 6, "~", true) + "  ";
-    String name = m_labels[pair.source];
+    String notes;
+    if (pair.velocity != 1)
+        notes += " (" + speedText(pair.velocity) + ")";
     if (pair.fadeIn > 0)
-        name += " (fade in " + shortLength(m_report, pair.fadeIn) + ")";
+        notes += " (fade in " + shortLength(m_report, pair.fadeIn) + ")";
     if (pair.fadeOut > 0)
-        name += " (fade out " + shortLength(m_report, pair.fadeOut) + ")";
-    addName(std::move(name),
-            1 + m_numberColumns + 4 * (kTimecodeColumns + 2) + m_lengthColumns + 4 + (m_speeds ? 8 : 0),
-            inkOf(source));
+        notes += " (fade out " + shortLength(m_report, pair.fadeOut) + ")";
+    addName(m_labels[pair.source], notes,
+            1 + m_numberColumns + 4 * (kTimecodeColumns + 2) + m_lengthColumns + 4, inkOf(source));
 }
 
 void Table::addChannel(const ChannelReport& channel) {
     const auto& pairs = channel.pairs;
     const size_t shown = std::min(pairs.size(), m_options.eventsPerChannel);
     std::vector<String> lengths;
-    m_speeds = false;
-    m_lengthColumns = 6;
+    m_lengthColumns = static_cast<int>(std::string_view("length").size());
     for (size_t i = 0; i < shown; ++i) {
         lengths.push_back(shortLength(m_report, pairs[i].out - pairs[i].in));
         m_lengthColumns = std::max(m_lengthColumns, static_cast<int>(lengths.back().size()));
-        m_speeds = m_speeds || pairs[i].velocity != 1;
     }
-    m_numberColumns = std::max(4, static_cast<int>(std::to_string(shown).size()));
+    m_numberColumns = std::max(2, static_cast<int>(std::to_string(shown).size()));
 
     const String name = m_console.safe(channel.name);
     m_text += "\n " + m_console.inked(Ink::Bold, name.empty() ? String("?") : name);
@@ -123,8 +116,7 @@ void Table::addChannel(const ChannelReport& channel) {
         return;
     String heading = " " + String(static_cast<size_t>(m_numberColumns - 1), ' ') +
                      "#  record in    record out   source in    source out   ";
-    heading +=
-        safe_text::padded("length", m_lengthColumns, "", true) + (m_speeds ? "   speed" : "") + "  name";
+    heading += safe_text::padded("length", m_lengthColumns, "", true) + "  name";
     m_text += m_console.inked(Ink::Dim, heading) + "\n";
     for (size_t i = 0; i < shown; ++i) {
         if (i > 0 && pairs[i].in > pairs[i - 1].out + kTolerance) {
@@ -133,7 +125,7 @@ void Table::addChannel(const ChannelReport& channel) {
             gap += String(2 * (kTimecodeColumns + 2) + 2, ' ');
             gap += safe_text::padded(shortLength(m_report, pairs[i].in - pairs[i - 1].out), m_lengthColumns,
                                      "", true);
-            m_text += m_console.inked(Ink::Dim, gap + (m_speeds ? "        " : "") + "  gap") + "\n";
+            m_text += m_console.inked(Ink::Dim, gap + "  gap") + "\n";
         }
         addEvent(channel, i, lengths[i]);
     }
@@ -154,7 +146,9 @@ void Table::addCues() {
     for (size_t i = 0; i < shown; ++i) {
         const CueReport& cue = m_report.cues[i];
         m_text += "       " + m_report.recordTimecode(cue.time) + "  ";
-        addName(m_console.safe(cue.text), 20, Ink::None);
+        const String colour(interchange::markerColourName(cue.code));
+        const String note = colour.empty() ? String() : " (" + colour.lower() + ")";
+        addName(m_console.safe(cue.text), note, 20, Ink::None);
     }
     if (shown < count)
         m_text += m_console.inked(Ink::Dim,

@@ -2,6 +2,7 @@
 
 #include "edit/persist/edit_init.h"
 #include "edit/project/project_details.h"
+#include "interchange/edl_records.h"
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
@@ -173,17 +174,20 @@ Qx::Status ProjectSession::list(std::vector<ListedEdit>& edits, std::vector<Stri
 
 SourceNamer ProjectSession::sourceNamer() {
     return [this](SourceReport& source) {
-        const auto [place, added] = m_names.try_emplace(source.strip);
+        const auto [place, added] = m_known.try_emplace(source.strip);
         if (added)
-            place->second = nameOf(source.strip);
+            place->second = look(source.strip);
         source.name = place->second.name;
         source.problem = place->second.problem;
+        if (source.problem.empty())
+            source.dropFrame = place->second.dropFrame;
     };
 }
 
-ProjectSession::KnownName ProjectSession::nameOf(const cookie& item) const {
+ProjectSession::Known ProjectSession::look(const cookie& item) const {
     EditPtr edit;
     if (const Qx::Status read = readEdit(item, edit); !read)
-        return {{}, read.reason()};
-    return {edit->getName(), {}};
+        return {{}, read.reason(), false};
+    const bool dropFrame = std::as_const(*edit).Opts().getBool(interchange::EdlKey::kDropFrame);
+    return {edit->getName(), {}, dropFrame && edit->getFrameRate().hasDropFrame()};
 }

@@ -51,17 +51,19 @@ public:
     [[nodiscard]] SourceNamer sourceNamer();
 
 private:
-    struct KnownName {
+    /// What the file of a source says of it.
+    struct Known {
         String name;
         String problem;
+        bool dropFrame = false;
     };
 
     void makeCurrentUnwritten(Qx::FrameRate rate) const;
     [[nodiscard]] ListedEdit listed(const cookie& item) const;
-    [[nodiscard]] KnownName nameOf(const cookie& item) const;
+    [[nodiscard]] Known look(const cookie& item) const;
 
     String m_root;
     cookie m_project;
     Qx::FrameRate m_rateOfFresh;
-    std::unordered_map<cookie, KnownName> m_names;
+    std::unordered_map<cookie, Known> m_known;
 };

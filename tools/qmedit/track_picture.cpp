@@ -11,6 +11,7 @@ namespace {
 using Ink = Console::Ink;
 
 constexpr int kWidestChannelName = 10;
+constexpr int kRoomForEllipsis = 6;
 
 /// The signs of the picture, in the two sets that terminals show.
 struct Signs {
@@ -107,8 +108,9 @@ private:
 
 /// Where the pairs of one channel fall on the columns.
 struct Lanes {
-    explicit Lanes(size_t columns) : edge(columns), covered(columns) {}
+    explicit Lanes(size_t columns) : edge(columns), stem(columns), covered(columns) {}
     std::vector<bool> edge;    ///< a pair begins or ends in the column
+    std::vector<bool> stem;    ///< and the rules beside the channel meet it there
     std::vector<bool> covered; ///< a pair reaches from the column into the next
 };
 
@@ -190,11 +192,14 @@ void Picture::addCues() {
         if (cue.time >= m_report.start && cue.time <= m_report.end)
             row.set(columnOf(cue.time), m_signs.cue, Ink::Cue);
     for (const CueReport& cue : m_report.cues) {
-        const int column = columnOf(cue.time) + 1;
-        const String label = m_console.safe(cue.text);
         // A marker's text stands beside it only where it is whole and touches no other.
-        if (row.blank(column, column + safe_text::columns(label) + 1))
-            row.setText(column, label, Ink::Cue);
+        const String label = m_console.safe(cue.text);
+        const int room = safe_text::columns(label) + 2;
+        const int column = columnOf(cue.time);
+        if (row.blank(column + 1, column + room))
+            row.setText(column + 2, label, Ink::Cue);
+        else if (column >= room && row.blank(column - room, column))
+            row.setText(column - room + 1, label, Ink::Cue);
     }
     addLine("", row);
 }
@@ -206,8 +211,8 @@ void Picture::addRule(const Lanes* above, const Lanes* below) {
     };
     for (int i = 0; i < m_columns; ++i) {
         unsigned sign = 0;
-        sign += has(above, &Lanes::edge, i) ? kUp : 0;
-        sign += has(below, &Lanes::edge, i) ? kDown : 0;
+        sign += has(above, &Lanes::stem, i) ? kUp : 0;
+        sign += has(below, &Lanes::stem, i) ? kDown : 0;
         sign += has(above, &Lanes::covered, i - 1) || has(below, &Lanes::covered, i - 1) ? kLeft : 0;
         sign += has(above, &Lanes::covered, i) || has(below, &Lanes::covered, i) ? kRight : 0;
         if (sign != 0)
@@ -246,7 +251,9 @@ void Picture::drawFill(const PairReport& pair, int from, int to, Ink ink, Row& r
     const String& label = m_labels[pair.source];
     const int room = last - first;
     const bool spaced = room > safe_text::columns(label) + 1;
-    row.setText(first + (spaced ? 1 : 0), safe_text::fitted(label, room, m_console.ellipsis()), ink);
+    // In a narrow pair every column is worth a letter.
+    row.setText(first + (spaced ? 1 : 0),
+                safe_text::fitted(label, room, room < kRoomForEllipsis ? "" : m_console.ellipsis()), ink);
 }
 
 void Picture::drawPair(const ChannelReport& channel, size_t index, Row& row, Lanes& lanes) {
@@ -262,11 +269,18 @@ void Picture::drawPair(const ChannelReport& channel, size_t index, Row& row, Lan
             row.set(column, dense ? m_signs.denseCut : m_signs.cut, Ink::Dim);
         m_showsDense = m_showsDense || dense;
         lanes.edge[static_cast<size_t>(column)] = true;
+        lanes.stem[static_cast<size_t>(column)] = !dense;
     }
     m_showsCut = true;
     m_showsGap = m_showsGap || (index > 0 && channel.pairs[index - 1].out + 1e-6 < pair.in);
-    if (out > in + 1)
-        drawFill(pair, in + 1, out, inkOf(channel, m_report.sources[pair.source], index), row);
+    const Ink ink = inkOf(channel, m_report.sources[pair.source], index);
+    if (out > in + 1) {
+        drawFill(pair, in + 1, out, ink, row);
+    } else if (ink == Ink::Black) {
+        // Black is never too short to be seen: it takes the place of its cut.
+        row.set(in, m_signs.black, ink);
+        m_showsBlack = true;
+    }
 }
 
 Lanes Picture::addChannel(const ChannelReport& channel) {
@@ -321,8 +335,22 @@ String Picture::text() {
     return std::move(m_text);
 }
 
-String counted(size_t count, const char* one) {
-    return String::format("%zu %s", count, one);
+/// The parts that are not empty, joined into lines of at most `width` columns.
+String joined(const std::vector<String>& parts, const char* separator, int width) {
+    String lines;
+    String line;
+    for (const String& part : parts) {
+        if (part.empty())
+            continue;
+        const String longer = line.empty() ? " " + part : line + separator + part;
+        if (!line.empty() && safe_text::columns(longer) > width) {
+            lines += line + "\n";
+            line = " " + part;
+        } else {
+            line = longer;
+        }
+    }
+    return lines + line + "\n";
 }
 
 } // namespace
@@ -330,7 +358,8 @@ String counted(size_t count, const char* one) {
 String sourceLabel(const SourceReport& source, const Console& console) {
     if (!source.problem.empty())
         return "missing " + source.strip.asString();
-    if (source.kind == SourceKind::Shot || source.kind == SourceKind::Alias)
+    if (source.kind != SourceKind::Black && source.kind != SourceKind::Effect &&
+        source.kind != SourceKind::Input)
         return source.name.empty() ? source.strip.asString() : console.safe(source.name);
     return sourceKindText(source.kind);
 }
@@ -342,8 +371,6 @@ String trackPicture(const EditReport& report, const Console& console) {
 }
 
 String editSummary(const EditReport& report, const Console& console) {
-    const char* dot = console.utf8() ? " · " : ", ";
-    const char* to = console.utf8() ? " – " : " to ";
     size_t video = 0;
     size_t audio = 0;
     size_t effects = 0;
@@ -352,20 +379,21 @@ String editSummary(const EditReport& report, const Console& console) {
         effects += channel.type == VideoChan && channel.subtype == Edit_Chan_SubType::ALIAS;
         video += channel.type == VideoChan && channel.subtype != Edit_Chan_SubType::ALIAS;
     }
-    String line = report.item.asString();
-    line += String(dot) + Edit::log_type_string_get_ms(report.type);
-    line += dot + report.rate.asString() + " fps";
-    line += dot + report.recordTimecode(report.start) + to + report.recordTimecode(report.end);
-    line += dot + report.lengthText(report.duration()) + " long";
-    String channels;
+    std::vector<String> parts = {report.item.asString(), Edit::log_type_string_get_ms(report.type),
+                                 report.rate.asString() + " fps",
+                                 report.recordTimecode(report.start) + (console.utf8() ? " – " : " to ") +
+                                     report.recordTimecode(report.end),
+                                 report.lengthText(report.duration()) + " long"};
     const auto add = [&](size_t count, const char* kind) {
         if (count > 0)
-            channels += (channels.empty() ? "" : ", ") + counted(count, kind);
+            parts.push_back(String::format("%zu %s", count, kind));
     };
     add(effects, "effects");
     add(video, "video");
     add(audio, "audio");
-    line += dot + (channels.empty() ? String("no channels") : channels);
+    if (report.channels.empty())
+        parts.push_back("no channels");
+    const String lines = joined(parts, console.utf8() ? " · " : ", ", console.width() - 1);
     const String name = report.name.empty() ? String("(no name)") : console.safe(report.name);
-    return " " + console.inked(Ink::Bold, name) + "\n " + line + "\n";
+    return " " + console.inked(Ink::Bold, name) + "\n" + lines;
 }
