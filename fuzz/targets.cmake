@@ -1,1 +1,3 @@
 quillmarch_fuzz(edl quillmarch_interchange)
+quillmarch_fuzz(cues)
+quillmarch_fuzz(groups)

@@ -540,8 +540,9 @@ public:
     void shuffleCueChans(int firstChan, int count);
     /// Puts the cues that are kept in the file into the object store, under "CueId".
     void storeCues();
-    /// Takes the stored cues over in the place of the edit's own, unattached until `convertCues`; without any
-    /// the edit has none. False, changing nothing, when what is stored cannot be read.
+    /// Takes the stored cues over in the place of the edit's own; those read from a file follow their events
+    /// after `convertCues`. Without any the edit has none. False, changing nothing, when what is stored
+    /// cannot be read.
     bool retrieveCues();
     /// @}
 

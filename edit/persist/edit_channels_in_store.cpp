@@ -159,7 +159,9 @@ Qx::Status EditFile::setupChannels(Edit& edit, std::vector<LoadedCel>& cels) {
                 "EditFile::setupChannels( %s ) - channel %s has a stamp that is taken; given a new one\n",
                 edit.get_cookie_str().c_str(), name.c_str());
         }
-        if (!loaded.kindIsStated && !name.empty() && edit.getChanDisplayName(id) != name) {
+        // The standard name of a channel may be the name that it was given, too.
+        const bool own = loaded.kindIsStated ? loaded.ownName : edit.getChanDisplayName(id) != name;
+        if (own && !name.empty()) {
             edit.setChanName(id, name);
         }
     }

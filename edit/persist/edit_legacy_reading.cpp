@@ -29,8 +29,7 @@ void putFrameRateBack(TextFile& file) {
     if (at < 0 || at > end) {
         return;
     }
-    const auto standard =
-        Qx::Ed2Support::tvStdFromText(file[static_cast<unsigned>(at)].substr(start.size()));
+    const auto standard = Qx::Ed2Support::tvStdFromText(file[static_cast<unsigned>(at)].substr(start.size()));
     if (standard.known()) {
         file.changeLine(static_cast<unsigned>(at),
                         String(EditKeys::kFrameRate) + ":int " + std::to_string(standard.frameRateCode));
@@ -104,8 +103,9 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
 
     Qx::Status status;
     if (!named.known()) {
-        status = Qx::Status::failure(refused + "its tvtype names no television standard; write one such as pal "
-                                               "in that line");
+        status =
+            Qx::Status::failure(refused + "its tvtype names no television standard; write one such as pal "
+                                          "in that line");
     } else {
         edit.readED2Cues(file);
         status = edit.readED2Cels(file);

@@ -112,8 +112,7 @@ Qx::Ed2Support::TVStd Edit::writeED2Config(TextFile& file) const {
             file.changeLine(static_cast<unsigned>(at), String(line.substr(0, static_cast<size_t>(comma))));
         }
     }
-    putHeaderLine(file, "NUM_CHANS:int ",
-                  "NUM_CHANS:int " + std::to_string(getNumChans(AudioChan) + 1));
+    putHeaderLine(file, "NUM_CHANS:int ", "NUM_CHANS:int " + std::to_string(getNumChans(AudioChan) + 1));
     const String standard = Qx::Ed2Support::tvStdTextForProject();
     putHeaderLine(file, "FRAME_RATE:int ", String(EditKeys::kTvType) + ":textdata " + standard);
     return Qx::Ed2Support::tvStdFromText(standard);

@@ -32,7 +32,7 @@ bool showsEffects(Edit& edit) {
     bool found = false;
     forEachCel(edit, AnyChan, [&found](const IdStamp&, const cel& content) {
         for (int i = 0; i < content.numEvents() && !found; ++i) {
-            found = content.getChanEventPtr(i)->strip.isEffectGraph();
+            found = content.get_event(i).strip.isEffectGraph();
         }
     });
     return found;
@@ -103,6 +103,22 @@ Qx::Ed2Support::TVStd getTvStandard(const configb& header) {
         return other;
     }
     }
+}
+
+Qx::Ed2Support::TVStd getNamedStandard(const TextFile& file) {
+    // Only the header's own lines count: a text further on may begin with anything.
+    const int end = file.find(EditKeys::kHeaderEnd, 0, true);
+    const auto valueOf = [&](const String& start) {
+        const int at = file.find(start, 0, true);
+        return at >= 0 && at < end ? String(file[static_cast<unsigned>(at)].substr(start.size())) : String();
+    };
+    configb header;
+    header.setString(EditKeys::kTvType, valueOf(String(EditKeys::kTvType) + ":textdata "));
+    int code = 0;
+    if (Qx::textToInt(valueOf(String(EditKeys::kFrameRate) + ":int "), code)) {
+        header.setInt(EditKeys::kFrameRate, code);
+    }
+    return getTvStandard(header);
 }
 
 RememberedFlags::RememberedFlags(const Edit& edit)
@@ -192,7 +208,7 @@ void validateUTRIDs(Edit& edit) {
     forEachCel(edit, static_cast<Edit_Chan_Type>(VideoChan | AudioChan), [&](const IdStamp&, cel& content) {
         for (int i = 0; i < content.numEvents(); ++i) {
             channel_event event = content.get_event(i);
-            const cookie strip = content.getChanEventPtr(i & ~1)->strip;
+            const cookie strip = content.get_event(i & ~1).strip;
             const bool wrongKind = !strip.isMagic() && event.id.getMagicType() != IdStampMagic::Material;
             if (!event.id.valid() || wrongKind || seen.contains(event.id)) {
                 event.id = channel_event::newId();
@@ -211,7 +227,7 @@ void validateUTRIDs(Edit& edit) {
 void initialiseAudioVarispeeds(Edit& edit) {
     forEachCel(edit, AudioChan, [](const IdStamp&, cel& content) {
         for (int i = 0; i < content.numEvents(); ++i) {
-            if (content.getChanEventPtr(i)->velocity != 1.0) {
+            if (content.get_event(i).velocity != 1.0) {
                 ce_handle(&content, i).set_strip_velocity(1.0);
             }
         }
@@ -258,7 +274,7 @@ void updateLegacyFrameRate(Edit& edit, const Qx::Ed2Support::TVStd& standard) {
     forEachCel(edit, AnyChan, [](const IdStamp&, cel& content) {
         for (int i = 0; i + 1 < content.numEvents(); i += 2) {
             const channel_event in = content.get_event(i);
-            if (!in.strip.isMagic() && content.getChanEventPtr(i + 1)->level != in.level) {
+            if (!in.strip.isMagic() && content.get_event(i + 1).level != in.level) {
                 ce_handle(&content, i + 1).set_strip_level(in.level);
             }
         }
