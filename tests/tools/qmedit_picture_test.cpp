@@ -2,13 +2,12 @@
 
 namespace {
 
-/// The lines of the picture: from the ruler to the legend.
+/// The lines of the picture, from the ruler to the legend: they follow the summary and a blank line.
 String pictureOf(const String& shown) {
-    std::vector<String> rows = shown.split('\n');
-    String picture;
-    for (size_t i = 4; i < rows.size() && !rows[i].empty(); ++i)
-        picture += rows[i] + "\n";
-    return picture;
+    const size_t start = shown.find("\n\n", 1);
+    if (start == String::npos)
+        return shown;
+    return shown.substr(start + 2, shown.find("\n\n", start + 2) - start - 1);
 }
 
 TEST_F(Qmedit, DrawsTracksToScale) {
