@@ -64,10 +64,8 @@ _qmedit() {
     import)
         mapfile -t COMPREPLY < <(compgen -f -- "$current")
         compopt -o filenames 2>/dev/null ;;
-    show | header) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;
-    ;
-    completion) mapfile -t COMPREPLY < <(compgen -W bash -- "$current") ;
-    ;
+    show | header) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;;
+    completion) mapfile -t COMPREPLY < <(compgen -W bash -- "$current") ;;
     esac
 }
 complete -F _qmedit qmedit

@@ -135,7 +135,10 @@ void reportProgress(std::string_view text) {
 }
 
 void routeLibraryLog() {
-    Qx::setLogSink([](std::string_view line) {
+    const bool wanted = environment("QMEDIT_LOG") != nullptr;
+    Qx::setLogSink([wanted](std::string_view line) {
+        if (!wanted)
+            return;
         while (!line.empty() && (line.back() == '\n' || line.back() == ' '))
             line.remove_suffix(1);
         reportProgress(line);

@@ -75,12 +75,19 @@ String fields(const Json& object) {
     return text.substr(1, text.size() - 2);
 }
 
+/// "ALIAS": the subtype's name without the label that files write before it.
+std::string subtypeName(Edit_Chan_SubType subtype) {
+    const std::string_view text = Edit::subTypeText(subtype);
+    const size_t colon = text.find(':');
+    return std::string(colon == std::string_view::npos ? text : text.substr(colon + 1));
+}
+
 String channelJson(const EditReport& report, const ChannelReport& channel) {
     Json head;
     head["id"] = channel.id.asString();
     head["name"] = channel.name;
     head["type"] = std::string(1, channel.letter());
-    head["subtype"] = Edit::subTypeText(channel.subtype);
+    head["subtype"] = subtypeName(channel.subtype);
     String out = "{" + fields(head) + ",\"pairs\":[";
     addLines(out, "      ", channel.pairs,
              [&](const PairReport& pair) { return dumped(pairJson(report, pair)); });

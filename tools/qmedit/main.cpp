@@ -3,7 +3,7 @@
 
 #include <CLI/CLI.hpp>
 
-#include <iostream>
+#include <sstream>
 
 namespace {
 
@@ -33,8 +33,11 @@ int runCommandLine(int count, char** arguments) {
     app.set_version_flag("--version", "qmedit " QMEDIT_VERSION, "Print the version and exit");
     app.set_help_flag("-h,--help", "Print this help and exit");
     app.footer(kFooter);
-    app.require_subcommand(1);
+    app.require_subcommand(0, 1);
     app.get_formatter()->column_width(28);
+    app.get_formatter()->label("SUBCOMMAND", "COMMAND");
+    app.get_formatter()->label("Subcommands", "Commands");
+    app.get_formatter()->label("REQUIRED", "");
 
     CommandWork work;
     addImportCommand(app, work);
@@ -48,6 +51,10 @@ int runCommandLine(int count, char** arguments) {
         app.parse(count, arguments);
     } catch (const CLI::ParseError& error) {
         return reportUsage(app, error);
+    }
+    if (!work) {
+        reportError("name a command; see qmedit --help");
+        return kWrongUsage;
     }
     const int code = work();
     return finishOutput() ? code : static_cast<int>(kFailed);
