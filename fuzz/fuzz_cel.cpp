@@ -24,9 +24,11 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         std::abort();
     }
     const double middle = its.get_start_time() / 2 + its.get_end_time() / 2;
-    const bool replaced = its.replace(&second, {middle - 3, middle + 3}, middle - 1, ids);
-    const bool removed = its.remove({middle - 2, middle + 5});
-    if (its.is_good_cel() == 0 || (replaced != removed && middle < cel::kGreatestTime / 2 && middle > 0)) {
+    static_cast<void>(its.replace(&second, {middle - 3, middle + 3}, middle - 1, ids));
+    static_cast<void>(its.insert(&second, {middle - 3, middle + 3}, middle + 2, ids));
+    static_cast<void>(its.remove({middle - 2, middle + 5}));
+    static_cast<void>(its.replace(&second, {middle - 3, middle + 3}, middle - 1, ids, true));
+    if (its.is_good_cel() == 0) {
         std::abort();
     }
     return 0;

@@ -38,9 +38,17 @@ public:
     bool changed = false;
 
 private:
+    static const bool registered;
+
     uint8_t m_major = kMajor;
     uint8_t m_minor = 0;
 };
+
+const bool AudLevelsCel::Contents::registered = [] {
+    Streamable::registerBuilder(kLayerName,
+                                [] { return std::unique_ptr<Streamable>(std::make_unique<Contents>()); });
+    return true;
+}();
 
 AudLevelsCel::~AudLevelsCel() = default;
 

@@ -51,7 +51,9 @@ void appendLeft(Events& block, const Events& events, const Cut& cut, bool split)
     block.push_back(out);
 }
 
-void appendRight(Events& block, const Events& events, const Cut& cut, bool split, double shift,
+/// Appends what is left of the pair after a cut, so that it begins at `at`; its end moves by `shift` as all
+/// that follows does.
+void appendRight(Events& block, const Events& events, const Cut& cut, bool split, double at, double shift,
                  cel::IdMap* splits) {
     channel_event in = cutIn(events[2 * cut.pair], events[2 * cut.pair + 1], cut.time);
     channel_event out = events[2 * cut.pair + 1];
@@ -60,15 +62,15 @@ void appendRight(Events& block, const Events& events, const Cut& cut, bool split
         in.id = channel_event::newId();
         noteSplit(splits, old, in.id);
     }
-    in.editTime += shift;
-    out.editTime += shift;
+    in.editTime = at;
+    out.editTime = std::max(out.editTime + shift, at);
     block.push_back(in);
     block.push_back(out);
 }
 
 /// Puts `block` in the place of the events [first, last) and moves all that follow by `shift`: one pass over
-/// what follows.
-void splice(Events& events, size_t first, size_t last, const Events& block, double shift) {
+/// what follows. What then counts as one with `joint`, the end of the block's span, lies at it exactly.
+void splice(Events& events, size_t first, size_t last, const Events& block, double shift, double joint) {
     const size_t size = events.size();
     const size_t kept = last - first;
     if (block.size() > kept) {
@@ -87,6 +89,10 @@ void splice(Events& events, size_t first, size_t last, const Events& block, doub
         events.resize(size - fewer);
     }
     std::copy(block.begin(), block.end(), events.begin() + static_cast<std::ptrdiff_t>(first));
+    for (size_t i = first + block.size(); i < events.size() && events[i].editTime <= joint + kTolerance;
+         ++i) {
+        events[i].editTime = joint;
+    }
 }
 
 /// Lays the material of some pairs under the events of a region: writes the region's events as they are to
@@ -102,14 +108,16 @@ public:
         while (now < to - kTolerance && seek(now)) {
             const channel_event& in = m_laid[m_next];
             const channel_event& out = m_laid[m_next + 1];
-            const double start = std::max(now, in.editTime);
-            const double end = std::min(to, out.editTime);
+            const double start = in.editTime <= now + kTolerance ? now : in.editTime;
+            const double end = out.editTime >= to - kTolerance ? to : out.editTime;
             if (start >= to - kTolerance) {
                 break;
             }
             const size_t first = m_block.size();
-            m_block.push_back(start > in.editTime ? cutIn(in, out, start) : in);
-            m_block.push_back(end < out.editTime ? cutOut(in, out, end) : out);
+            m_block.push_back(start > in.editTime + kTolerance ? cutIn(in, out, start) : in);
+            m_block.push_back(end < out.editTime - kTolerance ? cutOut(in, out, end) : out);
+            m_block[first].editTime = start;
+            m_block[first + 1].editTime = end;
             refresh(m_block, first, m_ids);
             now = end;
         }
@@ -232,6 +240,7 @@ bool cel::insert(const cel* source, const Range& sourceRange, double at, IdMap& 
     const Region part(source->m_events, sourceRange.start(), sourceRange.end());
     const Cut cut = cutAt(m_events, at);
     const double length = part.length();
+    const double joint = cut.time + length;
     if (!isUsableTime(std::max(get_end_time(), cut.time) + length)) {
         return false;
     }
@@ -241,12 +250,12 @@ bool cel::insert(const cel* source, const Range& sourceRange, double at, IdMap& 
         appendLeft(block, m_events, cut, true);
     }
     const size_t first = block.size();
-    appendPart(block, source->m_events, part.from, part.to, cut.time, cut.time + length);
+    appendPart(block, source->m_events, part.from, part.to, cut.time, joint);
     refresh(block, first, ids);
     if (cut.inside) {
-        appendRight(block, m_events, cut, true, length, splits);
+        appendRight(block, m_events, cut, true, joint, length, splits);
     }
-    splice(m_events, 2 * cut.pair, 2 * (cut.pair + (cut.inside ? 1 : 0)), block, length);
+    splice(m_events, 2 * cut.pair, 2 * (cut.pair + (cut.inside ? 1 : 0)), block, length, joint);
     changedNow();
     return true;
 }
@@ -256,18 +265,18 @@ bool cel::remove(const Range& range, IdMap* splits) {
         return false;
     }
     const Region region(m_events, range.start(), range.end());
-    const double length = region.length();
     Events block;
     block.reserve(4);
     if (region.from.inside) {
         appendLeft(block, m_events, region.from, region.splitsOnePair());
     }
     if (region.to.inside) {
-        appendRight(block, m_events, region.to, region.splitsOnePair(), -length, splits);
+        appendRight(block, m_events, region.to, region.splitsOnePair(), region.from.time, -region.length(),
+                    splits);
     }
     const size_t last = region.from.pair + region.numPairs();
     if (region.numPairs() > 0 || 2 * last < m_events.size()) {
-        splice(m_events, 2 * region.from.pair, 2 * last, block, -length);
+        splice(m_events, 2 * region.from.pair, 2 * last, block, -region.length(), region.from.time);
         changedNow();
     }
     return true;
@@ -302,9 +311,10 @@ bool cel::replace(const cel* source, const Range& sourceRange, double at, IdMap&
         refresh(block, first, ids);
     }
     if (region.to.inside) {
-        appendRight(block, m_events, region.to, apart, 0, splits);
+        appendRight(block, m_events, region.to, apart, region.to.time, 0, splits);
     }
-    splice(m_events, 2 * region.from.pair, 2 * (region.from.pair + region.numPairs()), block, 0);
+    splice(m_events, 2 * region.from.pair, 2 * (region.from.pair + region.numPairs()), block, 0,
+           region.to.time);
     changedNow();
     return true;
 }

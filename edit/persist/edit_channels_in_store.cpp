@@ -207,6 +207,9 @@ Qx::Status EditFile::readCels(Edit& edit) {
     if (cels.empty()) {
         return Qx::Status::failure("it has no channels");
     }
+    // The cues' channel numbers are those of the whole edit: they do not move as its channels are added.
+    const cue_list cues = edit.m_cues;
+    edit.m_cues.delete_all_cues();
     status = setupChannels(edit, cels);
     if (!status) {
         return status;
@@ -220,6 +223,7 @@ Qx::Status EditFile::readCels(Edit& edit) {
         }
         edit.setChanName(id, loaded.name);
     }
+    edit.m_cues = cues;
     edit.convertCues();
     return {};
 }

@@ -108,7 +108,11 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
                                           "in that line");
     } else {
         edit.readED2Cues(file);
+        // The cues' channel numbers are those of the whole edit: they do not move as its channels are added.
+        const cue_list cues = edit.m_cues;
+        edit.m_cues.delete_all_cues();
         status = edit.readED2Cels(file);
+        edit.m_cues = cues;
         if (!status) {
             status = Qx::Status::failure(refused + status.reason());
         } else if (edit.getNumChans() == 0) {

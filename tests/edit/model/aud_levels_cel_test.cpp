@@ -2,6 +2,7 @@
 
 #include "edit/model/aud_levels_cel.h"
 #include "support/cel_layout.h"
+#include "support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 
@@ -57,16 +58,74 @@ TEST(AudLevels, ClipsGetAPairOfNodesAndNothingElseMoves) {
     EXPECT_FALSE(levels.checkNodesRevision(sound)) << "of the current revision";
 }
 
+/// Levels as an older program packed them.
+class LevelsOfRevisionZero : public Streamable {
+public:
+    const char* layerName() const override { return "LevelsOfRevisionZero"; }
+    const char* shortLayerName() const override { return "AudLevels"; }
+    uint8_t revisionMajor() const override { return 0; }
+    uint8_t revisionMinor() const override { return 0; }
+    void revisionMajor(uint8_t) override {}
+    void revisionMinor(uint8_t) override {}
+    void pack(PStream& stream) const override { nodes.pack(stream); }
+    void unpack(PStream& stream) override { nodes.unpack(stream); }
+    std::unique_ptr<Streamable> clone(BuilderType) const override {
+        return std::make_unique<LevelsOfRevisionZero>(*this);
+    }
+    AudLevelsCel::Store nodes;
+};
+
+const cookie kItem(Cookie_Type::Edit, 1, 0);
+
 TEST(AudLevels, GoThroughTheObjectStore) {
+    const test::TemporaryFolder folder;
     AudLevelsCel levels = AudLevelsCel::create();
     levels.insertNode(1, 0.5f);
     levels.insertNode(2, 0.75f);
+    {
+        TagBag store;
+        ASSERT_EQ(store.open(kItem, folder.path(), eOpenOrCreate, ".qme"), TagBag::NewStore);
+        levels.writeToStore(store);
+        ASSERT_TRUE(store.flush().isOk());
+        levels.extractFromStore(store);
+        levels.setChanged(false);
+        levels.writeToStore(store);
+        ASSERT_TRUE(store.flush().isOk());
+        EXPECT_EQ(store.numPacked(), 0u) << "what has not changed is not packed again";
+        levels.extractFromStore(store);
+    }
     TagBag store;
-    levels.writeToStore(store);
-    PStream layers;
-    levels.extractFromStore(store);
+    ASSERT_EQ(store.open(kItem, folder.path(), eOpenExisting, ".qme"), TagBag::Opened);
+    AudLevelsCel again = AudLevelsCel::createFromStore(levels.id(), store);
+    ASSERT_TRUE(again.valid());
+    EXPECT_EQ(again.getNodeStore(), levels.getNodeStore());
+    EXPECT_EQ(again.id(), levels.id());
+    EXPECT_FALSE(again.changed());
     EXPECT_FALSE(AudLevelsCel::createFromStore(IdStamp(9, 9, 9), store).valid());
     EXPECT_FALSE(AudLevelsCel::createFromStore(IdStamp(), store).valid());
+}
+
+TEST(AudLevels, OfRevisionZeroGetTheNodesOfTheirClips) {
+    const test::TemporaryFolder folder;
+    const IdStamp id = IdStamp::fresh(IdStampMagic::Channel);
+    {
+        TagBag store;
+        ASSERT_EQ(store.open(kItem, folder.path(), eOpenOrCreate, ".qme"), TagBag::NewStore);
+        store.storeObject(id.asString(), std::make_unique<LevelsOfRevisionZero>());
+        ASSERT_TRUE(store.flush().isOk());
+    }
+    TagBag store;
+    ASSERT_EQ(store.open(kItem, folder.path(), eOpenExisting, ".qme"), TagBag::Opened);
+    AudLevelsCel levels = AudLevelsCel::createFromStore(id, store);
+    ASSERT_TRUE(levels.valid());
+    AudCel sound = AudCel::create();
+    layout::build(*sound.getCel(), "AABB");
+    ce_handle(sound.getCel(), 2).set_strip_level(0.25f);
+    EXPECT_TRUE(levels.checkNodesRevision(sound));
+    EXPECT_NEAR(levels.getNodeStore().levelAt(2), 0.25, 1e-6);
+    EXPECT_NEAR(levels.getNodeStore().levelAt(1), 1, 1e-6);
+    EXPECT_TRUE(levels.changed());
+    EXPECT_FALSE(levels.checkNodesRevision(sound)) << "once is enough";
 }
 
 } // namespace

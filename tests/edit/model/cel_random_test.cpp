@@ -100,7 +100,8 @@ Model modelOf(const cel& its) {
             return ::testing::AssertionFailure() << "the stamp of event " << i << " is used twice";
         }
         if (i > 0 && event.editTime != before.editTime && event.editTime - before.editTime < 0.9) {
-            return ::testing::AssertionFailure() << "a sliver before event " << i;
+            return ::testing::AssertionFailure() << "a sliver before event " << i << " at " << event.editTime
+                                                 << ": " << event.editTime - before.editTime;
         }
         if (i % 2 != 0 && std::abs(before.stripTime + (event.editTime - before.editTime) * before.velocity -
                                    event.stripTime) > 1e-3) {
@@ -114,9 +115,9 @@ class Random {
 public:
     explicit Random(unsigned seed) : m_engine(seed) {}
     size_t below(size_t limit) { return m_engine() % limit; }
-    /// A whole second, or so near to one that it counts as that.
+    /// A whole second, or so near to one that it counts as that even when many such have added up.
     double near(size_t second) {
-        static constexpr double kNoise[] = {0, 0, 3e-7, -3e-7, 1e-10, -1e-10};
+        static constexpr double kNoise[] = {0, 0, 1e-10, -1e-10, 1e-12, -1e-12};
         return static_cast<double>(second) + kNoise[below(6)];
     }
 

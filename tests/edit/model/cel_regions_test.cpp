@@ -103,7 +103,7 @@ INSTANTIATE_TEST_SUITE_P(
                     LayCase{"WholePairs", "ABCD", "ee", 0, 2, 1, "AeeD", "0013"},
                     LayCase{"HeadOfAPair", "AABBB", "ee", 0, 1, 2, "AAeBB", "01034"},
                     LayCase{"TailOfAPair", "AABBB", "ee", 0, 1, 4, "AABBe", "01230"},
-                    LayCase{"SeveralPairs", "AABCDEFF", "xyyz", 0, 4, 2, "AAxyyzFF", "01011367"},
+                    LayCase{"SeveralPairs", "AABCDEFF", "xyyz", 0, 4, 2, "AAxyyzFF", "01012367"},
                     LayCase{"EmptyCel", "", "xy", 0, 2, 0, "xy", "01"}),
     caseName);
 

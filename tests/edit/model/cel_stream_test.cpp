@@ -94,11 +94,13 @@ TEST(CelStream, EveryFieldIsChecked) {
 }
 
 TEST(CelStream, ALaterRevisionIsRefused) {
-    cel its = makeNamed();
-    its.revisionMajor(2);
     PStream stream;
-    its.STRM_hierarchyPack(stream);
-    PStream input{std::span<const std::byte>(stream.bytes())};
+    makeNamed().STRM_hierarchyPack(stream);
+    Bytes bytes = stream.bytes();
+    constexpr size_t kMajorAt = 4 + 4 + 3; // behind the number of layers and the name
+    ASSERT_EQ(bytes[kMajorAt], std::byte{1});
+    bytes[kMajorAt] = std::byte{2};
+    PStream input{std::span<const std::byte>(bytes)};
     cel again;
     EXPECT_FALSE(again.STRM_hierarchyUnpack(input));
     EXPECT_EQ(again.numEvents(), 0);

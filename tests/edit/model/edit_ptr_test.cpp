@@ -24,6 +24,7 @@ private:
 
 TEST(Handle, TheLastOneDestroysTheEdit) {
     int alive = 0;
+    const Edit alone;
     EditPtr first(new MortalEdit(alive));
     EXPECT_EQ(first->refCount(), 1);
     {
@@ -43,6 +44,7 @@ TEST(Handle, TheLastOneDestroysTheEdit) {
     EXPECT_EQ(alive, 0);
     EXPECT_FALSE(moved.valid());
     EXPECT_TRUE(moved == static_cast<Edit*>(nullptr));
+    EXPECT_TRUE(moved == nullptr && nullptr == EditPtr() && moved != &alone);
 }
 
 TEST(Handle, OpensThroughTheRegistryAndReleasesFirst) {

@@ -182,6 +182,7 @@ TEST_F(EditFileFaultsTest, DeathAtAnyMomentOfManySavesLeavesAnEdit) {
             Edit edit(path(), eOpenExisting);
             for (int i = 0;; ++i) {
                 edit.setName("save " + std::to_string(i));
+                edit.init_dirty(); // the name may be that of the last save already
                 if (!edit.write_file(path())) {
                     ::_exit(1);
                 }

@@ -4,6 +4,7 @@
 #include "platform/services/current_project.h"
 #include "platform/services/network.h"
 #include "platform/store/edit_header_proxy.h"
+#include "support/memory_file.h"
 #include "support/recording_log.h"
 #include "support/temporary_folder.h"
 
@@ -330,11 +331,10 @@ TEST_F(EditFileTest, EveryFlippedByteAndEveryTruncationIsRefusedOrHarmless) {
     test::fillAtRandom(edit, 2, 2);
     ASSERT_NO_FATAL_FAILURE(save(edit));
     const std::string good = bytes("E0001000.qme");
-    const String state = stateOf(edit);
+    const std::string state = stateOf(edit);
+    test::MemoryFile file;
     const auto check = [&](const std::string& written, const char* how, size_t at) {
-        std::filesystem::remove(
-            folder.path("E0001000.qme")); // quicker than emptying it, on some file systems
-        folder.write("E0001000.qme", written);
+        file.setBytes(written);
         const Edit read(path(), eOpenExisting);
         if (read.isBad()) {
             ASSERT_EQ(read.getNumChans(), 0) << how << at;

@@ -211,15 +211,15 @@ TEST_F(StoreTest, EveryFaultOfTheDiskLeavesTheOldFileOrTheNew) {
     };
     FaultyFileSystem disk;
     ASSERT_TRUE(save(disk, 0));
-    changed = bytes();
     const size_t operations = disk.numOperations();
+    changed = bytes();
     ASSERT_GT(operations, 8u);
     for (size_t n = 1; n <= operations; ++n) {
         SCOPED_TRACE(n);
         const bool saved = save(disk, n);
+        disk.reset();
         const std::string found = bytes();
         EXPECT_TRUE(found == changed || (!saved && found == old));
-        disk.reset();
         TagBag bag;
         EXPECT_EQ(open(bag), TagBag::Opened) << bag.openError();
     }
