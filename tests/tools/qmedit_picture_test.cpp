@@ -13,7 +13,7 @@ String pictureOf(const String& shown) {
 TEST_F(Qmedit, DrawsTracksToScale) {
     const String item = imported(kShortList);
     EXPECT_EQ(pictureOf(run({"show", item}, {"LANG=en_GB.UTF-8", "COLUMNS=56"}).out),
-              "     ╷10:00:00:00              ╷10:00:05:00\n"
+              "     ╷10:00:00:00             ╷10:00:05:00\n"
               "          ▼ ship\n"
               "     ┌──────────────┬────┐    ┌────────────────────────┐\n"
               " V1  │ harbour      │blac│    │ harbour                │\n"
@@ -22,7 +22,7 @@ TEST_F(Qmedit, DrawsTracksToScale) {
               "     └─────────────────────────────────────────────────┘\n"
               "     │ cut   ░ black   blank gap   ▼ marker\n");
     EXPECT_EQ(pictureOf(run({"show", item}, {"LC_ALL=C", "LANG=en_GB.UTF-8", "COLUMNS=46"}).out),
-              "     +10:00:00:00         +10:00:05:00\n"
+              "     +10:00:00:00        +10:00:05:00\n"
               "         v ship\n"
               "     +-----------+---+   +-------------------+\n"
               " V1  | harbour   |bla|   | harbour           |\n"

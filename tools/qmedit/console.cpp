@@ -89,7 +89,7 @@ const char* Console::begin(Ink ink) const {
     case Ink::Audio:
         return "\x1b[38;5;231;48;5;28m";
     case Ink::AudioOther:
-        return "\x1b[38;5;231;48;5;65m";
+        return "\x1b[38;5;231;48;5;22m";
     case Ink::Effect:
         return "\x1b[38;5;231;48;5;90m";
     case Ink::Black:

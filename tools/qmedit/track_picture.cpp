@@ -305,9 +305,16 @@ void Picture::addLegend() {
     add(m_showsGap, "blank", "gap");
     add(!m_report.cues.empty(), m_signs.cue, "marker");
     String line;
-    for (const String& part : parts)
+    const auto finish = [&] {
+        m_text += gutter("") + m_console.inked(Ink::Dim, line) + "\n";
+        line.clear();
+    };
+    for (const String& part : parts) {
+        if (!line.empty() && safe_text::columns(line) + 3 + safe_text::columns(part) > m_columns)
+            finish();
         line += (line.empty() ? "" : "   ") + part;
-    m_text += gutter("") + m_console.inked(Ink::Dim, line) + "\n";
+    }
+    finish();
 }
 
 String Picture::text() {
