@@ -486,13 +486,26 @@ public:
 
     /// \name File (defined in edit/persist)
     /// @{
+    /// Reads the item's file, or one by its path, in the place of what the edit holds. The objects of a file
+    /// are those of docs/edit-file.md. On failure the edit has no channels, `isBad()` and `lastFileError()`
+    /// tells why; only a failed upgrade of an older revision leaves what was read. A path that is not named
+    /// after an item fails at once and deliberately leaves the edit flagged as loading, one reference held.
+    /// A new, empty store gives one empty video channel.
     ReadFileRC read_file(const cookie& item, eEditOpenBehaviour behaviour);
     ReadFileRC readFile(const WString& path, eEditOpenBehaviour behaviour);
-    /// Why the last read or write failed: one sentence, empty after a success.
+    /// Why the last read or write failed: one sentence with the path, empty after a success.
     [[nodiscard]] const String& lastFileError() const { return m_fileError; }
+    /// Writes the edit to the file of its cookie, or to a path that is named after it. True only when the
+    /// file was stored; its marks of change are cleared then. False, with the old file whole and the edit as
+    /// dirty as before, when nothing is to be written, a write is running, the edit could not be read again
+    /// (no channels, too many) or the disk refuses.
     bool write_file();
     bool write_file(const WString& path);
+    /// Writes a form: 1 by `write_file`, true whatever came of it (`lastFileError` tells), 4 the legacy text.
+    /// Other forms are not written: false.
     bool writeToFile(const WString& path, QxEditFileType type);
+    /// Writes or reads the legacy text, docs/ed2-format.md, which holds the first video channel and the audio
+    /// channels. A failed write leaves the file as it was; a failed read leaves no channels.
     bool writeToLegacyFile(const WString& path);
     bool readFromLegacyFile(const WString& path);
     /// The sections of the legacy text; its form is docs/ed2-format.md. The writers append to a text, the

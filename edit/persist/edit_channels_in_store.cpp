@@ -99,9 +99,6 @@ Qx::Status EditFile::loadCels(Edit& edit, std::vector<LoadedCel>& cels) {
             return Qx::Status::failure("object " + object + " is not a cel that reads (" +
                                        edit.m_store.objectError() + ")");
         }
-        if (loaded.content->is_good_cel() == 0) {
-            return Qx::Status::failure("the events of object " + object + " contradict each other");
-        }
         if (Qx::Status kind = findKind(edit.m_header, n, loaded); !kind) {
             return kind;
         }
