@@ -4,8 +4,10 @@
 #include "edit/model/channel_group_list.h"
 #include "edit/model/channel_types.h"
 #include "edit/model/cue_list.h"
+#include "edit/model/edit_chan_time_info.h"
 #include "edit/model/edit_modification.h"
 #include "edit/model/edit_ptr.h"
+#include "edit/model/edit_types.h"
 #include "edit/model/managed_cel.h"
 #include "platform/base/critical_section.h"
 #include "platform/base/vector.h"
@@ -21,56 +23,6 @@
 #include <optional>
 
 class TextFile;
-
-/// What kind of item an edit is. The numbers appear in project records: do not change them.
-enum edit_log_type_t : int {
-    kLogNone = 0,
-    kLogShot = 1,
-    kLogEdit = 2,
-    kLogGhost3 = 3, ///< 3 to 7: ghost variants of a shot
-    kLogGhost4 = 4,
-    kLogGhost5 = 5,
-    kLogGhost6 = 6,
-    kLogGhost7 = 7,
-    kLogMagic = 8,
-    kLogReel = 9,
-    kLogTemplate = 10
-};
-
-/// The forms of an edit file, by its name.
-enum QxEditFileType : int {
-    kUnknownFile = 0,
-    kObjectStoreFile = 1,
-    kObjectStoreEd3File = 2,
-    kLegacyTextFile = 4
-};
-/// The form that a file's name stands for, without regard to case.
-QM_API QxEditFileType getEditFileTypeFromFileName(const WString& name);
-
-/// Why a revision of an edit is replaced by another.
-enum RevisionChangeType : int { kRevisionBackup = 1, kRevisionUndo = 2, kRevisionRedo = 3 };
-
-/// Position of a caller on one channel. Equal when the channels are.
-class QM_API EditChanTimeInfo {
-public:
-    EditChanTimeInfo() = default;
-    EditChanTimeInfo(const IdStamp& chan, double current, bool markValid, double mark)
-        : m_chan(chan), m_current(current), m_markValid(markValid), m_mark(mark) {}
-    [[nodiscard]] bool valid() const { return m_chan.valid(); }
-    [[nodiscard]] const IdStamp& getChanId() const { return m_chan; }
-    void setChanId(const IdStamp& chan) { m_chan = chan; }
-    [[nodiscard]] double getCurrentTime() const { return m_current; }
-    void setCurrentTime(double time) { m_current = time; }
-    [[nodiscard]] double getMarkTime() const { return m_mark; }
-    [[nodiscard]] bool isMarkValid() const { return m_markValid; }
-    bool operator==(const EditChanTimeInfo& other) const { return m_chan == other.m_chan; }
-
-private:
-    IdStamp m_chan;
-    double m_current = 0;
-    bool m_markValid = false;
-    double m_mark = 0;
-};
 
 /// One edit in memory: a header of named properties and an ordered set of channels, each with its cel.
 ///
