@@ -10,6 +10,11 @@ if(QUILLMARCH_SANITIZE)
     add_link_options(-fsanitize=${QUILLMARCH_SANITIZE})
 endif()
 
+if(QUILLMARCH_FUZZ)
+    # What the fuzzers steer by: the library tells them which of its branches an input takes.
+    add_compile_options(-fsanitize=fuzzer-no-link)
+endif()
+
 # quillmarch_warnings(<target>): warnings are errors in everything written here.
 function(quillmarch_warnings target)
     target_compile_options(${target} PRIVATE
