@@ -82,7 +82,7 @@ void addCompletionCommand(CLI::App& app, CommandWork& work) {
         ->type_name("")
         ->check(CLI::IsMember({"bash"}));
     command->footer("Example:\n  source <(qmedit completion bash)");
-    command->callback([&app, &work] {
+    command->callback([shell, &app, &work] { // the option writes to it: it lives as long as the command
         work = [&app] {
             writeOut(bashCompletion(app));
             return static_cast<int>(kDone);
