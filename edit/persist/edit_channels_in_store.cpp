@@ -83,7 +83,7 @@ Qx::Status EditFile::loadCels(Edit& edit, std::vector<LoadedCel>& cels, Salvagin
             continue;
         }
         if (salvaging != nullptr) {
-            salvaging->celRead(loaded);
+            salvaging->celRead(n, loaded);
         }
         cels.push_back(std::move(loaded));
     }

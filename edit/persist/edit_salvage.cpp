@@ -54,29 +54,69 @@ int EditFile::Salvaging::lastCel() const {
     return last;
 }
 
-// By the kinds in the header: the name that a channel has by its place. One of its own lies in its cel.
+char EditFile::Salvaging::kindOf(int number) const {
+    const String kind = m_edit->m_header.getString(EditKeys::numbered(EditKeys::kCelKind, number));
+    return kind.empty() ? '?' : kind.front();
+}
+
+// The number from 1 of an audio channel among its kind.
+int EditFile::Salvaging::audioIndex(int number) const {
+    int index = 1;
+    for (int n = 0; n < number; ++n) {
+        index += kindOf(n) == 'A' ? 1 : 0;
+    }
+    return index;
+}
+
+// The name that a channel has by its place. One of its own lies in its cel.
 String EditFile::Salvaging::channelName(int number) const {
-    const auto letterOf = [&](int n) {
-        const String kind = m_edit->m_header.getString(EditKeys::numbered(EditKeys::kCelKind, n));
-        return kind.empty() ? '?' : kind.front();
-    };
-    const char letter = letterOf(number);
-    if (letter != 'V' && letter != 'A') {
+    switch (kindOf(number)) {
+    case 'V':
+        // Both are of this kind, so that the number of neither is known from its place.
+        return "a video or effects channel";
+    case 'A': {
+        const bool named =
+            m_edit->m_header.getString(EditKeys::numbered(EditKeys::kCelKind, number)).find(' ') !=
+            String::npos;
+        return "channel A" + std::to_string(audioIndex(number)) + (named ? " (with a name of its own)" : "");
+    }
+    default:
         return "a channel";
     }
-    // Effects channels are of the kind V and stand before the video channels, so that with them the number
-    // of a video channel is not known from its place.
-    if (letter == 'V' && number > 0) {
-        return "a video channel";
+}
+
+void EditFile::Salvaging::renumberHeader() {
+    if (!m_celsLost || m_headerLost) {
+        return;
     }
-    int place = 1;
-    for (int n = 0; n < number; ++n) {
-        place += letterOf(n) == letter ? 1 : 0;
+    configb& header = m_edit->m_header;
+    const struct {
+        const char* name;
+        bool isAudio; ///< goes by the number of the audio channel
+        bool isDouble;
+    } keys[] = {{EditKeys::kSyncLoss, false, true},
+                {EditKeys::kSyncError, true, true},
+                {EditKeys::kSoundOutput, true, false},
+                {EditKeys::kSoundOutputXFade, true, false}};
+    for (const auto& key : keys) {
+        const configb before(header);
+        EditKeys::removeNumbered(header, key.name, 0);
+        int audio = 0;
+        for (size_t i = 0; i < m_read.size(); ++i) {
+            const bool isAudio = kindOf(m_read[i]) == 'A';
+            audio += isAudio ? 1 : 0;
+            const String from = EditKeys::numbered(key.name, key.isAudio ? audioIndex(m_read[i]) : m_read[i]);
+            const String to = EditKeys::numbered(key.name, key.isAudio ? audio : static_cast<int>(i));
+            if (!before.contains(from) || (key.isAudio && !isAudio)) {
+                continue;
+            }
+            if (key.isDouble) {
+                header.setDouble(to, before.getDouble(from));
+            } else {
+                header.setInt(to, before.getInt(from));
+            }
+        }
     }
-    const bool named =
-        m_edit->m_header.getString(EditKeys::numbered(EditKeys::kCelKind, number)).find(' ') != String::npos;
-    return "channel " + String(1, letter) + std::to_string(place) +
-           (named ? " (with a name of its own)" : "");
 }
 
 void EditFile::Salvaging::celMissing(int number) {
@@ -112,7 +152,8 @@ void EditFile::Salvaging::levelsFailed(int number, const String& why) {
     lose(levelsName(number) + ": " + why);
 }
 
-void EditFile::Salvaging::celRead(const LoadedCel& loaded) {
+void EditFile::Salvaging::celRead(int number, const LoadedCel& loaded) {
+    m_read.push_back(number);
     m_audioSeen = m_audioSeen || loaded.type.type == AudioChan;
 }
 
@@ -216,6 +257,14 @@ Qx::Status EditFile::salvage(Edit& edit, const String& path, Salvaging& salvagin
     if (Qx::Status cels = readCels(edit, &salvaging); !cels) {
         return cels;
     }
+    // The cels have other numbers where some are lost: none is to be taken over as the bytes it was.
+    edit.m_storedCels.reset();
+    for (const String& name : edit.m_store.names()) {
+        if (name.starts_with(EditKeys::kCelid)) {
+            edit.m_store.removeObject(name);
+        }
+    }
+    salvaging.renumberHeader();
     for (const char* name : {ChannelGroupList::Id, ChannelGroupList::IdForDefaultGrouping}) {
         salvaging.loseIfUnsound(name, name == ChannelGroupList::Id ? "the channel groups"
                                                                    : "the default channel groups");

@@ -24,13 +24,15 @@ public:
     [[nodiscard]] int lastCel() const;
     void celMissing(int number);
     void celFailed(int number, const String& why);
-    void celRead(const LoadedCel& loaded);
+    void celRead(int number, const LoadedCel& loaded);
     void levelsMissing(int number, bool hasAudio);
     void levelsFailed(int number, const String& why);
     /// Without its header nothing tells the kind of a channel that has a name of its own: it is taken for one
     /// that fits the order of the channels, and that is told. False where the header is there, the name is
     /// one by place ("A2"), or the cel does not read.
     bool guessKind(LoadedCel& loaded);
+    /// Header keys that go by the number of a channel follow the channels that are left.
+    void renumberHeader();
     /// Tells of the unsound objects that no part told of.
     void finish();
 
@@ -38,6 +40,8 @@ private:
     /// More objects of this name than a file can hold channels are not looked for.
     static constexpr int kMostCels = 1000;
 
+    [[nodiscard]] char kindOf(int number) const;
+    [[nodiscard]] int audioIndex(int number) const;
     [[nodiscard]] String channelName(int number) const;
     [[nodiscard]] String levelsName(int number) const;
 
@@ -47,5 +51,6 @@ private:
     bool m_headerLost = false;
     bool m_audioSeen = false;
     bool m_celsLost = false;
+    std::vector<int> m_read;            ///< the numbers of the cels that were read
     std::map<String, String> m_unsound; ///< why, by the object's name
 };
