@@ -57,9 +57,6 @@ static Qx::Status loadCel(TagBag& store, const configb& header, int number, Edit
         return Qx::Status::failure("object " + object + " is not a cel that reads (" + store.objectError() +
                                    ")");
     }
-    if (loaded.content->is_good_cel() == 0) {
-        return Qx::Status::failure("the events of object " + object + " contradict each other");
-    }
     return findKind(header, number, loaded);
 }
 

@@ -64,10 +64,8 @@ _qmedit() {
     import | salvage)
         mapfile -t COMPREPLY < <(compgen -f -- "$current")
         compopt -o filenames 2>/dev/null ;;
-    show | header | export | verify) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;
-    ;
-    completion) mapfile -t COMPREPLY < <(compgen -W bash -- "$current") ;
-    ;
+    show | header | export | verify) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;;
+    completion) mapfile -t COMPREPLY < <(compgen -W bash -- "$current") ;;
     esac
 }
 complete -F _qmedit qmedit
@@ -84,7 +82,7 @@ void addCompletionCommand(CLI::App& app, CommandWork& work) {
         ->type_name("")
         ->check(CLI::IsMember({"bash"}));
     command->footer("Example:\n  source <(qmedit completion bash)");
-    command->callback([&app, &work] {
+    command->callback([shell, &app, &work] { // the option writes to it: it lives as long as the command
         work = [&app] {
             writeOut(bashCompletion(app));
             return static_cast<int>(kDone);
