@@ -38,7 +38,7 @@ TEST_F(QmeditFiles, ExportGivesAnImportedListBack) {
                              "001  R1       B     C        00:00:10:00 00:00:13:00 10:00:00:00 10:00:03:00\n"
                              "* FROM CLIP NAME: harbour\n"
                              "* LOC: 10:00:01:00 RED     ship\n"
-                             "002  R2       V     C        00:00:10:00 00:00:12:12 10:00:03:00 10:00:08:00\n"
+                             "002  R2       V     C        00:00:10:00 00:00:12:00 10:00:03:00 10:00:07:00\n"
                              "M2   R2             012.5                00:00:10:00\n";
     const String item = imported(list);
     const auto before = snapshot();
