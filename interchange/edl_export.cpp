@@ -142,10 +142,11 @@ Qx::Status EdlExporting::checkProgramme() {
         end = std::max(end, clip.recordOut);
     }
     if (m_clips.front().recordIn < 0 || end > Qx::framesPerDay(m_rate, m_drop)) {
-        return Qx::Status::failure(
-            "edit " + name +
-            (end > 0 ? " is longer than the 24 hours of timecode" : " begins before its time 0") +
-            "; export it in parts");
+        return Qx::Status::failure("edit " + name +
+                                   (m_clips.front().recordIn < 0
+                                        ? " begins before its time 0"
+                                        : " is longer than the 24 hours of timecode") +
+                                   "; export it in parts");
     }
     if (m_clips.size() > kMaxEdlEvents) {
         return Qx::Status::failure("edit " + name + " has more than 999999 events; export it in parts");
