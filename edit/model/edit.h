@@ -438,7 +438,7 @@ public:
     /// changing nothing, when no default grouping is present.
     bool applyDefaultGrouping();
     /// The shot's groups become its default grouping; without groups it has none. False for what is no shot,
-    /// and when that is its default grouping already.
+    /// when that is its default grouping already, and when a stored one cannot be read, which then stays.
     bool updateDefaultGroupingForShot();
     /// Turns the header text "CHAN_GRPS" of older files into groups and removes it.
     void updateChannelGroups();

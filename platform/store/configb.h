@@ -24,10 +24,19 @@ public:
 /// of ASCII letters and keep the spelling of their first writing and their order. A key is not empty and
 /// holds no line end, colon or control character; a write with another key is refused (false).
 ///
-/// Text form, a line a key: "KEY:type value", where type is int, int64, double, string, cookie or bool; line
-/// ends, backslashes and control characters in a string are escaped; a double reads back as the same bits.
-/// The block ends with the end marker on a line of its own. Lines of a type that is not known
-/// ("tvtype:textdata pal") are kept and written back.
+/// Text form: the name on a line of its own, a line a key, the end marker on a line of its own. The line of a
+/// key is "KEY:type value", where type is int, int64, double, string, cookie or bool. In a string a backslash
+/// is written as two, a line feed as "\\n", a carriage return as "\\r" and any other control character as
+/// "\\x" and two hexadecimal digits. A double is its shortest decimal text, or "bits" and its bits as a
+/// decimal number where that text would lose some (a NaN that carries a payload), so it reads back as the
+/// same bits. A cookie is its text, or "words" and its three words as decimal numbers where it is not
+/// storable. A bool is true or false; 1 and 0 are read too. Lines of a type that is not known
+/// ("tvtype:textdata pal") are kept and written back as they are; `getString` gives their text. Where a text
+/// holds a key twice the later line wins, in the place of the earlier one. Without an end marker the block
+/// ends with an empty line or the text.
+///
+/// A copy has the values, the name and the end marker, no observer, and is not dirty. Not thread-safe: one
+/// store is used by one thread at a time.
 class QM_API configb {
 public:
     using Value = std::variant<int32_t, int64_t, double, String, cookie, bool>;
@@ -44,7 +53,8 @@ public:
 
     /// \name Values
     /// A read converts between int, int64, double and bool where nothing is lost; a key that is missing or of
-    /// another type gives the default. A write of the value that is there already is no change.
+    /// another type gives the default. A bool counts as 0 or 1, and only those read as a bool. A write of the
+    /// value and type that are there already is no change.
     /// @{
     [[nodiscard]] int getInt(std::string_view key, int defaultValue = 0) const;
     [[nodiscard]] int64_t getInt64(std::string_view key, int64_t defaultValue = 0) const;
@@ -67,7 +77,7 @@ public:
     /// False when there is no such key.
     bool remove(std::string_view key);
     void clear();
-    [[nodiscard]] size_t size() const { return m_order.size(); }
+    [[nodiscard]] size_t size() const { return m_index.size(); }
     /// The keys, in order.
     [[nodiscard]] std::vector<String> keys() const;
 
@@ -77,15 +87,19 @@ public:
 
     /// Appends the text form, name line first and end marker last.
     void writeTo(TextFile& file) const;
-    /// Reads the text form from line `from` on and sets `after` to the line past the end marker. A failure
-    /// names the line and leaves the store as it was.
+    /// Reads the text form from line `from` on, in place of what the store held, and sets `after` to the line
+    /// past the end marker. It counts as a change if anything differs. A failure names the line and leaves
+    /// the store and `after` as they were.
     Qx::Status buildFrom(const TextFile& file, unsigned from, unsigned& after);
 
     /// The packed form: a count, then per key its spelling, a type byte and the value.
     void pack(PStream& stream) const;
-    /// On a bad stream the stream is in its error state and the store is as it was.
+    /// Reads the packed form in place of what the store held; a change if anything differs. On a bad stream
+    /// the stream is in its error state and the store is as it was.
     void unpack(PStream& stream);
 
+    /// True if both hold the same keys, spelled alike, in the same order, with the same types and values
+    /// (doubles by their bits). Names and end markers do not count.
     bool operator==(const configb& other) const;
 
 private:
@@ -94,13 +108,20 @@ private:
         bool operator()(std::string_view a, std::string_view b) const;
     };
     struct Entry {
-        String key;
+        String key; ///< empty once the key was removed
         Value value;
         String foreignType; ///< of a value whose type is not known; the value is then its text
     };
 
     bool put(std::string_view key, Value value, String foreignType);
+    [[nodiscard]] const Entry* entry(std::string_view key) const;
+    bool readLine(std::string_view line, String& complaint);
+    bool unpackEntry(PStream& stream);
+    void takeValues(const configb& other);
+    void compact();
     void changed();
+    static bool sameEntry(const Entry& a, const Entry& b);
+    static void packEntry(const Entry& entry, PStream& stream);
 
     String m_name;
     String m_endMarker;

@@ -4,7 +4,8 @@
 #include "platform/store/streamable.h"
 
 /// The object that carries a header store into the object store. It refers to a `configb` that it does not
-/// own, or owns one that was read.
+/// own and that must outlive it, or owns one that was read. A copy made for a stream refers to the header of
+/// its original; any other copy owns one.
 class QM_API EditHeaderProxy : public Streamable {
 public:
     /// The tag of the header object.

@@ -14,7 +14,10 @@
 ///
 /// Every read is checked against what is left. A short or refused read sets the error state and yields zero
 /// or an empty text; from then on every read does so and nothing more is consumed. The state is checked once,
-/// at the end of an object, by whoever unpacks it.
+/// at the end of an object, by whoever unpacks it. Writing sets the error state for a text longer than its
+/// length can tell and on a stream made for reading; writing it to a file is then refused.
+///
+/// A stream is used by one thread at a time.
 class QM_API PStream {
 public:
     /// For writing.
@@ -34,9 +37,11 @@ public:
     void setString(std::string_view text);
     /// Bytes as they are, without a length.
     void setRaw(const void* from, size_t size);
-    /// Room for `size` more bytes is made ahead.
-    void reserve(size_t size) { m_output.reserve(m_output.size() + size); }
-    /// Overwrites four bytes written before, for a length known only afterwards.
+    /// Room for `size` more bytes is made ahead. The buffer at least doubles when it must grow, so that
+    /// calls for small amounts stay cheap.
+    void reserve(size_t size);
+    /// Overwrites four bytes written before, for a length known only afterwards. The error state is set, and
+    /// nothing written, when they do not lie within what was written.
     void patchUnsignedLong(size_t at, uint32_t value);
     [[nodiscard]] const std::vector<std::byte>& bytes() const { return m_output; }
     [[nodiscard]] size_t size() const { return m_output.size(); }

@@ -38,10 +38,15 @@ public:
 
     [[nodiscard]] virtual std::unique_ptr<Streamable> clone(BuilderType type = BuilderType::Copy) const = 0;
 
-    /// Writes every layer.
+    /// Writes every layer. The revision written is the class's current one (that of an empty object made by
+    /// its builder, or of this object when the class has none), whatever revision was last unpacked: `pack`
+    /// always writes the current form.
     virtual void STRM_hierarchyPack(PStream& stream) const;
-    /// Reads what `STRM_hierarchyPack` wrote. A layer from a newer major revision is refused. False, with the
-    /// stream in its error state, when the stream is short, lacks the object's layer or is refused.
+    /// Reads what `STRM_hierarchyPack` wrote; layers of other names are passed over. A layer of a newer major
+    /// revision is refused; of a newer minor revision it is read, and what its writer added behind is passed
+    /// over. False, with the stream in its error state, when the stream is short, lacks the object's layer or
+    /// has it twice, when the revision is refused, or when a layer of a known revision holds more than
+    /// `unpack` took (the object then holds what was read).
     virtual bool STRM_hierarchyUnpack(PStream& stream);
 
     /// Makes an empty object of a class.

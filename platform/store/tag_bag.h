@@ -4,6 +4,7 @@
 #include "platform/base/id_stamp.h"
 #include "platform/base/open_behaviour.h"
 #include "platform/base/status.h"
+#include "platform/store/object_store_info.h"
 #include "platform/store/streamable.h"
 
 #include <functional>
@@ -43,6 +44,12 @@ public:
     /// bag is closed and `openError` tells why. What it held before is dropped.
     OpenResult open(const cookie& item, const String& folder, eEditOpenBehaviour behaviour,
                     const String& extension);
+    /// Opens what can be saved of a damaged store: the objects whose bytes are sound are there, the others
+    /// are told of in `lost`. Possible while the table of the file is whole (`examineStore`); otherwise the
+    /// bag is closed, `openError` tells why and the result is that of `open`. The bag has no id, so that a
+    /// flush cannot replace the damaged file before `setId` (and `setFolder`) tell where the salvage shall
+    /// go.
+    OpenResult openSalvaging(const String& path, std::vector<StoredObjectInfo>& lost);
     /// One sentence for a person: the path, what is wrong and what can be done. Empty after a success.
     [[nodiscard]] const String& openError() const;
     [[nodiscard]] bool isOpen() const;
@@ -57,17 +64,24 @@ public:
     /// Binds an object under a name; the bag owns it, and a former object of that name goes. It counts as
     /// changed.
     void storeObject(std::string_view name, std::unique_ptr<Streamable> object);
-    /// Lends an object to the bag until `extractObject` or `releaseLent`; the caller keeps ownership. With
-    /// `changed` false, and bytes known for the name, those are kept and the object is not packed.
+    /// Lends an object to the bag until `extractObject` or `releaseLent`; the caller keeps ownership, and an
+    /// object that the bag owned under the name goes. With `changed` false, and bytes known for the name,
+    /// those are kept and the object is not packed, unless they can be had no more or an earlier lending with
+    /// `changed` true was not followed by a flush that succeeded. An object that was never written goes from
+    /// the bag when its loan ends.
     void lendObject(std::string_view name, const Streamable& object, bool changed);
     void releaseLent();
 
     /// The object under a name, as a live object that the bag owns: unpacked from its bytes on the first
     /// call. Null when there is none or its bytes do not make one; `objectError` then tells which.
     [[nodiscard]] Streamable* openObject(std::string_view name);
-    /// The same, handed over: the bag knows the bytes still (see `lendObject`) but owns no object any more.
+    /// The same, handed over: the bag knows the bytes still (see `lendObject`) but owns no object any more;
+    /// an object that was never written goes from the bag. Bytes of an object handed over are not kept in
+    /// memory but found again in the file: if that was replaced or moved since, and no object is lent in
+    /// their place, a flush fails. For an object that is lent the loan ends and the result is null.
     [[nodiscard]] std::unique_ptr<Streamable> extractObject(std::string_view name);
-    /// Unpacks the bytes under a name into an object that the caller has. False when there are none or they
+    /// Unpacks the bytes under a name, as they were last written or read, into an object that the caller has.
+    /// False when there are none or they
     /// do not fit; the object is then as its `unpack` promises.
     [[nodiscard]] bool readObject(std::string_view name, Streamable& object);
     [[nodiscard]] const String& objectError() const;
@@ -82,8 +96,11 @@ public:
     /// The names, in the order of the file.
     [[nodiscard]] std::vector<String> names() const;
 
-    /// Writes every object to the file, atomically and durably. The same objects give the same bytes. On
-    /// failure the old file is untouched and everything still counts as changed.
+    /// Writes every object to the file, atomically and durably, in the order of the file, new ones at the end
+    /// in the order of their binding. The same objects give the same bytes. On failure the old file is
+    /// untouched and everything still counts as changed; only when the file could not be made durable after
+    /// it was written whole, the name may hold the new file already. A changed object is written in the
+    /// revision of this program.
     Qx::Status flush();
     /// How many objects the last `flush` packed, and how many it took over as bytes.
     [[nodiscard]] size_t numPacked() const;
@@ -91,5 +108,6 @@ public:
 
 private:
     class Contents;
+    OpenResult openFile(eEditOpenBehaviour behaviour);
     std::unique_ptr<Contents> m_contents;
 };

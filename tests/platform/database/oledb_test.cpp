@@ -19,7 +19,7 @@ const Fields kColumns{"Type", "start time", "name"};
 class Oledb : public testing::Test {
 protected:
     [[nodiscard]] String path() const { return folder.path() + "/table.db"; }
-    TemporaryFolder folder;
+    test::TemporaryFolder folder;
 };
 
 TEST_F(Oledb, KeepsRecordsAndValuesBetweenOpenings) {

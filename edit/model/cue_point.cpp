@@ -1,0 +1,321 @@
+#include "edit/model/cue_point.h"
+
+#include "edit/model/cel.h"
+#include "edit/model/detail/event_search.h"
+
+#include <algorithm>
+#include <cmath>
+
+namespace {
+
+bool near(double a, double b) {
+    return std::abs(a - b) <= Qx::kTimeTolerance;
+}
+
+/// What the pair of an event plays.
+struct Span {
+    double editFrom = 0;
+    double editTo = 0;
+    double stripFrom = 0; ///< at its start, so above `stripTo` in reverse
+    double stripTo = 0;
+    cookie strip;
+
+    Span(const cel& its, int inIndex) {
+        const channel_event* in = its.getChanEventPtr(inIndex);
+        const channel_event* out = its.getChanEventPtr(inIndex + 1);
+        if (in != nullptr && out != nullptr) {
+            editFrom = in->editTime;
+            editTo = out->editTime;
+            stripFrom = in->stripTime;
+            stripTo = in->stripTime + (editTo - editFrom) * in->velocity;
+            strip = in->strip;
+        }
+    }
+    /// The start belongs to what is played, the end does not; of a freeze the one moment does.
+    [[nodiscard]] bool plays(double stripTime) const {
+        const double way = stripTo >= stripFrom ? 1.0 : -1.0;
+        const double gone = (stripTime - stripFrom) * way;
+        return gone >= -Qx::kTimeTolerance &&
+               (gone < (stripTo - stripFrom) * way - Qx::kTimeTolerance || near(stripTime, stripFrom));
+    }
+    [[nodiscard]] bool within(double from, double to) const {
+        return std::min(stripFrom, stripTo) >= from - Qx::kTimeTolerance &&
+               std::max(stripFrom, stripTo) <= to + Qx::kTimeTolerance;
+    }
+    [[nodiscard]] bool holds(double editTime) const {
+        return Qx::timeIsConsideredToBeInRegion(editTime, {editFrom, editTo});
+    }
+    [[nodiscard]] double distance(double editTime) const {
+        return std::max({editFrom - editTime, editTime - editTo, 0.0});
+    }
+};
+
+/// The in point of the pair that plays at a time; an invalid handle where none does.
+ce_handle playing(const cel* its, double time) {
+    if (its == nullptr) {
+        return {};
+    }
+    const ce_handle in = its->find_ceh(time, CE_IN_POINT);
+    return in.valid() != 0 && Span(*its, in.index()).holds(time) ? in : ce_handle();
+}
+
+} // namespace
+
+cue_point::cue_point(const char* text, double time, int chan, int code, const Vector<cel*>& cels, bool attach)
+    : m_channel(chan), m_code(code), m_flags(CueFlag::kKept | CueFlag::kInside) {
+    setText(text != nullptr ? text : "");
+    setEditTime(time);
+    m_secondTime = editTime();
+    if (!attach) {
+        return;
+    }
+    if (chan != kAnyCueChan) {
+        if (chan >= 0 && chan < std::ssize(cels)) {
+            attachTo(playing(cels[static_cast<size_t>(chan)], editTime()));
+        }
+        return;
+    }
+    for (const cel* its : cels) {
+        const ce_handle event = playing(its, editTime());
+        if (event.valid() != 0 && !event.get_strip_cookie().isBlack()) {
+            attachTo(event);
+            return;
+        }
+    }
+}
+
+bool cue_point::setStripTime(double seconds) {
+    if (!std::isfinite(seconds)) {
+        return false;
+    }
+    m_stripTime = seconds;
+    return true;
+}
+
+bool cue_point::setSecondTime(double seconds) {
+    if (!std::isfinite(seconds)) {
+        return false;
+    }
+    m_secondTime = seconds;
+    return true;
+}
+
+void cue_point::setEvent(const ce_handle& event) {
+    m_event = event;
+    m_eventId = {};
+    m_outId = {};
+    m_stripFrom = m_stripTo = 0;
+    remember();
+}
+
+bool cue_point::attachTo(const ce_handle& event) {
+    if (event.valid() == 0) {
+        return false;
+    }
+    setEvent(event);
+    m_flags.set(CueFlag::kAttached, true);
+    update_strip_time();
+    const cel& its = *event.get_its_cel();
+    m_flags.set(CueFlag::kInside, Span(its, event.index() & ~1).distance(editTime()) <= 0);
+    return true;
+}
+
+void cue_point::detach() {
+    setEvent({});
+    m_flags.set(CueFlag::kAttached, false);
+    m_flags.set(CueFlag::kInside, true);
+}
+
+bool cue_point::slide(double seconds) {
+    const double second = m_secondTime + seconds;
+    if (!std::isfinite(second) || !m_editTime.set(editTime() + seconds)) {
+        return false;
+    }
+    m_secondTime = second;
+    return true;
+}
+
+/// Keeps what finds the event again after a change.
+void cue_point::remember() {
+    const channel_event* event = m_event.get_chan_evnt_ptr();
+    if (event == nullptr) {
+        return;
+    }
+    const cel& its = *m_event.get_its_cel();
+    const int in = m_event.index() & ~1;
+    m_eventId = event->id;
+    const channel_event* out = its.getChanEventPtr(in + 1);
+    m_outId = out != nullptr ? out->id : IdStamp();
+    const Span span(its, in);
+    m_stripFrom = std::min(span.stripFrom, span.stripTo);
+    m_stripTo = std::max(span.stripFrom, span.stripTo);
+}
+
+/// Brings the handle back to the cue's event after the cel changed; `shift` is by how much the index of
+/// another cue's event moved. Without one the handle is left at no event.
+bool cue_point::findEvent(int shift) {
+    const cel* its = m_event.get_its_cel();
+    if (its == nullptr || m_event.index() < 0) {
+        return false;
+    }
+    if (!m_eventId.valid()) {
+        return m_event.valid() != 0;
+    }
+    int index = EventSearch::nearest(*its, m_eventId, m_event.index(), shift);
+    if (index < 0 && m_outId.valid() && m_event.index() % 2 == 0) {
+        const int out = EventSearch::nearest(*its, m_outId, m_event.index() + 1, shift);
+        if (out > 0) {
+            const Span span(*its, out - 1);
+            const bool part = span.strip == m_stripCookie && span.within(m_stripFrom, m_stripTo);
+            index = part && span.plays(m_stripTime) ? out - 1 : -1;
+        }
+    }
+    m_event.set_index(index);
+    return index >= 0;
+}
+
+/// After a split: to the piece that plays the cue's strip time, when the one with the stamp does not any
+/// more.
+bool cue_point::moveToPiece() {
+    const cel& its = *m_event.get_its_cel();
+    const bool played =
+        m_stripTime >= m_stripFrom - Qx::kTimeTolerance && m_stripTime <= m_stripTo + Qx::kTimeTolerance;
+    if (m_event.index() % 2 != 0 || !played || Span(its, m_event.index()).plays(m_stripTime)) {
+        return false;
+    }
+    for (int in = m_event.index() + 2; in < its.numEvents(); in += 2) {
+        const Span span(its, in);
+        if (span.strip == m_stripCookie && span.plays(m_stripTime) && span.within(m_stripFrom, m_stripTo)) {
+            m_event.set_index(in);
+            return true;
+        }
+    }
+    return false;
+}
+
+bool cue_point::moveTo(double time) {
+    const double old = editTime();
+    const double second = m_secondTime + (time - old);
+    if (time == old || !m_editTime.set(time)) {
+        return false;
+    }
+    m_secondTime = std::isfinite(second) ? second : time;
+    return true;
+}
+
+void cue_point::update_strip_time() {
+    if (findEvent(0)) {
+        setStripTime(m_event.get_strip_time(editTime()));
+        m_stripCookie = m_event.get_strip_cookie();
+        remember();
+    } else if (attached()) {
+        moveTo(0.0);
+    }
+}
+
+bool cue_point::update_edit_time() {
+    int shift = 0;
+    return updateEditTime(shift);
+}
+
+bool cue_point::updateEditTime(int& shift) {
+    if (!attached()) {
+        m_flags.set(CueFlag::kInside, true);
+        return false;
+    }
+    const int before = m_event.index();
+    if (!findEvent(shift)) {
+        return moveTo(0.0);
+    }
+    shift = m_event.index() - before;
+    moveToPiece();
+    remember();
+    const double from = m_event.get_edit_time();
+    const bool moved = moveTo(m_stripTime - m_event.get_strip_time(Qx::kStripTimeAtEvent) + from);
+    const ce_handle out = m_event.get_next_ceh(CE_OUT_POINT);
+    if (out.valid() == 0) {
+        return moved;
+    }
+    const bool inside = editTime() >= from && editTime() <= out.get_edit_time();
+    const bool wasInside = hasFlags(CueFlag::kInside);
+    m_flags.set(CueFlag::kInside, inside);
+    return moved || inside != wasInside;
+}
+
+std::unique_ptr<cue_point> cue_point::copy() const {
+    return std::make_unique<cue_point>(*this);
+}
+
+void cue_point::convert(const Vector<cel*>& cels) {
+    if (!attached()) {
+        return;
+    }
+    Vector<cel*> searched;
+    if (m_channel == kAnyCueChan) {
+        searched = cels;
+    } else if (m_channel >= 0 && m_channel < std::ssize(cels)) {
+        searched.push_back(cels[static_cast<size_t>(m_channel)]);
+    }
+    if (!attachByStamp(searched) && !attachByTimes(searched)) {
+        const bool reread = hasFlags(CueFlag::kInside);
+        for (const cel* its : searched) {
+            const ce_handle event = reread ? playing(its, editTime()) : ce_handle();
+            if (event.valid() != 0) {
+                attachTo(event);
+                return;
+            }
+        }
+        detach();
+    }
+}
+
+bool cue_point::attachByStamp(const Vector<cel*>& cels) {
+    if (!m_eventId.valid()) {
+        return false;
+    }
+    const int hint = std::max(m_event.index(), 0);
+    for (cel* its : cels) {
+        const int index = its != nullptr ? EventSearch::nearest(*its, m_eventId, hint, 0) : -1;
+        if (index >= 0) {
+            m_event = ce_handle(its, index);
+            return true;
+        }
+    }
+    return false;
+}
+
+/// To the event that plays the cue's strip time at its edit time.
+bool cue_point::attachByTimes(const Vector<cel*>& cels) {
+    const double time = editTime();
+    const auto fits = [&](const Span& span) {
+        return (!m_stripCookie.is_valid() || span.strip == m_stripCookie) &&
+               near(m_stripTime - span.stripFrom + span.editFrom, time);
+    };
+    ce_handle best;
+    double bestDistance = 0;
+    for (const cel* its : cels) {
+        const ce_handle there = playing(its, time);
+        if (there.valid() != 0 &&
+            (fits(Span(*its, there.index())) || near(its->get_strip_time(there, time), m_stripTime))) {
+            best = there;
+            break;
+        }
+        for (int in = 0; its != nullptr && in < its->numEvents(); in += 2) {
+            const Span span(*its, in);
+            if (!span.strip.isBlack() && fits(span) &&
+                (best.valid() == 0 || span.distance(time) < bestDistance)) {
+                best = ce_handle(its, in);
+                bestDistance = span.distance(time);
+            }
+        }
+    }
+    if (best.valid() == 0) {
+        return false;
+    }
+    const double strip = m_stripTime;
+    setEvent(best);
+    m_stripTime = strip;
+    m_stripCookie = best.get_strip_cookie();
+    m_flags.set(CueFlag::kAttached, true);
+    return true;
+}

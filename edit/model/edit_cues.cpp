@@ -1,0 +1,119 @@
+#include "edit/model/edit.h"
+
+namespace {
+
+/// The cue list's name in the object store. It lives in files: do not change it.
+constexpr const char* kCueId = "CueId";
+
+bool isCelCue(const cue_point& cue) {
+    return cue.attached() && !cue.hasFlags(CueFlag::kKept);
+}
+
+} // namespace
+
+void Edit::cuesChanged() {
+    setChangeDescription(kCuesChanged, true);
+}
+
+bool Edit::delete_all_cel_cues() {
+    const size_t before = m_cues.get_num_cue_points(0);
+    for (size_t i = before; i-- > 0;) {
+        if (isCelCue(*m_cues.get_cue_point(i, 0))) {
+            m_cues.delete_cue_point(i);
+        }
+    }
+    if (m_cues.get_num_cue_points(0) == before) {
+        return false;
+    }
+    cuesChanged();
+    return true;
+}
+
+bool Edit::cel_cues_off() {
+    set_cel_cues_loaded(false);
+    return delete_all_cel_cues();
+}
+
+bool Edit::deleteCues(int chan) {
+    if (m_cues.delete_matching_cues(0, chan) == 0) {
+        return false;
+    }
+    cuesChanged();
+    return true;
+}
+
+bool Edit::deleteCue(size_t index) {
+    if (!m_cues.delete_cue_point(index)) {
+        return false;
+    }
+    cuesChanged();
+    return true;
+}
+
+bool Edit::updateCues() {
+    if (m_cues.update_edit_time() == 0) {
+        return false;
+    }
+    cuesChanged();
+    return true;
+}
+
+void Edit::convertCues() {
+    Vector<cel*> cels;
+    const int count = getNumChans();
+    cels.reserve(static_cast<size_t>(count));
+    for (int i = 0; i < count; ++i) {
+        cels.push_back(get_edit_cel_p(i));
+    }
+    m_cues.convert(cels);
+}
+
+void Edit::shuffleCueChans(int firstChan, int count) {
+    m_cues.shuffleChans(firstChan, count);
+}
+
+void Edit::storeCues() {
+    auto kept = std::make_unique<cue_list>(m_cues);
+    for (size_t i = kept->get_num_cue_points(0); i-- > 0;) {
+        if (!kept->get_cue_point(i, 0)->hasFlags(CueFlag::kKept)) {
+            kept->delete_cue_point(i);
+        }
+    }
+    m_store.storeObject(kCueId, std::move(kept));
+}
+
+bool Edit::retrieveCues() {
+    cue_list read;
+    if (m_store.contains(kCueId) && !m_store.readObject(kCueId, read)) {
+        return false;
+    }
+    m_cues = std::move(read);
+    return true;
+}
+
+void Edit::celReplaced(const cel* from, cel* to) {
+    m_cues.rebindCel(from, to);
+}
+
+void Edit::channelRemoved(const IdStamp& chan, int index) {
+    for (ChannelGroupList* list : {retrieveGroupsList(), retrieveDefaultGroupsList()}) {
+        if (list != nullptr) {
+            list->removeMember(chan);
+        }
+    }
+    if (const cel* its = get_edit_cel_p(index); its != nullptr && getId(index) == chan) {
+        m_cues.dropCel(its);
+    }
+    if (index >= 0 && index != NO_CHAN) {
+        m_cues.delete_matching_cues(0, index);
+        m_cues.shuffleChans(index + 1, -1);
+    }
+}
+
+void Edit::channelRenamed(const IdStamp& from, const IdStamp& to) {
+    for (ChannelGroupList* list : {retrieveGroupsList(), retrieveDefaultGroupsList()}) {
+        if (list != nullptr) {
+            list->replaceMember(from, to);
+        }
+    }
+}

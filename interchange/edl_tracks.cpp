@@ -1,0 +1,367 @@
+#include "interchange/edl_tracks.h"
+
+#include "platform/media/timecode.h"
+
+#include <algorithm>
+#include <cmath>
+#include <map>
+
+namespace interchange {
+
+namespace {
+
+int64_t recordLength(const EdlEvent& event) {
+    return event.recordOut - event.recordIn;
+}
+
+// Source frames a record frame. The speed counts the labels of a second, as timecode does: 24 at 23.976.
+double velocityOf(const EdlEvent& event, Qx::FrameRate rate) {
+    return event.speed ? event.speed->framesPerSecond / rate.nominal() : 1.0;
+}
+
+// One track while it is laid: clips by record in, none overlapping.
+class Lane {
+public:
+    /// Lays a clip; what it covers goes. Answers an event that lost a part, or its own when none did.
+    size_t lay(const EdlClip& clip) {
+        size_t covered = clip.event;
+        auto next = m_clips.lower_bound(clip.recordIn);
+        if (next != m_clips.begin()) {
+            auto before = std::prev(next);
+            EdlClip& earlier = before->second;
+            if (earlier.recordOut > clip.recordIn) {
+                covered = earlier.event;
+                if (earlier.recordOut > clip.recordOut) {
+                    next = m_clips.emplace_hint(next, clip.recordOut, tailOf(earlier, clip.recordOut));
+                }
+                earlier.recordOut = clip.recordIn;
+            }
+        }
+        while (next != m_clips.end() && next->first < clip.recordOut) {
+            covered = next->second.event;
+            if (next->second.recordOut > clip.recordOut) {
+                m_clips.emplace(clip.recordOut, tailOf(next->second, clip.recordOut));
+            }
+            next = m_clips.erase(next);
+        }
+        m_clips.emplace_hint(next, clip.recordIn, clip);
+        return covered;
+    }
+    [[nodiscard]] bool empty() const { return m_clips.empty(); }
+    /// The end of the last clip; -1 for none.
+    [[nodiscard]] int64_t end() const { return m_clips.empty() ? -1 : m_clips.rbegin()->second.recordOut; }
+    [[nodiscard]] std::vector<EdlClip> clips() const {
+        std::vector<EdlClip> result;
+        result.reserve(m_clips.size());
+        for (const auto& [in, clip] : m_clips) {
+            result.push_back(clip);
+        }
+        return result;
+    }
+
+private:
+    static EdlClip tailOf(EdlClip clip, int64_t from) {
+        clip.sourceIn += clip.velocity * static_cast<double>(from - clip.recordIn);
+        clip.recordIn = from;
+        return clip;
+    }
+
+    std::map<int64_t, EdlClip> m_clips;
+};
+
+class Laying {
+public:
+    Laying(const EdlList& list, bool strict, LossReport& report)
+        : m_list(list), m_strict(strict), m_report(report) {}
+
+    Qx::Status lay(EdlProgramme& programme);
+
+private:
+    void findPositions();
+    [[nodiscard]] bool runsOverMidnight();
+    [[nodiscard]] int64_t startOfDay() const;
+    Qx::Status layEvent(size_t index);
+    Qx::Status layOn(EdlChannels channel, const EdlClip& clip);
+    Qx::Status checkTransition(size_t index);
+    void reportTransition(const EdlEvent& event, const EdlEvent* outgoing);
+    void checkDurations(const EdlEvent& event);
+    void checkJoin(size_t index, EdlChannels channels);
+    [[nodiscard]] EdlClip clipOf(size_t index) const;
+    [[nodiscard]] const EdlEvent* outgoingOf(size_t index) const;
+    [[nodiscard]] Qx::Status failure(int line, const String& what) const {
+        return Qx::Status::failure(m_report.file() + ":" + std::to_string(line) + ": " + what);
+    }
+
+    const EdlList& m_list;
+    bool m_strict;
+    LossReport& m_report;
+    EdlProgramme m_programme;
+    std::map<EdlChannels, Lane> m_lanes; // by bit, so in the order of the tracks
+};
+
+bool Laying::runsOverMidnight() {
+    const auto& events = m_list.events;
+    bool crosses = false;
+    size_t back = 0;
+    for (size_t i = 0; i < events.size(); ++i) {
+        const int64_t day = Qx::framesPerDay(m_list.rate, events[i].recordDrop);
+        if (events[i].recordIn >= day) {
+            return false; // frame counts that go on beyond a day
+        }
+        crosses = crosses || events[i].recordOut >= day;
+        if (back == 0 && i > 0 && events[i - 1].recordIn - events[i].recordIn > day / 2) {
+            back = i;
+        }
+    }
+    if (!crosses && back > 0) {
+        m_report.addWarning(events[back].line,
+                            "record time steps back by more than 12 hours; taken as running over midnight");
+    }
+    return crosses || back > 0;
+}
+
+// The record in after the longest pause on the circle of a day.
+int64_t Laying::startOfDay() const {
+    std::vector<std::pair<int64_t, int64_t>> spans;
+    spans.reserve(m_list.events.size());
+    int64_t day = 0;
+    for (const EdlEvent& event : m_list.events) {
+        spans.emplace_back(event.recordIn, event.recordOut);
+        day = std::max(day, Qx::framesPerDay(m_list.rate, event.recordDrop));
+    }
+    std::sort(spans.begin(), spans.end());
+    int64_t end = 0;
+    for (const auto& [in, out] : spans) {
+        end = std::max(end, out);
+    }
+    int64_t start = spans.front().first;
+    int64_t longest = start + day - end;
+    end = spans.front().second;
+    for (const auto& [in, out] : spans) {
+        if (in - end > longest) {
+            longest = in - end;
+            start = in;
+        }
+        end = std::max(end, out);
+    }
+    return start;
+}
+
+void Laying::findPositions() {
+    const auto& events = m_list.events;
+    auto& positions = m_programme.positions;
+    positions.resize(events.size());
+    const bool overMidnight = runsOverMidnight();
+    const int64_t dayStart = overMidnight ? startOfDay() : 0;
+    size_t first = 0;
+    bool mixed = false;
+    for (size_t i = 0; i < events.size(); ++i) {
+        positions[i] = events[i].recordIn;
+        if (positions[i] < dayStart) {
+            positions[i] += Qx::framesPerDay(m_list.rate, events[i].recordDrop);
+        }
+        if (positions[i] < positions[first]) {
+            first = i;
+        }
+        if (!mixed && events[i].recordDrop != events[0].recordDrop) {
+            mixed = true;
+            m_report.addWarning(events[i].line, "the record side changes between drop and non-drop frame; "
+                                                "each label is counted in its own mode");
+        }
+    }
+    m_programme.start = positions[first];
+    m_programme.dropFrame = events[first].recordDrop;
+    for (int64_t& position : positions) {
+        position -= m_programme.start;
+    }
+}
+
+const EdlEvent* Laying::outgoingOf(size_t index) const {
+    return m_list.events[index].role == EdlRole::Incoming ? &m_list.events[index - 1] : nullptr;
+}
+
+EdlClip Laying::clipOf(size_t index) const {
+    const EdlEvent& event = m_list.events[index];
+    EdlClip clip;
+    clip.event = index;
+    clip.recordIn = m_programme.positions[index];
+    clip.recordOut = clip.recordIn + recordLength(event);
+    clip.black = event.isBlack();
+    clip.velocity = clip.black ? 1.0 : velocityOf(event, m_list.rate);
+    clip.sourceIn = static_cast<double>(event.sourceIn);
+    if (event.speed && event.speed->framesPerSecond < 0) {
+        // The first frame shown is the one that the M2 names; failing that, the highest of the span.
+        const int64_t low = std::min(event.sourceIn, event.sourceOut);
+        const int64_t high = std::max(event.sourceIn, event.sourceOut);
+        const bool named = event.speed->at >= low && event.speed->at <= high && event.speed->at != low;
+        const bool descending = event.sourceIn > event.sourceOut;
+        clip.sourceIn = static_cast<double>(named        ? event.speed->at
+                                            : descending ? event.sourceIn
+                                                         : std::max(low, high - 1));
+    }
+    return clip;
+}
+
+void Laying::checkDurations(const EdlEvent& event) {
+    if (event.role == EdlRole::Outgoing && recordLength(event) == 0) {
+        return;
+    }
+    const int64_t record = recordLength(event);
+    const int64_t source = std::abs(event.sourceOut - event.sourceIn);
+    const String durations = "source duration " + Qx::durationText(source, m_list.rate, event.sourceDrop) +
+                             " and record duration " +
+                             Qx::durationText(record, m_list.rate, event.recordDrop);
+    if (event.isBlack() || source == record) {
+        return; // with an M2 too: some writers give the source span as at normal speed
+    }
+    if (!event.speed) {
+        m_report.addWarning(event.line, durations + " differ without M2; the record side is trusted");
+        return;
+    }
+    const double scaled = static_cast<double>(record) * std::abs(velocityOf(event, m_list.rate));
+    const bool freeze = event.speed->framesPerSecond == 0 && source <= 1;
+    if (!freeze && std::abs(static_cast<double>(source) - scaled) > 1.0) {
+        m_report.addWarning(event.line, durations + " do not agree with the M2 speed " + event.speed->digits +
+                                            "; the speed and the record side are trusted");
+    }
+}
+
+void Laying::reportTransition(const EdlEvent& event, const EdlEvent* outgoing) {
+    const bool fromBlack = outgoing == nullptr || outgoing->isBlack();
+    String what;
+    switch (event.type) {
+    case EdlType::Cut:
+    case EdlType::KeyBackground:
+        return;
+    case EdlType::Dissolve:
+        what = event.isBlack() ? "a fade out" : (fromBlack ? "a fade in" : "a dissolve");
+        what += String::format(" of %d frames became a cut", event.duration);
+        break;
+    case EdlType::Wipe:
+        what =
+            String::format("a wipe of pattern %03d and %d frames became a cut", event.wipe, event.duration);
+        break;
+    case EdlType::Key:
+    case EdlType::KeyOut:
+        what = String::format("a key %s with a fade of %d frames became a clip on the second picture track",
+                              event.type == EdlType::Key ? "in" : "out", event.duration);
+        break;
+    }
+    m_report.addLoss(event.line, std::move(what));
+}
+
+Qx::Status Laying::checkTransition(size_t index) {
+    const EdlEvent& event = m_list.events[index];
+    if (event.duration <= recordLength(event)) {
+        return {};
+    }
+    const String what = String::format("the transition of %d frames is longer than its clip", event.duration);
+    if (m_strict) {
+        return failure(event.line, what + "; shorten it or import without the strict mode");
+    }
+    m_report.addWarning(event.line, what);
+    return {};
+}
+
+// A line of no length says where the outgoing side goes on: that should be where a clip ends.
+void Laying::checkJoin(size_t index, EdlChannels channels) {
+    for (EdlChannels bits = channels; bits != 0; bits &= bits - 1) {
+        const EdlChannels channel = bits & ~(bits - 1);
+        const auto lane = m_lanes.find(channel);
+        const int64_t end = lane == m_lanes.end() ? -1 : lane->second.end();
+        if (!m_list.events[index].isBlack() && end != m_programme.positions[index]) {
+            m_report.addWarning(m_list.events[index].line,
+                                "the outgoing side does not start where the event before it ends");
+            return;
+        }
+    }
+}
+
+Qx::Status Laying::layOn(EdlChannels channel, const EdlClip& clip) {
+    const size_t covered = m_lanes[channel].lay(clip);
+    const EdlEvent& event = m_list.events[clip.event];
+    const EdlEvent& below = m_list.events[covered];
+    const bool ownOutgoing = event.role == EdlRole::Incoming && covered + 1 == clip.event;
+    if (covered == clip.event || ownOutgoing) {
+        return {};
+    }
+    const String lines = String::format("the event overlaps the one at line %d", below.line);
+    if (m_strict) {
+        return failure(event.line, lines + "; correct the record times or import without the strict mode");
+    }
+    m_report.addWarning(event.line, lines + ", which is trimmed");
+    return {};
+}
+
+Qx::Status Laying::layEvent(size_t index) {
+    const EdlEvent& event = m_list.events[index];
+    if (event.role == EdlRole::Outgoing && recordLength(event) == 0) {
+        checkJoin(index, event.channels);
+        return {};
+    }
+    checkDurations(event);
+    if (Qx::Status status = checkTransition(index); !status) {
+        return status;
+    }
+    reportTransition(event, outgoingOf(index));
+    if (event.channels == 0) {
+        m_report.addLoss(event.line, "the event is on no track and is left out");
+        return {};
+    }
+    if (recordLength(event) == 0) {
+        m_report.addLoss(event.line, "the event has no length and is left out");
+        return {};
+    }
+    const bool foreground = event.type == EdlType::Key || event.type == EdlType::KeyOut;
+    const EdlClip clip = clipOf(index);
+    for (EdlChannels bits = event.channels; bits != 0; bits &= bits - 1) {
+        EdlChannels channel = bits & ~(bits - 1);
+        if (foreground && channel == kEdlPicture) {
+            channel = kEdlPicture2;
+        }
+        if (Qx::Status status = layOn(channel, clip); !status) {
+            return status;
+        }
+    }
+    return {};
+}
+
+Qx::Status Laying::lay(EdlProgramme& programme) {
+    findPositions();
+    std::vector<size_t> order(m_list.events.size());
+    for (size_t i = 0; i < order.size(); ++i) {
+        order[i] = i;
+    }
+    const auto& positions = m_programme.positions;
+    std::stable_sort(order.begin(), order.end(),
+                     [&](size_t a, size_t b) { return positions[a] < positions[b]; });
+    for (const size_t index : order) {
+        if (Qx::Status status = layEvent(index); !status) {
+            return status;
+        }
+    }
+    for (const auto& [channel, lane] : m_lanes) {
+        if (!lane.empty()) {
+            m_programme.tracks.push_back({channel, lane.clips()});
+        }
+    }
+    programme = std::move(m_programme);
+    return {};
+}
+
+} // namespace
+
+Qx::Status layTracks(const EdlList& list, bool strict, EdlProgramme& programme, LossReport& report) {
+    return Laying(list, strict, report).lay(programme);
+}
+
+int64_t markerPosition(const EdlList& list, const EdlProgramme& programme, const EdlMarker& marker) {
+    int64_t position = marker.at - programme.start;
+    const int64_t day = Qx::framesPerDay(list.rate, programme.dropFrame);
+    if (position < -day / 2) {
+        position += day;
+    }
+    return position;
+}
+
+} // namespace interchange

@@ -1,0 +1,84 @@
+#pragma once
+
+#include "platform/store/detail/object_store_writer.h"
+#include "platform/store/tag_bag.h"
+
+#include <list>
+#include <unordered_map>
+
+/// What a bag holds.
+///
+/// An object's bytes are in memory (in the image of the file that was read, or copied out of it), or known to
+/// lie in the file `source`, or both, or nowhere. They are dropped from memory as soon as a live object was
+/// made from them and the file has them too.
+class TagBag::Contents {
+public:
+    struct Entry {
+        String name;
+        String layer;
+        uint8_t major = 0;
+        uint8_t minor = 0;
+        std::unique_ptr<Streamable> owned;
+        const Streamable* lent = nullptr;
+        /// The live object differs from the bytes, or did when it was last here. Cleared by a flush only.
+        bool changed = false;
+        bool inMemory = false;
+        bool onFile = false; ///< `place` tells where in `source`
+        Qx::detail::StoredPlace place;
+        std::span<const std::byte> memory;
+        std::vector<std::byte> copied; ///< backs `memory` once the image was dropped
+
+        [[nodiscard]] bool hasBytes() const { return inMemory || onFile; }
+        [[nodiscard]] const Streamable* live() const { return lent != nullptr ? lent : owned.get(); }
+        [[nodiscard]] bool mustBePacked() const { return live() != nullptr && (changed || !hasBytes()); }
+        [[nodiscard]] Qx::detail::StoredLabel label() const { return {name, layer, major, minor}; }
+    };
+    using Entries = std::list<Entry>;
+
+    /// Forgets everything but the identity of the store.
+    void clear();
+    [[nodiscard]] Entry* find(std::string_view name);
+    [[nodiscard]] const Entry* find(std::string_view name) const;
+    Entry& findOrAdd(std::string_view name);
+    void erase(std::string_view name);
+    /// Adds the objects of the image. `complaints` is empty or tells of each whether it is sound; those that
+    /// are not are left out.
+    void takeImage(std::span<const Qx::detail::StoredObject> objects, std::span<const String> complaints,
+                   bool onFile);
+
+    /// Unpacks an object's bytes. False with `objectError` set.
+    bool unpack(const Entry& entry, Streamable& object);
+    /// A live object from an object's bytes; null with `objectError` set.
+    std::unique_ptr<Streamable> build(const Entry& entry);
+    /// Forgets an object's bytes in memory if the file has them.
+    void dropMemory(Entry& entry);
+    /// Forgets an object's bytes wherever they are.
+    void forgetBytes(Entry& entry);
+
+    [[nodiscard]] String path() const;
+    /// Writes the file once. `retry` is set when bytes could not be taken over from `source`: then nothing
+    /// was changed and `keepFromSource` must be false the next time.
+    Qx::Status write(bool keepFromSource, bool& retry);
+
+    cookie id;
+    String folder;
+    String extension;
+    bool isOpen = false;
+    String openError;
+    String objectError;
+    size_t numPacked = 0;
+    size_t numKept = 0;
+    Entries entries; ///< in the order of the file
+    Qx::detail::StoreImage image;
+    Qx::detail::StoreIdentity source;
+
+private:
+    struct Written;
+    Qx::Status writeEntry(Qx::detail::StoreWriter& writer, Entry& entry, Written& written,
+                          Qx::detail::StoreSource* from, bool& intact);
+    void thinImage();
+    void adopt(const std::vector<Written>& written, const Qx::detail::StoreIdentity& identity, bool durable);
+
+    std::unordered_map<std::string_view, Entries::iterator> m_index; ///< keys lie in the entries
+    size_t m_imageBytesInUse = 0;
+};

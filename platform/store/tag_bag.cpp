@@ -1,0 +1,330 @@
+#include "platform/store/tag_bag.h"
+
+#include "platform/base/ole_splat.h"
+#include "platform/store/detail/header_values.h"
+#include "platform/store/detail/salvage.h"
+#include "platform/store/detail/tag_bag_contents.h"
+
+#include <cerrno>
+
+using namespace Qx::detail;
+
+namespace {
+
+String refusal(const String& path, Qx::FileKind kind) {
+    switch (kind) {
+    case Qx::FileKind::Folder:
+        return path + " is a folder, not an object store; move it away";
+    case Qx::FileKind::Link:
+        return path + " is a symbolic link, which is not followed; put the file itself in its place";
+    default:
+        return path + " is not a regular file; move it away";
+    }
+}
+
+String readFailure(const Qx::FileError& error, const String& path) {
+    if (error.code == EFBIG) {
+        return path + " is larger than 4 GiB, the greatest size of an object store; check that this is the "
+                      "file you mean";
+    }
+    return error.text();
+}
+
+TagBag::OpenResult resultOf(StoreState state) {
+    switch (state) {
+    case StoreState::Sound:
+        return TagBag::Opened;
+    case StoreState::Foreign:
+        return TagBag::Foreign;
+    case StoreState::Newer:
+        return TagBag::Newer;
+    case StoreState::Damaged:
+        break;
+    }
+    return TagBag::Damaged;
+}
+
+/// What a name stands for, as far as it decides the result of opening; Opened for a regular file.
+TagBag::OpenResult lookAt(const String& path, String& complaint) {
+    Qx::FileInfo info;
+    if (const Qx::FileError error = Qx::fileSystem().info(path, info)) {
+        complaint = error.text();
+        return TagBag::NotOpened;
+    }
+    if (info.kind == Qx::FileKind::Missing) {
+        complaint = path + " does not exist";
+        return TagBag::Missing;
+    }
+    if (info.kind != Qx::FileKind::Regular) {
+        complaint = refusal(path, info.kind);
+        return TagBag::NotOpened;
+    }
+    return TagBag::Opened;
+}
+
+} // namespace
+
+TagBag::TagBag() : m_contents(std::make_unique<Contents>()) {}
+
+TagBag::~TagBag() = default;
+
+TagBag::OpenResult TagBag::open(const cookie& item, const String& inFolder, eEditOpenBehaviour behaviour,
+                                const String& extension) {
+    close();
+    m_contents->id = item;
+    m_contents->folder = inFolder;
+    m_contents->extension = extension;
+    OpenResult result = NewStore;
+    if (extension.find('/') != String::npos || extension.find('\0') != String::npos) {
+        m_contents->openError = quoted(extension) + " cannot end a file name";
+        result = NotOpened;
+    } else if (behaviour != eOpenNew) {
+        result = openFile(behaviour);
+    }
+    m_contents->isOpen = result == Opened || result == NewStore;
+    return result;
+}
+
+TagBag::OpenResult TagBag::openFile(eEditOpenBehaviour behaviour) {
+    Contents& bag = *m_contents;
+    const String name = bag.path();
+    if (name.empty()) {
+        bag.openError =
+            "the item " + quoted(bag.id.asString()) + " has no file: its identity cannot form a name";
+        return NotOpened;
+    }
+    const OpenResult seen = lookAt(name, bag.openError);
+    if (seen == Missing && behaviour == eOpenOrCreate) {
+        bag.openError.clear();
+        return NewStore;
+    }
+    if (seen != Opened) {
+        return seen;
+    }
+    StoreVerdict verdict;
+    if (const Qx::FileError error = bag.image.read(name, true, verdict)) {
+        bag.image.drop();
+        bag.openError = readFailure(error, name);
+        return NotOpened;
+    }
+    std::vector<StoredObject> objects;
+    if (verdict.isSound()) {
+        verdict = judgeStore(bag.image.bytes(), objects);
+    }
+    if (!verdict.isSound()) {
+        bag.image.drop();
+        bag.openError = verdict.sentence(name);
+        return resultOf(verdict.state);
+    }
+    bag.source = bag.image.identity();
+    bag.takeImage(objects, {}, true);
+    return Opened;
+}
+
+TagBag::OpenResult TagBag::openSalvaging(const String& file, std::vector<StoredObjectInfo>& lost) {
+    close();
+    lost.clear();
+    Contents& bag = *m_contents;
+    const OpenResult seen = lookAt(file, bag.openError);
+    if (seen != Opened) {
+        return seen;
+    }
+    std::vector<StoredObject> objects;
+    std::vector<String> complaints;
+    StoreVerdict verdict;
+    if (const Qx::Status status = salvageStore(file, bag.image, objects, complaints, verdict); !status) {
+        bag.image.drop();
+        bag.openError = status.reason();
+        return verdict.isSound() ? (bag.image.identity().known ? Damaged : NotOpened)
+                                 : resultOf(verdict.state);
+    }
+    for (size_t i = 0; i < objects.size(); ++i) {
+        if (!complaints[i].empty()) {
+            lost.push_back(infoOf(objects[i], complaints[i]));
+        }
+    }
+    bag.takeImage(objects, complaints, false);
+    bag.folder = Qx::folderOf(file);
+    bag.extension = Qx::extensionOf(Qx::fileNameOf(file));
+    bag.isOpen = true;
+    return Opened;
+}
+
+const String& TagBag::openError() const {
+    return m_contents->openError;
+}
+
+bool TagBag::isOpen() const {
+    return m_contents->isOpen;
+}
+
+void TagBag::close() {
+    m_contents->clear();
+    m_contents->id = invalid_cookie;
+    m_contents->folder.clear();
+    m_contents->extension.clear();
+    m_contents->isOpen = false;
+}
+
+const cookie& TagBag::id() const {
+    return m_contents->id;
+}
+
+void TagBag::setId(const cookie& item) {
+    m_contents->id = item;
+}
+
+const String& TagBag::folder() const {
+    return m_contents->folder;
+}
+
+void TagBag::setFolder(const String& inFolder) {
+    m_contents->folder = inFolder;
+}
+
+String TagBag::path() const {
+    return m_contents->path();
+}
+
+void TagBag::storeObject(std::string_view name, std::unique_ptr<Streamable> object) {
+    if (object == nullptr || !isStoredName(name) || !isStoredName(object->layerName())) {
+        ole_splat("TagBag::storeObject( %s ) - no object, or a name that cannot be stored",
+                  quoted(name).c_str());
+        return;
+    }
+    Contents::Entry& entry = m_contents->findOrAdd(name);
+    m_contents->forgetBytes(entry);
+    entry.lent = nullptr;
+    entry.owned = std::move(object);
+    entry.changed = true;
+}
+
+void TagBag::lendObject(std::string_view name, const Streamable& object, bool changed) {
+    if (!isStoredName(name) || !isStoredName(object.layerName())) {
+        ole_splat("TagBag::lendObject( %s ) - a name that cannot be stored", quoted(name).c_str());
+        return;
+    }
+    Contents::Entry& entry = m_contents->findOrAdd(name);
+    entry.owned.reset();
+    entry.lent = &object;
+    entry.changed = entry.changed || changed || entry.layer != object.layerName();
+}
+
+void TagBag::releaseLent() {
+    std::vector<String> gone;
+    for (Contents::Entry& entry : m_contents->entries) {
+        if (entry.lent != nullptr && !entry.hasBytes()) {
+            gone.push_back(entry.name);
+        }
+        entry.lent = nullptr;
+    }
+    for (const String& name : gone) {
+        m_contents->erase(name);
+    }
+}
+
+Streamable* TagBag::openObject(std::string_view name) {
+    m_contents->objectError.clear();
+    Contents::Entry* entry = m_contents->find(name);
+    if (entry == nullptr || entry->lent != nullptr) {
+        m_contents->objectError =
+            entry == nullptr ? "there is no object " + quoted(name) : "object " + quoted(name) + " is lent";
+        return nullptr;
+    }
+    if (entry->owned == nullptr) {
+        entry->owned = m_contents->build(*entry);
+        if (entry->owned != nullptr) {
+            m_contents->dropMemory(*entry);
+        }
+    }
+    return entry->owned.get();
+}
+
+std::unique_ptr<Streamable> TagBag::extractObject(std::string_view name) {
+    Contents::Entry* entry = m_contents->find(name);
+    if (entry != nullptr && entry->lent != nullptr) {
+        m_contents->objectError = "object " + quoted(name) + " was lent; it is its lender's again";
+        entry->lent = nullptr;
+        if (!entry->hasBytes()) {
+            m_contents->erase(name);
+        }
+        return nullptr;
+    }
+    if (openObject(name) == nullptr) {
+        return nullptr;
+    }
+    std::unique_ptr<Streamable> object = std::move(entry->owned);
+    if (!entry->hasBytes()) {
+        m_contents->erase(name);
+    }
+    return object;
+}
+
+bool TagBag::readObject(std::string_view name, Streamable& object) {
+    m_contents->objectError.clear();
+    Contents::Entry* entry = m_contents->find(name);
+    if (entry == nullptr) {
+        m_contents->objectError = "there is no object " + quoted(name);
+        return false;
+    }
+    if (!m_contents->unpack(*entry, object)) {
+        return false;
+    }
+    m_contents->dropMemory(*entry);
+    return true;
+}
+
+const String& TagBag::objectError() const {
+    return m_contents->objectError;
+}
+
+void TagBag::markChanged(std::string_view name) {
+    Contents::Entry* entry = m_contents->find(name);
+    if (entry != nullptr && entry->live() != nullptr) {
+        entry->changed = true;
+    }
+}
+
+bool TagBag::removeObject(std::string_view name) {
+    const bool there = m_contents->find(name) != nullptr;
+    m_contents->erase(name);
+    return there;
+}
+
+bool TagBag::contains(std::string_view name) const {
+    return m_contents->find(name) != nullptr;
+}
+
+size_t TagBag::numObjects() const {
+    return m_contents->entries.size();
+}
+
+std::vector<String> TagBag::names() const {
+    std::vector<String> list;
+    list.reserve(m_contents->entries.size());
+    for (const Contents::Entry& entry : m_contents->entries) {
+        list.push_back(entry.name);
+    }
+    return list;
+}
+
+Qx::Status TagBag::flush() {
+    if (!m_contents->isOpen) {
+        return Qx::Status::failure("the object store is not open; open it before it is written");
+    }
+    if (m_contents->path().empty()) {
+        return Qx::Status::failure("the item " + quoted(m_contents->id.asString()) +
+                                   " cannot be written: its identity cannot form a file name");
+    }
+    bool retry = false;
+    Qx::Status status = m_contents->write(true, retry);
+    return retry ? m_contents->write(false, retry) : status;
+}
+
+size_t TagBag::numPacked() const {
+    return m_contents->numPacked;
+}
+
+size_t TagBag::numKept() const {
+    return m_contents->numKept;
+}

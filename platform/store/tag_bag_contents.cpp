@@ -1,0 +1,246 @@
+#include "platform/store/detail/tag_bag_contents.h"
+
+#include "platform/store/detail/checksum.h"
+#include "platform/store/detail/header_values.h"
+#include "platform/store/detail/layer_revision.h"
+
+using namespace Qx::detail;
+
+namespace {
+
+/// The image goes once less than this part of it is in use; the rest is copied out of it.
+constexpr size_t kLeastPartInUse = 8;
+
+} // namespace
+
+void TagBag::Contents::clear() {
+    m_index.clear();
+    entries.clear();
+    image.drop();
+    source = {};
+    m_imageBytesInUse = 0;
+    openError.clear();
+    objectError.clear();
+    numPacked = 0;
+    numKept = 0;
+}
+
+TagBag::Contents::Entry* TagBag::Contents::find(std::string_view name) {
+    const auto found = m_index.find(name);
+    return found == m_index.end() ? nullptr : &*found->second;
+}
+
+const TagBag::Contents::Entry* TagBag::Contents::find(std::string_view name) const {
+    const auto found = m_index.find(name);
+    return found == m_index.end() ? nullptr : &*found->second;
+}
+
+TagBag::Contents::Entry& TagBag::Contents::findOrAdd(std::string_view name) {
+    if (Entry* there = find(name)) {
+        return *there;
+    }
+    Entry& added = entries.emplace_back();
+    added.name = String(name);
+    m_index.emplace(added.name, std::prev(entries.end()));
+    return added;
+}
+
+void TagBag::Contents::erase(std::string_view name) {
+    const auto found = m_index.find(name);
+    if (found != m_index.end()) {
+        const Entries::iterator entry = found->second;
+        if (entry->inMemory && entry->copied.empty()) {
+            m_imageBytesInUse -= entry->memory.size();
+        }
+        m_index.erase(found);
+        entries.erase(entry);
+    }
+}
+
+void TagBag::Contents::takeImage(std::span<const StoredObject> objects, std::span<const String> complaints,
+                                 bool onFile) {
+    m_index.reserve(objects.size());
+    for (size_t i = 0; i < objects.size(); ++i) {
+        if (!complaints.empty() && !complaints[i].empty()) {
+            continue;
+        }
+        const StoredObject& object = objects[i];
+        Entry& entry = findOrAdd(object.name);
+        entry.layer = String(object.layer);
+        entry.major = object.major;
+        entry.minor = object.minor;
+        entry.place = {object.offset, object.length, object.checksum};
+        entry.memory = image.bytes().subspan(object.offset, object.length);
+        entry.inMemory = true;
+        entry.onFile = onFile;
+        m_imageBytesInUse += entry.memory.size();
+    }
+}
+
+bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
+    const String who = "object " + quoted(entry.name) + " of " + path();
+    std::span<const std::byte> bytes = entry.memory;
+    std::vector<std::byte> reread;
+    if (!entry.hasBytes()) {
+        objectError = who + " was never written";
+        return false;
+    }
+    if (!entry.inMemory) {
+        StoreSource file;
+        const bool opened = file.open(source);
+        reread.resize(opened ? entry.place.length : 0);
+        if (!opened || !file.read(entry.place.offset, reread) || checksum(reread) != entry.place.checksum) {
+            objectError = who + " cannot be read again: the file was replaced, moved or damaged";
+            return false;
+        }
+        bytes = reread;
+    }
+    PStream stream(bytes);
+    if (object.STRM_hierarchyUnpack(stream) && stream.remaining() == 0) {
+        return true;
+    }
+    const LayerRevision current = currentRevision(object);
+    if (entry.layer == object.layerName() && entry.major > current.major) {
+        objectError = who + " was written by a newer version of this program: it has revision " +
+                      std::to_string(entry.major) + ", this version reads " + std::to_string(current.major);
+    } else {
+        objectError = who + " does not hold what an object of class " + quoted(object.layerName()) +
+                      " is made of; it was written by another program or another class";
+    }
+    return false;
+}
+
+std::unique_ptr<Streamable> TagBag::Contents::build(const Entry& entry) {
+    std::unique_ptr<Streamable> object = Streamable::build(entry.layer);
+    if (object == nullptr) {
+        objectError = "object " + quoted(entry.name) + " of " + path() + " is of class " +
+                      quoted(entry.layer) + ", which this program does not know; it is kept as it is";
+        return nullptr;
+    }
+    return unpack(entry, *object) ? std::move(object) : nullptr;
+}
+
+void TagBag::Contents::dropMemory(Entry& entry) {
+    if (!entry.inMemory || !entry.onFile) {
+        return;
+    }
+    forgetBytes(entry);
+    entry.onFile = true;
+    thinImage();
+}
+
+void TagBag::Contents::forgetBytes(Entry& entry) {
+    if (entry.inMemory && entry.copied.empty()) {
+        m_imageBytesInUse -= entry.memory.size();
+    }
+    entry.inMemory = false;
+    entry.onFile = false;
+    entry.memory = {};
+    entry.copied = {};
+}
+
+void TagBag::Contents::thinImage() {
+    if (image.bytes().empty() || m_imageBytesInUse > image.bytes().size() / kLeastPartInUse) {
+        return;
+    }
+    for (Entry& other : entries) {
+        if (other.inMemory && other.copied.empty()) {
+            other.copied.assign(other.memory.begin(), other.memory.end());
+            other.memory = other.copied;
+        }
+    }
+    image.drop();
+    m_imageBytesInUse = 0;
+}
+
+String TagBag::Contents::path() const {
+    return id.isStorable() ? Qx::joinPath(folder, id.asString() + extension) : String();
+}
+
+/// An object that went into a file that is not yet in place.
+struct TagBag::Contents::Written {
+    Entry* entry;
+    StoredPlace place;
+    LayerRevision revision;
+    bool packed;
+};
+
+Qx::Status TagBag::Contents::writeEntry(StoreWriter& writer, Entry& entry, Written& written,
+                                        StoreSource* from, bool& intact) {
+    const Streamable* live = entry.live();
+    const bool reachable = entry.inMemory || (entry.onFile && from != nullptr);
+    if (live != nullptr && (entry.mustBePacked() || !reachable)) {
+        written.revision = currentRevision(*live);
+        written.packed = true;
+        return writer.add({entry.name, live->layerName(), written.revision.major, written.revision.minor},
+                          *live, written.place);
+    }
+    written.revision = {entry.major, entry.minor};
+    written.packed = false;
+    if (entry.inMemory) {
+        return writer.add(entry.label(), entry.memory, entry.place.checksum, written.place);
+    }
+    if (!reachable) {
+        return Qx::Status::failure("object " + quoted(entry.name) + " of " + path() +
+                                   " cannot be taken over: " + source.path +
+                                   " was replaced, moved or damaged since it was read; nothing was written");
+    }
+    return writer.add(entry.label(), *from, entry.place, written.place, intact);
+}
+
+Qx::Status TagBag::Contents::write(bool keepFromSource, bool& retry) {
+    retry = false;
+    StoreSource file;
+    StoreSource* from = nullptr;
+    for (const Entry& entry : entries) {
+        if (keepFromSource && from == nullptr && entry.onFile && !entry.inMemory && !entry.mustBePacked()) {
+            keepFromSource = file.open(source);
+            from = keepFromSource ? &file : nullptr;
+        }
+    }
+    StoreWriter writer(path());
+    if (Qx::Status status = writer.begin(); !status) {
+        return status;
+    }
+    std::vector<Written> written;
+    written.reserve(entries.size());
+    for (Entry& entry : entries) {
+        Written& row = written.emplace_back(Written{&entry, {}, {}, false});
+        bool intact = true;
+        if (Qx::Status status = writeEntry(writer, entry, row, from, intact); !status) {
+            return status;
+        }
+        if (!intact) {
+            retry = true;
+            return {};
+        }
+    }
+    StoreIdentity identity;
+    bool replaced = false;
+    Qx::Status status = writer.commit(identity, replaced);
+    if (replaced) {
+        adopt(written, identity, status.isOk());
+    }
+    return status;
+}
+
+void TagBag::Contents::adopt(const std::vector<Written>& written, const StoreIdentity& identity,
+                             bool durable) {
+    source = identity;
+    numPacked = 0;
+    numKept = 0;
+    for (const Written& row : written) {
+        Entry& entry = *row.entry;
+        ++(row.packed ? numPacked : numKept);
+        if (row.packed) {
+            entry.layer = entry.live()->layerName();
+            entry.major = row.revision.major;
+            entry.minor = row.revision.minor;
+            forgetBytes(entry);
+        }
+        entry.place = row.place;
+        entry.onFile = identity.known;
+        entry.changed = entry.changed && !durable;
+    }
+    thinImage();
+}
