@@ -14,10 +14,10 @@ endif()
 function(quillmarch_warnings target)
     target_compile_options(${target} PRIVATE
         -Wall -Wextra -Wpedantic -Werror -Wshadow -Wconversion -Wnon-virtual-dtor -Wold-style-cast
-        -Wcast-align -Woverloaded-virtual -Wnull-dereference -Wformat=2 -Wimplicit-fallthrough)
+        -Wcast-align -Woverloaded-virtual -Wformat=2 -Wimplicit-fallthrough)
     if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND QUILLMARCH_SANITIZE)
-        # The sanitizers' instrumentation makes gcc see null pointers and unset values that are not there.
-        target_compile_options(${target} PRIVATE -Wno-null-dereference -Wno-maybe-uninitialized)
+        # The sanitizers' instrumentation makes gcc see unset values that are not there.
+        target_compile_options(${target} PRIVATE -Wno-maybe-uninitialized)
     endif()
 endfunction()
 

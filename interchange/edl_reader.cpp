@@ -209,7 +209,9 @@ void EdlReading::pairWithLineBefore(EdlEvent& event) {
     }
     if (!m_list.events.empty()) {
         EdlEvent& before = m_list.events.back();
-        if (before.number == event.number && before.role == EdlRole::Alone && !isTransition(before)) {
+        const bool sameTrack = before.channels == 0 || (before.channels & event.channels) != 0;
+        if (before.number == event.number && sameTrack && before.role == EdlRole::Alone &&
+            !isTransition(before)) {
             before.role = EdlRole::Outgoing;
             event.role = EdlRole::Incoming;
             return;

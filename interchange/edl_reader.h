@@ -33,7 +33,8 @@ enum class EdlRole {
     Incoming  ///< the second
 };
 
-/// An `M2` line.
+/// An `M2` line. The speed factor is its speed by the labels of a second (30 at 29.97, 24 at 23.976), so that
+/// "030.0" is normal speed there.
 struct EdlSpeed {
     String reel;
     String digits;              ///< as written, so that an export returns the same

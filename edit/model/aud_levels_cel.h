@@ -32,6 +32,8 @@ public:
     bool insertNode(double time, float level);
     [[nodiscard]] Range getExtents(Editable::ExtentType type = Editable::Everything,
                                    bool fromZero = false) const;
+    /// The operations of the node store. False, with nothing changed, for an invalid one and for times that
+    /// are not usable; `simplify` also where nothing was to drop. An invalid source counts as an empty one.
     bool insert(const AudLevelsCel& source, const Range& sourceRange, double at);
     bool remove(const Range& range);
     bool replace(const AudLevelsCel& source, const Range& sourceRange, double at);
@@ -40,10 +42,15 @@ public:
     [[nodiscard]] bool changed() const;
     void setChanged(bool changed);
 
-    /// Brings nodes of an older revision up to date with the channel that they belong to. False if nothing
-    /// was to do.
+    /// Brings nodes of an older revision up to date with the channel that they belong to. Levels of revision
+    /// 0 hold only what was drawn by hand, and the clips' own levels besides; since revision 1 the nodes
+    /// stand for all that is done to the sound, so the clips' nodes are added (`replaceClipNodes`). False if
+    /// nothing was to do.
     bool checkNodesRevision(const AudCel& audio);
-    /// Rebuilds the nodes that come from the clips' own levels.
+    /// Rebuilds the nodes that come from the clips' own levels: each clip of material whose level is not 1 at
+    /// both ends gets a node at its in point and one at its out point, in the place of what nodes lie
+    /// between; the envelope outside the clip stays as it was (`Store::kStep`). The clips are not changed.
+    /// False, with nothing changed, if no clip has levels of its own or the nodes are there already.
     bool replaceClipNodes(const AudCel& audio);
 
     /// Lends the levels to the store under their stamp's text.

@@ -53,11 +53,13 @@ public:
     [[nodiscard]] double get_strip_time(double editTime = Qx::kStripTimeAtEvent) const;
     void set_strip_time(double time);
     [[nodiscard]] cookie get_strip_cookie() const;
+    /// This and the setters below change one event of the pair, and ignore a value that no event may hold.
     void set_strip_cookie(const cookie& strip);
     /// Level at an edit time, linear between the pair's ends; `Qx::kStripTimeAtEvent` asks at the event.
     [[nodiscard]] float get_strip_level(double editTime = Qx::kStripTimeAtEvent) const;
     void set_strip_level(float level);
     [[nodiscard]] double get_strip_velocity() const;
+    /// Sets the velocity of the pair, at both its ends, and the out point's strip time with it.
     void set_strip_velocity(double velocity);
     [[nodiscard]] int get_dmod_code() const;
     void set_dmod_code(int code);
@@ -76,6 +78,10 @@ public:
     void set_audioRamp_CurveType(Aud::GainCurve::eCurveType type);
 
 private:
+    [[nodiscard]] channel_event* event() const;
+    template <typename Change>
+    void change(Change&& apply);
+
     cel* m_cel = nullptr;
     int m_index = -1;
 };
@@ -98,3 +104,6 @@ private:
     ce_handle m_in;
     ce_handle m_out;
 };
+
+// The handle's inline members need the cel.
+#include "edit/model/cel.h"

@@ -28,11 +28,22 @@ enum class SoftCuts {
 /// cookie. Nothing keeps a pointer into the array across a change. Finding a time is a binary search; an
 /// operation on a region is a search and one block move. Not thread-safe.
 ///
+/// What plays at a time is read from the in point: its strip time there, plus the time since then multiplied
+/// by its velocity. Every operation keeps the out point's strip time in agreement with that; the setters of
+/// single fields change one field of one event, so whoever uses them does.
+///
 /// An operation that answers false or null has changed nothing.
 class QM_API cel : public Streamable {
 public:
     using IdMap = std::map<IdStamp, IdStamp>;
     using Range = NumRange<double, Ordered>;
+
+    /// \name What an event may hold: the greatest absolute edit time and strip time in seconds, and velocity
+    /// @{
+    static constexpr double kGreatestTime = 1e9;
+    static constexpr double kGreatestStripTime = 1e12;
+    static constexpr double kGreatestVelocity = 1e6;
+    /// @}
 
     cel();
     ~cel() override;
@@ -41,8 +52,8 @@ public:
 
     /// A deep copy, stamps included.
     [[nodiscard]] std::unique_ptr<cel> copy() const;
-    /// Finishes a cel after loading: checks it, gives an open last pair nothing. False, and the cel is empty,
-    /// if the events are not consistent.
+    /// Finishes a cel after loading: a last in point without an out point gets one at its own time, and all
+    /// is checked. False, and the cel is empty, if the events are not consistent.
     bool close();
 
     /// \name Events
@@ -52,11 +63,16 @@ public:
     /// Changed since it was last written.
     [[nodiscard]] bool changed() const { return m_changed; }
     void setChanged(bool changed) { m_changed = changed; }
+    /// Goes up with every change of the events: who keeps something worked out from them compares it.
+    [[nodiscard]] uint64_t changeCount() const { return m_changeCount; }
     /// Room for `pairs` pairs is made ahead.
     void reserve(int pairs);
 
     /// Appends one event, while loading or building: an in point at or after the last out point, or the out
-    /// point of the last in point. False, changing nothing, for an event that does not follow.
+    /// point of the last in point. One that lies before it by no more than the tolerance is moved up to it;
+    /// one without a stamp gets a fresh one. False, changing nothing, for an event that does not follow or
+    /// holds what no cel may (`kGreatestTime` and its like, a level that is no number, another kind than 1
+    /// and 4).
     bool add_event(const channel_event& event);
     /// Appends or inserts a pair that plays `strip` from `stripTime` at [editTime, editTime + length).
     /// Returns the in handle; an invalid one, with nothing changed, if the pair would overlap another, lie
@@ -70,7 +86,7 @@ public:
     [[nodiscard]] const channel_event* getChanEventPtr(int index) const {
         return index >= 0 && index < numEvents() ? &m_events[static_cast<size_t>(index)] : nullptr;
     }
-    /// Overwrites one event in place. False if the result would not be consistent.
+    /// Overwrites one event in place, that one alone. False if the result would not be consistent.
     bool setEvent(int index, const channel_event& event);
     /// @}
 
@@ -78,9 +94,9 @@ public:
     /// @{
     [[nodiscard]] ce_handle get_start_ceh() const;
     [[nodiscard]] ce_handle get_end_ceh() const;
-    /// The event of a kind that governs a time. Kind 1: the in point of the last pair that starts at or
-    /// before `time` (within the tolerance), whether it still plays or not. Kind 4: the first out point at or
-    /// after `time`. Kind 7: the last event at or before `time`. Invalid if there is none.
+    /// The event of a kind that governs a time, by binary search. Kind 1: the in point of the last pair that
+    /// starts at or before `time` (within the tolerance), whether it still plays or not. Kind 4: the first
+    /// out point at or after `time`. Kind 7: the last event at or before `time`. Invalid if there is none.
     [[nodiscard]] ce_handle find_ceh(double time, ce_info kind) const;
     [[nodiscard]] ce_handle get_next_ceh(const ce_handle& from, ce_info kind) const;
     [[nodiscard]] int check_ceh(const ce_handle& handle) const;
@@ -93,16 +109,21 @@ public:
     [[nodiscard]] double get_start_time() const; ///< 0 for an empty cel
     [[nodiscard]] double get_end_time() const;   ///< 0 for an empty cel
     [[nodiscard]] double get_edit_time(const ce_handle& handle) const;
-    /// Moves one event. Without `force` a move past a neighbour is refused (false); with it the event stops
-    /// at the neighbour.
+    /// Moves one event and changes nothing else of the pair: its strip time there and its velocity stay as
+    /// they are. Without `force` a move past a neighbour is refused (false); with it the event stops at the
+    /// neighbour.
     bool set_edit_time(const ce_handle& handle, double time, bool force);
     [[nodiscard]] double get_strip_time(const ce_handle& handle,
                                         double editTime = Qx::kStripTimeAtEvent) const;
     /// What plays at an edit time; `Qx::kNoTime` and the invalid cookie where nothing does.
     [[nodiscard]] double get_strip_time(double editTime) const;
+    /// Changes the strip time of one event alone: whoever slips a pair sets both ends. Ignored for a time
+    /// that no event may hold.
     void set_strip_time(const ce_handle& handle, double time);
     [[nodiscard]] cookie get_strip_cookie(const ce_handle& handle) const;
     [[nodiscard]] cookie get_strip_cookie(double editTime) const;
+    /// The occupied span, `Editable::invalidRange()` if there is none; with `fromZero` it starts at 0 at the
+    /// latest.
     [[nodiscard]] Range getExtents(Editable::ExtentType type = Editable::Everything,
                                    bool fromZero = false) const;
     /// True if nothing but black and gaps lies in the range.
@@ -111,32 +132,185 @@ public:
     /// @}
 
     /// \name Operations on regions
-    /// The contract of each is drawn below: one character a second, a letter for each source, '.' for black,
-    /// a blank for a gap, '|' a mark.
+    /// Each is drawn before and after: one character a second, a letter for each source (upper case in the
+    /// cel, lower case in the source of the operation), '.' for black, a blank for a gap, '|' a mark or,
+    /// between two pairs of one source, a cut.
+    ///
+    /// What holds for all of them:
+    /// - Marks are seconds. A mark within the tolerance (`Qx::kTimeTolerance`) of a cut means that cut, and
+    /// what
+    ///   is joined there meets exactly: no operation leaves a piece or a gap shorter than the tolerance. A
+    ///   pair of no length belongs to the region that starts with it.
+    /// - A range that is no longer than the tolerance, a mark that is no usable time (`kGreatestTime`), a
+    /// null
+    ///   source, and a result that would reach past `kGreatestTime` are refused; so is everything while the
+    ///   last pair is open (an in point added, its out point not).
+    /// - Gaps are content: a gap of the source is a gap where it is laid. Past the end of a cel lies a gap,
+    /// so
+    ///   what is laid there leaves one, and nothing is filled with black; a region past the end is not an
+    ///   error and the answer is true.
+    /// - The source may be the cel itself: the result is as if it had been copied first.
+    /// - Cutting a pair changes nothing of what is seen or heard in either piece: strip time and level at the
+    ///   cut are those that the pair has there. The events at the cut have no fade; the fade at an end that
+    ///   stays, stays. The `dmod` codes of the two ends go with the pieces' ends.
+    /// - Stamps: a piece that is left of a pair keeps both of the pair's stamps, and so what is bound to
+    /// them.
+    ///   Where both pieces stay in the cel, the left one keeps the in point's stamp, the right one the out
+    ///   point's, and the two events at the cut get fresh ones; `splits`, when given, receives the in point's
+    ///   stamp and the fresh one of the right piece's in point, so that an effect can be bound to both.
+    /// - Events that are copied out of a source get fresh stamps; `ids` receives the stamp of each and the
+    /// fresh
+    ///   one. Of a stamp that is copied several times it holds the last.
+    /// - Velocity stays; the strip time of a piece's out point is where its in point and velocity lead.
+    ///
+    /// Cost: two binary searches, the events laid, and one pass over what follows if it moves. No allocation
+    /// an event.
     /// @{
-    /// A flag of `extract`.
+
+    /// Flags of `extract`.
     static constexpr unsigned KeepTimes = 1; ///< the part stays at its edit times instead of starting at 0
+
+    /// The part between two edit times, as a cel of its own at 0. Stamps included: it is a copy of the part.
+    ///
+    ///        |   |
+    ///     AAABB CCC    extract(3, 7)               BB C
+    ///                  extract(3, 7, KeepTimes)       BB C
+    ///
+    /// Where nothing lies the part is empty. Null for a refused range, also for one whose end is not after
+    /// its start. The channel information is not copied, the resolution is.
     [[nodiscard]] std::unique_ptr<cel> extract(double from, double to, unsigned flags = 0) const;
-    bool insert(const cel* source, const Range& sourceRange, double at, IdMap& ids);
-    bool remove(const Range& range);
-    /// With `materialOnly` the events of the destination stay, stamps, fades and levels too, and only what
-    /// they play changes.
+
+    /// Opens the cel at a time and lays a part of a source there; all that follows moves by the part's
+    /// length.
+    ///
+    ///        at                                 source  ddee
+    ///        |                                           ||
+    ///     AAABBB    insert([1, 3), 3)         AAAdeBBB
+    ///     AAAAAA                              AAAdeAAA      the pair is split
+    ///     AA                                  AA de         past the end
+    ///     (empty)                                de
+    ///     AAABBB    insert([3, 6), 3)         AAAe  BBB     the source ends within its range
+    bool insert(const cel* source, const Range& sourceRange, double at, IdMap& ids, IdMap* splits = nullptr);
+
+    /// Takes a region out; all that follows moves earlier by its length.
+    ///
+    ///       |  |
+    ///     AAABBCC    remove([2, 5))    AACC
+    ///     AAAAAAA                      AA|AA     the pair is split
+    ///          BB                        BB      a gap goes too
+    ///     A                            A         past the end: true, and nothing is changed
+    bool remove(const Range& range, IdMap* splits = nullptr);
+
+    /// Overwrites from a time with a part of a source; nothing moves.
+    ///
+    ///       at                                  source  ddee
+    ///       |                                            ||
+    ///     AAABBB    replace([1, 3), 2)        AAdeBB
+    ///     AAAAAA                              AAdeAA        the pair is split
+    ///     AAA                                 AAde          reaches past the end
+    ///     A                                   A de          past the end
+    ///     AAABBB    replace([3, 5), 2)        AAe BB        a gap of the source overwrites too
+    ///
+    /// With `materialOnly` what is seen is the same, but for a gap, which plays black; and the events stay,
+    /// with their stamps, levels, fades and codes. Pairs keep their bounds and are cut besides where the
+    /// source is cut and at the ends of the region; those cuts are made as above. In gaps of the cel nothing
+    /// stays, so the source is laid there as it is.
+    ///
+    ///       |                                            ||
+    ///     AAABBB    replace([1, 3), 2, material)  AAdeBB      cut before d and after e, the ends of the
+    ///     region;
+    ///                                                         between d and e lies the cut of A and B
     bool replace(const cel* source, const Range& sourceRange, double at, IdMap& ids,
-                 bool materialOnly = false);
+                 bool materialOnly = false, IdMap* splits = nullptr);
+
+    /// Joins another cel on: its time 0 comes to lie at `at`. Refused if it would begin before this cel ends.
+    ///
+    ///     AAABB    weld("cc", 5)     AAABBcc
+    ///              weld(" cc", 5)    AAABB cc
+    ///              weld("cc", 4)     refused
+    ///
+    /// The events keep their stamps but for those that this cel has already, which become fresh ones: the
+    /// parts that `extract` made weld together again. Pairs that play on through the joint stay two
+    /// (`simplify`).
     bool weld(const cel* other, double at);
+
+    /// A copy with `seconds` of black put before its first event ('S'), after its last ('E'), or both ('B').
+    /// What is behind black at the start moves later by it.
+    ///
+    ///     AABB    (2, 'S')    ..AABB
+    ///             (2, 'E')    AABB..
+    ///             (1, 'B')    .AABB.
+    ///      AA     (1, 'S')     .AA        the first event lies at 1
+    ///     (empty) (1, 'B')    .|.
+    ///
+    /// 0 seconds give a plain copy; null for a negative number or another letter.
     [[nodiscard]] std::unique_ptr<cel> add_black_to_ends(int seconds, char ends) const;
+
+    /// A copy whose edit times lie on the grid of the resolution, or on the project's frames if none is set,
+    /// rounded to nearest. Here '^' is the grid and a cut lies between two of its points:
+    ///
+    ///     AAABBBBB    AAAABBBB
+    ///     ^   ^   ^   ^   ^   ^
+    ///
+    /// Each end is trimmed or drawn out: what plays at an edit time that a pair still covers stays. A pair
+    /// that is rounded to nothing is left out; cuts that lay on one another still do.
     [[nodiscard]] std::unique_ptr<cel> quantise() const;
-    [[nodiscard]] std::unique_ptr<cel> rescale(double fromEditRate, double toEditRate, double fromStripRate,
-                                               double toStripRate, double editOffset, double stripOffset,
-                                               int quantiseResult) const;
+
+    /// A copy of the part that is played when something plays this cel as its strip: the moments from
+    /// `stripIn` to `stripOut` on this cel's clock come to lie from `editIn` to `editOut`.
+    ///
+    ///        |   |
+    ///     AAABBBBCC    rescale(0, 8, 3, 7, ...)    BBBBBBBB    at half the velocity
+    ///     AAABBBBCC    rescale(0, 3, 2, 5, ...)    ABB
+    ///     AAABBBBCC    rescale(0, 3, 5, 2, ...)    BBA         backwards: each pair in reverse
+    ///     AAABBBBCC    rescale(0, 3, 4, 4, ...)    BBB         a freeze of one moment
+    ///
+    /// Strip times at the pairs' ends stay, velocities are multiplied by (stripOut - stripIn) / (editOut -
+    /// editIn). Levels at the ends are multiplied by a line from `levelIn` at `editIn` to `levelOut` at
+    /// `editOut`. Stamps are copied. With `quantiseResult` non-zero the result is quantised. Where nothing
+    /// plays the copy is empty. Null for times that are not usable, for an edit span that is not longer than
+    /// the tolerance, and where a velocity would pass `kGreatestVelocity`.
+    [[nodiscard]] std::unique_ptr<cel> rescale(double editIn, double editOut, double stripIn, double stripOut,
+                                               double levelIn, double levelOut, int quantiseResult) const;
+
+    /// The time quantum, seconds; 0 (the default) for none. A negative one or one that is no number is
+    /// ignored.
     void set_resolution(double quantum);
     [[nodiscard]] double resolution() const { return m_resolution; }
+
+    /// Flags of `chequerboard`.
+    static constexpr int ChequerWiden =
+        1; ///< pairs are lengthened to their reach, playing on beyond their cuts
+    static constexpr int ChequerFill = 2; ///< gaps of the parts are filled with black up to this cel's end
+
+    /// Deals the pairs of material out to as few parts as hold them without overlap: each goes to the first
+    /// part that is free where it reaches. A pair reaches half of `overlap` seconds beyond either end, and
+    /// with `SoftCuts::Keep` as far as its fades besides. Stamps are copied.
+    ///
+    ///     AABB.CC    overlap 0        AABB CC
+    ///                overlap 1        AA   CC
+    ///                                   BB
+    ///     AABB.CC    overlap 4        AA            A reaches from -2 to 4, B from 0 to 6, C from 3 to 9
+    ///                                   BB
+    ///                                      CC
+    ///
+    /// Puts the parts, which the caller comes to own, into `parts` and their number into `numParts`, and
+    /// returns that number. 0, with nothing made, if there is no material, if more than `maxParts` parts were
+    /// needed, or for a negative overlap. With `ChequerWiden` no pair is lengthened to before time 0.
     int chequerboard(cel** parts, int& numParts, int maxParts, double overlap, int flags,
                      SoftCuts softCuts) const;
-    /// Fills the channel with black from its end to `time`. False if it reaches that far already.
+
+    /// Fills the channel with one pair of black from its end to `time`. False if it reaches that far already.
     bool fillToTime(double time);
+
+    /// Merges pairs that touch. `MergeBlack`: black with black. `MergeThrough`: pairs of one source, velocity
+    /// and code, the second going on where the first stops, at one level throughout and without a fade at the
+    /// cut. The pair keeps the stamps of its two ends; what was bound to the in point at the cut is no longer
+    /// bound, so whoever binds effects asks first. False if there was nothing to merge.
     bool simplify(Simplification::Type type);
-    /// Non-zero if the events are consistent: in and out points paired, in order, finite, stamps set.
+
+    /// Non-zero if the events are consistent: in and out points paired, in order, every field one that a cel
+    /// may hold, stamps set.
     [[nodiscard]] int is_good_cel() const;
     /// @}
 
@@ -147,6 +321,8 @@ public:
     [[nodiscard]] const IdStamp& editChannelId() const { return m_id; }
     [[nodiscard]] const String& editChannelSubType() const { return m_subType; }
     [[nodiscard]] const String& editChannelMaterialInfo() const { return m_materialInfo; }
+    /// The channel's name, with its stamp in brackets and the number of events if asked for: "V1", "V1
+    /// (stamp) [4 events]".
     [[nodiscard]] String hierarchyName(bool withId, bool withEvents) const;
     /// @}
 
@@ -159,8 +335,9 @@ public:
     void revisionMajor(uint8_t major) override { m_major = major; }
     void revisionMinor(uint8_t minor) override { m_minor = minor; }
     /// Packed: the channel information, the resolution, the number of events, the events as they lie in
-    /// memory.
+    /// memory. A last in point without an out point is not packed.
     void pack(PStream& stream) const override;
+    /// Checks all that is read before it changes anything; `changed()` is false afterwards.
     void unpack(PStream& stream) override;
     [[nodiscard]] std::unique_ptr<Streamable> clone(BuilderType type = BuilderType::Copy) const override;
 
@@ -175,6 +352,13 @@ public:
     /// @}
 
 private:
+    friend class ce_handle;
+
+    void changedNow() {
+        m_changed = true;
+        ++m_changeCount;
+    }
+
     std::vector<channel_event> m_events;
     String m_name;
     IdStamp m_id;
@@ -184,4 +368,72 @@ private:
     uint8_t m_major = 1;
     uint8_t m_minor = 0;
     bool m_changed = false;
+    uint64_t m_changeCount = 0;
 };
+
+// Stepping and reading a handle is what every walk over a channel does for each pair, so it is inline.
+
+inline int ce_handle::valid() const {
+    return m_cel != nullptr && m_cel->getChanEventPtr(m_index) != nullptr ? 1 : 0;
+}
+
+inline ce_handle ce_handle::matching_in_ceh() const {
+    return valid() != 0 ? ce_handle(m_cel, m_index & ~1) : ce_handle(m_cel, -1);
+}
+
+inline ce_handle ce_handle::matching_out_ceh() const {
+    return valid() != 0 ? ce_handle(m_cel, m_index | 1) : ce_handle(m_cel, -1);
+}
+
+inline void ce_handle::increment(ce_info kind) {
+    if (m_cel == nullptr) {
+        return;
+    }
+    const int at = m_index < 0 ? -1 : m_index;
+    const int end = m_cel->numEvents();
+    const bool ins = (kind & CE_IN_POINT) != 0;
+    const bool outs = (kind & CE_OUT_POINT) != 0;
+    int to = end;
+    if (ins && outs) {
+        to = at + 1;
+    } else if (ins) {
+        to = (at + 2) & ~1;
+    } else if (outs) {
+        to = (at + 1) | 1;
+    }
+    m_index = to < end ? to : end;
+}
+
+inline void ce_handle::decrement(ce_info kind) {
+    if (m_cel == nullptr) {
+        return;
+    }
+    const int end = m_cel->numEvents();
+    const int at = m_index > end ? end : m_index;
+    const bool ins = (kind & CE_IN_POINT) != 0;
+    const bool outs = (kind & CE_OUT_POINT) != 0;
+    int to = -1;
+    if (ins && outs) {
+        to = at - 1;
+    } else if (ins) {
+        to = (at - 1) & ~1;
+    } else if (outs) {
+        to = ((at - 2) | 1);
+    }
+    m_index = at <= 0 || to < 0 ? -1 : to;
+}
+
+inline ce_handle& ce_handle::operator++() {
+    increment(CE_ANY);
+    return *this;
+}
+
+inline ce_handle& ce_handle::operator--() {
+    decrement(CE_ANY);
+    return *this;
+}
+
+inline double ce_handle::get_edit_time() const {
+    const channel_event* its = m_cel != nullptr ? m_cel->getChanEventPtr(m_index) : nullptr;
+    return its != nullptr ? its->editTime : 0;
+}

@@ -126,10 +126,8 @@ bool cue_list::rescale(double editFactor, double stripFactor, double editOffset,
         cue.setSecondTime(edit(cue.secondTime()));
         if (cue.attached()) {
             cue.setStripTime(strip(cue.stripTime()));
-            const double from = strip(cue.m_stripFrom);
-            const double to = strip(cue.m_stripTo);
-            cue.m_stripFrom = std::min(from, to);
-            cue.m_stripTo = std::max(from, to);
+            cue.m_stripFrom = strip(cue.m_stripFrom);
+            cue.m_stripTo = strip(cue.m_stripTo);
         }
     }
     return true;

@@ -38,9 +38,10 @@ struct Span {
         return gone >= -Qx::kTimeTolerance &&
                (gone < (stripTo - stripFrom) * way - Qx::kTimeTolerance || near(stripTime, stripFrom));
     }
-    [[nodiscard]] bool within(double from, double to) const {
-        return std::min(stripFrom, stripTo) >= from - Qx::kTimeTolerance &&
-               std::max(stripFrom, stripTo) <= to + Qx::kTimeTolerance;
+    /// True if all that it plays lies between two strip times, in either order.
+    [[nodiscard]] bool within(double a, double b) const {
+        return std::min(stripFrom, stripTo) >= std::min(a, b) - Qx::kTimeTolerance &&
+               std::max(stripFrom, stripTo) <= std::max(a, b) + Qx::kTimeTolerance;
     }
     [[nodiscard]] bool holds(double editTime) const {
         return Qx::timeIsConsideredToBeInRegion(editTime, {editFrom, editTo});
@@ -147,8 +148,8 @@ void cue_point::remember() {
     const channel_event* out = its.getChanEventPtr(in + 1);
     m_outId = out != nullptr ? out->id : IdStamp();
     const Span span(its, in);
-    m_stripFrom = std::min(span.stripFrom, span.stripTo);
-    m_stripTo = std::max(span.stripFrom, span.stripTo);
+    m_stripFrom = span.stripFrom;
+    m_stripTo = span.stripTo;
 }
 
 /// Brings the handle back to the cue's event after the cel changed; `shift` is by how much the index of
@@ -174,23 +175,41 @@ bool cue_point::findEvent(int shift) {
     return index >= 0;
 }
 
+/// When other material was laid under the event: the cue keeps its distance from the event's start.
+void cue_point::takeOverStrip() {
+    const cookie strip = m_event.get_strip_cookie();
+    if (m_event.index() % 2 != 0 || !m_stripCookie.is_valid() || strip == m_stripCookie) {
+        return;
+    }
+    if (setStripTime(m_stripTime - m_stripFrom + m_event.get_strip_time(Qx::kStripTimeAtEvent))) {
+        m_stripCookie = strip;
+        remember();
+    }
+}
+
 /// After a split: to the piece that plays the cue's strip time, when the one with the stamp does not any
 /// more.
-bool cue_point::moveToPiece() {
+void cue_point::moveToPiece() {
     const cel& its = *m_event.get_its_cel();
-    const bool played =
-        m_stripTime >= m_stripFrom - Qx::kTimeTolerance && m_stripTime <= m_stripTo + Qx::kTimeTolerance;
-    if (m_event.index() % 2 != 0 || !played || Span(its, m_event.index()).plays(m_stripTime)) {
-        return false;
+    const auto isLast = [&](int in) {
+        const channel_event* out = its.getChanEventPtr(in + 1);
+        return out == nullptr || out->id == m_outId;
+    };
+    const bool played = m_stripTime >= std::min(m_stripFrom, m_stripTo) - Qx::kTimeTolerance &&
+                        m_stripTime <= std::max(m_stripFrom, m_stripTo) + Qx::kTimeTolerance;
+    int in = m_event.index();
+    // A pair that has its out point still was trimmed at most.
+    if (in % 2 != 0 || !played || isLast(in) || Span(its, in).plays(m_stripTime)) {
+        return;
     }
-    for (int in = m_event.index() + 2; in < its.numEvents(); in += 2) {
+    do {
+        in += 2;
         const Span span(its, in);
         if (span.strip == m_stripCookie && span.plays(m_stripTime) && span.within(m_stripFrom, m_stripTo)) {
             m_event.set_index(in);
-            return true;
+            return;
         }
-    }
-    return false;
+    } while (!isLast(in));
 }
 
 bool cue_point::moveTo(double time) {
@@ -228,6 +247,7 @@ bool cue_point::updateEditTime(int& shift) {
         return moveTo(0.0);
     }
     shift = m_event.index() - before;
+    takeOverStrip();
     moveToPiece();
     remember();
     const double from = m_event.get_edit_time();

@@ -41,9 +41,11 @@ inline constexpr int kAnyCueChan = 65535;
 ///     in point cut off                 aaa^aa        bbba^a        found by the out point's stamp
 ///     event removed                    aa^aaa        bbbbbb        edit time 0, handle not valid
 ///
-/// A piece is taken for a part of the cue's event when it lies later on the same cel, plays the same strip
-/// within the strip times that the whole played, and plays the cue's strip time. Once its event is gone a
-/// cue stays at edit time 0 until `convert` finds the event elsewhere.
+/// A piece is taken for a part of the cue's event when it lies later on the same cel, up to the pair that has
+/// the event's out point, plays the same strip within the strip times that the whole played, and plays the
+/// cue's strip time. A cue whose moment was trimmed away stays with its event, outside. When other material
+/// is laid under its event it keeps its distance from the event's start. Once its event is gone a cue stays
+/// at edit time 0 until `convert` finds the event elsewhere.
 class QM_API cue_point {
 public:
     cue_point() = default;
@@ -129,7 +131,8 @@ private:
     bool updateEditTime(int& shift);
     bool moveTo(double editTime);
     bool findEvent(int shift);
-    bool moveToPiece();
+    void takeOverStrip();
+    void moveToPiece();
     void remember();
     bool attachByStamp(const Vector<cel*>& cels);
     bool attachByTimes(const Vector<cel*>& cels);

@@ -9,13 +9,6 @@ namespace {
 std::atomic<uint64_t> constructed{0};
 std::atomic<bool> defaultDebugMode{false};
 
-/// True for a name of the object store under which a save puts what the edit itself holds: its header, cues
-/// and channels.
-bool isHeldByEdit(const String& name) {
-    return name == EditHeaderProxy::EditHeaderId || name == "CueId" || name.starts_with("Celid") ||
-           IdStamp(name).getMagicType() == IdStampMagic::Channel;
-}
-
 } // namespace
 
 Edit::Edit() : m_header("EDIT", "END_EDIT_HEADER", this), m_channels(std::make_unique<ChannelSet>()) {
@@ -62,8 +55,10 @@ EditPtr Edit::copy() const {
     twin->m_markTime = m_markTime;
     twin->clear_cache_flags();
     for (const String& name : m_store.names()) {
-        if (isHeldByEdit(name)) {
-            continue;
+        const ChannelSet::Entry* const channel = m_channels->entry(IdStamp(name));
+        if (name == EditHeaderProxy::EditHeaderId || name == "CueId" || name.starts_with("Celid") ||
+            (channel != nullptr && channel->list == ChannelSet::Levels)) {
+            continue; // what a save puts there of the edit itself
         }
         if (const Streamable* const object = m_store.openObject(name)) {
             twin->m_store.storeObject(name, object->clone());

@@ -75,19 +75,34 @@ private:
 /// One edit in memory: a header of named properties and an ordered set of channels, each with its cel.
 ///
 /// The class is the face that callers know; the work is done in parts with one job each: header accessors
-/// (edit_header.cpp), the channel set (channel_set.h), dirt, changes and notification (edit_changes.cpp), the
-/// file (edit/persist). Its operations take no lock; callers that share one edit between threads use
-/// `section()`. Notifications run synchronously on the thread that makes a change. Queries for an unknown
-/// index or stamp answer `NO_CHAN`, the null stamp, a null cel or (`NoChan`, `INVALID`) and never fail
-/// otherwise.
+/// (edit_header.cpp), the channel set (detail/channel_set.h), dirt, changes and notification
+/// (edit_changes.cpp), cues, groups, the file (edit/persist). It owns its channels and objects; undo and the
+/// cache of open edits are the manager's.
+///
+/// Threads: handles and `numConstructed` may be used from any thread at any time. Everything else takes no
+/// lock: one edit is used by one thread at a time, and callers that share it hold `section()` around what
+/// they do. Of the edit's own operations only the first fetch of the channel groups takes it. Different edits
+/// are independent. Notifications run synchronously on the thread that makes a change; an observer may change
+/// the edit, subscribe, unsubscribe, and drop the last handle (the edit then goes once everybody is told).
+///
+/// Answers: queries for an unknown index or stamp give `NO_CHAN`, the null stamp, a null cel, an empty text
+/// or (`NoChan`, `INVALID`) and never fail otherwise. An operation that answers false, or a null stamp, or
+/// `NO_CHAN`, has changed nothing.
+///
+/// Changes: a write of the header dirties the edit. The operations on channels, names and times either record
+/// a change of their own (counted in "MOD_COUNT", described, dirtied, announced) or, where they are a part of
+/// what a caller describes with `setChangeDescription`, dirty only; each says which.
 class QM_API Edit : public Notifier, public Dirtiable {
 public:
+    /// Type and subtype of a channel; the default is "not found".
     struct ChanType {
         Edit_Chan_Type type = NoChan;
         Edit_Chan_SubType subtype = Edit_Chan_SubType::INVALID;
         bool operator==(const ChanType&) const = default;
     };
+    /// Outcome of reading a file.
     enum ReadFileRC : int { kReadOk = 0, kReadFailed = 1 };
+    /// What the header lets users do with the edit. The numbers live in files.
     enum Permissions : int { kPermissionsNone = 0, kPermissionsRead = 1, kPermissionsAll = 2 };
 
     /// The revision of the content that this library writes. It lives in files.
@@ -114,6 +129,7 @@ public:
 
     /// \name Handles (used by `EditPtr` alone)
     /// @{
+    /// Both return the new count.
     int32_t incRefCount();
     int32_t decRefCount();
     [[nodiscard]] int32_t refCount() const { return m_refCount.load(); }
@@ -121,9 +137,12 @@ public:
 
     /// \name Conversions
     /// @{
+    /// The channel type for a kind of cookie; `NoChan` for a kind that stands for none.
     [[nodiscard]] static Edit_Chan_Type edit_chan_type_from_cookie_type(Cookie_Type kind);
+    /// The channel type for an upper-case letter; `NoChan` for any other character.
     [[nodiscard]] static Edit_Chan_Type edit_chan_type_from_name(char letter);
     [[nodiscard]] static Edit_Chan_Type edit_chan_type_from_name(wchar_t letter);
+    /// The letter of a channel; the subtype counts for control channels only.
     [[nodiscard]] static Edit_Chan_Letter edit_chan_letter_from_type(Edit_Chan_Type type,
                                                                      Edit_Chan_SubType subtype);
     /// "SUBTYPE:ALIAS" and so on, as the files write it.
@@ -131,56 +150,89 @@ public:
     /// @}
 
     /// \name Identity and header
+    /// Each accessor reads or writes one key of the header store; a missing key gives the default stated.
+    /// Frame rate, revision, duration of the source, its medium and the transfer are cached: after writing
+    /// their keys through `Opts` call `clear_cache_flags`.
     /// @{
+    /// The item that the edit is; invalid for one that was not stored.
     [[nodiscard]] const cookie& get_cookie() const { return m_cookie; }
     void set_cookie(const cookie& item) { m_cookie = item; }
     [[nodiscard]] String get_cookie_str() const { return m_cookie.asString(); }
     /// The header store. A change to it dirties the edit.
     [[nodiscard]] configb& Opts() { return m_header; }
     [[nodiscard]] const configb& Opts() const { return m_header; }
-    /// The edit's name, header key "NAME"; UTF-8.
+    /// The edit's name, "NAME", UTF-8; empty. A new name records a change of type `kNameChanged`.
     [[nodiscard]] String getName() const;
     void setName(const String& name);
 
+    /// "READ_ONLY"; false. Setting it dirties the edit once, so that the property is saved; from then on
+    /// nothing does until it is taken away.
     [[nodiscard]] bool get_read_only() const;
     void set_read_only(bool readOnly);
+    /// "IS_BACKUP", non-zero for a backup copy; 0.
     [[nodiscard]] int get_backup() const;
     void set_backup(int backup);
+    /// "HIDDEN", non-zero for what is not shown to the user; 0.
     [[nodiscard]] int get_hidden() const;
     void set_hidden(int hidden);
+    /// "SEARCH_EDIT", non-zero for the result of a search; 0.
     [[nodiscard]] int get_search_edit() const;
     void set_search_edit(int search);
+    /// "ORIGINAL_MATERIAL", non-zero for what describes source material; 0. Setting it records the current
+    /// user as the item's owner, unless somebody is already or the cookie is invalid.
     [[nodiscard]] int get_original_material() const;
     void set_original_material(int original);
+    /// "ENTIRE_MEDIUM", non-zero for what covers a whole medium; 0. The question is answered from memory,
+    /// which reading the edit's file and the setter fill. Setting it has the project record updated.
     [[nodiscard]] int get_entire_medium() const { return m_entireMedium; }
     void set_entire_medium(int entire);
+    /// "UNDO_COOKIE" and "REDO_COOKIE", the items of the states before and after; the invalid cookie.
     [[nodiscard]] cookie get_undo_cookie() const;
     void set_undo_cookie(const cookie& item);
     [[nodiscard]] cookie get_redo_cookie() const;
     void set_redo_cookie(const cookie& item);
+    /// "CREATION_TIME", seconds since 1970 in 32 bits; 0.
     [[nodiscard]] int getCreationTime() const;
+    /// "CREATION_PROGRAM", a version; empty.
     [[nodiscard]] String getCreationProgram() const;
+    /// Both become now and this program.
     void setCreationDetails();
+    /// "MODIFICATION_TIME", seconds since 1970 in 32 bits; 0.
     [[nodiscard]] int getModificationTime() const;
+    /// "MODIFICATION_PROGRAM", a version; empty.
     [[nodiscard]] String getModificationProgram() const;
+    /// Both, and "MOD_TIME_V3", become now and this program.
     void setModificationDetails();
+    /// "MOD_COUNT", how many changes were recorded; 0. Stays at the greatest signed 64-bit number.
     [[nodiscard]] uint64_t getModificationCount() const;
     void incModificationCount();
+    /// "PERMISSIONS"; `kPermissionsAll`, also for a number that is none of them.
     [[nodiscard]] Permissions getPermissions() const;
     void setPermissions(Permissions permissions);
+    /// "ED2_REVISION", the revision of the content; 1. Setting -1 removes the key.
     [[nodiscard]] int get_ed2_revision() const;
     void set_ed2_revision(int revision);
+    /// "FRAME_RATE"; the project's, also for a code that is none. An edit of a revision below 501 takes it
+    /// from its television standard ("tvtype") and, unless it is read-only, keeps it in the header; with a
+    /// standard that is not known it has the project's. Setting an unknown rate does nothing.
     [[nodiscard]] Qx::FrameRate getFrameRate() const;
     void setFrameRate(Qx::FrameRate rate);
+    /// Seconds a frame.
     [[nodiscard]] double get_frame_time() const;
+    /// "SOURCE_MEDIUM_DURATION", seconds; `Qx::kNoTime`, also for a revision below 503.
     [[nodiscard]] double getSourceMediumDuration() const;
     void setSourceMediumDuration(double seconds);
+    /// "SOURCE_MEDIUM", a medium code; the project's default.
     [[nodiscard]] int getSourceMedium() const;
     void setSourceMedium(int medium);
+    /// "TRANSFER"; `kDefaultTransfer`.
     [[nodiscard]] int getTransfer() const;
     void setTransfer(int transfer);
+    /// "ELAPSED_ORIGIN", seconds; 0.
     [[nodiscard]] double get_elapsed_time_origin() const;
     void set_elapsed_time_origin(double seconds);
+    /// "OWNER", the name of the user who made the edit, UTF-8; empty. With `notify` another owner records a
+    /// change of type `kPropertiesChanged`.
     [[nodiscard]] String getOwner() const;
     void setOwner(const String& owner, bool notify);
     /// Drops what is cached of the header, so that the next question reads it.
@@ -189,48 +241,69 @@ public:
 
     /// \name Kind of item
     /// @{
+    /// What the item is, by its cookie and its header; not cached, the two are one question.
     [[nodiscard]] edit_log_type_t get_log_type() const;
     [[nodiscard]] edit_log_type_t log_type_get_m() const;
+    /// The same, after forgetting what is derived from the header.
     edit_log_type_t redetermineLogType();
+    /// Type 1, type 2.
     [[nodiscard]] bool isShot() const;
     [[nodiscard]] bool isEdit() const;
+    /// A shot or a ghost of one.
     [[nodiscard]] bool is_original() const;
+    /// An edit that was put together from a reel ("KEMROLL_TIME").
     [[nodiscard]] bool is_kemroll() const;
+    /// "shot", "edit", "ghost", "magic", "reel", "FXT"; empty for no type.
     [[nodiscard]] static String log_type_string_get_ms(edit_log_type_t type);
+    /// The inverse; "ghost" gives 3, any other text 0.
     [[nodiscard]] static edit_log_type_t getLogTypeFromString(std::string_view text);
     /// @}
 
     /// \name Channels
     /// Indices run over effects, video, audio, then levels channels; they shift when channels come and go,
-    /// stamps do not.
+    /// stamps do not. A filter passes a channel when its type is `AnyChan` or shares a bit with the
+    /// channel's, and its subtype is `ANY`, equals the channel's or shares a bit with it.
     /// @{
+    /// The number of channels, of all or of those that pass a filter.
     [[nodiscard]] int getNumChans() const;
     [[nodiscard]] uint16_t getNumChans(Edit_Chan_Type type) const;
     [[nodiscard]] uint16_t getNumChans(Edit_Chan_Type type, Edit_Chan_SubType subtype) const;
+    /// Stamp by index, and index by stamp.
     [[nodiscard]] IdStamp getId(int index) const;
     [[nodiscard]] int getIdx(const IdStamp& chan) const;
+    /// Position, from 0, among the channels of the same list; `NO_CHAN` for no channel.
     [[nodiscard]] int getIndexWithinType(const IdStamp& chan) const;
     [[nodiscard]] int getIndexWithinType(int index) const;
+    /// Type and subtype; (`NoChan`, `INVALID`) for a levels channel.
     [[nodiscard]] Edit_Chan_Type getChanType(int index) const;
     [[nodiscard]] Edit_Chan_SubType getChanSubtype(int index) const;
     [[nodiscard]] Edit_Chan_Type getChanType(const IdStamp& chan) const;
     [[nodiscard]] Edit_Chan_SubType getChanSubtype(const IdStamp& chan) const;
     [[nodiscard]] ChanType getChanTypeAndSubType(const IdStamp& chan) const;
+    /// True if it names a channel of any list (`AnyChan`), one with a cel that is video or effects
+    /// (`VideoChan`) or audio (`AudioChan`); false for every other type.
     [[nodiscard]] bool chanValid(int index, Edit_Chan_Type type = AnyChan) const;
     [[nodiscard]] bool chanValid(const IdStamp& chan, Edit_Chan_Type type = AnyChan) const;
+    /// The first channel that passes the filter, or `NO_CHAN`.
     [[nodiscard]] int getFirstChan(Edit_Chan_Type type = AnyChan,
                                    Edit_Chan_SubType subtype = Edit_Chan_SubType::ANY) const;
-    /// Moves `index` to the next channel that passes the filter, or to `NO_CHAN`, and returns it.
+    /// Moves `index` to the next channel that passes the filter, or to `NO_CHAN`, and returns it. Starts from
+    /// `kBeforeFirstChan`.
     int getNextChan(int& index, Edit_Chan_Type type = AnyChan,
                     Edit_Chan_SubType subtype = Edit_Chan_SubType::ANY) const;
+    /// Appends the channels that pass the filter, in order.
     void getChans(Vector<int>& chans, Edit_Chan_Type type = AnyChan,
                   Edit_Chan_SubType subtype = Edit_Chan_SubType::ANY) const;
     void getChans(Vector<IdStamp>& chans, Edit_Chan_Type type = AnyChan,
                   Edit_Chan_SubType subtype = Edit_Chan_SubType::ANY) const;
+    /// The channel's cel, which the edit owns; null for a levels channel. By stamp it is the cached one, see
+    /// `cacheCelForTrack`.
     [[nodiscard]] cel* getCel(const IdStamp& chan) const;
     [[nodiscard]] cel* get_edit_cel_p(int index) const;
     [[nodiscard]] cel* get_play_cel_p(int index) const { return get_edit_cel_p(index); }
+    /// True if both are channels, of one type.
     [[nodiscard]] bool sameType(const IdStamp& a, const IdStamp& b) const;
+    /// True if the channel holds nothing but black, a levels channel no node; also for no channel.
     [[nodiscard]] bool isEmpty(int index) const;
     [[nodiscard]] bool isEmpty(const IdStamp& chan) const;
     /// True if every channel is.
@@ -240,54 +313,97 @@ public:
     [[nodiscard]] VFXCel getVFXCel(const IdStamp& chan) const;
     [[nodiscard]] AudCel getAudCel(const IdStamp& chan) const;
     [[nodiscard]] AudLevelsCel getLevelsCel(const IdStamp& chan) const;
-    /// Changes the audio properties of a channel (output, cross-fades, levels channel). False if it is none.
+    /// Changes the audio properties of a channel (output, cross-fades, levels channel); dirties only. False
+    /// if it is none of the edit's, shares another cel than the channel's, or names a levels channel that is
+    /// not there or is another audio channel's. A levels channel that is let go stays.
     bool setAudCel(const AudCel& audio);
 
-    /// The channel's own name (UTF-8, may be empty), the name shown ("V1", "A2", "FX1" unless it has its own)
-    /// and the first channel whose shown name is `name`; the null stamp if none.
+    /// The channel's own name (UTF-8, may be empty), and the name shown: its own, else "FX1", "V1", "A2",
+    /// "L1" by its place in its list.
     [[nodiscard]] String getChanName(const IdStamp& chan) const;
-    bool setChanName(const IdStamp& chan, const String& name);
     [[nodiscard]] String getChanDisplayName(const IdStamp& chan) const;
+    /// Another name records a change of type `kChanNameChanged`. False for an unknown stamp and for a text
+    /// that is no UTF-8 or holds a line end or another control character.
+    bool setChanName(const IdStamp& chan, const String& name);
+    /// The first channel whose shown name is `name`, to the letter; the null stamp if none.
     [[nodiscard]] IdStamp getChanWithName(const String& name) const;
+    /// A text about the material of the channel, kept with its cel; the setter dirties only. False for an
+    /// unknown stamp.
     [[nodiscard]] String getMaterialInfo(const IdStamp& chan) const;
     bool setMaterialInfo(const IdStamp& chan, const String& text);
 
+    /// Inserts `count` empty channels, with fresh stamps, in one block.
+    ///
+    /// They go before channel `at` if `before` is true. If it is false they go behind it, as long as the
+    /// channel that follows `at` is of the type and subtype asked for: before that one. In every other case,
+    /// an `at` of `NO_CHAN` or in another list included, they go to the end of their list. With a `time`
+    /// above 0 they are filled with black to it, with -1.0 to the edit's end.
+    ///
+    ///     V1 V2 A1   2 audio at 2 (A1), before      ->  V1 V2 A1' A2' A1
+    ///     V1 V2 A1   1 video at 0 (V1), not before  ->  V1 V1' V2 A1
+    ///     V1 V2 A1   1 video at 1 (V2), not before  ->  V1 V2 V3' A1
+    ///
+    /// With `notify`: a change of type `kChansInserted` naming the first new channel is recorded, the message
+    /// "editChanAdded" is sent ("cookie type at count"), and the change is recorded again and announced, so
+    /// that "MOD_COUNT" rises by two. Without it the edit becomes dirty only and the caller describes what it
+    /// does. Cues of the channels behind are renumbered.
+    ///
+    /// False for a type and subtype that an edit does not hold, for a `count` of 0, for a time that is not
+    /// finite or not below `Qx::kNoTime`, and where there would be more than 32 audio or 24 video channels
+    /// ("Too many audio channels for <...>", "Too many video channels for <...>" in the log) or effects
+    /// channels beyond the reach of an index.
     bool insertChans(Edit_Chan_Type type, Edit_Chan_SubType subtype, int at, unsigned count, bool before,
                      bool notify, double time);
-    /// Returns the new index, or `NO_CHAN` on failure. The edit takes over `content` (null and 1 mean none).
+    /// Inserts one channel at the end of its list, as `insertChans` does. Returns the new index, or `NO_CHAN`
+    /// on failure. The edit takes over `content` (null and 1 mean none) when it succeeds; observers find it
+    /// in place.
     int addChan(Edit_Chan_Type type, cel* content = nullptr, bool notify = true,
                 Edit_Chan_SubType subtype = Edit_Chan_SubType::NONE, bool unused = false, double time = 0);
-    /// Removes one channel, an audio channel with its levels. False for an unknown stamp.
+    /// Removes one channel, an audio channel with its levels; its cues and its place in a group go too. With
+    /// `notify`: a change of type `kChansRemoved` naming it is recorded, the message "editChanDeleted" is
+    /// sent for each channel that went, levels first ("cookie type index count", with the index before the
+    /// removal), and the change is recorded again and announced. The cel lives until everybody was told.
+    /// False for an unknown stamp.
     bool removeChan(const IdStamp& chan, bool notify);
-    /// Removes every channel. False if there was none.
+    /// Removes every channel, with one message of type `AnyChan` and index 0. False if there was none.
     bool removeChans(bool notify);
-    /// Puts a cel (taken over) in the place of a channel's own. False for a levels channel or no channel.
+    /// Puts a cel (taken over on success) in the place of a channel's own; dirties only. Attached cues follow
+    /// to the events with the same stamps. False for a levels channel or no channel, or without a cel.
     bool set_edit_cel_p(int index, cel* content);
-    /// Makes the channel map answer with a cel. False for an unknown stamp.
+    /// Makes `getCel` by stamp answer with a cel that the caller owns, until the channel gets another or
+    /// goes; null ends it. No change of the edit. False for an unknown stamp or a levels channel.
     bool cacheCelForTrack(const IdStamp& chan, cel* content);
-    /// Gives a channel another stamp. False if the stamp is null or taken.
+    /// Gives a channel another stamp, in its group and its pairing with levels too; dirties only. False if
+    /// the stamp is null or taken.
     bool setChannelID(const IdStamp& chan, const IdStamp& newId);
-    /// Adds a levels channel and pairs it with an audio channel; null stamp on failure.
+    /// Adds a levels channel that shares the levels, and pairs it with an audio channel that has none;
+    /// dirties only. It keeps its stamp unless that is null or taken. The null stamp on failure: no such
+    /// audio channel, one that has levels, or invalid ones.
     IdStamp addLevelsChan(const IdStamp& audio, const AudLevelsCel& levels);
-    /// Adds a channel that was read, with its stamp, name and material text; an invalid or taken stamp is
-    /// replaced by a fresh one. The null stamp for a type that an edit does not hold.
+    /// Adds a channel that was read, at the end of its list, with its stamp, name and material text; an
+    /// invalid or taken stamp is replaced by a fresh one, and the standard name of its place counts as none
+    /// of its own. Records nothing and knows no limits: who reads checks those. The null stamp for a type
+    /// that an edit does not hold, or without content.
     IdStamp setupEditChannel(ChanType type, Qx::Ptr<cel> content);
-    /// Earliest start (`start` true) or latest end of the channels; 0 without any. `withLevels` counts levels
-    /// channels too.
+    /// Earliest start (`start` true) or latest end, in seconds, of the channels that hold anything; 0 without
+    /// any. `withLevels` counts levels channels too.
     [[nodiscard]] double get_start_or_end_time(bool start, bool withLevels) const;
     [[nodiscard]] double getStartTime() const { return get_start_or_end_time(true, false); }
     [[nodiscard]] double getEndTime() const { return get_start_or_end_time(false, false); }
-    /// Sync loss of a channel in seconds, 0 if none is recorded.
+    /// Sync loss of a channel in seconds, 0 if none is recorded; the setter dirties only. False for an
+    /// unknown stamp or a number that is not finite.
     [[nodiscard]] double getSyncLoss(const IdStamp& chan) const;
     bool setSyncLoss(const IdStamp& chan, double seconds);
     /// @}
 
     /// \name Current time and mark (seconds)
-    /// An edit has one of each; the channel argument is accepted and not used.
+    /// An edit has one of each; the channel argument is accepted and not used. The setters dirty when the
+    /// value changes, the `_raw` forms never; a number that is not finite is ignored.
     /// @{
     [[nodiscard]] double get_current_time(int chan = NO_CHAN) const;
     void set_current_time(int chan, double time);
     void set_current_time_raw(int chan, double time);
+    /// `Qx::kNoTime` when no mark is set.
     [[nodiscard]] double get_mark_time(int chan = NO_CHAN) const;
     void set_mark_time(int chan, double time);
     void set_mark_time_raw(int chan, double time);
@@ -295,27 +411,60 @@ public:
     void mark_invalidate(int chan = NO_CHAN);
     /// @}
 
-    /// \name Dirt and changes
+    /// \name Dirt
     /// @{
+    /// Makes the edit dirty without asking or telling anybody.
     void init_dirty();
+    /// The dirty flag, or the header store's dirty mark.
     [[nodiscard]] bool get_dirty() const;
+    /// To dirty: refused with a line in the log for an edit that is read-only, for the user or by its header.
+    /// An edit that was clean tells other machines that the user changes it (in network mode, unless it is of
+    /// log type 2) and goes onto the registry's dirty list. To clean: the flag and the header's mark go.
     void set_dirty(bool dirty);
+    /// `get_dirty`, or with `deep` a channel whose content changed since it was written.
     [[nodiscard]] bool isDirty(bool deep) const;
+    /// True if a save has something to do and may do it: the edit is dirty, neither temporary nor
+    /// write-suppressed, and not read-only for the user. Where writing is suppressed or not allowed to the
+    /// user the edit becomes clean.
     bool needsToBeWritten();
+    /// The header store changed: dirties the edit.
     void onConfigbDirty() override;
+    /// A temporary edit is never written.
     void setTemporary(bool temporary) { m_temporary = temporary; }
     [[nodiscard]] bool isTemporary() const { return m_temporary; }
+    /// Neither is one whose writing is suppressed; see `needsToBeWritten`.
     void setWriteSuppressed(bool suppressed) { m_writeSuppressed = suppressed; }
     [[nodiscard]] bool isWriteSuppressed() const { return m_writeSuppressed; }
+    /// While set, other machines are not told when the edit becomes dirty: for changes that come from them.
+    void setNetworkNotificationSuppressed(bool suppressed) { m_networkSuppressed = suppressed; }
+    [[nodiscard]] bool isNetworkNotificationSuppressed() const { return m_networkSuppressed; }
+    /// @}
+
+    /// \name Changes and notification
+    /// Messages go through the edit's own `Notifier`; their text begins with the cookie's.
+    /// @{
+    /// Records a change: it becomes the current description, published to observers with `notify`; where the
+    /// description before was of another type (and not the initial one) the current one then is `kSeveral`.
+    /// The description and the count of changes go into the header and the edit becomes dirty, but not for a
+    /// read-only edit or the type `kTransient`; `kEditDeleted` is written and does not dirty. Edit operations
+    /// and changes of channels, name and properties have the project record updated first.
     void setChangeDescription(const EditModification& modification, bool notify);
     void setChangeDescription(EditModificationType type, bool notify);
+    /// The description in the header; one of type `kNotDescribed` without any that reads.
     [[nodiscard]] EditModification getChangeDescription() const;
+    /// Starts describing afresh: the current description is the initial one and the header has none. Neither
+    /// announced nor dirtying.
     void resetChangeDescription();
+    /// Where observers follow the current description.
     [[nodiscard]] ValServer<EditModification>& getChangeDescriptionServer() { return m_changes; }
+    /// Sends "editDelete" and records a change of type `kEditDeleted`.
     void notifyEditDelete();
+    /// Send "impendingRevChange" and "revChange", with the number of `type` behind the cookie.
     void notifyImpendingRevisionChange(RevisionChangeType type);
     void notifyRevisionChange(RevisionChangeType type);
+    /// Sends "editShotSound" with the channel's stamp behind the cookie.
     void notifyShotSoundAltered(const IdStamp& chan);
+    /// The types of the messages, interned when the library loads. "editChanged" is for its users to send.
     [[nodiscard]] static NotifyMsgType getEditChangedNotifyMsgType();
     [[nodiscard]] static NotifyMsgType getEditDeleteNotifyMsgType();
     [[nodiscard]] static NotifyMsgType getChanAddedNotifyMsgType();
@@ -323,9 +472,15 @@ public:
     [[nodiscard]] static NotifyMsgType getShotSoundAlteredNotifyMsgType();
     [[nodiscard]] static NotifyMsgType getImpendingRevChangeMsgType();
     [[nodiscard]] static NotifyMsgType getRevChangeMsgType();
+    /// @}
+
+    /// \name Debugging and sharing
+    /// @{
+    /// Extra lines in the log about this edit; at first the process-wide default.
     [[nodiscard]] bool debugMode() const { return m_debug; }
     void setDebugMode(bool on) { m_debug = on; }
     static void setDefaultDebugMode(bool on);
+    /// For callers that share the edit between threads.
     [[nodiscard]] criticalSection& section() const { return m_section; }
     /// @}
 
@@ -385,8 +540,9 @@ public:
     void shuffleCueChans(int firstChan, int count);
     /// Puts the cues that are kept in the file into the object store, under "CueId".
     void storeCues();
-    /// Takes the stored cues over in the place of the edit's own, unattached until `convertCues`; without any
-    /// the edit has none. False, changing nothing, when what is stored cannot be read.
+    /// Takes the stored cues over in the place of the edit's own; those read from a file follow their events
+    /// after `convertCues`. Without any the edit has none. False, changing nothing, when what is stored
+    /// cannot be read.
     bool retrieveCues();
     /// @}
 
@@ -539,7 +695,7 @@ private:
     bool m_loading = false;
     bool m_writing = false;
     bool m_debug = false;
-    bool m_networkNotified = false;
+    bool m_networkSuppressed = false;
     int m_quietHeader = 0;
     int m_entireMedium = 0;
     mutable Qx::FrameRate m_frameRate;

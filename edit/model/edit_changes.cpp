@@ -99,7 +99,7 @@ void Edit::set_dirty(bool dirty) {
 
 /// Tells the other machines and the manager that a clean edit becomes dirty.
 void Edit::announceDirt() {
-    if (!m_networkNotified && Qx::Network::networkMode() && get_log_type() != kLogEdit) {
+    if (!m_networkSuppressed && Qx::Network::networkMode() && get_log_type() != kLogEdit) {
         Qx::Network::send({Qx::Network::EditBeingChanged, m_cookie, PermissionsManager::getCurrentUser()});
     }
     if (EditRegistry* const registry = EditRegistry::current()) {

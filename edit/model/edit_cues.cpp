@@ -83,11 +83,15 @@ void Edit::storeCues() {
 }
 
 bool Edit::retrieveCues() {
-    cue_list read;
-    if (m_store.contains(kCueId) && !m_store.readObject(kCueId, read)) {
+    if (!m_store.contains(kCueId)) {
+        m_cues.delete_all_cues();
+        return true;
+    }
+    const auto* stored = dynamic_cast<const cue_list*>(m_store.openObject(kCueId));
+    if (stored == nullptr) {
         return false;
     }
-    m_cues = std::move(read);
+    m_cues = *stored;
     return true;
 }
 

@@ -1,10 +1,9 @@
 #include "edit/model/edit.h"
 #include "edit/model/edit_registry.h"
 #include "edit/project/permissions_manager.h"
+#include "platform/services/clock.h"
 #include "platform/services/current_project.h"
 #include "platform/services/log.h"
-
-#include <ctime>
 
 namespace {
 
@@ -16,7 +15,7 @@ constexpr uint32_t kRevisionUnknown = UINT32_MAX;
 
 /// Seconds since 1970 as the header keeps them: the low 32 bits.
 int32_t now() {
-    return static_cast<int32_t>(static_cast<uint32_t>(std::time(nullptr)));
+    return static_cast<int32_t>(static_cast<uint32_t>(Qx::nowSeconds()));
 }
 
 } // namespace

@@ -4,6 +4,8 @@
 #include "platform/base/export.h"
 #include "platform/base/open_behaviour.h"
 
+#include <cstddef>
+
 class Edit;
 class configb;
 
@@ -22,8 +24,7 @@ public:
 
     /// Releases, then opens as the constructor does.
     EditPtr& open(const cookie& item, eEditOpenBehaviour behaviour);
-    /// Releases first, then holds the other. Assigning a handle that holds the only reference to an edit from
-    /// that edit is not guarded.
+    /// Releases first, then holds the other; for the edit that is held already nothing happens.
     EditPtr& operator=(const EditPtr& other);
     EditPtr& operator=(EditPtr&& other) noexcept;
     EditPtr& operator=(Edit* edit);
@@ -34,7 +35,10 @@ public:
     void invalidate();
 
     bool operator==(const EditPtr& other) const { return m_edit == other.m_edit; }
+    /// The overloads keep a plain pointer and `nullptr` from being ambiguous with the conversion below.
     bool operator==(const Edit* edit) const { return m_edit == edit; }
+    bool operator==(Edit* edit) const { return m_edit == edit; }
+    bool operator==(std::nullptr_t) const { return m_edit == nullptr; }
     Edit* operator->() const { return m_edit; }
     operator Edit*() const { return m_edit; }
     /// The edit's header store. The handle must be valid.

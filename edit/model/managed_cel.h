@@ -77,7 +77,8 @@ public:
     void setSoundOutputEnabled(bool on) { m_output = on; }
 
     /// \name Cross-fades
-    /// Overlapping sounds lie on two helper cels while cross-fades are on; any change makes them out of date.
+    /// Overlapping sounds lie on two helper cels while cross-fades are on. Any change of the cel makes them
+    /// out of date, also one through another object that shares it.
     /// @{
     [[nodiscard]] bool getXFadesEnabled() const { return m_xfades; }
     void setXFadesEnabled(bool on);
@@ -101,4 +102,5 @@ private:
     bool m_output = true;
     bool m_xfades = false;
     Qx::Ptr<cel> m_xfadeCels[2];
+    uint64_t m_xfadeChangeCount = 0; ///< `cel::changeCount` that the helper cels were made for
 };

@@ -1,5 +1,4 @@
 #include "edit/model/channel_group_list.h"
-#include "edit/model/cue_list.h"
 #include "edit/persist/detail/edit_file.h"
 #include "platform/base/attrib_value_pair.h"
 #include "platform/services/log.h"
@@ -39,6 +38,7 @@ struct EditFile::LoadedCel {
 struct EditFile::LoadedLevels {
     AudLevelsCel levels;
     IdStamp audio;
+    String name; ///< empty unless the levels channel has one of its own
 };
 
 namespace {
@@ -133,6 +133,7 @@ Qx::Status EditFile::loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
             return Qx::Status::failure("object " + pair.attrib() + " is not a level envelope that reads (" +
                                        edit.m_store.objectError() + ")");
         }
+        loaded.name = edit.m_header.getString(EditKeys::numbered(EditKeys::kLevelsName, m));
         levels.push_back(std::move(loaded));
     }
 }
@@ -158,7 +159,9 @@ Qx::Status EditFile::setupChannels(Edit& edit, std::vector<LoadedCel>& cels) {
                 "EditFile::setupChannels( %s ) - channel %s has a stamp that is taken; given a new one\n",
                 edit.get_cookie_str().c_str(), name.c_str());
         }
-        if (!loaded.kindIsStated && !name.empty() && edit.getChanDisplayName(id) != name) {
+        // The standard name of a channel may be the name that it was given, too.
+        const bool own = loaded.kindIsStated ? loaded.ownName : edit.getChanDisplayName(id) != name;
+        if (own && !name.empty()) {
             edit.setChanName(id, name);
         }
     }
@@ -204,18 +207,24 @@ Qx::Status EditFile::readCels(Edit& edit) {
     if (cels.empty()) {
         return Qx::Status::failure("it has no channels");
     }
+    // The cues' channel numbers are those of the whole edit: they do not move as its channels are added.
+    const cue_list cues = edit.m_cues;
+    edit.m_cues.delete_all_cues();
     status = setupChannels(edit, cels);
     if (!status) {
         return status;
     }
     for (LoadedLevels& loaded : levels) {
         loaded.levels.checkNodesRevision(edit.getAudCel(loaded.audio));
-        if (!edit.addLevelsChan(loaded.audio, loaded.levels).valid()) {
+        const IdStamp id = edit.addLevelsChan(loaded.audio, loaded.levels);
+        if (!id.valid()) {
             return Qx::Status::failure("the levels " + loaded.levels.id().asString() +
                                        " could not be joined to their audio channel");
         }
+        edit.setChanName(id, loaded.name);
     }
-    convertCues(edit);
+    edit.m_cues = cues;
+    edit.convertCues();
     return {};
 }
 
@@ -231,28 +240,11 @@ Qx::Status EditFile::readGroups(Edit& edit) {
 }
 
 Qx::Status EditFile::readCues(Edit& edit) {
-    if (!edit.m_store.contains(EditKeys::kCues)) {
-        return {};
-    }
-    cue_list stored;
-    if (!edit.m_store.readObject(EditKeys::kCues, stored)) {
+    if (!edit.retrieveCues()) {
         return Qx::Status::failure("object " + String(EditKeys::kCues) + " is not a cue list that reads (" +
                                    edit.m_store.objectError() + ")");
     }
-    cue_list& cues = edit.get_cues();
-    cues.delete_all_cues();
-    for (size_t i = 0; i < stored.get_num_cue_points(0); ++i) {
-        cues.add_cue_point(*stored.get_cue_point(i, 0));
-    }
     return {};
-}
-
-void EditFile::convertCues(Edit& edit) {
-    Vector<cel*> cels;
-    for (int i = 0; i < edit.getNumChans(); ++i) {
-        cels.push_back(edit.get_edit_cel_p(i));
-    }
-    edit.get_cues().convert(cels);
 }
 
 // ---- writing
@@ -267,14 +259,6 @@ Qx::Ptr<cel> EditFile::sharedCel(const Edit& edit, const IdStamp& chan) {
     }
     return type.subtype == Edit_Chan_SubType::ALIAS ? edit.getVFXCel(chan).sharedCel()
                                                     : edit.getVidCel(chan).sharedCel();
-}
-
-void EditFile::lendCues(Edit& edit, cue_list& stored) {
-    const cue_list& cues = edit.get_cues();
-    for (size_t i = 0; i < cues.get_num_cue_points(CueFlag::kKept); ++i) {
-        stored.add_cue_point(*cues.get_cue_point(i, CueFlag::kKept));
-    }
-    edit.m_store.lendObject(EditKeys::kCues, stored, true);
 }
 
 void EditFile::lendCels(Edit& edit) {
@@ -319,9 +303,17 @@ void EditFile::lendCels(Edit& edit) {
             levels.writeToStore(store);
             header.setString(EditKeys::numbered(EditKeys::kLevels, m),
                              Qx::AttribValuePair(levels.id().asString(), id.asString()).asString());
+            const String levelsName = EditKeys::numbered(EditKeys::kLevelsName, m);
+            const String name = edit.getChanName(levels.id());
+            if (name.empty()) {
+                header.remove(levelsName);
+            } else {
+                header.setString(levelsName, name);
+            }
             ++m;
         }
     }
+    EditKeys::removeNumbered(header, EditKeys::kLevelsName, m);
     EditKeys::removeNumbered(header, EditKeys::kCelKind, n);
     EditKeys::removeNumbered(header, EditKeys::kLevels, m);
     for (int gone = n; store.removeObject(EditKeys::numbered(EditKeys::kCelid, gone)); ++gone) {
@@ -350,6 +342,7 @@ void EditFile::reset(Edit& edit) {
         const Quiet quiet(edit);
         edit.removeChans(false);
         edit.get_cues().delete_all_cues();
+        edit.forgetGroups();
         edit.m_storedCels.reset();
     }
     const cookie item = edit.m_cookie;

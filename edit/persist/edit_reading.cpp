@@ -55,6 +55,13 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
         return kReadFailed;
     }
     m_cookie = item;
+    if (getNumChans() > 0 &&
+        (behaviour == eOpenExisting || (behaviour == eOpenOrCreate && Qx::fileExists(file)))) {
+        // Before the store is opened, as channels that go leave the groups in it.
+        EditFile::reset(*this);
+    }
+    forgetGroups();
+    m_storedCels.reset();
 
     ReadFileRC result = kReadFailed;
     const String name = Qx::fileNameOf(file);

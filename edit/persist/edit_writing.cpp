@@ -1,4 +1,3 @@
-#include "edit/model/cue_list.h"
 #include "edit/persist/detail/edit_file.h"
 #include "edit/project/permissions_manager.h"
 #include "platform/services/edit_filenames.h"
@@ -99,9 +98,9 @@ bool Edit::store(const WString& path) {
     }
     {
         const EditFile::Quiet quiet(*this);
-        cue_list cues;
         updateHeaderBeforeWrite();
-        EditFile::lendCues(*this, cues);
+        storeCues();
+        storeGroups();
         EditFile::lendCels(*this);
         const EditHeaderProxy header(m_header);
         m_store.lendObject(EditHeaderProxy::EditHeaderId, header, true);
@@ -178,6 +177,7 @@ Qx::Status EditFile::openStore(Edit& edit, const String& path) {
         store.storeObject(object, std::move(held));
     }
     edit.m_storedCels.reset();
+    edit.forgetGroups();
     if (result != TagBag::NewStore && result != TagBag::Opened) {
         return Qx::Status::failure(store.openError());
     }

@@ -200,7 +200,8 @@ Qx::Status parseByFields(const Fields& fields, EdlLine& parsed) {
         return Qx::Status::failure(
             "edit type " +
             quotedText({middle->data(), size_t(end[-1].data() - middle->data()) + end[-1].size()}) +
-            " is none; write C, D, Wnnn or K O with a duration in frames, K or K B");
+            " is not known or lacks its duration; write C, D, Wnnn or K O with a number of "
+            "frames, K or K B");
     }
     parsed.event.reel = fields[1];
     return {};

@@ -2,9 +2,16 @@
 #include "platform/media/timecode.h"
 
 #include <algorithm>
+#include <cmath>
 
 // What the lines between the events say of them.
 namespace interchange::detail {
+
+namespace {
+
+constexpr double kGreatestSpeed = 99'999; // frames a second
+
+} // namespace
 
 void EdlReading::readNote(std::string_view line) {
     const Note note = parseNote(line);
@@ -145,6 +152,7 @@ void EdlReading::applySpeed(std::string_view value) {
     const bool plain = digits.find_first_not_of("0123456789.-") == std::string_view::npos;
     Qx::TimecodeFields fields;
     if (!plain || digits.size() > 16 || !Qx::textToDouble(digits, speed.framesPerSecond) ||
+        std::abs(speed.framesPerSecond) > kGreatestSpeed ||
         !Qx::parseTimecode(m_fields[count - 1], m_list.rate, fields)) {
         m_report.addWarning(m_line, "M2 does not read as reel, frames a second and timecode; normal speed is "
                                     "taken");

@@ -7,7 +7,7 @@
 namespace Qx {
 
 /// What the application says of the project that is open. A plain value.
-struct CurrentProject {
+struct QM_API CurrentProject {
     cookie project = cookie("P0001000");
     String rootFolder; ///< the projects' base folder; each project has a folder of its cookie's text in it
     String name;
@@ -19,7 +19,7 @@ struct CurrentProject {
 
     /// The folder that holds the project's edit files. Empty without a root folder, or when the project is
     /// not storable.
-    [[nodiscard]] String folder() const;
+    [[nodiscard]] QM_API String folder() const;
 };
 
 /// A copy of what is set. Safe on any thread. Before the first call of `setCurrentProject` the root folder is

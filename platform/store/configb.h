@@ -26,8 +26,8 @@ public:
 ///
 /// Text form: the name on a line of its own, a line a key, the end marker on a line of its own. The line of a
 /// key is "KEY:type value", where type is int, int64, double, string, cookie or bool. In a string a backslash
-/// is written as two, a line feed as "\\n", a carriage return as "\\r" and any other control character as
-/// "\\x" and two hexadecimal digits. A double is its shortest decimal text, or "bits" and its bits as a
+/// is written as two, a line feed as "\n", a carriage return as "\r" and any other control character as
+/// "\x" and two hexadecimal digits. A double is its shortest decimal text, or "bits" and its bits as a
 /// decimal number where that text would lose some (a NaN that carries a payload), so it reads back as the
 /// same bits. A cookie is its text, or "words" and its three words as decimal numbers where it is not
 /// storable. A bool is true or false; 1 and 0 are read too. Lines of a type that is not known

@@ -267,10 +267,8 @@ FileError readFully(OpenFile& file, std::span<std::byte> to, size_t& got) {
     got = 0;
     while (got < to.size()) {
         size_t piece = 0;
-        if (FileError error = file.read(to.data() + got, to.size() - got, piece)) {
-            if (error.code == EINTR) {
-                continue;
-            }
+        if (FileError error =
+                retryInterrupted([&] { return file.read(to.data() + got, to.size() - got, piece); })) {
             return error;
         }
         if (piece == 0) {
@@ -285,11 +283,11 @@ FileError StoreImage::read(const String& path, bool headerMustHold, StoreVerdict
     drop();
     m_identity = {};
     std::unique_ptr<OpenFile> file;
-    if (FileError error = fileSystem().open(path, OpenMode::Read, file)) {
+    if (FileError error = retryInterrupted([&] { return fileSystem().open(path, OpenMode::Read, file); })) {
         return error;
     }
     FileInfo info;
-    if (FileError error = file->info(info)) {
+    if (FileError error = retryInterrupted([&] { return file->info(info); })) {
         return error;
     }
     if (info.size > kMaxStoreSize) {
@@ -331,8 +329,10 @@ bool StoreSource::open(const StoreIdentity& identity) {
     m_file.reset();
     std::unique_ptr<OpenFile> file;
     size_t got = 0;
-    const bool opened = identity.known && !fileSystem().open(identity.path, OpenMode::Read, file) &&
-                        !file->info(info) && !readFully(*file, header, got);
+    const bool opened =
+        identity.known &&
+        !retryInterrupted([&] { return fileSystem().open(identity.path, OpenMode::Read, file); }) &&
+        !retryInterrupted([&] { return file->info(info); }) && !readFully(*file, header, got);
     const FileInfo& was = identity.info;
     const bool unmoved = !identity.infoKnown || (info.device == was.device && info.inode == was.inode &&
                                                  info.size == was.size && info.modifiedNs == was.modifiedNs);
@@ -346,7 +346,8 @@ bool StoreSource::open(const StoreIdentity& identity) {
 
 bool StoreSource::read(uint64_t offset, std::span<std::byte> to) {
     size_t got = 0;
-    return m_file != nullptr && !m_file->seek(offset) && !readFully(*m_file, to, got) && got == to.size();
+    return m_file != nullptr && !retryInterrupted([&] { return m_file->seek(offset); }) &&
+           !readFully(*m_file, to, got) && got == to.size();
 }
 
 } // namespace Qx::detail

@@ -129,7 +129,8 @@ Status StoreWriter::commit(StoreIdentity& identity, bool& replaced) {
     if (replaced) {
         identity = {m_path, {}, bytes, true, false};
         // Within a batch the name still holds the old file.
-        identity.infoKnown = m_file.replaced() && !fileSystem().info(m_path, identity.info);
+        identity.infoKnown =
+            m_file.replaced() && !retryInterrupted([&] { return fileSystem().info(m_path, identity.info); });
     }
     return error ? Status::failure(error.text()) : Status();
 }

@@ -47,7 +47,7 @@ TagBag::OpenResult resultOf(StoreState state) {
 /// What a name stands for, as far as it decides the result of opening; Opened for a regular file.
 TagBag::OpenResult lookAt(const String& path, String& complaint) {
     Qx::FileInfo info;
-    if (const Qx::FileError error = Qx::fileSystem().info(path, info)) {
+    if (const Qx::FileError error = Qx::retryInterrupted([&] { return Qx::fileSystem().info(path, info); })) {
         complaint = error.text();
         return TagBag::NotOpened;
     }
@@ -180,6 +180,10 @@ const String& TagBag::folder() const {
 
 void TagBag::setFolder(const String& inFolder) {
     m_contents->folder = inFolder;
+}
+
+void TagBag::setExtension(const String& extension) {
+    m_contents->extension = extension;
 }
 
 String TagBag::path() const {

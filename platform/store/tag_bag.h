@@ -59,6 +59,8 @@ public:
     void setId(const cookie& item);
     [[nodiscard]] const String& folder() const;
     void setFolder(const String& folder);
+    /// The extension of the file's name, with its dot.
+    void setExtension(const String& extension);
     [[nodiscard]] String path() const;
 
     /// Binds an object under a name; the bag owns it, and a former object of that name goes. It counts as

@@ -239,6 +239,7 @@ void TagBag::Contents::adopt(const std::vector<Written>& written, const StoreIde
             forgetBytes(entry);
         }
         entry.place = row.place;
+        entry.onFile = true;
         entry.onFile = identity.known;
         entry.changed = entry.changed && !durable;
     }

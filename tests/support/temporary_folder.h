@@ -6,6 +6,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <sstream>
 #include <stdexcept>
 #include <string>
 
@@ -40,7 +41,12 @@ public:
     /// A file's bytes; "(missing)" when it cannot be read.
     [[nodiscard]] std::string read(const std::string& name) const {
         std::ifstream file(m_path / name, std::ios::binary);
-        return file ? std::string(std::istreambuf_iterator<char>(file), {}) : std::string("(missing)");
+        if (!file) {
+            return "(missing)";
+        }
+        std::ostringstream bytes;
+        bytes << file.rdbuf();
+        return bytes.str();
     }
     /// How many names there are in the folder, not looking into folders in it.
     [[nodiscard]] size_t numNames() const {

@@ -2,8 +2,6 @@
 
 #include "edit/model/edit.h"
 
-class cue_list;
-
 /// Names in edit files. They live in files: do not change them.
 namespace EditKeys {
 inline constexpr const char* kNumChans = "NUM_CHANS";
@@ -14,10 +12,11 @@ inline constexpr const char* kSyncError = "SYNC_ERROR";                ///< foll
 inline constexpr const char* kSoundOutput = "SOUND_OUTPUT_FLAG";       ///< followed by the old index
 inline constexpr const char* kSoundOutputXFade = "SOUND_OUTPUT_XFADE"; ///< followed by the old index
 inline constexpr const char* kEntireMedium = "ENTIRE_MEDIUM";
-inline constexpr const char* kLevels = "Levels";   ///< followed by a counter
-inline constexpr const char* kCelKind = "CelKind"; ///< followed by the counter of a Celid object
-inline constexpr const char* kCelid = "Celid";     ///< name of a cel object, followed by a counter
-inline constexpr const char* kCues = "CueId";      ///< name of the cue object
+inline constexpr const char* kLevels = "Levels";         ///< followed by a counter
+inline constexpr const char* kLevelsName = "LevelsName"; ///< followed by the counter of a Levels key
+inline constexpr const char* kCelKind = "CelKind";       ///< followed by the counter of a Celid object
+inline constexpr const char* kCelid = "Celid";           ///< name of a cel object, followed by a counter
+inline constexpr const char* kCues = "CueId";            ///< name of the cue object
 inline constexpr const char* kTvType = "tvtype";
 inline constexpr const char* kFrameRate = "FRAME_RATE";
 inline constexpr const char* kRevision = "ED2_REVISION";
@@ -81,8 +80,6 @@ public:
     static Qx::Status openStore(Edit& edit, const String& path);
     /// What the header says of channels, times and flags, for a file that has the channels `order`.
     static void updateHeader(const Edit& edit, configb& header, const Vector<IdStamp>& order);
-    /// Fills `stored` with the cues that are kept in the file and lends it to the store.
-    static void lendCues(Edit& edit, cue_list& stored);
     static void lendCels(Edit& edit);
     /// Ends the lending. Afterwards the edit alone owns its cels.
     static void extractCelsFromStore(Edit& edit, bool written);
@@ -93,8 +90,6 @@ public:
     /// The first video channel and the audio channels: what a legacy text holds. Empty without video.
     [[nodiscard]] static Vector<IdStamp> legacyChannels(const Edit& edit);
     static Qx::Status readLegacy(Edit& edit, const String& path);
-    /// Re-attaches the cues to the events of the channels.
-    static void convertCues(Edit& edit);
     /// @}
 
     struct LoadedCel;

@@ -4,6 +4,7 @@
 #include "platform/media/tv_standard.h"
 
 class Edit;
+class TextFile;
 class configb;
 
 /// The steps that bring an edit of an older revision, or one from a legacy text, to the current model. Each
@@ -13,6 +14,10 @@ namespace LegacyUpgrades {
 /// The television standard that a header names: its "tvtype", else what follows from its frame rate; one
 /// that is not known when it tells neither.
 [[nodiscard]] Qx::Ed2Support::TVStd getTvStandard(const configb& header);
+
+/// The television standard that a legacy text names in the "tvtype" line of its header, else the one that
+/// follows from its frame rate.
+[[nodiscard]] Qx::Ed2Support::TVStd getNamedStandard(const TextFile& file);
 
 /// What a conversion must not change, remembered over it.
 class RememberedFlags {

@@ -1,0 +1,232 @@
+#include "edit/model/aud_levels_cel.h"
+
+#include "platform/media/frame_rate.h"
+
+#include <cmath>
+
+namespace {
+
+constexpr const char* kLayerName = "AudLevels";
+constexpr uint8_t kMajor = 1;
+using Store = Aud::DynamicLevelControl::Store;
+
+} // namespace
+
+/// The shared part: what is kept in the object store.
+class AudLevelsCel::Contents : public Streamable {
+public:
+    const char* layerName() const override { return kLayerName; }
+    const char* shortLayerName() const override { return kLayerName; }
+    uint8_t revisionMajor() const override { return m_major; }
+    uint8_t revisionMinor() const override { return m_minor; }
+    void revisionMajor(uint8_t major) override { m_major = major; }
+    void revisionMinor(uint8_t minor) override { m_minor = minor; }
+    void pack(PStream& stream) const override { nodes.pack(stream); }
+    void unpack(PStream& stream) override {
+        if (m_major > kMajor) {
+            stream.fail();
+            return;
+        }
+        nodes.unpack(stream);
+        changed = false;
+    }
+    std::unique_ptr<Streamable> clone(BuilderType) const override {
+        return std::make_unique<Contents>(*this);
+    }
+
+    Store nodes;
+    bool changed = false;
+
+private:
+    static const bool registered;
+
+    uint8_t m_major = kMajor;
+    uint8_t m_minor = 0;
+};
+
+const bool AudLevelsCel::Contents::registered = [] {
+    Streamable::registerBuilder(kLayerName,
+                                [] { return std::unique_ptr<Streamable>(std::make_unique<Contents>()); });
+    return true;
+}();
+
+AudLevelsCel::~AudLevelsCel() = default;
+
+AudLevelsCel AudLevelsCel::create() {
+    AudLevelsCel made;
+    made.m_contents = std::make_shared<Contents>();
+    made.m_contents->changed = true;
+    made.m_id = IdStamp::fresh(IdStampMagic::Channel);
+    return made;
+}
+
+bool AudLevelsCel::is_dummy() const {
+    return !valid() || m_contents->nodes.empty();
+}
+
+AudLevelsCel AudLevelsCel::clone() const {
+    AudLevelsCel made;
+    made.m_contents = valid() ? std::make_shared<Contents>(*m_contents) : nullptr;
+    made.m_id = m_id;
+    return made;
+}
+
+const AudLevelsCel::Store& AudLevelsCel::getNodeStore() const {
+    static const Store none;
+    return valid() ? m_contents->nodes : none;
+}
+
+AudLevelsCel::Store& AudLevelsCel::changeNodeStore() {
+    m_contents->changed = true;
+    return m_contents->nodes;
+}
+
+bool AudLevelsCel::insertNode(double time, float level) {
+    if (!valid() || !(std::abs(time) <= Store::kGreatestTime) || !std::isfinite(level)) {
+        return false;
+    }
+    changeNodeStore().insertNode(time, level);
+    return true;
+}
+
+AudLevelsCel::Range AudLevelsCel::getExtents(Editable::ExtentType type, bool fromZero) const {
+    const auto& nodes = getNodeStore().nodes();
+    size_t first = 0;
+    size_t last = nodes.size();
+    if (type == Editable::MaterialOnly) {
+        while (first < last && nodes[first].level == 1.0f) {
+            ++first;
+        }
+        while (first < last && nodes[last - 1].level == 1.0f) {
+            --last;
+        }
+    }
+    if (first == last) {
+        return Editable::invalidRange();
+    }
+    return {fromZero ? std::min(0.0, nodes[first].time) : nodes[first].time, nodes[last - 1].time};
+}
+
+namespace {
+
+bool isUsableTime(double time) {
+    return std::abs(time) <= Store::kGreatestTime;
+}
+
+bool isUsableRange(const cel::Range& range) {
+    return isUsableTime(range.start()) && isUsableTime(range.end()) && range.length() > Qx::kTimeTolerance;
+}
+
+} // namespace
+
+bool AudLevelsCel::insert(const AudLevelsCel& source, const Range& sourceRange, double at) {
+    const auto& nodes = getNodeStore().nodes();
+    const double last = nodes.empty() ? at : std::max(at, nodes.back().time);
+    if (!valid() || !isUsableRange(sourceRange) || !isUsableTime(at) ||
+        !isUsableTime(last + sourceRange.length())) {
+        return false;
+    }
+    changeNodeStore().insert(source.getNodeStore(), sourceRange, at);
+    return true;
+}
+
+bool AudLevelsCel::remove(const Range& range) {
+    if (!valid() || !isUsableRange(range)) {
+        return false;
+    }
+    changeNodeStore().remove(range);
+    return true;
+}
+
+bool AudLevelsCel::replace(const AudLevelsCel& source, const Range& sourceRange, double at) {
+    if (!valid() || !isUsableRange(sourceRange) || !isUsableTime(at) ||
+        !isUsableTime(at + sourceRange.length())) {
+        return false;
+    }
+    changeNodeStore().replace(source.getNodeStore(), sourceRange, at);
+    return true;
+}
+
+bool AudLevelsCel::simplify() {
+    if (!valid()) {
+        return false;
+    }
+    const size_t before = m_contents->nodes.size();
+    m_contents->nodes.simplify();
+    if (m_contents->nodes.size() == before) {
+        return false;
+    }
+    m_contents->changed = true;
+    return true;
+}
+
+bool AudLevelsCel::changed() const {
+    return valid() && m_contents->changed;
+}
+
+void AudLevelsCel::setChanged(bool changed) {
+    if (valid()) {
+        m_contents->changed = changed;
+    }
+}
+
+bool AudLevelsCel::checkNodesRevision(const AudCel& audio) {
+    if (!valid() || m_contents->revisionMajor() >= kMajor) {
+        return false;
+    }
+    static_cast<void>(replaceClipNodes(audio));
+    m_contents->revisionMajor(kMajor);
+    m_contents->revisionMinor(0);
+    m_contents->changed = true;
+    return true;
+}
+
+bool AudLevelsCel::replaceClipNodes(const AudCel& audio) {
+    if (!valid() || !audio.valid()) {
+        return false;
+    }
+    const cel& clips = *audio.getCel();
+    Store built = m_contents->nodes;
+    bool found = false;
+    for (int i = 0; i + 1 < clips.numEvents(); i += 2) {
+        const channel_event in = clips.get_event(i);
+        const channel_event out = clips.get_event(i + 1);
+        const double length = out.editTime - in.editTime;
+        const bool ownLevels = in.level != 1.0f || out.level != 1.0f;
+        if (in.strip.isBlack() || !ownLevels || !(length > Store::kStep)) {
+            continue;
+        }
+        Store clip;
+        clip.insertNode(0, in.level);
+        clip.insertNode(length, out.level);
+        built.replace(clip, {0, length}, in.editTime);
+        found = true;
+    }
+    if (!found || built == m_contents->nodes) {
+        return false;
+    }
+    changeNodeStore() = std::move(built);
+    return true;
+}
+
+void AudLevelsCel::writeToStore(TagBag& store) const {
+    if (valid()) {
+        store.lendObject(m_id.asString(), *m_contents, m_contents->changed);
+    }
+}
+
+AudLevelsCel AudLevelsCel::createFromStore(const IdStamp& id, TagBag& store) {
+    AudLevelsCel made;
+    auto contents = std::make_shared<Contents>();
+    if (id.valid() && store.readObject(id.asString(), *contents)) {
+        made.m_contents = std::move(contents);
+        made.m_id = id;
+    }
+    return made;
+}
+
+void AudLevelsCel::extractFromStore(TagBag& store) const {
+    if (valid()) {
+        static_cast<void>(store.extractObject(m_id.asString()));
+    }
+}

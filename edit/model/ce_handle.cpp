@@ -1,0 +1,198 @@
+#include "edit/model/ce_handle.h"
+
+#include "edit/model/detail/cel_events.h"
+
+using namespace cel_detail;
+
+channel_event* ce_handle::event() const {
+    return const_cast<channel_event*>(get_chan_evnt_ptr());
+}
+
+const channel_event* ce_handle::get_chan_evnt_ptr() const {
+    return m_cel != nullptr ? m_cel->getChanEventPtr(m_index) : nullptr;
+}
+
+bool ce_handle::is_in_point() const {
+    return get_ce_info() == CE_IN_POINT;
+}
+
+bool ce_handle::is_out_point() const {
+    return get_ce_info() == CE_OUT_POINT;
+}
+
+ce_info ce_handle::get_ce_info() const {
+    const channel_event* its = event();
+    return its != nullptr ? its->kind : ce_info{};
+}
+
+ce_handle ce_handle::get_next_ceh(ce_info kind) const {
+    ce_handle next = *this;
+    next.increment(kind);
+    return next;
+}
+
+ce_handle ce_handle::get_prev_ceh(ce_info kind) const {
+    ce_handle before = *this;
+    before.decrement(kind);
+    return before;
+}
+
+bool ce_handle::next() {
+    increment(CE_ANY);
+    return valid() != 0;
+}
+
+ce_handle ce_handle::get_start_ceh() const {
+    return m_cel != nullptr ? m_cel->get_start_ceh() : ce_handle();
+}
+
+ce_handle ce_handle::get_end_ceh() const {
+    return m_cel != nullptr ? m_cel->get_end_ceh() : ce_handle();
+}
+
+bool ce_handle::find_ceh(ce_handle& found, double time, ce_info kind) const {
+    found = m_cel != nullptr ? m_cel->find_ceh(time, kind) : ce_handle();
+    return found.valid() != 0;
+}
+
+bool ce_handle::set_edit_time(double time) {
+    return m_cel != nullptr && m_cel->set_edit_time(*this, time, false);
+}
+
+double ce_handle::get_strip_time(double editTime) const {
+    const channel_event* its = event();
+    if (its == nullptr) {
+        return 0;
+    }
+    return editTime == Qx::kStripTimeAtEvent ? its->stripTime
+                                             : stripAt(*matching_in_ceh().get_chan_evnt_ptr(), editTime);
+}
+
+void ce_handle::set_strip_time(double time) {
+    if (m_cel != nullptr) {
+        m_cel->set_strip_time(*this, time);
+    }
+}
+
+cookie ce_handle::get_strip_cookie() const {
+    const channel_event* its = event();
+    return its != nullptr ? its->strip : invalid_cookie;
+}
+
+void ce_handle::set_strip_cookie(const cookie& strip) {
+    change([&](channel_event& its) { its.strip = strip; });
+}
+
+float ce_handle::get_strip_level(double editTime) const {
+    const channel_event* its = event();
+    if (its == nullptr) {
+        return 0;
+    }
+    const channel_event* out = matching_out_ceh().get_chan_evnt_ptr();
+    if (editTime == Qx::kStripTimeAtEvent || out == nullptr) {
+        return its->level;
+    }
+    return levelAt(*matching_in_ceh().get_chan_evnt_ptr(), *out, editTime);
+}
+
+void ce_handle::set_strip_level(float level) {
+    change([&](channel_event& its) { its.level = level; });
+}
+
+double ce_handle::get_strip_velocity() const {
+    const channel_event* its = event();
+    return its != nullptr ? its->velocity : 0;
+}
+
+void ce_handle::set_strip_velocity(double velocity) {
+    const ce_handle in = matching_in_ceh();
+    const ce_handle out = matching_out_ceh();
+    channel_event first = in.get_channel_event();
+    first.velocity = velocity;
+    if (valid() == 0 || !isGoodEvent(first)) {
+        return;
+    }
+    *in.event() = first;
+    if (out.valid() != 0) {
+        out.event()->velocity = velocity;
+        out.event()->stripTime = stripAt(first, out.get_edit_time());
+    }
+    m_cel->changedNow();
+}
+
+int ce_handle::get_dmod_code() const {
+    const channel_event* its = event();
+    return its != nullptr ? its->code : 0;
+}
+
+void ce_handle::set_dmod_code(int code) {
+    change([&](channel_event& its) { its.code = code; });
+}
+
+channel_event ce_handle::get_channel_event() const {
+    const channel_event* its = event();
+    return its != nullptr ? *its : channel_event();
+}
+
+bool ce_handle::time_in_range_exclusive(double time) const {
+    return valid() != 0 && matching_out_ceh().valid() != 0 &&
+           time > matching_in_ceh().get_edit_time() + kTolerance &&
+           time < matching_out_ceh().get_edit_time() - kTolerance;
+}
+
+IdStamp ce_handle::getEffectGraph() const {
+    const channel_event* its = event();
+    return its != nullptr ? its->id : IdStamp();
+}
+
+void ce_handle::setEffectGraph(const IdStamp& id) {
+    change([&](channel_event& its) { its.id = id; });
+}
+
+uint16_t ce_handle::audioRamp_DurationQFrames() const {
+    const channel_event* its = event();
+    return its != nullptr ? its->rampQFrames : uint16_t{0};
+}
+
+void ce_handle::set_audioRamp_DurationQFrames(uint16_t quarterFrames) {
+    change([&](channel_event& its) { its.rampQFrames = quarterFrames; });
+}
+
+Aud::GainCurve::eCurveType ce_handle::audioRamp_CurveType() const {
+    const channel_event* its = event();
+    return static_cast<Aud::GainCurve::eCurveType>(its != nullptr ? its->rampCurve : 0);
+}
+
+void ce_handle::set_audioRamp_CurveType(Aud::GainCurve::eCurveType type) {
+    change([&](channel_event& its) { its.rampCurve = type; });
+}
+
+template <typename Change>
+void ce_handle::change(Change&& apply) {
+    channel_event* its = event();
+    if (its == nullptr) {
+        return;
+    }
+    channel_event changed = *its;
+    apply(changed);
+    if (changed != *its && isGoodEvent(changed)) {
+        *its = changed;
+        m_cel->changedNow();
+    }
+}
+
+CEHPair::CEHPair(const ce_handle& event) : m_in(event.matching_in_ceh()), m_out(event.matching_out_ceh()) {}
+
+CEHPair::CEHPair(const cel& its, double time) {
+    const ce_handle in = its.find_ceh(time, CE_IN_POINT);
+    const ce_handle out = in.matching_out_ceh();
+    if (in.valid() != 0 && out.valid() != 0 &&
+        Qx::timeIsConsideredToBeInRegion(time, {in.get_edit_time(), out.get_edit_time()})) {
+        m_in = in;
+        m_out = out;
+    }
+}
+
+cel::Range CEHPair::editRange() const {
+    return valid() ? cel::Range(m_in.get_edit_time(), m_out.get_edit_time()) : Editable::invalidRange();
+}

@@ -1,0 +1,182 @@
+#include "edit/model/cel.h"
+
+#include "edit/model/detail/cel_events.h"
+
+using namespace cel_detail;
+
+cel::cel() = default;
+cel::~cel() = default;
+cel::cel(const cel& other) = default;
+
+std::unique_ptr<cel> cel::copy() const {
+    return std::make_unique<cel>(*this);
+}
+
+bool cel::close() {
+    if (m_events.size() % 2 != 0) {
+        channel_event out = m_events.back();
+        out.kind = CE_OUT_POINT;
+        out.id = channel_event::newId();
+        out.rampQFrames = 0;
+        out.rampCurve = 0;
+        m_events.push_back(out);
+        changedNow();
+    }
+    if (!isGood(m_events)) {
+        m_events.clear();
+        changedNow();
+        return false;
+    }
+    return true;
+}
+
+void cel::reserve(int pairs) {
+    if (pairs > 0) {
+        m_events.reserve(2 * static_cast<size_t>(pairs));
+    }
+}
+
+bool cel::add_event(const channel_event& event) {
+    const bool inExpected = m_events.size() % 2 == 0;
+    channel_event added = event;
+    if (!added.id.valid()) {
+        added.id = channel_event::newId();
+    }
+    if (!isGoodEvent(added) || (added.kind == CE_IN_POINT) != inExpected) {
+        return false;
+    }
+    if (!m_events.empty()) {
+        const double last = m_events.back().editTime;
+        if (added.editTime < last - kTolerance) {
+            return false;
+        }
+        added.editTime = std::max(added.editTime, last);
+    }
+    m_events.push_back(added);
+    changedNow();
+    return true;
+}
+
+ce_handle cel::appendEventPair(const cookie& strip, double stripTime, double editTime, double length) {
+    return insertEventPair(numPairs(), strip, stripTime, editTime, length);
+}
+
+ce_handle cel::insertEventPair(int pair, const cookie& strip, double stripTime, double editTime,
+                               double length) {
+    if (pair < 0 || pair > numPairs() || m_events.size() % 2 != 0 || !(length >= 0)) {
+        return {};
+    }
+    FreshPair added(strip, stripTime, editTime, editTime + length);
+    const size_t at = 2 * static_cast<size_t>(pair);
+    if (at > 0) {
+        const double before = m_events[at - 1].editTime;
+        if (added.in.editTime < before - kTolerance) {
+            return {};
+        }
+        added.in.editTime = std::max(added.in.editTime, before);
+        added.out.editTime = std::max(added.out.editTime, before);
+    }
+    if (at < m_events.size()) {
+        const double after = m_events[at].editTime;
+        if (added.out.editTime > after + kTolerance) {
+            return {};
+        }
+        added.in.editTime = std::min(added.in.editTime, after);
+        added.out.editTime = std::min(added.out.editTime, after);
+    }
+    if (!isGoodEvent(added.in) || !isGoodEvent(added.out)) {
+        return {};
+    }
+    m_events.insert(m_events.begin() + static_cast<std::ptrdiff_t>(at), {added.in, added.out});
+    changedNow();
+    return {this, static_cast<int>(at)};
+}
+
+channel_event cel::get_event(int index) const {
+    const channel_event* event = getChanEventPtr(index);
+    return event != nullptr ? *event : channel_event();
+}
+
+bool cel::setEvent(int index, const channel_event& event) {
+    if (getChanEventPtr(index) == nullptr || !isGoodEvent(event)) {
+        return false;
+    }
+    const size_t at = static_cast<size_t>(index);
+    const bool fits = event.kind == (at % 2 == 0 ? CE_IN_POINT : CE_OUT_POINT) &&
+                      (at == 0 || event.editTime >= m_events[at - 1].editTime) &&
+                      (at + 1 == m_events.size() || event.editTime <= m_events[at + 1].editTime);
+    if (!fits) {
+        return false;
+    }
+    m_events[at] = event;
+    changedNow();
+    return true;
+}
+
+void cel::set_resolution(double quantum) {
+    if (std::isfinite(quantum) && quantum >= 0 && quantum != m_resolution) {
+        m_resolution = quantum;
+        m_changed = true;
+    }
+}
+
+void cel::editChannelInfo(String name, const IdStamp& id, String subType, String materialInfo) {
+    if (name == m_name && id == m_id && subType == m_subType && materialInfo == m_materialInfo) {
+        return;
+    }
+    m_name = std::move(name);
+    m_id = id;
+    m_subType = std::move(subType);
+    m_materialInfo = std::move(materialInfo);
+    m_changed = true;
+}
+
+String cel::hierarchyName(bool withId, bool withEvents) const {
+    String name = m_name;
+    if (withId) {
+        name += " (" + m_id.asString() + ")";
+    }
+    if (withEvents) {
+        name += String::format(" [%d events]", numEvents());
+    }
+    return name;
+}
+
+int cel::is_good_cel() const {
+    return isGood(m_events) ? 1 : 0;
+}
+
+namespace cel_detail {
+
+namespace {
+
+bool isInPlace(const channel_event& event, size_t index, double last) {
+    return isGoodEvent(event) && event.kind == (index % 2 == 0 ? CE_IN_POINT : CE_OUT_POINT) &&
+           event.editTime >= last;
+}
+
+} // namespace
+
+bool isGood(const Events& events) {
+    double last = -cel::kGreatestTime;
+    for (size_t i = 0; i < events.size(); ++i) {
+        if (!isInPlace(events[i], i, last)) {
+            return false;
+        }
+        last = events[i].editTime;
+    }
+    return events.size() % 2 == 0;
+}
+
+bool checkAndSettle(Events& events) {
+    double last = -cel::kGreatestTime;
+    for (size_t i = 0; i < events.size(); ++i) {
+        if (!isInPlace(events[i], i, last - kTolerance)) {
+            return false;
+        }
+        last = events[i].editTime = std::max(events[i].editTime, last);
+    }
+    return events.size() % 2 == 0;
+}
+
+} // namespace cel_detail

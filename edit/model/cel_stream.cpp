@@ -1,0 +1,85 @@
+#include "edit/model/cel.h"
+
+#include "edit/model/detail/cel_events.h"
+
+#include <bit>
+#include <cstring>
+#include <type_traits>
+
+using namespace cel_detail;
+
+static_assert(std::endian::native == std::endian::little, "events are packed as they lie in memory");
+static_assert(std::is_trivially_copyable_v<channel_event>);
+
+namespace {
+
+constexpr const char* kLayerName = "cel";
+constexpr uint8_t kMajor = 1;
+
+[[maybe_unused]] const bool registered = [] {
+    Streamable::registerBuilder(kLayerName,
+                                [] { return std::unique_ptr<Streamable>(std::make_unique<cel>()); });
+    return true;
+}();
+
+} // namespace
+
+const char* cel::layerName() const {
+    return kLayerName;
+}
+
+const char* cel::shortLayerName() const {
+    return kLayerName;
+}
+
+std::unique_ptr<Streamable> cel::clone(BuilderType) const {
+    return copy();
+}
+
+void cel::pack(PStream& stream) const {
+    const size_t count = m_events.size() / 2 * 2;
+    stream.reserve(count * sizeof(channel_event) + m_name.size() + m_subType.size() + m_materialInfo.size() +
+                   64);
+    stream.setString(m_name);
+    m_id.pack(stream);
+    stream.setString(m_subType);
+    stream.setString(m_materialInfo);
+    stream.setDouble(m_resolution);
+    stream.setUnsignedLong(static_cast<uint32_t>(count));
+    stream.setRaw(m_events.data(), count * sizeof(channel_event));
+}
+
+void cel::unpack(PStream& stream) {
+    if (m_major > kMajor) {
+        stream.fail();
+        return;
+    }
+    String name = stream.getString();
+    IdStamp id;
+    id.unpack(stream);
+    String subType = stream.getString();
+    String materialInfo = stream.getString();
+    const double resolution = stream.getDouble();
+    const size_t count = stream.getCount(sizeof(channel_event));
+    const std::span<const std::byte> bytes = stream.getSpan(count * sizeof(channel_event));
+    if (!stream.good() || !std::isfinite(resolution) || resolution < 0) {
+        stream.fail();
+        return;
+    }
+    Events events(count);
+    if (count > 0) {
+        std::memcpy(static_cast<void*>(events.data()), bytes.data(), bytes.size());
+    }
+    if (!checkAndSettle(events)) {
+        stream.fail();
+        return;
+    }
+    m_events = std::move(events);
+    m_name = std::move(name);
+    m_id = id;
+    m_subType = std::move(subType);
+    m_materialInfo = std::move(materialInfo);
+    m_resolution = resolution;
+    ++m_changeCount;
+    m_changed = false;
+}

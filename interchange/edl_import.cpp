@@ -1,0 +1,304 @@
+#include "interchange/edl_import.h"
+
+#include "edit/model/edit.h"
+#include "interchange/edl_records.h"
+#include "interchange/marker_colour.h"
+#include "platform/services/files.h"
+
+#include <cmath>
+#include <unordered_map>
+
+namespace interchange {
+
+namespace {
+
+/// The span used of one source on each track, in source frames.
+struct Source {
+    size_t event = 0; ///< the first that plays it
+    EdlChannels channels = 0;
+    double in = 0;
+    double out = 0;
+};
+
+constexpr size_t kNoSource = SIZE_MAX;
+
+class EdlImporting {
+public:
+    EdlImporting(const EdlList& list, const EdlProgramme& programme, Import& result)
+        : m_list(list), m_programme(programme), m_result(result) {}
+
+    void build(const String& name);
+
+private:
+    void findSources();
+    size_t sourceOf(const EdlClip& clip);
+    void buildShot(size_t index);
+    void buildSequence(const String& name);
+    void buildChannels(Edit& edit);
+    [[nodiscard]] Qx::Ptr<cel> buildCel(const EdlTrack* track);
+    void addCues(Edit& edit);
+    String shownName(const String& name, int line);
+    [[nodiscard]] EditPtr newEdit(const cookie& item, bool original) const;
+    [[nodiscard]] double seconds(double frames) const {
+        return frames * m_list.rate.denominator() / m_list.rate.numerator();
+    }
+
+    const EdlList& m_list;
+    const EdlProgramme& m_programme;
+    Import& m_result;
+    std::vector<Source> m_sources;
+    std::vector<size_t> m_sourceOfEvent;
+    std::vector<EdlRecord> m_records;
+    std::unordered_map<std::string, size_t> m_byName;
+};
+
+void addPair(cel& content, const cookie& strip, double editIn, double editOut, double stripIn,
+             double velocity) {
+    channel_event in(editIn, stripIn, strip, 1.0F, CE_IN_POINT, channel_event::newId(), 0);
+    in.velocity = velocity;
+    channel_event out(editOut, stripIn + velocity * (editOut - editIn), strip, 1.0F, CE_OUT_POINT,
+                      channel_event::newId(), 0);
+    out.velocity = velocity;
+    content.add_event(in);
+    content.add_event(out);
+}
+
+// How many audio channels an edit needs so that the last one used has its own number.
+int lastAudio(EdlChannels channels) {
+    int last = 0;
+    for (int number = 1; number <= kMaxEdlAudio; ++number) {
+        if ((channels & edlAudio(number)) != 0) {
+            last = number;
+        }
+    }
+    return last;
+}
+
+// The channel bits of the tracks up to the last one of each kind that is used, in order.
+std::vector<EdlChannels> tracksUpTo(EdlChannels used) {
+    std::vector<EdlChannels> tracks;
+    if ((used & (kEdlPicture | kEdlPicture2)) != 0) {
+        tracks.push_back(kEdlPicture);
+    }
+    if ((used & kEdlPicture2) != 0) {
+        tracks.push_back(kEdlPicture2);
+    }
+    for (int number = 1; number <= lastAudio(used); ++number) {
+        tracks.push_back(edlAudio(number));
+    }
+    return tracks;
+}
+
+bool isPicture(EdlChannels channel) {
+    return channel == kEdlPicture || channel == kEdlPicture2;
+}
+
+// A name that a project can show. The notes keep the whole of it.
+String EdlImporting::shownName(const String& name, int line) {
+    constexpr size_t most = 1000;
+    if (name.size() <= most) {
+        return name;
+    }
+    size_t end = most;
+    while ((static_cast<unsigned char>(name[end]) & 0xC0) == 0x80) {
+        --end; // inside a character
+    }
+    m_result.report.addLoss(line, String::format("a name of %zu bytes is cut to %zu", name.size(), end));
+    return name.substr(0, end);
+}
+
+EditPtr EdlImporting::newEdit(const cookie& item, bool original) const {
+    EditPtr edit(new Edit);
+    // Dirty from the start, so that no header change below announces an item that no project has.
+    edit->init_dirty();
+    edit->set_cookie(item);
+    edit->setFrameRate(m_list.rate);
+    // Not through the accessor, which records an owner with the project.
+    edit->Opts().setInt("ORIGINAL_MATERIAL", original ? 1 : 0);
+    return edit;
+}
+
+// The number of the source that an event plays.
+size_t EdlImporting::sourceOf(const EdlClip& clip) {
+    size_t& known = m_sourceOfEvent[clip.event];
+    if (known != kNoSource) {
+        return known;
+    }
+    const EdlEvent& event = m_list.events[clip.event];
+    // Line feeds cannot occur in the names.
+    std::string key = event.reel + "\n" + event.clipName + "\n" + event.sourceFile;
+    const bool nameless = event.clipName.empty() && event.sourceFile.empty();
+    if (nameless && String::equalNoCase(event.reel, "AX")) {
+        key += "\n" + std::to_string(clip.event);
+    }
+    known = m_byName.try_emplace(std::move(key), m_sources.size()).first->second;
+    if (known == m_sources.size()) {
+        m_sources.push_back({clip.event, 0, INFINITY, -INFINITY});
+    }
+    return known;
+}
+
+void EdlImporting::findSources() {
+    m_sourceOfEvent.assign(m_list.events.size(), kNoSource);
+    for (const EdlTrack& track : m_programme.tracks) {
+        for (const EdlClip& clip : track.clips) {
+            if (clip.black) {
+                continue;
+            }
+            Source& source = m_sources[sourceOf(clip)];
+            source.channels |= track.channel == kEdlPicture2 ? kEdlPicture : track.channel;
+            // In reverse the out is the frame below the last one shown; a freeze shows one frame.
+            const double last = clip.sourceOut();
+            source.in = std::min({source.in, clip.sourceIn, last + (clip.velocity < 0 ? 1.0 : 0.0)});
+            source.out = std::max({source.out, clip.sourceIn + (clip.velocity > 0 ? 0.0 : 1.0), last});
+        }
+    }
+}
+
+void EdlImporting::buildShot(size_t index) {
+    const Source& source = m_sources[index];
+    const EdlEvent& event = m_list.events[source.event];
+    const cookie item = provisionalCookie(index);
+    EditPtr shot = newEdit(item, true);
+    const String& name = !event.clipName.empty()     ? event.clipName
+                         : !event.sourceFile.empty() ? event.sourceFile
+                                                     : event.reel;
+    shot.Opts().setString("NAME", shownName(name, event.line));
+    shot.Opts().setString(EdlKey::kReel, event.reel);
+    shot.Opts().setBool(EdlKey::kDropFrame, event.sourceDrop);
+    if (!event.sourceFile.empty()) {
+        shot.Opts().setString(EdlKey::kSourceFile, event.sourceFile);
+    }
+    if (!event.mediaPath.empty()) {
+        shot.Opts().setString(EdlKey::kMediaPath, event.mediaPath);
+    }
+    const double in = seconds(source.in);
+    const double out = seconds(source.out);
+    for (const EdlChannels channel : tracksUpTo(source.channels)) {
+        auto content = std::make_unique<cel>();
+        const bool picture = isPicture(channel);
+        if ((source.channels & channel) != 0) {
+            const Cookie_Type kind = picture ? Cookie_Type::Video : Cookie_Type::Sound;
+            addPair(*content, cookie::fromWords(item.word(0), item.word(1), static_cast<uint32_t>(kind)), in,
+                    out, in, 1.0);
+        }
+        shot->addChan(picture ? VideoChan : AudioChan, content.release(), false);
+    }
+    shot->setSourceMediumDuration(out);
+    m_result.shots.push_back(std::move(shot));
+}
+
+Qx::Ptr<cel> EdlImporting::buildCel(const EdlTrack* track) {
+    auto content = std::make_shared<cel>();
+    if (track == nullptr) {
+        return content;
+    }
+    content->reserve(static_cast<int>(track->clips.size()));
+    for (const EdlClip& clip : track->clips) {
+        const cookie strip = clip.black ? black_cookie : provisionalCookie(m_sourceOfEvent[clip.event]);
+        addPair(*content, strip, m_list.rate.toSeconds(clip.recordIn), m_list.rate.toSeconds(clip.recordOut),
+                clip.black ? 0.0 : seconds(clip.sourceIn), clip.velocity);
+        const channel_event in = content->get_event(content->numEvents() - 2);
+        m_records[clip.event].events.push_back(in.id);
+    }
+    return content;
+}
+
+void EdlImporting::buildChannels(Edit& edit) {
+    EdlChannels used = 0;
+    for (const EdlTrack& track : m_programme.tracks) {
+        used |= track.channel;
+    }
+    for (const EdlChannels channel : tracksUpTo(used)) {
+        const EdlTrack* found = nullptr;
+        for (const EdlTrack& track : m_programme.tracks) {
+            if (track.channel == channel) {
+                found = &track;
+            }
+        }
+        const Edit::ChanType type{isPicture(channel) ? VideoChan : AudioChan, Edit_Chan_SubType::NONE};
+        edit.setupEditChannel(type, buildCel(found));
+    }
+}
+
+void EdlImporting::addCues(Edit& edit) {
+    for (const EdlMarker& marker : m_list.markers) {
+        const int64_t position = markerPosition(m_list, m_programme, marker);
+        if (position < 0) {
+            m_result.report.addLoss(marker.line, "the marker lies before the programme and is left out");
+            continue;
+        }
+        const int colour = markerColourCode(marker.colour);
+        String text = marker.text;
+        if (colour == 0 && !marker.colour.empty()) {
+            text = marker.colour + (text.empty() ? "" : " ") + text;
+        }
+        edit.get_cues().add_cue_point(
+            cue_point(text.c_str(), m_list.rate.toSeconds(position), kAnyCueChan, colour, {}, false));
+    }
+    edit.get_cues().sort();
+}
+
+void EdlImporting::buildSequence(const String& name) {
+    m_records.resize(m_list.events.size());
+    for (size_t i = 0; i < m_records.size(); ++i) {
+        const EdlEvent& event = m_list.events[i];
+        m_records[i].number = event.number;
+        m_records[i].typeText = event.typeText();
+        m_records[i].reel = event.reel;
+        m_records[i].speedDigits = event.speed ? event.speed->digits : String();
+        m_records[i].notes = event.notes;
+    }
+    EditPtr sequence = newEdit(provisionalCookie(m_sources.size()), false);
+    buildChannels(*sequence);
+    addCues(*sequence);
+    configb& header = sequence.Opts();
+    header.setString("NAME", shownName(m_list.title.empty() ? name : m_list.title, 0));
+    header.setInt64(EdlKey::kStart, m_programme.start);
+    header.setBool(EdlKey::kDropFrame, m_programme.dropFrame);
+    header.setString(EdlKey::kEvents, packEdlRecords(m_records));
+    if (!m_list.notes.empty()) {
+        header.setString(EdlKey::kNotes, m_list.notes);
+    }
+    m_result.sequence = std::move(sequence);
+}
+
+void EdlImporting::build(const String& name) {
+    findSources();
+    m_result.shots.reserve(m_sources.size());
+    for (size_t i = 0; i < m_sources.size(); ++i) {
+        buildShot(i);
+    }
+    buildSequence(name);
+}
+
+} // namespace
+
+Qx::Status importEdlList(const EdlList& list, const String& name, const ImportOptions& options,
+                         Import& result) {
+    Import built;
+    built.report = result.report;
+    EdlProgramme programme;
+    if (Qx::Status status = layTracks(list, options.strict, programme, built.report); !status) {
+        return status;
+    }
+    EdlImporting(list, programme, built).build(name);
+    result = std::move(built);
+    return {};
+}
+
+Qx::Status importEdl(const String& path, const ImportOptions& options, Import& result) {
+    Import built;
+    EdlList list;
+    if (Qx::Status status = readEdlFile(path, options.rate, list, built.report); !status) {
+        return status;
+    }
+    const String name = Qx::withoutExtension(Qx::fileNameOf(path));
+    if (Qx::Status status = importEdlList(list, name, options, built); !status) {
+        return status;
+    }
+    result = std::move(built);
+    return {};
+}
+
+} // namespace interchange

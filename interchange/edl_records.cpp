@@ -1,0 +1,82 @@
+#include "interchange/edl_records.h"
+
+namespace interchange {
+
+namespace {
+
+// Calls `use` for each line of a text.
+template <typename Use>
+void forEachLine(std::string_view text, Use use) {
+    while (!text.empty()) {
+        const size_t end = text.find('\n');
+        use(text.substr(0, end));
+        text.remove_prefix(end == std::string_view::npos ? text.size() : end + 1);
+    }
+}
+
+void appendLine(String& text, char tag, std::string_view line) {
+    text += tag;
+    text += line;
+    text += '\n';
+}
+
+void readField(EdlRecord& record, char tag, std::string_view value) {
+    switch (tag) {
+    case 'R':
+        record.reel = value;
+        break;
+    case 'S':
+        if (const IdStamp stamp(value); stamp.valid()) {
+            record.events.push_back(stamp);
+        }
+        break;
+    case 'V':
+        record.speedDigits = value;
+        break;
+    case 'N':
+        record.notes += record.notes.empty() ? "" : "\n";
+        record.notes += value;
+        break;
+    default:
+        break;
+    }
+}
+
+} // namespace
+
+String packEdlRecords(const std::vector<EdlRecord>& records) {
+    String text;
+    for (const EdlRecord& record : records) {
+        appendLine(text, 'E', record.number + " " + record.typeText);
+        appendLine(text, 'R', record.reel);
+        for (const IdStamp& stamp : record.events) {
+            appendLine(text, 'S', stamp.asString());
+        }
+        if (!record.speedDigits.empty()) {
+            appendLine(text, 'V', record.speedDigits);
+        }
+        forEachLine(record.notes, [&](std::string_view line) { appendLine(text, 'N', line); });
+    }
+    return text;
+}
+
+std::vector<EdlRecord> unpackEdlRecords(std::string_view text) {
+    std::vector<EdlRecord> records;
+    forEachLine(text, [&](std::string_view line) {
+        if (line.empty()) {
+            return;
+        }
+        const std::string_view value = line.substr(1);
+        if (line.front() == 'E') {
+            const size_t blank = value.find(' ');
+            EdlRecord& record = records.emplace_back();
+            record.number = value.substr(0, blank);
+            record.typeText = blank == std::string_view::npos ? std::string_view() : value.substr(blank + 1);
+        } else if (!records.empty()) {
+            readField(records.back(), line.front(), value);
+        }
+    });
+    return records;
+}
+
+} // namespace interchange

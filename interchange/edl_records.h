@@ -1,0 +1,49 @@
+#pragma once
+
+#include "platform/base/id_stamp.h"
+#include "platform/base/qx_string.h"
+
+#include <string_view>
+#include <vector>
+
+/// What an edit decision list says that an edit has no place for, kept in the header of the sequence so that
+/// an export can give it back.
+namespace interchange {
+
+/// Header keys of an imported sequence.
+namespace EdlKey {
+inline constexpr const char* kStart = "EDIT_START";     ///< int64: first record in, frames from midnight
+inline constexpr const char* kDropFrame = "DROP_FRAME"; ///< bool: whether that is counted in drop frame
+inline constexpr const char* kEvents = "EDL_EVENTS";    ///< string: `packEdlRecords`
+inline constexpr const char* kNotes = "EDL_NOTES";      ///< string: the notes above the first event
+// Of an imported shot (DROP_FRAME too: its source timecode's).
+inline constexpr const char* kReel = "REEL";                  ///< string
+inline constexpr const char* kSourceFile = "EDL_SOURCE_FILE"; ///< string: the full name behind the reel
+inline constexpr const char* kMediaPath = "EDL_MEDIA_PATH";   ///< string: text, never opened
+} // namespace EdlKey
+
+/// One event line of a list. The events of the sequence that came from it are known by their stamps, which
+/// stay with them through trims and moves.
+struct EdlRecord {
+    String number;   ///< as written
+    String typeText; ///< `EdlEvent::typeText`
+    String reel;
+    String speedDigits; ///< of its M2; empty for none
+    String notes;       ///< `EdlEvent::notes`
+    std::vector<IdStamp> events;
+    bool operator==(const EdlRecord&) const = default;
+};
+
+/// The records as one text, a line a field, whose first letter is a tag (do not change them):
+///
+///     E002 D 024                          begins a record: number, blank, type
+///     RA013C001                           reel
+///     S00000000-00000000-00000000         an event's stamp, in any number
+///     V047.6                              the digits of its speed
+///     N* FROM CLIP NAME: x                a note line, in any number
+String packEdlRecords(const std::vector<EdlRecord>& records);
+
+/// Reads that text. Lines of other tags and lines before the first record are passed over.
+std::vector<EdlRecord> unpackEdlRecords(std::string_view text);
+
+} // namespace interchange

@@ -1,0 +1,116 @@
+#include "interchange/import.h"
+
+#include "edit/model/edit.h"
+#include "edit/model/edit_registry.h"
+#include "edit/project/cookie_allocator.h"
+#include "platform/services/atomic_batch.h"
+#include "platform/services/current_project.h"
+
+#include <unordered_map>
+
+namespace interchange {
+
+namespace {
+
+using CookieMap = std::unordered_map<cookie, cookie>;
+
+cookie ofKind(Cookie_Type kind, const cookie& words) {
+    return cookie::fromWords(words.word(0), words.word(1), static_cast<uint32_t>(kind));
+}
+
+void mapStrips(Edit& edit, const CookieMap& map) {
+    for (int chan = 0; chan < edit.getNumChans(); ++chan) {
+        cel* const content = edit.get_edit_cel_p(chan);
+        if (content == nullptr) {
+            continue;
+        }
+        for (int i = 0; i < content->numEvents(); ++i) {
+            channel_event event = content->get_event(i);
+            const auto found = map.find(event.strip);
+            if (found != map.end()) {
+                event.strip = found->second;
+                content->setEvent(i, event);
+            }
+        }
+    }
+}
+
+// The edits of an import in the order of writing, so that no sequence names a shot without a file.
+std::vector<Edit*> editsOf(Import& result) {
+    std::vector<Edit*> edits;
+    edits.reserve(result.shots.size() + 1);
+    for (EditPtr& shot : result.shots) {
+        edits.push_back(shot);
+    }
+    edits.push_back(result.sequence);
+    return edits;
+}
+
+void giveCookies(const std::vector<Edit*>& edits, const std::vector<cookie>& cookies) {
+    CookieMap shots;
+    for (size_t i = 0; i + 1 < edits.size(); ++i) {
+        const cookie before = edits[i]->get_cookie();
+        shots.emplace(before, cookies[i]);
+        CookieMap media;
+        for (const Cookie_Type kind : {Cookie_Type::Video, Cookie_Type::Sound}) {
+            media.emplace(ofKind(kind, before), ofKind(kind, cookies[i]));
+        }
+        mapStrips(*edits[i], media);
+        edits[i]->set_cookie(cookies[i]);
+    }
+    mapStrips(*edits.back(), shots);
+    edits.back()->set_cookie(cookies.back());
+}
+
+Qx::Status writeAll(const std::vector<Edit*>& edits) {
+    Qx::AtomicBatch batch;
+    for (Edit* const edit : edits) {
+        if (!edit->write_file()) {
+            return Qx::Status::failure(edit->lastFileError());
+        }
+    }
+    if (const Qx::FileError error = batch.commit()) {
+        return Qx::Status::failure(error.text());
+    }
+    return {};
+}
+
+} // namespace
+
+cookie provisionalCookie(size_t index) {
+    return {Cookie_Type::Transient, static_cast<int>(index), 0};
+}
+
+Qx::Status saveImport(Import& result) {
+    if (!result.sequence.valid()) {
+        return Qx::Status::failure("there is no imported sequence to save");
+    }
+    const std::vector<Edit*> edits = editsOf(result);
+    std::vector<cookie> before;
+    before.reserve(edits.size());
+    for (const Edit* const edit : edits) {
+        before.push_back(edit->get_cookie());
+    }
+    std::vector<cookie> cookies;
+    cookies.reserve(edits.size());
+    CookieAllocator allocator(Qx::currentProject().folder());
+    if (Qx::Status status = allocator.allocate(static_cast<unsigned>(edits.size()), cookies); !status) {
+        return status;
+    }
+    giveCookies(edits, cookies);
+    if (Qx::Status status = writeAll(edits); !status) {
+        giveCookies(edits, before);
+        for (Edit* const edit : edits) {
+            edit->init_dirty();
+        }
+        return status;
+    }
+    if (EditRegistry* const registry = EditRegistry::current()) {
+        for (const cookie& item : cookies) {
+            registry->updateProjdbRec(item, true);
+        }
+    }
+    return {};
+}
+
+} // namespace interchange

@@ -1,0 +1,39 @@
+#pragma once
+
+#include "edit/model/edit_ptr.h"
+#include "interchange/loss_report.h"
+#include "platform/base/status.h"
+#include "platform/media/frame_rate.h"
+
+#include <vector>
+
+/// What an importer of another tool's timeline makes, and how it becomes part of the current project. The
+/// importers themselves only build edits in memory; what a sequence or a shot is made of is their business.
+namespace interchange {
+
+struct ImportOptions {
+    Qx::FrameRate rate;  ///< of the timeline, where its form does not state one
+    bool strict = false; ///< overlaps and the like are failures instead of warnings
+};
+
+/// A sequence and the shots that it plays, not yet part of a project.
+///
+/// Until they are saved the edits have the cookies of `provisionalCookie` and are dirty. A pair of the
+/// sequence names the shot it plays by the shot's cookie. A shot's own pairs name its media: the shot's words
+/// with kind 'V' for picture and 'S' for sound.
+struct Import {
+    EditPtr sequence;
+    std::vector<EditPtr> shots;
+    LossReport report;
+};
+
+/// The cookie of shot `index` of an import that is not saved: of kind 'F', so that nothing stores it.
+cookie provisionalCookie(size_t index);
+
+/// Gives every edit a cookie of the current project, puts these in the place of the provisional ones wherever
+/// an event names a shot, and writes the shots, then the sequence, in one batch.
+///
+/// On failure the project is as it was and the import is too, so that the call can be repeated.
+Qx::Status saveImport(Import& result);
+
+} // namespace interchange

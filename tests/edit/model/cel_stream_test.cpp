@@ -1,0 +1,134 @@
+// The packed form, and streams that lie.
+
+#include "edit/model/cel.h"
+#include "platform/store/pstream.h"
+#include "support/cel_layout.h"
+
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <random>
+
+namespace {
+
+using Bytes = std::vector<std::byte>;
+
+Bytes packed(const cel& its) {
+    PStream stream;
+    its.pack(stream);
+    return stream.bytes();
+}
+
+cel makeNamed() {
+    cel its = layout::make("AAB..C D");
+    its.editChannelInfo("V1", IdStamp(1, 2, 3), "SUBTYPE:NONE", "stills");
+    its.set_resolution(0.04);
+    return its;
+}
+
+constexpr size_t kEventSize = 64;
+
+bool reads(const Bytes& bytes, cel& into) {
+    PStream stream{std::span<const std::byte>(bytes)};
+    into.unpack(stream);
+    return stream.good();
+}
+
+TEST(CelStream, CarriesEverything) {
+    const cel its = makeNamed();
+    cel again;
+    ASSERT_TRUE(reads(packed(its), again));
+    EXPECT_FALSE(again.changed());
+    EXPECT_EQ(again.editChannelName(), "V1");
+    EXPECT_EQ(again.editChannelId(), IdStamp(1, 2, 3));
+    EXPECT_EQ(again.editChannelSubType(), "SUBTYPE:NONE");
+    EXPECT_EQ(again.editChannelMaterialInfo(), "stills");
+    EXPECT_EQ(again.resolution(), 0.04);
+    EXPECT_EQ(packed(again), packed(its));
+    const auto built = Streamable::build(its.layerName());
+    EXPECT_NE(dynamic_cast<cel*>(built.get()), nullptr);
+}
+
+TEST(CelStream, AnyCutStreamIsRefusedAndLeavesTheCel) {
+    const Bytes whole = packed(makeNamed());
+    for (size_t size = 0; size < whole.size(); ++size) {
+        cel its = layout::make("XX");
+        ASSERT_FALSE(reads(Bytes(whole.begin(), whole.begin() + static_cast<std::ptrdiff_t>(size)), its))
+            << size;
+        ASSERT_EQ(layout::draw(its), "XX");
+        ASSERT_TRUE(its.editChannelName().empty());
+    }
+}
+
+TEST(CelStream, ACountThatTheStreamCannotHoldTakesNoMemory) {
+    Bytes bytes = packed(cel());
+    const uint32_t count = 4000000000u;
+    std::memcpy(bytes.data() + bytes.size() - 4, &count, 4);
+    cel its;
+    EXPECT_FALSE(reads(bytes, its));
+}
+
+TEST(CelStream, EveryFieldIsChecked) {
+    const Bytes whole = packed(makeNamed());
+    const size_t second = whole.size() - 8 * kEventSize; // the third event of ten: an in point
+    const auto broken = [&](size_t offset, auto value) {
+        Bytes bytes = whole;
+        std::memcpy(bytes.data() + second + offset, &value, sizeof value);
+        cel its;
+        return !reads(bytes, its);
+    };
+    const double nan = std::nan("");
+    EXPECT_FALSE(broken(offsetof(channel_event, code), 77)) << "what is free may be anything";
+    EXPECT_TRUE(broken(offsetof(channel_event, editTime), nan));
+    EXPECT_TRUE(broken(offsetof(channel_event, editTime), 1.9)) << "overlaps the pair before";
+    EXPECT_TRUE(broken(offsetof(channel_event, editTime), 99.0)) << "after its out point";
+    EXPECT_FALSE(broken(offsetof(channel_event, editTime), 2 - 5e-7)) << "within the tolerance";
+    EXPECT_TRUE(broken(offsetof(channel_event, stripTime), static_cast<double>(INFINITY)));
+    EXPECT_TRUE(broken(offsetof(channel_event, velocity), nan));
+    EXPECT_TRUE(broken(offsetof(channel_event, level), INFINITY));
+    EXPECT_TRUE(broken(offsetof(channel_event, kind), uint8_t{4}));
+    EXPECT_TRUE(broken(offsetof(channel_event, kind), uint8_t{2}));
+    EXPECT_TRUE(broken(offsetof(channel_event, reserved), 1u));
+    EXPECT_TRUE(broken(offsetof(channel_event, id), IdStamp()));
+    EXPECT_TRUE(broken(offsetof(channel_event, strip) + 8, uint32_t{'/'})) << "no kind of item";
+}
+
+TEST(CelStream, ALaterRevisionIsRefused) {
+    PStream stream;
+    makeNamed().STRM_hierarchyPack(stream);
+    Bytes bytes = stream.bytes();
+    constexpr size_t kMajorAt = 4 + 4 + 3; // behind the number of layers and the name
+    ASSERT_EQ(bytes[kMajorAt], std::byte{1});
+    bytes[kMajorAt] = std::byte{2};
+    PStream input{std::span<const std::byte>(bytes)};
+    cel again;
+    EXPECT_FALSE(again.STRM_hierarchyUnpack(input));
+    EXPECT_EQ(again.numEvents(), 0);
+}
+
+TEST(CelStream, RandomDamageNeverMakesABadCel) {
+    const Bytes whole = packed(makeNamed());
+    for (unsigned seed = 1; seed <= 4000; ++seed) {
+        std::mt19937 random(seed);
+        Bytes bytes = whole;
+        for (auto changes = 1 + random() % 4; changes > 0; --changes) {
+            bytes[random() % bytes.size()] = static_cast<std::byte>(random() & 0xff);
+        }
+        cel its;
+        if (reads(bytes, its)) {
+            ASSERT_NE(its.is_good_cel(), 0) << "seed " << seed;
+        } else {
+            ASSERT_EQ(its.numEvents(), 0) << "seed " << seed;
+        }
+    }
+}
+
+TEST(CelStream, AnOpenPairIsNotPacked) {
+    cel its = layout::make("AA");
+    ASSERT_TRUE(its.add_event(channel_event(5, 0, black_cookie, 1, CE_IN_POINT, channel_event::newId(), 0)));
+    cel again;
+    ASSERT_TRUE(reads(packed(its), again));
+    EXPECT_EQ(layout::draw(again), "AA");
+}
+
+} // namespace

@@ -1,0 +1,448 @@
+#include "edit/persist/edit_init.h"
+#include "edit/persist/revision_history.h"
+#include "edit_samples.h"
+#include "platform/services/current_project.h"
+#include "platform/services/network.h"
+#include "platform/store/edit_header_proxy.h"
+#include "support/memory_file.h"
+#include "support/recording_log.h"
+#include "support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using test::kItem;
+using test::stateOf;
+
+class EditFileTest : public testing::Test {
+protected:
+    [[nodiscard]] WString path(const std::string& name = "E0001000.qme") const {
+        return Qx::widen(folder.path(name));
+    }
+    [[nodiscard]] String bytes(const std::string& name) const { return test::bytesOf(folder.path(name)); }
+    void save(Edit& edit) const {
+        edit.init_dirty();
+        ASSERT_TRUE(edit.write_file(path())) << edit.lastFileError();
+    }
+    // A store of hand-made objects.
+    struct RawStore {
+        explicit RawStore(const String& folder) {
+            bag.open(cookie(kItem), folder, eOpenNew, ".qme");
+            header.setInt("ED2_REVISION", 602);
+        }
+        void addCel(int number, const char* name, const char* subType = "SUBTYPE:NONE",
+                    const IdStamp& id = IdStamp::fresh(IdStampMagic::Channel)) {
+            auto content = std::make_unique<cel>();
+            content->editChannelInfo(name, id, subType, "");
+            bag.storeObject("Celid" + std::to_string(number), std::move(content));
+        }
+        void finish() {
+            bag.storeObject(EditHeaderProxy::EditHeaderId, std::make_unique<EditHeaderProxy>(header));
+            ASSERT_TRUE(bag.flush().isOk());
+        }
+        TagBag bag;
+        configb header{"EDIT", "END_EDIT_HEADER"};
+    };
+
+    test::TemporaryFolder folder;
+    test::RecordingLog log;
+};
+
+TEST_F(EditFileTest, TypesFollowTheNameWhateverItsCase) {
+    const std::pair<const wchar_t*, QxEditFileType> names[] = {{L"E0001000.qme", kObjectStoreFile},
+                                                               {L"a.QmE", kObjectStoreFile},
+                                                               {L"a.ED3", kObjectStoreEd3File},
+                                                               {L"a.ed2", kLegacyTextFile},
+                                                               {L"a.Ed2", kLegacyTextFile},
+                                                               {L"a.ed2.bak", kUnknownFile},
+                                                               {L"", kUnknownFile}};
+    for (const auto& [name, type] : names) {
+        EXPECT_EQ(getEditFileTypeFromFileName(name), type) << Qx::narrow(name);
+    }
+}
+
+TEST_F(EditFileTest, RandomEditsComeBackExactly) {
+    for (unsigned seed = 1; seed <= 60; ++seed) {
+        SCOPED_TRACE(seed);
+        Edit edit;
+        test::fillAtRandom(edit, seed);
+        ASSERT_NO_FATAL_FAILURE(save(edit));
+        EXPECT_FALSE(edit.isDirty(true));
+        const Edit read(path(), eOpenExisting);
+        ASSERT_FALSE(read.isBad()) << read.lastFileError();
+        ASSERT_EQ(stateOf(read), stateOf(edit));
+        EXPECT_FALSE(read.isDirty(true));
+    }
+}
+
+// Changes between saves make cels keep, move and lose their places in the store.
+TEST_F(EditFileTest, ChangesBetweenSavesAreAllInTheFile) {
+    std::mt19937 random(7);
+    Edit edit;
+    test::fillAtRandom(edit, 3);
+    for (int step = 0; step < 40; ++step) {
+        SCOPED_TRACE(step);
+        const int chan = static_cast<int>(random() % static_cast<unsigned>(edit.getNumChans()));
+        switch (random() % 5) {
+        case 0:
+            edit.insertChans(random() % 2 == 0 ? VideoChan : AudioChan, Edit_Chan_SubType::NONE, 0, 1, true,
+                             false, 0);
+            break;
+        case 1:
+            if (edit.getNumChans(VideoChan) > 1) {
+                edit.removeChan(edit.getId(chan), false);
+            }
+            break;
+        case 2:
+            if (edit.getCel(edit.getId(chan)) != nullptr) {
+                test::addPairs(edit, chan, 2, random);
+            }
+            break;
+        case 3:
+            edit.setChanName(edit.getId(chan), "name " + std::to_string(step));
+            break;
+        default:
+            if (cel* content = edit.getCel(edit.getId(chan))) {
+                auto other = content->copy();
+                other->remove({0, 1});
+                other->setChanged(false);
+                edit.set_edit_cel_p(chan, other.release());
+            }
+        }
+        if (edit.getNumChans(AnyChan) == 0) {
+            edit.addChan(VideoChan);
+        }
+        ASSERT_NO_FATAL_FAILURE(save(edit));
+        const Edit read(path(), eOpenExisting);
+        ASSERT_EQ(stateOf(read), stateOf(edit));
+    }
+}
+
+TEST_F(EditFileTest, SavingTwiceGivesTheSameBytesAndPacksNoCelAgain) {
+    Edit edit;
+    test::fillAtRandom(edit, 5);
+    ASSERT_NO_FATAL_FAILURE(save(edit));
+    const String created = std::to_string(edit.getCreationTime());
+    std::string first = bytes("E0001000.qme");
+    EXPECT_FALSE(edit.write_file(path()));
+    EXPECT_EQ(bytes("E0001000.qme"), first);
+    for (int attempt = 0; attempt < 3; ++attempt) { // a second may turn between two saves
+        const int time = edit.getModificationTime();
+        ASSERT_NO_FATAL_FAILURE(save(edit));
+        if (edit.getModificationTime() == time) {
+            EXPECT_EQ(bytes("E0001000.qme"), first);
+            break;
+        }
+        first = bytes("E0001000.qme");
+    }
+    EXPECT_LE(edit.objectStore().numPacked(), 2U); // the header and the cues
+    EXPECT_EQ(std::to_string(edit.getCreationTime()), created);
+
+    Edit read(path(), eOpenExisting);
+    read.init_dirty();
+    ASSERT_TRUE(read.write_file(path()));
+    EXPECT_LE(read.objectStore().numPacked(), 2U);
+}
+
+TEST_F(EditFileTest, NoMarkAndNoSyncLossLeaveNoKeys) {
+    Edit edit;
+    test::fillAtRandom(edit, 9);
+    edit.set_mark_time(NO_CHAN, 3);
+    edit.setSyncLoss(edit.getId(0), 0.5);
+    ASSERT_NO_FATAL_FAILURE(save(edit));
+    EXPECT_TRUE(edit.Opts().contains("MARK_TIME"));
+    EXPECT_TRUE(edit.Opts().contains("SyncLoss0"));
+    edit.mark_invalidate();
+    edit.setSyncLoss(edit.getId(0), 0);
+    ASSERT_NO_FATAL_FAILURE(save(edit));
+    EXPECT_FALSE(edit.Opts().contains("MARK_TIME"));
+    EXPECT_FALSE(edit.Opts().contains("SyncLoss0"));
+    EXPECT_EQ(edit.Opts().getInt("NUM_CHANS"), edit.getNumChans());
+}
+
+TEST_F(EditFileTest, OldKeysAreTakenOver) {
+    RawStore raw(folder.path());
+    raw.addCel(0, "V1");
+    raw.addCel(1, "A1");
+    raw.addCel(2, "A2");
+    raw.header.setInt("SOUND_OUTPUT_FLAG2", 0);
+    raw.header.setInt("SOUND_OUTPUT_XFADE1", 1);
+    raw.header.setDouble("SYNC_ERROR1", 0.25);
+    raw.header.setInt("quality", 12);
+    raw.header.setInt("ENTIRE_MEDIUM", 1);
+    raw.finish();
+    Edit edit(path(), eOpenExisting);
+    ASSERT_FALSE(edit.isBad()) << edit.lastFileError();
+    EXPECT_TRUE(edit.getAudCel(edit.getId(1)).getSoundOutputEnabled());
+    EXPECT_FALSE(edit.getAudCel(edit.getId(2)).getSoundOutputEnabled());
+    EXPECT_TRUE(edit.getAudCel(edit.getId(1)).getXFadesEnabled());
+    EXPECT_EQ(edit.getSyncLoss(edit.getId(1)), 0.25);
+    EXPECT_EQ(edit.Opts().getString("quality_string"), "12 mins");
+    EXPECT_EQ(edit.get_entire_medium(), 1);
+    EXPECT_EQ(edit.getChanName(edit.getId(1)), "");
+    edit.setSyncLoss(edit.getId(1), 0);
+    ASSERT_NO_FATAL_FAILURE(save(edit));
+    const Edit again(path(), eOpenExisting);
+    EXPECT_EQ(again.getSyncLoss(again.getId(1)), 0);
+}
+
+TEST_F(EditFileTest, ANewStoreHasOneEmptyVideoChannel) {
+    for (const auto behaviour : {eOpenNew, eOpenOrCreate}) {
+        const Edit edit(path(), behaviour);
+        EXPECT_FALSE(edit.isBad());
+        ASSERT_EQ(edit.getNumChans(), 1);
+        EXPECT_EQ(edit.getChanType(0), VideoChan);
+        EXPECT_TRUE(edit.isEmpty());
+        EXPECT_EQ(folder.numNames(), 0U);
+    }
+}
+
+TEST_F(EditFileTest, ANameThatIsNoItemLeavesTheEditLoading) {
+    for (const char* name : {"hello.qme", "I0001000.qme", "e0001000.qme", "E0001000.qme.U1"}) {
+        Edit edit;
+        EXPECT_EQ(edit.readFile(path(name), eOpenExisting), Edit::kReadFailed);
+        EXPECT_TRUE(edit.isLoading());
+        EXPECT_EQ(edit.refCount(), 1);
+        EXPECT_NE(edit.lastFileError().find(name), String::npos);
+    }
+    EXPECT_EQ(log.log(), "");
+}
+
+TEST_F(EditFileTest, WhatCannotBeReadIsRefusedWhole) {
+    struct Case {
+        const char* what;
+        std::function<void(RawStore&)> make;
+        const char* reason;
+    };
+    const Case cases[] = {
+        {"no channels", [](RawStore&) {}, "no channels"},
+        {"header of another class",
+         [](RawStore& raw) {
+             raw.addCel(0, "V1");
+             raw.bag.storeObject(EditHeaderProxy::EditHeaderId, std::make_unique<cel>());
+             ASSERT_TRUE(raw.bag.flush().isOk());
+         },
+         "no header"},
+        {"cel of another class",
+         [](RawStore& raw) {
+             raw.addCel(0, "V1");
+             raw.bag.storeObject("Celid1", std::make_unique<cue_list>());
+         },
+         "Celid1"},
+        {"cues of another class",
+         [](RawStore& raw) {
+             raw.addCel(0, "V1");
+             raw.bag.storeObject("CueId", std::make_unique<cel>());
+         },
+         "CueId"},
+        {"groups of another class",
+         [](RawStore& raw) {
+             raw.addCel(0, "V1");
+             raw.bag.storeObject("ChannelGroupList", std::make_unique<cel>());
+         },
+         "ChannelGroupList"},
+        {"a channel of no kind", [](RawStore& raw) { raw.addCel(0, "Q7"); }, "Celid0"},
+        {"an invalid subtype", [](RawStore& raw) { raw.addCel(0, "V1", "SUBTYPE:INVALID"); }, "Celid0"},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.what);
+        RawStore raw(folder.path());
+        c.make(raw);
+        if (std::string_view(c.what) != "header of another class") {
+            raw.finish();
+        }
+        const Edit edit(path(), eOpenExisting);
+        EXPECT_TRUE(edit.isBad());
+        EXPECT_EQ(edit.getNumChans(), 0);
+        EXPECT_NE(edit.lastFileError().find(c.reason), String::npos) << edit.lastFileError();
+        EXPECT_NE(edit.lastFileError().find("E0001000.qme"), String::npos) << edit.lastFileError();
+    }
+    Edit missing;
+    EXPECT_EQ(missing.readFile(path("E0002000.qme"), eOpenExisting), Edit::kReadFailed);
+    EXPECT_TRUE(log.contains("Edit::readFile( E0002000 ) : Failed to open store\n"));
+    EXPECT_FALSE(missing.isLoading());
+}
+
+TEST_F(EditFileTest, ChannelLimits) {
+    struct Case {
+        int video, audio, levels;
+        const char* message;
+    };
+    const Case cases[] = {{24, 0, 0, nullptr},
+                          {25, 0, 0, "Too many video channels (25)\n"},
+                          {1, 32, 32, nullptr},
+                          {1, 33, 0, "Too many audio channels (33)\n"},
+                          {25, 33, 0, "Too many audio channels (33)\n"},
+                          {25, 1, 2, "Too many levels tracks (2)\n"}};
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.message != nullptr ? c.message : "within");
+        log.clear();
+        RawStore raw(folder.path());
+        int n = 0;
+        for (int i = 0; i < c.video; ++i) {
+            raw.addCel(n++, "V1");
+        }
+        std::vector<AudLevelsCel> levels;
+        for (int i = 0; i < std::max(c.audio, c.levels); ++i) {
+            const IdStamp audio(0x80000000U, 7, static_cast<uint32_t>(std::min(i, c.audio - 1)));
+            if (i < c.audio) {
+                raw.addCel(n++, "A1", "SUBTYPE:NONE", audio);
+            }
+            if (i < c.levels) {
+                levels.push_back(AudLevelsCel::create());
+                levels.back().insertNode(1, 0.5F);
+                levels.back().writeToStore(raw.bag);
+                raw.header.setString("Levels" + std::to_string(i),
+                                     levels.back().id().asString() + "=" + audio.asString());
+            }
+        }
+        raw.finish();
+        const Edit edit(path(), eOpenExisting);
+        EXPECT_EQ(edit.isBad(), c.message != nullptr) << edit.lastFileError();
+        EXPECT_EQ(edit.getNumChans(), c.message != nullptr ? 0 : c.video + c.audio + c.levels);
+        EXPECT_EQ(log.standardOutput(), c.message != nullptr ? c.message : "");
+        if (c.message != nullptr) {
+            EXPECT_TRUE(log.contains(c.message));
+        }
+    }
+}
+
+TEST_F(EditFileTest, RepeatedStampsAreReplacedAndLonelyLevelsIgnored) {
+    RawStore raw(folder.path());
+    const IdStamp id = IdStamp::fresh(IdStampMagic::Channel);
+    raw.addCel(0, "V1", "SUBTYPE:NONE", id);
+    raw.addCel(1, "V2", "SUBTYPE:NONE", id);
+    raw.addCel(3, "V4"); // behind a gap
+    const AudLevelsCel levels = AudLevelsCel::create();
+    levels.writeToStore(raw.bag);
+    raw.header.setString("Levels0", levels.id().asString() + "=" + id.asString());
+    raw.finish();
+    const Edit edit(path(), eOpenExisting);
+    ASSERT_FALSE(edit.isBad()) << edit.lastFileError();
+    ASSERT_EQ(edit.getNumChans(), 2);
+    EXPECT_EQ(edit.getId(0), id);
+    EXPECT_TRUE(edit.getId(1).valid());
+    EXPECT_NE(edit.getId(1), id);
+}
+
+TEST_F(EditFileTest, EveryFlippedByteAndEveryTruncationIsRefusedOrHarmless) {
+    Edit edit;
+    test::fillAtRandom(edit, 2, 2);
+    ASSERT_NO_FATAL_FAILURE(save(edit));
+    const std::string good = bytes("E0001000.qme");
+    const std::string state = stateOf(edit);
+    test::MemoryFile file;
+    const auto check = [&](const std::string& written, const char* how, size_t at) {
+        file.setBytes(written);
+        const Edit read(path(), eOpenExisting);
+        if (read.isBad()) {
+            ASSERT_EQ(read.getNumChans(), 0) << how << at;
+            ASSERT_FALSE(read.lastFileError().empty()) << how << at;
+        } else {
+            ASSERT_EQ(stateOf(read), state) << how << at;
+        }
+    };
+    for (size_t i = 0; i < good.size(); ++i) {
+        std::string changed = good;
+        changed[i] = static_cast<char>(changed[i] ^ (1 << (i % 8)));
+        ASSERT_NO_FATAL_FAILURE(check(changed, "flip ", i));
+        ASSERT_NO_FATAL_FAILURE(check(good.substr(0, i), "cut ", i));
+    }
+}
+
+TEST_F(EditFileTest, WhatIsNotToBeWrittenIsNot) {
+    Edit edit;
+    test::fillAtRandom(edit, 4);
+    edit.init_dirty();
+    edit.setTemporary(true);
+    EXPECT_FALSE(edit.write_file(path()));
+    edit.setTemporary(false);
+    EXPECT_FALSE(edit.write_file(path("E0002000.qme"))); // named after another item
+    EXPECT_NE(edit.lastFileError().find("E0002000.qme"), String::npos);
+    EXPECT_FALSE(edit.write_file(L""));
+    EXPECT_FALSE(edit.writeToFile(path(), kObjectStoreEd3File));
+    EXPECT_FALSE(edit.writeToFile(path(), kUnknownFile));
+    edit.set_cookie(cookie("F0001000"));
+    EXPECT_FALSE(edit.write_file(path("F0001000.qme")));
+    EXPECT_TRUE(edit.isDirty(false));
+    EXPECT_EQ(folder.numNames(), 0U);
+
+    Edit empty;
+    empty.set_cookie(cookie(kItem));
+    empty.init_dirty();
+    EXPECT_FALSE(empty.write_file(path()));
+    EXPECT_NE(empty.lastFileError().find("no channels"), String::npos);
+}
+
+TEST_F(EditFileTest, AnEditGoesWhereItIsTold) {
+    Edit edit;
+    test::fillAtRandom(edit, 6);
+    ASSERT_NO_FATAL_FAILURE(save(edit));
+    const std::string first = bytes("E0001000.qme");
+    edit.set_cookie(cookie("E0002000"));
+    edit.setName("the other");
+    edit.init_dirty();
+    ASSERT_TRUE(edit.write_file(path("E0002000.qme"))) << edit.lastFileError();
+    EXPECT_EQ(bytes("E0001000.qme"), first);
+    edit.init_dirty();
+    ASSERT_TRUE(edit.write_file(path("E0002000.ED3"))) << edit.lastFileError();
+    EXPECT_EQ(stateOf(Edit(path("E0002000.qme"), eOpenExisting)), stateOf(edit));
+    EXPECT_EQ(stateOf(Edit(path("E0002000.ED3"), eOpenExisting)), stateOf(edit));
+}
+
+TEST_F(EditFileTest, ReadingAgainReplacesWhatTheEditHad) {
+    Edit edit;
+    test::fillAtRandom(edit, 11);
+    ASSERT_NO_FATAL_FAILURE(save(edit));
+    const String state = stateOf(edit);
+    edit.addChan(AudioChan);
+    edit.ungroupAllChannels();
+    ASSERT_EQ(edit.readFile(path(), eOpenExisting), Edit::kReadOk) << edit.lastFileError();
+    EXPECT_EQ(stateOf(edit), state);
+    EXPECT_EQ(edit.refCount(), 0);
+}
+
+TEST_F(EditFileTest, OtherSeatsHearOfAStoredEdit) {
+    struct Service : Qx::Network::Service {
+        void send(const Qx::Network::Message& message) override { sent.push_back(message); }
+        std::shared_ptr<void> listen(Qx::Network::Listener) override { return nullptr; }
+        std::vector<Qx::Network::Message> sent;
+    };
+    const auto service = std::make_shared<Service>();
+    const auto before = Qx::Network::setService(service);
+    Edit edit;
+    test::fillAtRandom(edit, 8);
+    ASSERT_NO_FATAL_FAILURE(save(edit));
+    EXPECT_TRUE(service->sent.empty());
+    Qx::Network::setNetworkMode(true);
+    ASSERT_NO_FATAL_FAILURE(save(edit));
+    Qx::Network::setNetworkMode(false);
+    Qx::Network::setService(before);
+    ASSERT_EQ(service->sent.size(), 1U);
+    EXPECT_EQ(service->sent[0].kind, Qx::Network::EditWritten);
+    EXPECT_EQ(service->sent[0].item, cookie(kItem));
+}
+
+TEST_F(EditFileTest, StartingWritesTheVersionFile) {
+    const Qx::CurrentProject before = Qx::currentProject();
+    Qx::CurrentProject project = before;
+    project.rootFolder = folder.path();
+    Qx::setCurrentProject(project);
+    folder.write("Last.Version.Used.txt", "old");
+    EXPECT_TRUE(edit_init().isOk());
+    const std::string text = bytes("Last.Version.Used.txt");
+    EXPECT_NE(
+        text.find("Version:string 11.1.0.0\nCosmeticVersion:string Quillmarch 11.1\nEditRevision:int 602\n"
+                  "History310:string Track sound levels are now saved in edits\n"),
+        std::string::npos)
+        << text;
+    EXPECT_NE(text.find("History602:string Added stereoscopic effects\n"), std::string::npos);
+    EXPECT_EQ(editRevisionHistory().size(), 10U);
+    project.rootFolder = folder.path("none");
+    Qx::setCurrentProject(project);
+    EXPECT_FALSE(edit_init().isOk());
+    Qx::setCurrentProject(before);
+}
+
+} // namespace

@@ -1,0 +1,165 @@
+#pragma once
+
+#include "edit/model/edit.h"
+#include "platform/services/files.h"
+#include "platform/store/text_file.h"
+
+#include <random>
+
+namespace test {
+
+inline constexpr const char* kItem = "E0001000";
+
+/// A file's bytes; "(missing)" when it cannot be read.
+inline String bytesOf(const String& path) {
+    String text;
+    return Qx::readWholeFile(path, text, uint64_t{1} << 30) ? String("(missing)") : text;
+}
+
+inline String chanText(const Edit& edit, int index) {
+    const IdStamp id = edit.getId(index);
+    const Edit::ChanType type = edit.getChanTypeAndSubType(id);
+    String text = String::format("channel %d %u %u ", index, static_cast<unsigned>(type.type),
+                                 static_cast<unsigned>(type.subtype)) +
+                  id.asString() + " [" + edit.getChanName(id) + "] [" + edit.getChanDisplayName(id) + "] [" +
+                  edit.getMaterialInfo(id) + "] " + Qx::doubleToText(edit.getSyncLoss(id)) + "\n";
+    const AudCel audio = edit.getAudCel(id);
+    if (audio.valid()) {
+        text += String::format(" audio %d %d ", audio.getSoundOutputEnabled(), audio.getXFadesEnabled()) +
+                audio.getLevelsChanID().asString() + "\n";
+    }
+    for (const auto& node : edit.getLevelsCel(id).getNodeStore().nodes()) {
+        text += String::format(" node %a %a\n", node.time, static_cast<double>(node.level));
+    }
+    if (const cel* content = edit.getCel(id)) {
+        text += String::format(" resolution %a\n", content->resolution());
+        for (int i = 0; i < content->numEvents(); ++i) {
+            const channel_event e = content->get_event(i);
+            text += String::format(" event %d %a %a %a %a %d %u.%u.%u ", e.kind, e.editTime, e.stripTime,
+                                   e.velocity, static_cast<double>(e.level), e.code, e.strip.word(0),
+                                   e.strip.word(1), e.strip.word(2)) +
+                    e.id.asString() + String::format(" %u %u\n", e.rampQFrames, e.rampCurve);
+        }
+    }
+    return text;
+}
+
+/// Everything that a file keeps of an edit, as text.
+inline std::string stateOf(const Edit& edit) {
+    TextFile header;
+    edit.Opts().writeTo(header);
+    String text = edit.get_cookie_str() + "\n" + header.text();
+    text += String::format("time %a mark %a entire %d\n", edit.get_current_time(), edit.get_mark_time(),
+                           edit.get_entire_medium());
+    for (int i = 0; i < edit.getNumChans(); ++i) {
+        text += chanText(edit, i);
+    }
+    for (size_t i = 0; i < edit.get_cues().get_num_cue_points(CueFlag::kKept); ++i) {
+        const cue_point& cue = *edit.get_cues().get_cue_point(i, CueFlag::kKept);
+        text += "cue [" + cue.text() +
+                String::format("] %a %a %d %d %d\n", cue.editTime(), cue.secondTime(), cue.channel(),
+                               cue.code(), cue.flags());
+    }
+    for (const ChannelGroupList* list : {edit.retrieveGroupsList(), edit.retrieveDefaultGroupsList()}) {
+        for (unsigned i = 0; list != nullptr && i < list->size(); ++i) {
+            text += String::format("group %d", static_cast<int>(list->getGroup(i)->getType()));
+            for (const IdStamp& chan : list->getGroup(i)->getChans()) {
+                text += " " + chan.asString();
+            }
+            text += "\n";
+        }
+    }
+    return text;
+}
+
+/// Appends pairs of varied events to a channel.
+inline void addPairs(Edit& edit, int index, int pairs, std::mt19937& random) {
+    cel& content = *edit.get_edit_cel_p(index);
+    double time = content.get_end_time();
+    for (int i = 0; i < pairs; ++i) {
+        const double length = 0.04 * (1 + static_cast<double>(random() % 250));
+        const cookie strip = random() % 10 == 0
+                                 ? black_cookie
+                                 : cookie(Cookie_Type::Material, static_cast<int>(random() % 200), 1);
+        time += random() % 7 == 0 ? 0.04 : 0;
+        content.appendEventPair(strip, 0.1 * static_cast<double>(random() % 1000), time, length);
+        for (int at = content.numEvents() - 2; at < content.numEvents(); ++at) {
+            channel_event event = content.get_event(at);
+            event.level = static_cast<float>(random() % 1000) / 700.0F;
+            event.velocity = random() % 5 == 0 ? -1.0 / 3 : 1;
+            event.code = static_cast<int>(random());
+            event.rampQFrames = static_cast<uint16_t>(random());
+            event.rampCurve = static_cast<uint8_t>(random() % 4);
+            content.setEvent(at, event);
+        }
+        time += length;
+    }
+}
+
+/// An edit of its own for each seed, with something of everything that a file keeps.
+inline void fillAtRandom(Edit& edit, unsigned seed, int mostPairs = 6) {
+    std::mt19937 random(seed);
+    edit.set_cookie(cookie(kItem));
+    for (unsigned i = 0; i < 1 + random() % 3; ++i) {
+        edit.addChan(VideoChan, nullptr, false);
+    }
+    for (unsigned i = 0; i < random() % 5; ++i) {
+        edit.addChan(AudioChan, nullptr, false);
+    }
+    for (unsigned i = 0; i < random() % 3; ++i) {
+        edit.addChan(VideoChan, nullptr, false, Edit_Chan_SubType::ALIAS);
+    }
+    static const char* const names[] = {"",   "Ton links", "\xC3\x84\xE2\x82\xAC \xF0\x9F\x8E\xAC",
+                                        "V1", "A%_x",      "Music 50% = a,b"};
+    Vector<IdStamp> audio;
+    for (int i = 0; i < edit.getNumChans(); ++i) {
+        const IdStamp id = edit.getId(i);
+        edit.setChanName(id, names[random() % 6]);
+        edit.setMaterialInfo(id, random() % 2 == 0 ? "" : "roll 7\nscene \\2");
+        edit.setSyncLoss(id, random() % 3 == 0 ? 0.125 * static_cast<double>(random() % 9) : 0);
+        addPairs(edit, i,
+                 static_cast<int>(random()) & 1
+                     ? static_cast<int>(random() % (1u + static_cast<unsigned>(mostPairs)))
+                     : 0,
+                 random);
+        if (edit.getChanType(i) == AudioChan) {
+            audio.push_back(id);
+        }
+    }
+    for (const IdStamp& id : audio) {
+        AudCel channel = edit.getAudCel(id);
+        channel.setSoundOutputEnabled(random() % 2 == 0);
+        channel.setXFadesEnabled(random() % 2 == 0);
+        edit.setAudCel(channel);
+        if (random() % 2 == 0) {
+            AudLevelsCel levels = AudLevelsCel::create();
+            levels.insertNode(0.5, 0.25F);
+            levels.insertNode(1.0 / 3, static_cast<float>(random() % 100) / 9);
+            edit.setChanName(edit.addLevelsChan(id, levels), "fader");
+        }
+    }
+    if (audio.size() > 1) {
+        edit.groupChannels(audio, static_cast<ChannelGroup::eType>(1));
+    }
+    for (unsigned i = 0; i < random() % 4; ++i) {
+        cue_point cue;
+        cue.setText(i == 1 ? "zwei\nZeilen %41" : "cue " + std::to_string(random()));
+        cue.setEditTime(static_cast<double>(random() % 1000) / 7);
+        cue.setSecondTime(cue.editTime());
+        cue.setChannel(static_cast<int>(random() % 3));
+        cue.setCode(static_cast<int>(random()));
+        cue.setFlags(random() % 4 == 0 ? CueFlag::kInside : CueFlag::kKept | CueFlag::kInside);
+        edit.get_cues().add_cue_point(cue);
+    }
+    edit.Opts().setString("a_text", "line\nend \\ \x01 \xE2\x82\xAC");
+    edit.Opts().setDouble("a_double", 0.1 + static_cast<double>(random()) / 3);
+    edit.Opts().setInt64("an_int64", int64_t{1} << 60);
+    edit.Opts().setBool("a_bool", true);
+    edit.Opts().setCookie("a_cookie", cookie("V0ABC0HZ"));
+    edit.set_current_time(NO_CHAN, static_cast<double>(random() % 100) / 3);
+    if (random() % 2 == 0) {
+        edit.set_mark_time(NO_CHAN, 12.5);
+    }
+}
+
+} // namespace test

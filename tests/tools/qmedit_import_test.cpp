@@ -1,0 +1,131 @@
+#include "tests/tools/qmedit_fixture.h"
+
+#include <filesystem>
+
+namespace {
+
+TEST_F(Qmedit, ImportListAndShowAgreeAcrossProcesses) {
+    const test::ProgramResult result = run({"import", folder.write("short.edl", kShortList)});
+    ASSERT_EQ(result.code, 0) << result.err;
+    EXPECT_EQ(lines(result.out), 1u) << "the cookie alone, so that a script can take it";
+    const String item = result.out.trimmed();
+
+    const auto list = nlohmann::json::parse(run({"list", "--json"}).out);
+    ASSERT_EQ(list.size(), 3u) << "two shots and the edit";
+    const auto& entry = list.back();
+    EXPECT_EQ(entry.at("cookie"), item);
+    EXPECT_EQ(entry.at("type"), "edit");
+    EXPECT_EQ(entry.at("name"), "Short");
+    EXPECT_EQ(entry.at("rate"), 25);
+    EXPECT_EQ(entry.at("duration"), 250);
+    EXPECT_EQ(entry.at("channels"), 2);
+    EXPECT_TRUE(entry.at("damaged").is_null());
+
+    EXPECT_EQ(run({"header", item, "name"}).out, "Short\n");
+    EXPECT_EQ(nlohmann::json::parse(run({"header", item, "FRAME_BASED", "--json"}).out),
+              (nlohmann::json{{"FRAME_BASED", 1}}));
+    EXPECT_EQ(shown(item).at("name"), "Short");
+    EXPECT_EQ(run({"show", item.lower()}).code, 0) << "cookies are read in any case";
+    const String inside = project() + "/P0001000";
+    EXPECT_EQ(run({"list", "--project", inside}).out, run({"list"}).out)
+        << "the project's own folder will do";
+}
+
+TEST_F(Qmedit, ReadingChangesNothing) {
+    const String item = imported(kShortList);
+    const auto before = snapshot();
+    for (const std::vector<std::string>& arguments : {std::vector<std::string>{"list"},
+                                                      {"list", "--json"},
+                                                      {"show", item},
+                                                      {"show", item, "--json"},
+                                                      {"header", item}})
+        EXPECT_EQ(run(arguments).code, 0);
+    EXPECT_EQ(snapshot(), before);
+}
+
+TEST_F(Qmedit, RateOfTheFirstImportBecomesTheProjects) {
+    const std::string list = "001  R1 V C 00:00:00:00 00:00:02:00 00:00:00:00 00:00:02:00\n";
+    EXPECT_EQ(shown(imported(list, {"--rate", "24"})).at("rate"), 24);
+    EXPECT_EQ(shown(imported(list)).at("rate"), 24) << "the project's, when none is given";
+    const auto other = shown(imported(list, {"--rate", "29.97"}));
+    EXPECT_DOUBLE_EQ(other.at("rate"), 29.97);
+    EXPECT_EQ(other.at("rate_text"), "29.97");
+    EXPECT_EQ(other.at("duration"), 60);
+}
+
+TEST_F(Qmedit, LossesGoToStandardErrorAndStrictRefusesThem) {
+    const std::string list = "001  R1 V C        00:00:00:00 00:00:02:00 00:00:00:00 00:00:02:00\n"
+                             "002  R1 V C        00:00:02:00 00:00:02:00 00:00:02:00 00:00:02:00\n"
+                             "002  R2 V W001 024 00:00:00:00 00:00:02:00 00:00:02:00 00:00:04:00\n";
+    const String path = folder.write("wipe.edl", list);
+    const test::ProgramResult strict = run({"import", path, "--strict"});
+    EXPECT_EQ(strict.code, 1);
+    EXPECT_TRUE(strict.out.empty());
+    EXPECT_TRUE(snapshot().empty());
+    const test::ProgramResult result = run({"import", path});
+    EXPECT_EQ(result.code, 0);
+    EXPECT_NE(result.err.find("wipe.edl:3: loss"), String::npos) << result.err;
+    EXPECT_EQ(lines(result.out), 1u);
+}
+
+TEST_F(Qmedit, BadFilesFailInOneLineAndLeaveTheProjectAsItWas) {
+    namespace fs = std::filesystem;
+    const String folderPath = folder.path("folder.edl");
+    fs::create_directory(fs::path(folderPath.c_str()));
+    const String zeros = folder.write("zeros.edl", "");
+    fs::resize_file(fs::path(zeros.c_str()), 200u << 20);
+    fs::create_symlink("nowhere", fs::path(folder.path("link.edl").c_str()));
+    const std::string jpeg = std::string("\xFF\xD8\xFF\xE0\0\x10JFIF\0", 12);
+    const std::string event = "001  R1 V C 00:00:00:00 00:00:01:00 99:99:99:99 01:00:01:00\n";
+    const std::string badByte = "TITLE: x\n001  R1 V C 00:00:00:00 00:00:01:00 01:00:00:00 01:00\x1b[2J\n";
+    const std::vector<std::pair<String, const char*>> files = {
+        {folder.path("missing.edl"), "missing.edl: there is no such file"},
+        {folderPath, "folder.edl: this is a folder"},
+        {folder.path("link.edl"), "link.edl"},
+        {folder.write("empty.edl", ""), "empty.edl:1: "},
+        {folder.write("title.edl", "TITLE: nothing else\n"), "title.edl:1: "},
+        {zeros, "zeros.edl:1: "},
+        {folder.write("photo.jpg", jpeg), "photo.jpg:1: "},
+        {folder.write("photo.edl", jpeg), "photo.edl:1: "},
+        {folder.write("letter.txt", "Dear editor,\n"), "letter.txt:1: "},
+        {folder.write("label.edl", "TITLE: x\n" + event), "label.edl:2: "},
+        {folder.write("hostile.edl", badByte), "hostile.edl:2: "},
+        {folder.write("E0001000.qme", "x"), "'qmedit show COOKIE"},
+        {"/dev/zero", "/dev/zero: not a regular file"},
+    };
+    for (const bool withProject : {false, true}) {
+        if (withProject)
+            imported(kShortList);
+        const auto before = snapshot();
+        for (const auto& [path, error] : files) {
+            SCOPED_TRACE(path);
+            const test::ProgramResult result = run({"import", path});
+            EXPECT_EQ(result.code, 1);
+            EXPECT_TRUE(result.out.empty());
+            EXPECT_EQ(lines(result.err), 1u) << result.err;
+            EXPECT_NE(result.err.find(error), String::npos) << result.err;
+            EXPECT_EQ(result.err.find('\x1b'), String::npos) << "the file's bytes do not reach the terminal";
+            EXPECT_EQ(snapshot(), before);
+        }
+    }
+}
+
+TEST_F(Qmedit, DemoMakesAProjectThatStaysAndNamesIt) {
+    const test::ProgramResult result = run({"demo"});
+    ASSERT_EQ(result.code, 0) << result.err;
+    const size_t at = result.out.find("show E");
+    ASSERT_NE(at, String::npos);
+    const String kept = folder.path() + "/quillmarch-demo-";
+    const size_t named = result.out.find(kept);
+    ASSERT_NE(named, String::npos) << result.out;
+    const String made = result.out.substr(named, result.out.find_first_of(" .\n", named) - named);
+    const auto edit =
+        nlohmann::json::parse(run({"show", result.out.substr(at + 5, 8), "--json", "--project", made}).out);
+    ASSERT_EQ(edit.at("channels").size(), 3u);
+    EXPECT_EQ(edit.at("name"), "MARKET DAY");
+    EXPECT_EQ(edit.at("duration"), 52 * 25);
+    EXPECT_EQ(edit.at("cues").size(), 3u);
+    EXPECT_EQ(edit.at("channels").at(0).at("pairs").size(), 14u);
+}
+
+} // namespace

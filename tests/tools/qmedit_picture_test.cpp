@@ -1,0 +1,73 @@
+#include "tests/tools/qmedit_fixture.h"
+
+namespace {
+
+/// The lines of the picture: from the ruler to the legend.
+String pictureOf(const String& shown) {
+    std::vector<String> rows = shown.split('\n');
+    String picture;
+    for (size_t i = 4; i < rows.size() && !rows[i].empty(); ++i)
+        picture += rows[i] + "\n";
+    return picture;
+}
+
+TEST_F(Qmedit, DrawsTracksToScale) {
+    const String item = imported(kShortList);
+    EXPECT_EQ(pictureOf(run({"show", item}, {"LANG=en_GB.UTF-8", "COLUMNS=56"}).out),
+              "     ╷10:00:00:00              ╷10:00:05:00\n"
+              "          ▼ ship\n"
+              "     ┌──────────────┬────┐    ┌────────────────────────┐\n"
+              " V1  │ harbour      │blac│    │ harbour                │\n"
+              "     ├──────────────┴────┴────┴────────────────────────┤\n"
+              " A1  │ gulls                                           │\n"
+              "     └─────────────────────────────────────────────────┘\n"
+              "     │ cut   ░ black   blank gap   ▼ marker\n");
+    EXPECT_EQ(pictureOf(run({"show", item}, {"LC_ALL=C", "LANG=en_GB.UTF-8", "COLUMNS=46"}).out),
+              "     +10:00:00:00         +10:00:05:00\n"
+              "         v ship\n"
+              "     +-----------+---+   +-------------------+\n"
+              " V1  | harbour   |bla|   | harbour           |\n"
+              "     +-----------+---+---+-------------------+\n"
+              " A1  | gulls                                 |\n"
+              "     +---------------------------------------+\n"
+              "     | cut   . black   blank gap   v marker\n");
+}
+
+TEST_F(Qmedit, NoLineOfThePictureIsWiderThanTheConsole) {
+    const String item = imported(kShortList);
+    for (const int width : {40, 56, 80, 120, 333}) {
+        const String columns = "COLUMNS=" + std::to_string(width);
+        for (const String& row : pictureOf(run({"show", item}, {"LC_ALL=C", columns}).out).split('\n'))
+            EXPECT_LE(row.size(), static_cast<size_t>(width)) << row;
+    }
+    const auto widest = [&](std::vector<std::string> environment) {
+        environment.emplace_back("LC_ALL=C");
+        size_t most = 0;
+        for (const String& row : pictureOf(run({"show", item}, environment).out).split('\n'))
+            most = std::max(most, row.size());
+        return most;
+    };
+    EXPECT_EQ(widest({}), widest({"COLUMNS=100"})) << "a hundred columns where nothing says how many";
+    EXPECT_EQ(widest({"COLUMNS=-7"}), widest({"COLUMNS=100"}));
+}
+
+TEST_F(Qmedit, NoColourWhereOutputIsNoTerminal) {
+    const String item = imported(kShortList);
+    EXPECT_EQ(run({"show", item}, {"TERM=xterm-256color"}).out.find('\x1b'), String::npos);
+}
+
+TEST_F(Qmedit, ListsEventsWithTimecodesAndGaps) {
+    const String item = imported(kShortList);
+    const String out = run({"show", item}).out;
+    for (const char* line : {
+             "  1  10:00:00:00  10:00:03:00  00:00:10:00  00:00:13:00    3:00  harbour\n",
+             "  2  10:00:03:00  10:00:04:00                              1:00  black\n",
+             "     10:00:04:00  10:00:05:00                              1:00  gap\n",
+             "  1  10:00:00:00  10:00:10:00  00:01:00:00  00:01:10:00   10:00  gulls\n",
+             "       10:00:01:00  ship (red)\n",
+         })
+        EXPECT_NE(out.find(line), String::npos) << line << out;
+    EXPECT_NE(out.find("harbour (50%)"), String::npos) << out;
+}
+
+} // namespace

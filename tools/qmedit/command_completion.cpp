@@ -1,0 +1,93 @@
+#include "tools/qmedit/commands.h"
+#include "tools/qmedit/console.h"
+
+#include <CLI/CLI.hpp>
+
+#include <memory>
+
+namespace {
+
+/// The long options of a command, as words.
+String optionWords(const CLI::App& command) {
+    String words;
+    for (const CLI::Option* option : command.get_options())
+        for (const std::string& name : option->get_lnames())
+            words += (words.empty() ? "--" : " --") + String(name);
+    return words;
+}
+
+/// A bash function made from the declared commands and options, so that it cannot differ from them.
+String bashCompletion(const CLI::App& app) {
+    String commands;
+    String options;
+    for (const CLI::App* command : app.get_subcommands(nullptr)) {
+        commands += (commands.empty() ? "" : " ") + command->get_name();
+        options += "        " + command->get_name() + ") options='" + optionWords(*command) + "' ;;\n";
+    }
+    return R"bash(# bash completion for qmedit; use it with: source <(qmedit completion bash)
+_qmedit_cookies() {
+    local project=() i
+    for ((i = 1; i < COMP_CWORD; i++)); do
+        [[ ${COMP_WORDS[i]} == --project ]] && project=(--project "${COMP_WORDS[i + 1]/#\~/$HOME}")
+    done
+    "${COMP_WORDS[0]}" list "${project[@]}" 2>/dev/null | while read -r cookie rest; do
+        [[ $cookie =~ ^[A-Z][0-9A-Z]{7}$ ]] && printf '%s\n' "$cookie"
+    done
+}
+
+_qmedit() {
+    local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]} command='' options='' i
+    COMPREPLY=()
+    for ((i = 1; i < COMP_CWORD; i++)); do
+        case ${COMP_WORDS[i]} in
+        --project | --rate | --type) ((i++)) ;;
+        -*) ;;
+        *) command=${COMP_WORDS[i]}; break ;;
+        esac
+    done
+    case $previous in
+    --project)
+        mapfile -t COMPREPLY < <(compgen -d -- "$current")
+        compopt -o filenames 2>/dev/null
+        return ;;
+    --rate) mapfile -t COMPREPLY < <(compgen -W '23.976 24 25 29.97 30 47.952 48 50 59.94 60' -- "$current"); return ;;
+    --type) mapfile -t COMPREPLY < <(compgen -W 'edit shot ghost magic reel FXT' -- "$current"); return ;;
+    esac
+    case $command in
+        '') options=')bash" +
+           optionWords(app) + " " + commands + "' ;;\n" + options + R"bash(    esac
+    if [[ $current == -* || -z $command ]]; then
+        mapfile -t COMPREPLY < <(compgen -W "$options" -- "$current")
+        return
+    fi
+    case $command in
+    import)
+        mapfile -t COMPREPLY < <(compgen -f -- "$current")
+        compopt -o filenames 2>/dev/null ;;
+    show | header) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;
+    ;
+    completion) mapfile -t COMPREPLY < <(compgen -W bash -- "$current") ;
+    ;
+    esac
+}
+complete -F _qmedit qmedit
+)bash";
+}
+
+} // namespace
+
+void addCompletionCommand(CLI::App& app, CommandWork& work) {
+    const auto shell = std::make_shared<std::string>();
+    CLI::App* command = app.add_subcommand("completion", "Print the completion script for a shell");
+    command->add_option("SHELL", *shell, "The shell: bash")
+        ->required()
+        ->type_name("")
+        ->check(CLI::IsMember({"bash"}));
+    command->footer("Example:\n  source <(qmedit completion bash)");
+    command->callback([&app, &work] {
+        work = [&app] {
+            writeOut(bashCompletion(app));
+            return static_cast<int>(kDone);
+        };
+    });
+}

@@ -1,0 +1,96 @@
+#include "tools/qmedit/commands.h"
+#include "tools/qmedit/console.h"
+#include "tools/qmedit/edit_json.h"
+#include "tools/qmedit/project_session.h"
+#include "tools/qmedit/safe_text.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <memory>
+
+namespace {
+
+struct HeaderOptions {
+    std::string item;
+    std::string key;
+    String project;
+    bool json = false;
+};
+
+String valueText(const configb::Value& value, const Console& console) {
+    return std::visit(
+        [&](const auto& content) -> String {
+            using Type = std::decay_t<decltype(content)>;
+            if constexpr (std::is_same_v<Type, String>)
+                return console.safe(content);
+            else if constexpr (std::is_same_v<Type, cookie>)
+                return content.asString();
+            else if constexpr (std::is_same_v<Type, double>)
+                return Qx::doubleToText(content);
+            else if constexpr (std::is_same_v<Type, bool>)
+                return content ? "true" : "false";
+            else
+                return String(std::to_string(content));
+        },
+        value);
+}
+
+String headerTable(const configb& header, const std::vector<String>& keys, const Console& console) {
+    int width = 0;
+    for (const String& key : keys)
+        width = std::max(width, safe_text::columns(console.safe(key)));
+    String out;
+    for (const String& key : keys) {
+        const configb::Value* value = header.find(key);
+        out += console.inked(Console::Ink::Bold,
+                             safe_text::padded(console.safe(key), width, console.ellipsis()));
+        out += "  " + (value != nullptr ? valueText(*value, console) : String()) + "\n";
+    }
+    return out;
+}
+
+int runHeader(const HeaderOptions& options) {
+    cookie item;
+    if (!readCookie(options.item, item))
+        return kWrongUsage;
+    ProjectSession session(options.project);
+    if (const Qx::Status opened = session.openExisting(); !opened)
+        return failed(opened);
+    EditPtr edit;
+    if (const Qx::Status read = session.readEdit(item, edit); !read)
+        return failed(read);
+    const configb& header = std::as_const(*edit).Opts();
+    std::vector<String> keys = header.keys();
+    if (!options.key.empty()) {
+        if (!header.contains(options.key))
+            return failed(Qx::Status::failure("the header of " + item.asString() + " has no key '" +
+                                              options.key + "'; 'qmedit header " + item.asString() +
+                                              "' shows those it has"));
+        std::erase_if(keys, [&](const String& key) { return !String::equalNoCase(key, options.key); });
+    }
+    const Console console = Console::forStandardOutput();
+    if (options.json)
+        writeOut(headerJson(header, keys));
+    else if (!options.key.empty())
+        writeOut(valueText(*header.find(options.key), console) + "\n");
+    else
+        writeOut(headerTable(header, keys, console));
+    return kDone;
+}
+
+} // namespace
+
+void addHeaderCommand(CLI::App& app, CommandWork& work) {
+    const auto options = std::make_shared<HeaderOptions>();
+    CLI::App* command = app.add_subcommand("header", "Show the header properties of an edit, or one of them");
+    command->add_option("COOKIE", options->item, "The edit, as 'qmedit list' names it")
+        ->required()
+        ->type_name("");
+    command->add_option("KEY", options->key, "Only this property, its value alone (in any case)")
+        ->type_name("");
+    addProjectOption(*command, options->project);
+    command->add_flag("--json", options->json, "Write JSON: an object of the properties");
+    command->footer("Example:\n  qmedit header E0001000 FRAME_RATE");
+    command->callback([options, &work] { work = [options] { return runHeader(*options); }; });
+}

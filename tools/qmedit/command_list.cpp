@@ -1,0 +1,119 @@
+#include "tools/qmedit/commands.h"
+#include "tools/qmedit/console.h"
+#include "tools/qmedit/edit_json.h"
+#include "tools/qmedit/project_session.h"
+#include "tools/qmedit/safe_text.h"
+
+#include "platform/media/timecode.h"
+#include "platform/services/files.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <ctime>
+#include <memory>
+
+namespace {
+
+struct ListOptions {
+    String project;
+    String type;
+    bool json = false;
+};
+
+String localTime(int64_t seconds) {
+    const auto time = static_cast<std::time_t>(seconds);
+    std::tm fields{};
+    char text[32];
+    if (seconds <= 0 || localtime_r(&time, &fields) == nullptr ||
+        std::strftime(text, sizeof text, "%Y-%m-%d %H:%M", &fields) == 0)
+        return "-";
+    return text;
+}
+
+/// The rows of the table, each with one text a column; a damaged edit has its reason in the last.
+std::vector<String> cells(const ListedEdit& edit, const Console& console) {
+    if (!edit.damage.empty())
+        return {edit.item.asString(), "damaged", "-", "-", "-", "-", console.safe(edit.damage)};
+    return {edit.item.asString(),
+            edit.type.empty() ? "-" : edit.type,
+            edit.rate.valid() ? edit.rate.asString() : "-",
+            Qx::durationText(edit.rate.toFrames(edit.duration), edit.rate, false),
+            String(std::to_string(edit.channels)),
+            localTime(edit.modified),
+            console.safe(edit.name)};
+}
+
+String listTable(const std::vector<ListedEdit>& edits, const Console& console) {
+    const std::vector<String> heading = {"cookie", "type", "rate", "duration", "chans", "modified", "name"};
+    constexpr bool rightAligned[] = {false, false, true, true, true, false, false};
+    std::vector<std::vector<String>> rows = {heading};
+    for (const ListedEdit& edit : edits)
+        rows.push_back(cells(edit, console));
+    std::vector<int> widths(heading.size());
+    for (const auto& row : rows)
+        for (size_t i = 0; i + 1 < row.size(); ++i)
+            widths[i] = std::max(widths[i], safe_text::columns(row[i]));
+
+    String out;
+    for (size_t r = 0; r < rows.size(); ++r) {
+        String line;
+        int used = 0;
+        for (size_t i = 0; i + 1 < heading.size(); ++i) {
+            line += safe_text::padded(rows[r][i], widths[i], "", rightAligned[i]) + "  ";
+            used += widths[i] + 2;
+        }
+        const String& last = rows[r].back();
+        line += console.terminal()
+                    ? safe_text::fitted(last, std::max(console.width() - used, 12), console.ellipsis())
+                    : last;
+        const bool damaged = r > 0 && !edits[r - 1].damage.empty();
+        out += console.inked(r == 0    ? Console::Ink::Dim
+                             : damaged ? Console::Ink::Warning
+                                       : Console::Ink::None,
+                             line) +
+               "\n";
+    }
+    return out;
+}
+
+int runList(const ListOptions& options) {
+    ProjectSession session(options.project);
+    if (const Qx::Status opened = session.openExisting(); !opened)
+        return failed(opened);
+    std::vector<ListedEdit> edits;
+    std::vector<String> others;
+    if (const Qx::Status listed = session.list(edits, others); !listed)
+        return failed(listed);
+    for (const String& name : others)
+        reportWarning(Qx::joinPath(session.folder(), name) + " is passed over: its name is no cookie");
+    if (!options.type.empty())
+        std::erase_if(
+            edits, [&](const ListedEdit& edit) { return edit.damage.empty() && edit.type != options.type; });
+    if (options.json)
+        writeOut(listJson(edits));
+    else if (!edits.empty())
+        writeOut(listTable(edits, Console::forStandardOutput()));
+    else
+        reportProgress("the project " + session.root() + " holds no edit" +
+                       (options.type.empty() ? "" : " of that type"));
+    return kDone;
+}
+
+} // namespace
+
+void addListCommand(CLI::App& app, CommandWork& work) {
+    const auto options = std::make_shared<ListOptions>();
+    CLI::App* command = app.add_subcommand("list", "List the edits of a project");
+    addProjectOption(*command, options->project);
+    command->add_flag("--json", options->json, "Write JSON");
+    command
+        ->add_option_function<std::string>(
+            "--type", [options](const std::string& type) { options->type = type; },
+            "Only items of a type (damaged files are listed all the same)")
+        ->type_name("TYPE")
+        ->check(CLI::IsMember({"edit", "shot", "ghost", "magic", "reel", "FXT"}));
+    command->footer("Example:\n  qmedit list --project ~/feature --type edit\n\n"
+                    "A file that cannot be read is listed as damaged, with the reason.");
+    command->callback([options, &work] { work = [options] { return runList(*options); }; });
+}

@@ -1,0 +1,144 @@
+#include "tools/qmedit/console.h"
+
+#include "platform/services/log.h"
+#include "tools/qmedit/safe_text.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <sys/ioctl.h>
+#include <unistd.h>
+
+namespace {
+
+constexpr int kDefaultWidth = 100;
+constexpr int kLeastWidth = 40;
+constexpr int kGreatestWidth = 500;
+
+int outputError = 0;
+
+const char* environment(const char* name) {
+    const char* value = std::getenv(name);
+    return value != nullptr && *value != '\0' ? value : nullptr;
+}
+
+bool localeIsUtf8() {
+    for (const char* name : {"LC_ALL", "LC_CTYPE", "LANG"})
+        if (const char* value = environment(name)) {
+            const String lower = String(value).lower();
+            return lower.find("utf-8") != String::npos || lower.find("utf8") != String::npos;
+        }
+    return false;
+}
+
+int terminalWidth(bool terminal) {
+    int width = 0;
+    if (const char* columns = environment("COLUMNS");
+        columns != nullptr && Qx::textToInt(columns, width) && width > 0)
+        return std::clamp(width, kLeastWidth, kGreatestWidth);
+    winsize size{};
+    if (terminal && ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0)
+        return std::clamp(int{size.ws_col}, kLeastWidth, kGreatestWidth);
+    return kDefaultWidth;
+}
+
+bool errorsAscii() {
+    static const bool ascii = !localeIsUtf8();
+    return ascii;
+}
+
+void errorLine(std::string_view lead, std::string_view text) {
+    const String line = String(lead) + safe_text::escaped(text, errorsAscii()) + "\n";
+    std::fwrite(line.data(), 1, line.size(), stderr);
+}
+
+} // namespace
+
+Console Console::forStandardOutput() {
+    const bool terminal = isatty(STDOUT_FILENO) == 1;
+    const char* term = environment("TERM");
+    const bool dumb = term == nullptr || std::strcmp(term, "dumb") == 0;
+    return {terminal && !dumb && environment("NO_COLOR") == nullptr, localeIsUtf8(), terminalWidth(terminal),
+            terminal};
+}
+
+String Console::safe(std::string_view text) const {
+    return safe_text::escaped(text, !m_utf8);
+}
+
+const char* Console::begin(Ink ink) const {
+    if (!m_colour)
+        return "";
+    switch (ink) {
+    case Ink::None:
+        return "\x1b[0m";
+    case Ink::Dim:
+        return "\x1b[2m";
+    case Ink::Bold:
+        return "\x1b[1m";
+    case Ink::Error:
+        return "\x1b[1;38;5;231;48;5;124m";
+    case Ink::Warning:
+        return "\x1b[1;38;5;208m";
+    case Ink::Video:
+        return "\x1b[38;5;231;48;5;25m";
+    case Ink::VideoOther:
+        return "\x1b[38;5;231;48;5;31m";
+    case Ink::Audio:
+        return "\x1b[38;5;231;48;5;28m";
+    case Ink::AudioOther:
+        return "\x1b[38;5;231;48;5;65m";
+    case Ink::Effect:
+        return "\x1b[38;5;231;48;5;90m";
+    case Ink::Black:
+        return "\x1b[38;5;250;48;5;235m";
+    case Ink::Cue:
+        return "\x1b[1;38;5;214m";
+    }
+    return "";
+}
+
+String Console::inked(Ink ink, std::string_view text) const {
+    if (!m_colour || ink == Ink::None || text.empty())
+        return String(text);
+    return String(begin(ink)) + String(text) + begin(Ink::None);
+}
+
+void writeOut(std::string_view text) {
+    errno = 0;
+    if (outputError == 0 && std::fwrite(text.data(), 1, text.size(), stdout) != text.size())
+        outputError = errno != 0 ? errno : EIO;
+}
+
+bool finishOutput() {
+    errno = 0;
+    if (std::fflush(stdout) != 0 && outputError == 0)
+        outputError = errno != 0 ? errno : EIO;
+    if (outputError == 0)
+        return true;
+    reportError(String("cannot write standard output: ") + std::strerror(outputError));
+    return false;
+}
+
+void reportError(std::string_view text) {
+    errorLine("qmedit: ", text);
+}
+
+void reportWarning(std::string_view text) {
+    errorLine("qmedit: warning: ", text);
+}
+
+void reportProgress(std::string_view text) {
+    errorLine("", text);
+}
+
+void routeLibraryLog() {
+    Qx::setLogSink([](std::string_view line) {
+        while (!line.empty() && (line.back() == '\n' || line.back() == ' '))
+            line.remove_suffix(1);
+        reportProgress(line);
+    });
+    Qx::setStandardOutputSink([](std::string_view) {});
+}

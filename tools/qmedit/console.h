@@ -1,0 +1,70 @@
+#pragma once
+
+#include "platform/base/qx_string.h"
+
+#include <string_view>
+
+/// How standard output shows a text, and the ways that qmedit writes: results to standard output, everything
+/// else to standard error.
+class Console {
+public:
+    /// Roles of a text in colour. `None` ends a colour.
+    enum class Ink {
+        None,
+        Dim,
+        Bold,
+        Error,
+        Warning,
+        Video,
+        VideoOther,
+        Audio,
+        AudioOther,
+        Effect,
+        Black,
+        Cue
+    };
+
+    /// What standard output can show: colours on a terminal unless NO_COLOR is set or TERM is "dumb"; UTF-8
+    /// by LC_ALL, LC_CTYPE or LANG, the first that is set; the width by COLUMNS, else by the terminal, else
+    /// 100.
+    [[nodiscard]] static Console forStandardOutput();
+    /// A console of given abilities.
+    Console(bool colour, bool utf8, int width, bool terminal)
+        : m_colour(colour), m_utf8(utf8), m_terminal(terminal), m_width(width) {}
+
+    [[nodiscard]] bool colour() const { return m_colour; }
+    [[nodiscard]] bool utf8() const { return m_utf8; }
+    [[nodiscard]] bool terminal() const { return m_terminal; }
+    /// Columns, 40 to 500.
+    [[nodiscard]] int width() const { return m_width; }
+    /// The sign, one column wide, that something was cut off.
+    [[nodiscard]] const char* ellipsis() const { return m_utf8 ? "…" : "~"; }
+
+    /// `text` made fit for this console (see `safe_text::escaped`).
+    [[nodiscard]] String safe(std::string_view text) const;
+    /// `text`, which is fit to be shown, in a colour; as it is without colours.
+    [[nodiscard]] String inked(Ink ink, std::string_view text) const;
+    /// The sequence that begins a colour, empty without colours.
+    [[nodiscard]] const char* begin(Ink ink) const;
+
+private:
+    bool m_colour;
+    bool m_utf8;
+    bool m_terminal;
+    int m_width;
+};
+
+/// Writes to standard output. A failure is remembered; see `finishOutput`.
+void writeOut(std::string_view text);
+/// Flushes standard output. False, with one line on standard error, if anything could not be written.
+[[nodiscard]] bool finishOutput();
+
+/// One line on standard error, "qmedit: " and the text, made fit for a terminal.
+void reportError(std::string_view text);
+/// One line on standard error, "qmedit: warning: " and the text.
+void reportWarning(std::string_view text);
+/// One line on standard error, as it is but made fit for a terminal.
+void reportProgress(std::string_view text);
+
+/// Sends the library's log to standard error, made fit for a terminal, and nothing of it to standard output.
+void routeLibraryLog();

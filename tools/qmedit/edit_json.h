@@ -1,0 +1,22 @@
+#pragma once
+
+#include "tools/qmedit/edit_report.h"
+#include "tools/qmedit/project_session.h"
+
+#include <vector>
+
+/// The JSON texts of qmedit, as docs/qmedit.md describes them. Each is one valid JSON value in UTF-8 and a
+/// line end, whatever bytes the edit holds: a byte that is not UTF-8 becomes U+FFFD. Numbers do not depend on
+/// the locale. Fields are added over time and keep their meaning.
+
+/// One edit: an object. Each pair stands on a line of its own.
+[[nodiscard]] String editJson(const EditReport& report);
+
+/// The edits of a project: an array of objects.
+[[nodiscard]] String listJson(const std::vector<ListedEdit>& edits);
+
+/// Header values by key, in order: an object.
+[[nodiscard]] String headerJson(const configb& header, const std::vector<String>& keys);
+
+/// "2026-11-21T11:30:00Z" for seconds since 1970, UTC; empty for a time that has no date.
+[[nodiscard]] String isoTime(int64_t seconds);

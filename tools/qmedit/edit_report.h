@@ -1,0 +1,102 @@
+#pragma once
+
+#include "edit/model/edit.h"
+#include "platform/media/frame_rate.h"
+
+#include <functional>
+#include <vector>
+
+/// What one edit shows, taken out of it once as plain values: the picture, the table and the JSON text are
+/// all drawn from this. Times are seconds.
+
+/// What a pair plays.
+enum class SourceKind {
+    Shot,  ///< an item of the project, with a file and a name of its own
+    Media, ///< picture or sound itself, as a shot plays it
+    Black,
+    Effect,
+    Alias, ///< another channel of the edit
+    Input,
+    Magic ///< another magic item
+};
+
+/// One source that the pairs of an edit name.
+struct SourceReport {
+    cookie strip;
+    SourceKind kind = SourceKind::Shot;
+    String name;            ///< the item's own name, any bytes; empty for what has none
+    String problem;         ///< why the name could not be read; empty if it could
+    bool dropFrame = false; ///< its timecode is counted in drop frame
+};
+
+/// One pair of a channel.
+struct PairReport {
+    double in = 0;
+    double out = 0;
+    double stripIn = 0;
+    double stripOut = 0;
+    double velocity = 1;
+    double fadeIn = 0;  ///< length of the fade at the in point
+    double fadeOut = 0; ///< and at the out point
+    size_t source = 0;  ///< index into `EditReport::sources`
+};
+
+struct ChannelReport {
+    IdStamp id;
+    String name; ///< any bytes
+    Edit_Chan_Type type = NoChan;
+    Edit_Chan_SubType subtype = Edit_Chan_SubType::INVALID;
+    std::vector<PairReport> pairs;
+
+    [[nodiscard]] char letter() const;
+    /// An audio levels channel, which has a place among the channels but no pairs.
+    [[nodiscard]] bool isLevels() const { return type == NoChan; }
+};
+
+struct CueReport {
+    double time = 0;
+    double length = 0;
+    String text; ///< any bytes
+    int code = 0;
+    int channel = -1; ///< index into `EditReport::channels`; -1 for any channel
+    bool attached = false;
+};
+
+struct GroupReport {
+    unsigned type = 0;
+    std::vector<IdStamp> channels;
+};
+
+struct EditReport {
+    cookie item;
+    String name; ///< any bytes
+    edit_log_type_t type = kLogNone;
+    Qx::FrameRate rate;
+    bool dropFrame = false;
+    double origin = 0; ///< timecode, from midnight, of edit time 0
+    double start = 0;  ///< edit time of the first event
+    double end = 0;    ///< edit time at which the last event ends
+    int64_t modified = 0;
+    std::vector<ChannelReport> channels;
+    std::vector<SourceReport> sources;
+    std::vector<CueReport> cues;
+    std::vector<GroupReport> groups;
+
+    [[nodiscard]] double duration() const { return end - start; }
+    /// Frames of a length or an edit time; 0 for what is not finite.
+    [[nodiscard]] int64_t frames(double seconds) const;
+    /// Timecode text of an edit time, of a time of a source, and of a length.
+    [[nodiscard]] String recordTimecode(double editTime) const;
+    [[nodiscard]] String sourceTimecode(const SourceReport& source, double stripTime) const;
+    [[nodiscard]] String lengthText(double seconds) const;
+};
+
+/// Looks up what its own file says of a source: fills `name` and `dropFrame`, or `problem`. Asked once a
+/// source.
+using SourceNamer = std::function<void(SourceReport&)>;
+
+/// Takes out everything. `namer` may be empty: then no name is looked up.
+[[nodiscard]] EditReport reportOf(const Edit& edit, const SourceNamer& namer);
+
+/// A word for the kind, as the JSON text and the table write it: "shot", "black", "effect", ...
+[[nodiscard]] const char* sourceKindText(SourceKind kind);

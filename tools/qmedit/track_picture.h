@@ -1,0 +1,25 @@
+#pragma once
+
+#include "tools/qmedit/console.h"
+#include "tools/qmedit/edit_report.h"
+
+/// The tracks of an edit drawn to scale in the columns of a console: a timecode ruler, a row of markers where
+/// there are any, and for each channel one row of pairs between two rules.
+///
+///         ╷01:00:00:00      ╷01:00:10:00      ╷01:00:20:00
+///         ┌─────────┬───────┬────────┐        ┌──────────┐
+///     V1  │ square  │ stalls│░░░░░░░░│        │╱╱ bread  │
+///         ├─────────┴───────┼────────┴────────┴──────────┤
+///     A1  │ square          │ atmosphere                 │
+///         └─────────────────┴────────────────────────────┘
+///
+/// A cut is an upright line at its place, to the nearest column; a heavy one stands for pairs that are
+/// narrower than a column. A gap is blank, black is shaded, a fade is slanted, a pair whose shot is missing
+/// says so.
+[[nodiscard]] String trackPicture(const EditReport& report, const Console& console);
+
+/// One or two lines on the edit as a whole: name, cookie, type, rate, span, channels.
+[[nodiscard]] String editSummary(const EditReport& report, const Console& console);
+
+/// What stands for a source on a console: its name made fit to show, "black", or "missing E0001005".
+[[nodiscard]] String sourceLabel(const SourceReport& source, const Console& console);
