@@ -5,6 +5,7 @@
 #include "platform/base/vector.h"
 #include "platform/notify/notifier.h"
 #include "platform/notify/val_server.h"
+#include "platform/services/network.h"
 
 #include <functional>
 #include <memory>
@@ -22,19 +23,20 @@ struct EditCacheEntry {
     EditPtr edit;
 };
 
-/// The one registry of open edits of a process. It finds an edit by its cookie, reads it when it is not cached, falls
-/// back to its backups when its file is missing or unreadable, writes changed edits, keeps their revisions, and
-/// tells the rest of the system when the project changes, changes are flushed, the cache is dropped or an edit
-/// is deleted. What it leaves to others: reading and writing a file (`Edit`), the numbered files beside one
+/// The one registry of open edits of a process. It finds an edit by its cookie, reads it when it is not
+/// cached, falls back to its backups when its file is missing or unreadable, writes changed edits, keeps
+/// their revisions, and tells the rest of the system when the project changes, changes are flushed, the cache
+/// is dropped or an edit is deleted. What it leaves to others: reading and writing a file (`Edit`), the
+/// numbered files beside one
 /// (`RevisionChain`), milestone copies (`MilestoneRing`), the project's records (`projdb`).
 ///
 /// All operations are static; the one instance exists for its roles towards others: it is the model's
 /// `EditRegistry` and hears messages of other seats. Without an instance opening yields a null handle.
 ///
-/// Threads: any thread may call anything. One recursive lock guards the cache, the dirty list, the project edit
-/// and every write of an edit file made here; it is never held while a file is read. Openings of one item take
-/// turns. An edit itself is not locked: who changes it while another thread flushes must hold its section, as
-/// the flush does.
+/// Threads: any thread may call anything. One recursive lock guards the cache, the dirty list, the project
+/// edit and every write of an edit file made here; it is never held while a file is read. Openings of one
+/// item take turns. An edit itself is not locked: who changes it while another thread flushes must hold its
+/// section, as the flush does.
 ///
 /// Nothing here throws.
 class QM_API edit_manager : public EditRegistry {
@@ -42,17 +44,18 @@ public:
     /// Replaces any manager there is, clears network mode and becomes the model's registry. Settings are read
     /// here: "backup_depth" (10, at least 1).
     edit_manager();
-    /// Shuts down: flushes when the crash flag is set, brings the project's records up to date if the platform
-    /// agrees, calls the user interface's delete callback, closes every edit.
+    /// Shuts down: flushes when the crash flag is set, brings the project's records up to date if the
+    /// platform agrees, calls the user interface's delete callback, closes every edit.
     ~edit_manager() override;
 
     [[nodiscard]] static edit_manager* theEditManager();
-    /// Installs an instance (owned from then on) in the place of the present one, which is destroyed. Null only
-    /// destroys.
+    /// Installs an instance (owned from then on) in the place of the present one, which is destroyed. Null
+    /// only destroys.
     static void theEditManager(edit_manager* manager);
 
     /// \name Opening and the cache
-    /// A cached edit, or a failure that is remembered, costs one lookup under the lock, no file and no memory.
+    /// A cached edit, or a failure that is remembered, costs one lookup under the lock, no file and no
+    /// memory.
     /// @{
     [[nodiscard]] EditPtr open(const cookie& item, eEditOpenBehaviour behaviour) override;
     /// The same without an instance at hand.
@@ -77,8 +80,8 @@ public:
     /// \name Writing
     /// @{
     static bool flush_edit(const cookie& item);
-    /// Writes every changed edit, with milestones where they are due, and the project edit. Edits that could not be
-    /// written stay on the dirty list. True if all were written.
+    /// Writes every changed edit, with milestones where they are due, and the project edit. Edits that could
+    /// not be written stay on the dirty list. True if all were written.
     static bool flush_changes();
     void addToDirtyList(const cookie& item) override;
     [[nodiscard]] static size_t numDirty();
@@ -94,8 +97,8 @@ public:
     static bool backup_edit(const cookie& item);
     [[nodiscard]] static bool undoExists(const cookie& item);
     [[nodiscard]] static bool redoExists(const cookie& item);
-    /// Steps back or forward one revision; the clipboard edit goes with it where the revision used it. False if
-    /// there is no such revision or a step failed; then the edit's file is as it was or in the chain.
+    /// Steps back or forward one revision; the clipboard edit goes with it where the revision used it. False
+    /// if there is no such revision or a step failed; then the edit's file is as it was or in the chain.
     static bool undoRequest(const cookie& item);
     static bool redoRequest(const cookie& item);
     static void delete_redo_edits(const cookie& item, int keep);
@@ -105,14 +108,14 @@ public:
 
     /// \name Deleting
     /// @{
-    /// Deletes an edit's file with all its backups, after the notices. False for one that is read-only or in use
-    /// by others than the cache, unless `force`, or whose file could not be removed.
+    /// Deletes an edit's file with all its backups, after the notices. False for one that is read-only or in
+    /// use by others than the cache, unless `force`, or whose file could not be removed.
     static bool delete_edit_file_and_backups(const cookie& item, bool force);
     static bool deleteEditFilesAndBackups(const CookieVec& items, bool force);
     /// The paths of an edit's file and all its backups that are there, the file first, then undo, then redo.
     [[nodiscard]] static Vector<String> getEditFiles(const cookie& item);
-    /// Tells the edit's observers, and those of "editDeleted", that it is about to go. A hidden edit's deletion is
-    /// told only with the setting "notify_hidden_deleted".
+    /// Tells the edit's observers, and those of "editDeleted", that it is about to go. A hidden edit's
+    /// deletion is told only with the setting "notify_hidden_deleted".
     static void issuePreDeletionNotifications(const cookie& item);
     /// An edit was deleted at another seat: notices, then it leaves the cache unwritten.
     static void handleNetDelete(const cookie& item);
@@ -120,8 +123,8 @@ public:
 
     /// \name Project
     /// @{
-    /// Closes the present project and makes `project` the current one: its folder must be there, or with behaviours
-    /// 1 and 2 is made. Observers hear "editmanProjectChanged".
+    /// Closes the present project and makes `project` the current one: its folder must be there, or with
+    /// behaviours 1 and 2 is made. Observers hear "editmanProjectChanged".
     static eStatus set_current_project(const cookie& project, eEditOpenBehaviour behaviour);
     /// Ok if a project is current; adopts the one the application has set.
     static eStatus check_current_project(eEditOpenBehaviour behaviour);
@@ -142,7 +145,8 @@ public:
 
     /// \name The project's records
     /// @{
-    [[nodiscard]] static bool getProjDBValue(const String& key, String& value, const cookie& project = invalid_cookie);
+    [[nodiscard]] static bool getProjDBValue(const String& key, String& value,
+                                             const cookie& project = invalid_cookie);
     static bool setProjDBValue(const String& key, const String& value);
     /// The records of the current project; null without one. Opened on first use.
     [[nodiscard]] static projdb* get_projdb();
@@ -175,7 +179,8 @@ public:
     [[nodiscard]] static NotifyMsgType flushChangesMsgType();
     [[nodiscard]] static NotifyMsgType invalidateCacheMsgType();
     [[nodiscard]] static NotifyMsgType editDeletedMsgType();
-    [[nodiscard]] static Qx::Ptr<Qx::Guard> registerNotification(NotifyMsgType type, Notifier::Listener listener);
+    [[nodiscard]] static Qx::Ptr<Qx::Guard> registerNotification(NotifyMsgType type,
+                                                                 Notifier::Listener listener);
     static void deregisterNotification(Qx::Ptr<Qx::Guard>& subscription) { subscription.reset(); }
     /// @}
 
@@ -190,13 +195,13 @@ public:
 
     /// Called with true when the manager shuts down, so that a user interface can let go of its edits.
     static void setUiDeleteFn(std::function<void(bool)> callback);
-    /// Asked at shut-down whether the project's records shall be brought up to date. Without one they are not.
+    /// Asked at shut-down whether the project's records shall be brought up to date. Without one they are
+    /// not.
     static void setConfirmUpdateFn(std::function<bool()> callback);
 
 private:
-    class Opening;
-    class Revisions;
-    class Deleting;
+    std::shared_ptr<Qx::Network::Service> m_service;
+    std::shared_ptr<void> m_listening; ///< to other seats, for a user with the network right
 };
 
 /// The library's exit hook: reports and destroys the manager. After a crash it says what was open.
