@@ -15,12 +15,12 @@ void edit_manager::limitEditCache(int limit) {
             continue;
         }
         // Nobody else has the edit, so its section is free.
-        bool written = false;
+        bool mayGo = false;
         {
             const ManagerState::Hold section(entry->edit->section());
-            written = state.write(*entry);
+            mayGo = state.write(*entry) && !entry->edit->isDirty(true);
         }
-        if (written) {
+        if (mayGo) {
             evicted = state.removeCacheEntry(entry->item);
             return;
         }

@@ -147,6 +147,12 @@ void closeUnreferenced(Vector<cookie>& held) {
 
 void edit_manager::close_all_edits() {
     ManagerState& state = managerState();
+    EditPtr projectEdit; // opened again when it is asked for
+    {
+        const ManagerState::Hold hold(state.lock);
+        std::swap(projectEdit, state.projectEdit);
+    }
+    projectEdit.invalidate();
     Vector<cookie> held;
     closeUnreferenced(held);
     for (const cookie& item : held) {
