@@ -112,6 +112,17 @@ bool ManagerState::write(CachedEdit& entry) {
     return true;
 }
 
+ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry) {
+    if (entry.edit->refCount() > 1) {
+        return Unreferenced::InUse;
+    }
+    const std::unique_lock<criticalSection> section(entry.edit->section(), std::try_to_lock);
+    if (!section.owns_lock()) {
+        return Unreferenced::InUse;
+    }
+    return write(entry) ? Unreferenced::Written : Unreferenced::NotWritten;
+}
+
 void ManagerState::addToDirtyList(const cookie& item) {
     const std::lock_guard hold(dirtyMutex);
     dirty.insert(item);
