@@ -120,7 +120,12 @@ eStatus edit_manager::set_current_project(const cookie& project, eEditOpenBehavi
         wanted.dropFrame = details.dropFrame;
         wanted.defaultEditMedium = details.defaultEditMedium;
     } else {
-        wanted.name.clear();
+        String rate;
+        wanted.name = getProjectName(project);
+        if (getProjDBValue("PROJECT_RATE", rate, project) && Qx::FrameRate::fromString(rate).valid()) {
+            wanted.frameRateCode = Qx::FrameRate::fromString(rate).code();
+        }
+        wanted.dropFrame = wanted.dropFrame && Qx::FrameRate(wanted.frameRateCode).hasDropFrame();
     }
     bool leaves = false;
     {

@@ -132,7 +132,14 @@ TEST(Cache, EditsStayWithTheProjectThatTheyWereOpenedIn) {
     EXPECT_EQ(edit_manager::new_edit(), kEdit);
     EXPECT_EQ(heard, (std::vector<String>{"-P0001000", "P0002000", "-P0002000", "P0001000", "-P0001000",
                                           "P0003000"}));
+    EXPECT_EQ(edit_manager::getProjectSummary(cookie("P0003000")), "P0003000, 25 frames a second, 0 edits");
+    EXPECT_EQ(edit_manager::getProjectTvStd(cookie("P0003000")), Qx::Ed2Support::tvStdFromText("pal"));
+    // There are no settings in the first; its records know what it was when it was flushed.
     EXPECT_EQ(edit_manager::getProjectSummary(cookie("P0001000")), "");
+    String rate;
+    EXPECT_TRUE(edit_manager::getProjDBValue("PROJECT_RATE", rate, cookie("P0001000")));
+    EXPECT_EQ(edit_manager::getProjectTvStd(cookie("P0001000")), Qx::Ed2Support::tvStdFromText("pal"));
+    EXPECT_FALSE(edit_manager::getProjDBValue("PROJECT_RATE", rate, cookie("P0009000")));
     ASSERT_NE(edit_manager::get_current_project(), nullptr);
     EXPECT_EQ(edit_manager::get_current_project()->get_cookie(), cookie("P0003000"));
 }

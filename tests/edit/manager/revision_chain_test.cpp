@@ -13,7 +13,7 @@ namespace {
 /// A chain drawn as text: the edit file's letter, then a letter a backup, '-' for none: "E:ab-d".
 class ChainFiles {
 public:
-    explicit ChainFiles(int depth) : m_depth(depth), m_chain(file(), RevisionChain::Undo, depth) {}
+    explicit ChainFiles(int depth) : m_chain(file(), RevisionChain::Undo, depth) {}
 
     void draw(const std::string& drawing) {
         place(file(), drawing[0]);
@@ -44,7 +44,6 @@ private:
     }
 
     test::TemporaryFolder m_folder;
-    int m_depth;
     RevisionChain m_chain;
 };
 

@@ -118,7 +118,6 @@ TEST(Undo, TellsThoseWhoHoldTheEditAndThoseWhoOpenItAgain) {
     };
     const auto guard = watch(held, "");
     std::vector<Qx::Ptr<Qx::Guard>> guards;
-    EditModification described;
     EditPtr reopened;
     const auto follow = edit_manager::registerNotification(
         edit_manager::invalidateCacheMsgType(),
