@@ -40,6 +40,22 @@ TEST(Cache, AnOpenThatIsCachedCostsNoFileAndNoMemory) {
     EXPECT_EQ(Qx::TimedTask::named("editman").section("open").calls(), timed + 1);
 }
 
+TEST(Cache, AnOpenTakesNoticeOfTheOwnerWithoutWritingIt) {
+    const ManagedProject project;
+    ManagedProject::save("a");
+    EXPECT_EQ(PermissionsManager::getOwner(kEdit), "anna");
+    ASSERT_TRUE(PermissionsManager::setOwner(kOther, "bert", false));
+    const std::string written = project.read("Permissions.txt");
+    EXPECT_EQ(written.find("E0001000"), std::string::npos);
+    EXPECT_TRUE(EditPtr(kOther, eOpenNew).valid());
+    EXPECT_EQ(PermissionsManager::getOwner(kOther), "anna") << "an edit says itself whose it is";
+    EXPECT_EQ(project.read("Permissions.txt"), written);
+    ASSERT_TRUE(PermissionsManager::setOwner(kOther, "carl", true));
+    EXPECT_EQ(PermissionsManager::getOwner(kOther), "anna");
+    ASSERT_TRUE(PermissionsManager::setOwner(kOther, "carl", false));
+    EXPECT_EQ(PermissionsManager::getOwner(kOther), "carl");
+}
+
 TEST(Cache, ThreadsThatOpenOneItemReadItsFileOnce) {
     const ManagedProject project;
     ManagedProject::save("a");

@@ -126,6 +126,8 @@ TEST(EditInfo, NeverAnswersFromARowThatItsFileHasLeftBehind) {
     EXPECT_FALSE(EditInfo(kEdit, eOpenExisting).hasAudioTracks());
     project.write("E0001000.qme", two); // by another program
     EXPECT_TRUE(EditInfo(kEdit, eOpenExisting).hasAudioTracks());
+    project.write("E0001000.qme", project.read("E0002000.qme")); // by another program again
+    EXPECT_FALSE(EditInfo(kEdit, eOpenExisting).hasAudioTracks());
     // A change that is not written yet shows at once, and not as what the file says.
     const EditPtr open(kOther, eOpenExisting);
     open->addChan(AudioChan);
