@@ -21,6 +21,9 @@ install(FILES ${PROJECT_BINARY_DIR}/quillmarch_edit-config.cmake
               ${PROJECT_BINARY_DIR}/quillmarch_edit-config-version.cmake
         DESTINATION ${package_folder})
 
+# The file finds its prefix from where it lies, so that an installation can be moved.
+file(RELATIVE_PATH QUILLMARCH_PC_TO_PREFIX /${CMAKE_INSTALL_LIBDIR}/pkgconfig /)
+string(REGEX REPLACE "/$" "" QUILLMARCH_PC_TO_PREFIX "${QUILLMARCH_PC_TO_PREFIX}")
 configure_file(${PROJECT_SOURCE_DIR}/cmake/quillmarch_edit.pc.in ${PROJECT_BINARY_DIR}/quillmarch_edit.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/quillmarch_edit.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
 if(TARGET qmedit)

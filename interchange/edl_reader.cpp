@@ -41,7 +41,7 @@ Qx::Status readEdl(std::string_view text, Qx::FrameRate rate, EdlList& list, Los
 }
 
 Qx::Status readEdlFile(const String& path, Qx::FrameRate rate, EdlList& list, LossReport& report) {
-    report.setFile(Qx::fileNameOf(path));
+    report.setFile(path);
     String text;
     if (const Qx::FileError error = Qx::readWholeFile(path, text, kMaxEdlBytes)) {
         if (error.code == EFBIG) {

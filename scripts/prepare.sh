@@ -55,11 +55,12 @@ follow() {
     return 0
 }
 
-# build PRESET LABEL [TARGET...]: configures and builds. On failure the compiler's words are shown.
+# build PRESET LABEL TESTS [TARGET...]: configures, with the tests or without (ON, OFF), and builds. On failure the
+# compiler's words are shown.
 build() {
-    local preset=$1 label=$2 log status; shift 2
+    local preset=$1 label=$2 tests=$3 log status; shift 3
     mkdir -p build; log=build/$preset.log
-    if ! cmake --preset "$preset" >"$log" 2>&1; then
+    if ! cmake --preset "$preset" -DQUILLMARCH_TESTS="$tests" >"$log" 2>&1; then
         tail -n 30 "$log" >&2
         fail "Configuring failed; the lines above and $log say why."
     fi

@@ -107,7 +107,7 @@ int channel_mask::count_bits() const {
 }
 
 int channel_mask::highest_channel_set() const {
-    return std::bit_width(m_bits & CM_max_chan_mask) - 1;
+    return static_cast<int>(std::bit_width(m_bits & CM_max_chan_mask)) - 1;
 }
 
 int channel_mask::lowest_channel_set() const {

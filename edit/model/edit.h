@@ -4,8 +4,10 @@
 #include "edit/model/channel_group_list.h"
 #include "edit/model/channel_types.h"
 #include "edit/model/cue_list.h"
+#include "edit/model/edit_chan_time_info.h"
 #include "edit/model/edit_modification.h"
 #include "edit/model/edit_ptr.h"
+#include "edit/model/edit_types.h"
 #include "edit/model/managed_cel.h"
 #include "platform/base/critical_section.h"
 #include "platform/base/vector.h"
@@ -21,56 +23,6 @@
 #include <optional>
 
 class TextFile;
-
-/// What kind of item an edit is. The numbers appear in project records: do not change them.
-enum edit_log_type_t : int {
-    kLogNone = 0,
-    kLogShot = 1,
-    kLogEdit = 2,
-    kLogGhost3 = 3, ///< 3 to 7: ghost variants of a shot
-    kLogGhost4 = 4,
-    kLogGhost5 = 5,
-    kLogGhost6 = 6,
-    kLogGhost7 = 7,
-    kLogMagic = 8,
-    kLogReel = 9,
-    kLogTemplate = 10
-};
-
-/// The forms of an edit file, by its name.
-enum QxEditFileType : int {
-    kUnknownFile = 0,
-    kObjectStoreFile = 1,
-    kObjectStoreEd3File = 2,
-    kLegacyTextFile = 4
-};
-/// The form that a file's name stands for, without regard to case.
-QM_API QxEditFileType getEditFileTypeFromFileName(const WString& name);
-
-/// Why a revision of an edit is replaced by another.
-enum RevisionChangeType : int { kRevisionBackup = 1, kRevisionUndo = 2, kRevisionRedo = 3 };
-
-/// Position of a caller on one channel. Equal when the channels are.
-class QM_API EditChanTimeInfo {
-public:
-    EditChanTimeInfo() = default;
-    EditChanTimeInfo(const IdStamp& chan, double current, bool markValid, double mark)
-        : m_chan(chan), m_current(current), m_markValid(markValid), m_mark(mark) {}
-    [[nodiscard]] bool valid() const { return m_chan.valid(); }
-    [[nodiscard]] const IdStamp& getChanId() const { return m_chan; }
-    void setChanId(const IdStamp& chan) { m_chan = chan; }
-    [[nodiscard]] double getCurrentTime() const { return m_current; }
-    void setCurrentTime(double time) { m_current = time; }
-    [[nodiscard]] double getMarkTime() const { return m_mark; }
-    [[nodiscard]] bool isMarkValid() const { return m_markValid; }
-    bool operator==(const EditChanTimeInfo& other) const { return m_chan == other.m_chan; }
-
-private:
-    IdStamp m_chan;
-    double m_current = 0;
-    bool m_markValid = false;
-    double m_mark = 0;
-};
 
 /// One edit in memory: a header of named properties and an ordered set of channels, each with its cel.
 ///
@@ -486,13 +438,26 @@ public:
 
     /// \name File (defined in edit/persist)
     /// @{
+    /// Reads the item's file, or one by its path, in the place of what the edit holds. The objects of a file
+    /// are those of docs/edit-file.md. On failure the edit has no channels, `isBad()` and `lastFileError()`
+    /// tells why; only a failed upgrade of an older revision leaves what was read. A path that is not named
+    /// after an item fails at once and deliberately leaves the edit flagged as loading, one reference held.
+    /// A new, empty store gives one empty video channel.
     ReadFileRC read_file(const cookie& item, eEditOpenBehaviour behaviour);
     ReadFileRC readFile(const WString& path, eEditOpenBehaviour behaviour);
-    /// Why the last read or write failed: one sentence, empty after a success.
+    /// Why the last read or write failed: one sentence with the path, empty after a success.
     [[nodiscard]] const String& lastFileError() const { return m_fileError; }
+    /// Writes the edit to the file of its cookie, or to a path that is named after it. True only when the
+    /// file was stored; its marks of change are cleared then. False, with the old file whole and the edit as
+    /// dirty as before, when nothing is to be written, a write is running, the edit could not be read again
+    /// (no channels, too many) or the disk refuses.
     bool write_file();
     bool write_file(const WString& path);
+    /// Writes a form: 1 by `write_file`, true whatever came of it (`lastFileError` tells), 4 the legacy text.
+    /// Other forms are not written: false.
     bool writeToFile(const WString& path, QxEditFileType type);
+    /// Writes or reads the legacy text, docs/ed2-format.md, which holds the first video channel and the audio
+    /// channels. A failed write leaves the file as it was; a failed read leaves no channels.
     bool writeToLegacyFile(const WString& path);
     bool readFromLegacyFile(const WString& path);
     /// The sections of the legacy text; its form is docs/ed2-format.md. The writers append to a text, the

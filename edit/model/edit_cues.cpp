@@ -100,9 +100,12 @@ void Edit::celReplaced(const cel* from, cel* to) {
 }
 
 void Edit::channelRemoved(const IdStamp& chan, int index) {
-    for (ChannelGroupList* list : {retrieveGroupsList(), retrieveDefaultGroupsList()}) {
-        if (list != nullptr) {
-            list->removeMember(chan);
+    // While the edit is read, the store holds the groups of what is being read already.
+    if (!m_loading) {
+        for (ChannelGroupList* list : {retrieveGroupsList(), retrieveDefaultGroupsList()}) {
+            if (list != nullptr) {
+                list->removeMember(chan);
+            }
         }
     }
     if (const cel* its = get_edit_cel_p(index); its != nullptr && getId(index) == chan) {

@@ -159,9 +159,10 @@ void Edit::m_load_edit_bits_from_header() {
         m_header.setString("quality_string", String::format("%d mins", m_header.getInt("quality")));
     }
     if (m_header.contains(EditKeys::kCurrentTime)) {
-        m_currentTime = m_header.getDouble(EditKeys::kCurrentTime);
+        set_current_time_raw(NO_CHAN, m_header.getDouble(EditKeys::kCurrentTime));
     }
-    m_markTime = m_header.getDouble(EditKeys::kMarkTime, Qx::kNoTime);
+    m_markTime = Qx::kNoTime;
+    set_mark_time_raw(NO_CHAN, m_header.getDouble(EditKeys::kMarkTime, Qx::kNoTime));
 
     Vector<IdStamp> chans;
     getChans(chans, AudioChan);

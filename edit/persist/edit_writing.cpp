@@ -64,7 +64,7 @@ bool Edit::write_file(const WString& path) {
 bool Edit::writeToFile(const WString& path, QxEditFileType type) {
     switch (type) {
     case kObjectStoreFile:
-        // What was stored before and has not changed since is in its file; lastFileError tells of a failure.
+        // True whatever became of the write: callers ask for a form, and lastFileError tells of a failure.
         write_file(path);
         return true;
     case kLegacyTextFile:

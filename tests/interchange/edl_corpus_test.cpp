@@ -47,6 +47,15 @@ struct Expectation {
     }
 };
 
+/// Messages name a list as it was given: here without its folder.
+std::string withoutFolder(std::string text, const fs::path& path) {
+    const std::string folder = path.parent_path().string() + "/";
+    for (size_t at = text.find(folder); at != std::string::npos; at = text.find(folder, at)) {
+        text.erase(at, folder.size());
+    }
+    return text;
+}
+
 std::string outcome(const fs::path& path, const ImportOptions& options) {
     EdlList list;
     EdlProgramme programme;
@@ -55,7 +64,7 @@ std::string outcome(const fs::path& path, const ImportOptions& options) {
     if (status) {
         status = layTracks(list, options.strict, programme, report);
     }
-    return status ? printProgramme(list, programme, report) : status.reason() + "\n";
+    return withoutFolder(status ? printProgramme(list, programme, report) : status.reason() + "\n", path);
 }
 
 } // namespace

@@ -140,7 +140,7 @@ TEST(EdlImport, MarkersBecomeCues) {
     EXPECT_EQ(cues.get_cue_point(1, 0)->editTime(), 1.48);
     ASSERT_EQ(import.report.losses().size(), 1U);
     EXPECT_EQ(import.report.lines().front(),
-              "list.edl:8: loss: the marker lies before the programme and is left out");
+              import.report.file() + ":8: loss: the marker lies before the programme and is left out");
 }
 
 TEST(EdlImport, WhatAnEditHasNoPlaceForIsKept) {
@@ -206,7 +206,7 @@ TEST(EdlImport, AFailureLeavesTheResult) {
     EXPECT_FALSE(importEdl(folder.write("bad.edl", "001 R V\n"), {Qx::FrameRate(3), false}, import).isOk());
     EXPECT_FALSE(importEdl(folder.path("none.edl"), {Qx::FrameRate(3), false}, import).isOk());
     EXPECT_TRUE(import.sequence == before);
-    EXPECT_EQ(import.report.file(), "list.edl");
+    EXPECT_EQ(Qx::fileNameOf(import.report.file()), "list.edl");
 }
 
 TEST(EdlImport, TenThousandEventsAreNotFelt) {

@@ -36,6 +36,7 @@ file(GLOB_RECURSE pc ${prefix}/*.pc)
 get_filename_component(pc_folder ${pc} DIRECTORY)
 get_filename_component(lib_folder ${pc_folder} DIRECTORY)
 run_step("asking pkg-config" ${CMAKE_COMMAND} -E env PKG_CONFIG_PATH=${pc_folder} pkg-config --cflags --libs quillmarch_edit)
+string(STRIP "${step_output}" step_output)
 separate_arguments(flags UNIX_COMMAND "${step_output}")
 run_step("building with pkg-config" ${COMPILER} -std=c++20 ${WORK}/program/main.cpp ${flags}
     -Wl,-rpath,${lib_folder} -o ${WORK}/by_pkg_config)

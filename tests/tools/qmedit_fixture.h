@@ -7,6 +7,11 @@
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
+/// Shows a text in a failure as it is.
+inline void PrintTo(const String& text, std::ostream* out) {
+    *out << '"' << std::string_view(text) << '"';
+}
+
 /// Runs the real program on a project of the test's own.
 class Qmedit : public testing::Test {
 protected:

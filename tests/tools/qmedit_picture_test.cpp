@@ -2,31 +2,30 @@
 
 namespace {
 
-/// The lines of the picture: from the ruler to the legend.
+/// The lines of the picture, from the ruler to the legend: they follow the summary and a blank line.
 String pictureOf(const String& shown) {
-    std::vector<String> rows = shown.split('\n');
-    String picture;
-    for (size_t i = 4; i < rows.size() && !rows[i].empty(); ++i)
-        picture += rows[i] + "\n";
-    return picture;
+    const size_t start = shown.find("\n\n", 1);
+    if (start == String::npos)
+        return shown;
+    return shown.substr(start + 2, shown.find("\n\n", start + 2) - start - 1);
 }
 
 TEST_F(Qmedit, DrawsTracksToScale) {
     const String item = imported(kShortList);
     EXPECT_EQ(pictureOf(run({"show", item}, {"LANG=en_GB.UTF-8", "COLUMNS=56"}).out),
-              "     ╷10:00:00:00              ╷10:00:05:00\n"
+              "     ╷10:00:00:00             ╷10:00:05:00\n"
               "          ▼ ship\n"
               "     ┌──────────────┬────┐    ┌────────────────────────┐\n"
-              " V1  │ harbour      │blac│    │ harbour                │\n"
+              " V1  │ harbour      │░░░░│    │ harbour                │\n"
               "     ├──────────────┴────┴────┴────────────────────────┤\n"
               " A1  │ gulls                                           │\n"
               "     └─────────────────────────────────────────────────┘\n"
               "     │ cut   ░ black   blank gap   ▼ marker\n");
     EXPECT_EQ(pictureOf(run({"show", item}, {"LC_ALL=C", "LANG=en_GB.UTF-8", "COLUMNS=46"}).out),
-              "     +10:00:00:00         +10:00:05:00\n"
+              "     +10:00:00:00        +10:00:05:00\n"
               "         v ship\n"
               "     +-----------+---+   +-------------------+\n"
-              " V1  | harbour   |bla|   | harbour           |\n"
+              " V1  | harbour   |...|   | harbour           |\n"
               "     +-----------+---+---+-------------------+\n"
               " A1  | gulls                                 |\n"
               "     +---------------------------------------+\n"

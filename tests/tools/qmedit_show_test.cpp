@@ -114,8 +114,18 @@ TEST_F(Qmedit, MissingAndDamagedFilesAreSaidAndStopNothingElse) {
     EXPECT_EQ(show.code, 1);
     EXPECT_EQ(lines(show.err), 1u);
     EXPECT_NE(show.err.find(sound + ".qme"), String::npos) << show.err;
+    folder.write("project/P0001000/" + sound + ".qme.U1", "x");
+    EXPECT_NE(run({"show", sound}).err.find(sound + ".qme.U1"), String::npos) << "the backup is named";
     EXPECT_NE(run({"show", "E0ZZZ000"}).err.find("qmedit list"), String::npos);
     EXPECT_NE(run({"header", item, "NO_KEY"}).err.find("qmedit header"), String::npos);
+
+    folder.write("project/P0001000/Project.txt", "junk");
+    const test::ProgramResult unsettled = run({"show", item});
+    EXPECT_EQ(unsettled.code, 0) << "the edits can be looked at without the project's settings";
+    EXPECT_NE(unsettled.err.find("Project.txt"), String::npos);
+    const auto project = snapshot();
+    EXPECT_EQ(run({"import", folder.write("again.edl", kShortList)}).code, 1);
+    EXPECT_EQ(snapshot(), project);
 }
 
 TEST_F(Qmedit, TenThousandEventsAreShownAtOnce) {

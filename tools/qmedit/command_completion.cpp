@@ -40,13 +40,13 @@ _qmedit() {
     COMPREPLY=()
     for ((i = 1; i < COMP_CWORD; i++)); do
         case ${COMP_WORDS[i]} in
-        --project | --rate | --type) ((i++)) ;;
+        --project | --into | --rate | --type) ((i++)) ;;
         -*) ;;
         *) command=${COMP_WORDS[i]}; break ;;
         esac
     done
     case $previous in
-    --project)
+    --project | --into)
         mapfile -t COMPREPLY < <(compgen -d -- "$current")
         compopt -o filenames 2>/dev/null
         return ;;
@@ -61,13 +61,11 @@ _qmedit() {
         return
     fi
     case $command in
-    import)
+    import | salvage)
         mapfile -t COMPREPLY < <(compgen -f -- "$current")
         compopt -o filenames 2>/dev/null ;;
-    show | header) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;
-    ;
-    completion) mapfile -t COMPREPLY < <(compgen -W bash -- "$current") ;
-    ;
+    show | header | export | verify) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;;
+    completion) mapfile -t COMPREPLY < <(compgen -W bash -- "$current") ;;
     esac
 }
 complete -F _qmedit qmedit
@@ -84,7 +82,7 @@ void addCompletionCommand(CLI::App& app, CommandWork& work) {
         ->type_name("")
         ->check(CLI::IsMember({"bash"}));
     command->footer("Example:\n  source <(qmedit completion bash)");
-    command->callback([&app, &work] {
+    command->callback([shell, &app, &work] { // the option writes to it: it lives as long as the command
         work = [&app] {
             writeOut(bashCompletion(app));
             return static_cast<int>(kDone);

@@ -89,7 +89,7 @@ const char* Console::begin(Ink ink) const {
     case Ink::Audio:
         return "\x1b[38;5;231;48;5;28m";
     case Ink::AudioOther:
-        return "\x1b[38;5;231;48;5;65m";
+        return "\x1b[38;5;231;48;5;22m";
     case Ink::Effect:
         return "\x1b[38;5;231;48;5;90m";
     case Ink::Black:
@@ -135,7 +135,10 @@ void reportProgress(std::string_view text) {
 }
 
 void routeLibraryLog() {
-    Qx::setLogSink([](std::string_view line) {
+    const bool wanted = environment("QMEDIT_LOG") != nullptr;
+    Qx::setLogSink([wanted](std::string_view line) {
+        if (!wanted)
+            return;
         while (!line.empty() && (line.back() == '\n' || line.back() == ' '))
             line.remove_suffix(1);
         reportProgress(line);

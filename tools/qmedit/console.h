@@ -66,5 +66,6 @@ void reportWarning(std::string_view text);
 /// One line on standard error, as it is but made fit for a terminal.
 void reportProgress(std::string_view text);
 
-/// Sends the library's log to standard error, made fit for a terminal, and nothing of it to standard output.
+/// Keeps the library's log off standard output. With QMEDIT_LOG set it goes to standard error, made fit for a
+/// terminal; without, it is dropped: what a user is to know is reported by the command.
 void routeLibraryLog();

@@ -200,3 +200,28 @@ String isoTime(int64_t seconds) {
         return {};
     return text;
 }
+
+String verifyJson(const std::vector<VerifiedFile>& files) {
+    String out = "[";
+    addLines(out, "  ", files, [](const VerifiedFile& file) {
+        Json json;
+        json["file"] = file.name;
+        json["sound"] = file.faults.empty();
+        json["faults"] = Json::array();
+        for (const String& fault : file.faults)
+            json["faults"].push_back(std::string(fault));
+        return dumped(json);
+    });
+    return out + "]\n";
+}
+
+String salvageJson(const cookie& item, const Edit& edit, const std::vector<String>& lost) {
+    Json json;
+    json["cookie"] = item.asString();
+    json["name"] = edit.getName();
+    json["channels"] = edit.getNumChans();
+    json["lost"] = Json::array();
+    for (const String& line : lost)
+        json["lost"].push_back(std::string(line));
+    return dumped(json) + "\n";
+}

@@ -68,10 +68,13 @@ Qx::Status checkContent(const String& path, const String& start) {
         return failure(path, 1, "the file is empty; export the list again and import that");
     if (const size_t zero = start.find('\0'); zero != String::npos)
         return failure(path, lineOf(start, zero),
-                       "not text but binary data; import reads CMX 3600 edit decision lists (EDL)");
-    if (extension != ".edl" && !looksLikeEdl(start))
-        return failure(
-            path, 1, "no EDL: it has no TITLE, FCM or event line; import reads CMX 3600 edit decision lists");
+                       "not text but binary data; import reads CMX 3600 edit decision lists (.edl) and "
+                       "legacy text (.ed2)");
+    if (extension != ".edl" && extension != ".ed2" && !looksLikeEdl(start))
+        return failure(path, 1,
+                       "no EDL: it has no TITLE, FCM or event line; import reads CMX 3600 edit decision "
+                       "lists (.edl) and "
+                       "legacy text (.ed2)");
     return {};
 }
 

@@ -43,13 +43,13 @@ cookie projectIn(const String& root) {
     return found.is_valid() ? found : kUsualProject;
 }
 
-/// What a person can do about an edit file that cannot be read.
-String remedyFor(const String& path) {
+/// Why an edit file cannot be read, and where its newest backup is if it has one.
+Qx::Status damage(const String& path, const String& reason) {
+    String text = (reason.find(path) == String::npos ? path + ": " : String()) + reason;
     const String backup = path + ".U1";
     if (Qx::fileExists(backup))
-        return "; its newest backup is " + backup +
-               ": keep a copy of the damaged file and put the backup in its place";
-    return "; keep the file, and put a copy of it from elsewhere in its place";
+        text += "; its newest backup is " + backup;
+    return Qx::Status::failure(std::move(text));
 }
 
 } // namespace
@@ -96,8 +96,12 @@ Qx::Status ProjectSession::openExisting() {
         return {};
     }
     ProjectDetails details;
-    if (Qx::Status opened = ProjectDetails::openOrCreate(m_root, m_project, {}, details); !opened)
-        return opened;
+    if (const Qx::Status opened = ProjectDetails::openOrCreate(m_root, m_project, {}, details); !opened) {
+        // The edits are there all the same. What writes asks again, and fails, in `create`.
+        reportWarning(opened.reason() + "; the usual settings are taken");
+        makeCurrentUnwritten({});
+        return {};
+    }
     details.makeCurrent();
     return {};
 }
@@ -133,7 +137,7 @@ Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
                                    "; 'qmedit list' shows those there are");
     EditPtr read(new Edit);
     if (read->read_file(item, eOpenExisting) != Edit::kReadOk)
-        return Qx::Status::failure(path + " is damaged: " + read->lastFileError() + remedyFor(path));
+        return damage(path, read->lastFileError());
     edit = read;
     return {};
 }

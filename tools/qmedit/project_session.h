@@ -34,7 +34,8 @@ public:
     /// True if the project is there.
     [[nodiscard]] bool exists() const;
 
-    /// Opens the project that is there. A failure says that there is none and what makes one.
+    /// Opens the project that is there. Settings that cannot be read draw a warning and the usual ones are
+    /// taken, so that the edits can be looked at. A failure says that there is no project and what makes one.
     Qx::Status openExisting();
     /// Makes a project current so that edits can be prepared for it: the one that is there, else one of the
     /// given rate (25 for an invalid one) of which nothing is on the disk yet.

@@ -101,7 +101,7 @@ int columns(std::string_view utf8) {
 String fitted(std::string_view utf8, int width, std::string_view ellipsis) {
     if (width <= 0)
         return {};
-    size_t fits = 0;     // bytes that leave a column for the ellipsis
+    size_t fits = 0;     // bytes that leave the ellipsis its column
     size_t position = 0; // bytes that fit without one
     int used = 0;
     while (position < utf8.size()) {
@@ -112,7 +112,7 @@ String fitted(std::string_view utf8, int width, std::string_view ellipsis) {
             return String(utf8.substr(0, fits)) + String(ellipsis);
         used += wide;
         position += length;
-        if (used < width)
+        if (used < width || ellipsis.empty())
             fits = position;
     }
     return String(utf8);

@@ -250,6 +250,9 @@ void Picture::drawFill(const PairReport& pair, int from, int to, Ink ink, Row& r
     m_showsBlack = m_showsBlack || ink == Ink::Black;
     const String& label = m_labels[pair.source];
     const int room = last - first;
+    // Black is known by its shade; a part of the word would hide it.
+    if (ink == Ink::Black && safe_text::columns(label) > room)
+        return;
     const bool spaced = room > safe_text::columns(label) + 1;
     // In a narrow pair every column is worth a letter.
     row.setText(first + (spaced ? 1 : 0),
@@ -305,9 +308,16 @@ void Picture::addLegend() {
     add(m_showsGap, "blank", "gap");
     add(!m_report.cues.empty(), m_signs.cue, "marker");
     String line;
-    for (const String& part : parts)
+    const auto finish = [&] {
+        m_text += gutter("") + m_console.inked(Ink::Dim, line) + "\n";
+        line.clear();
+    };
+    for (const String& part : parts) {
+        if (!line.empty() && safe_text::columns(line) + 3 + safe_text::columns(part) > m_columns)
+            finish();
         line += (line.empty() ? "" : "   ") + part;
-    m_text += gutter("") + m_console.inked(Ink::Dim, line) + "\n";
+    }
+    finish();
 }
 
 String Picture::text() {

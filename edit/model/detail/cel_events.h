@@ -53,8 +53,7 @@ constexpr double kTolerance = Qx::kTimeTolerance;
     return static_cast<float>(from + (double{out.level} - from) * part);
 }
 
-/// Number of pairs whose in point (`which` 0) or out point (1) lies before `limit`. Without a branch that
-/// depends on the data.
+/// Number of pairs whose in point (`which` 0) or out point (1) lies before `limit`.
 [[nodiscard]] inline size_t countBefore(const Events& events, size_t which, double limit) {
     const channel_event* base = events.data() + which;
     size_t left = events.size() / 2;

@@ -8,6 +8,7 @@
 #include "support/recording_log.h"
 #include "support/temporary_folder.h"
 
+#include <cmath>
 #include <gtest/gtest.h>
 
 namespace {
@@ -170,6 +171,8 @@ TEST_F(EditFileTest, OldKeysAreTakenOver) {
     raw.header.setInt("SOUND_OUTPUT_XFADE1", 1);
     raw.header.setDouble("SYNC_ERROR1", 0.25);
     raw.header.setInt("quality", 12);
+    raw.header.setDouble("CURRENT_TIME", std::nan(""));
+    raw.header.setDouble("MARK_TIME", HUGE_VAL);
     raw.header.setInt("ENTIRE_MEDIUM", 1);
     raw.finish();
     Edit edit(path(), eOpenExisting);
@@ -180,6 +183,8 @@ TEST_F(EditFileTest, OldKeysAreTakenOver) {
     EXPECT_EQ(edit.getSyncLoss(edit.getId(1)), 0.25);
     EXPECT_EQ(edit.Opts().getString("quality_string"), "12 mins");
     EXPECT_EQ(edit.get_entire_medium(), 1);
+    EXPECT_EQ(edit.get_current_time(), 0);
+    EXPECT_FALSE(edit.mark_is_valid());
     EXPECT_EQ(edit.getChanName(edit.getId(1)), "");
     edit.setSyncLoss(edit.getId(1), 0);
     ASSERT_NO_FATAL_FAILURE(save(edit));
