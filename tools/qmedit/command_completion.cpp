@@ -10,9 +10,11 @@ namespace {
 /// The long options of a command, as words.
 String optionWords(const CLI::App& command) {
     String words;
-    for (const CLI::Option* option : command.get_options())
-        for (const std::string& name : option->get_lnames())
+    for (const CLI::Option* option : command.get_options()) {
+        for (const std::string& name : option->get_lnames()) {
             words += (words.empty() ? "--" : " --") + String(name);
+        }
+    }
     return words;
 }
 

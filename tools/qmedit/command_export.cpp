@@ -23,8 +23,9 @@ struct ExportArguments {
 /// The extension of the file, in lower case, if it is that of a form to export to.
 bool readForm(const String& file, String& form) {
     form = Qx::extensionOf(Qx::fileNameOf(file)).lower();
-    if (form == ".edl" || form == ".ed2")
+    if (form == ".edl" || form == ".ed2") {
         return true;
+    }
     reportError("'" + file +
                 "' ends with neither .edl (CMX 3600) nor .ed2 (legacy text); choose one of them");
     return false;
@@ -32,15 +33,17 @@ bool readForm(const String& file, String& form) {
 
 Qx::Status writeForm(const ExportArguments& arguments, const String& form, const ProjectSession& session,
                      Edit& edit, interchange::LossReport& report) {
-    if (form == ".ed2")
+    if (form == ".ed2") {
         return interchange::exportLegacyText(edit, arguments.strict, arguments.file, report);
+    }
     interchange::EdlExportOptions options;
     options.strict = arguments.strict;
     options.crlf = arguments.crlf;
     options.source = [&session](const cookie& strip) {
         EditPtr shot;
-        if (!strip.isStorable() || !session.readEdit(strip, shot))
+        if (!strip.isStorable() || !session.readEdit(strip, shot)) {
             return EditPtr();
+        }
         return shot;
     };
     return interchange::exportEdlFile(edit, options, arguments.file, report);
@@ -49,21 +52,26 @@ Qx::Status writeForm(const ExportArguments& arguments, const String& form, const
 int runExport(const ExportArguments& arguments) {
     cookie item;
     String form;
-    if (!readCookie(arguments.item, item) || !readForm(arguments.file, form))
+    if (!readCookie(arguments.item, item) || !readForm(arguments.file, form)) {
         return kWrongUsage;
+    }
     ProjectSession session(arguments.project);
-    if (const Qx::Status opened = session.openExisting(); !opened)
+    if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
     EditPtr edit;
-    if (const Qx::Status read = session.readEdit(item, edit); !read)
+    if (const Qx::Status read = session.readEdit(item, edit); !read) {
         return failed(read);
+    }
     interchange::LossReport report;
     report.setFile(item.asString());
     const Qx::Status written = writeForm(arguments, form, session, *edit, report);
-    for (const String& line : report.lines())
+    for (const String& line : report.lines()) {
         reportProgress(line);
-    if (!written)
+    }
+    if (!written) {
         return failed(Qx::Status::failure(arguments.file + " was not written: " + written.reason()));
+    }
     return kDone;
 }
 

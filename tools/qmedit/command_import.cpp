@@ -17,14 +17,16 @@ constexpr const char* kRates = "23.976, 24, 25, 29.97, 30, 47.952, 48, 50, 59.94
 
 /// Tells what the import met; returns the number of losses.
 size_t reportLosses(const interchange::LossReport& report) {
-    for (const String& line : report.lines())
+    for (const String& line : report.lines()) {
         reportProgress(line);
+    }
     return report.losses().size();
 }
 
 String checkRate(const std::string& rate) {
-    if (Qx::FrameRate::fromString(rate).valid())
+    if (Qx::FrameRate::fromString(rate).valid()) {
         return {};
+    }
     return "'" + rate + "' is no frame rate; give one of " + kRates;
 }
 
@@ -34,8 +36,9 @@ bool isLegacyText(const String& file) {
 
 Qx::Status readSource(const String& file, const ImportOptions& options, interchange::Import& import) {
     if (isLegacyText(file)) {
-        if (!options.rate.empty())
+        if (!options.rate.empty()) {
             return Qx::Status::failure(file + ": legacy text states its frame rate; leave out --rate");
+        }
         return interchange::importLegacyText(file, import);
     }
     const Qx::FrameRate rate = Qx::FrameRate::fromString(options.rate);
@@ -49,27 +52,34 @@ Qx::Status readSource(const String& file, const ImportOptions& options, intercha
 
 int importFile(const ImportOptions& options, cookie& item) {
     String file;
-    if (const Qx::Status checked = checkImportSource(options.file, file); !checked)
+    if (const Qx::Status checked = checkImportSource(options.file, file); !checked) {
         return failed(checked);
+    }
     ProjectSession session(options.project);
-    if (const Qx::Status prepared = session.prepare(Qx::FrameRate::fromString(options.rate)); !prepared)
+    if (const Qx::Status prepared = session.prepare(Qx::FrameRate::fromString(options.rate)); !prepared) {
         return failed(prepared);
+    }
 
     interchange::Import import;
-    if (const Qx::Status read = readSource(file, options, import); !read)
+    if (const Qx::Status read = readSource(file, options, import); !read) {
         return failed(read);
+    }
     const size_t losses = reportLosses(import.report);
-    if (options.strict && losses > 0)
+    if (options.strict && losses > 0) {
         return failed(Qx::Status::failure(
             options.file + String::format(": %zu loss%s", losses, losses == 1 ? "" : "es") +
             ", so nothing was imported; without --strict the edit is made all the same"));
+    }
     // A fresh project takes the rate of the edit, which a legacy text states.
-    if (const Qx::Status prepared = session.prepare(import.sequence->getFrameRate()); !prepared)
+    if (const Qx::Status prepared = session.prepare(import.sequence->getFrameRate()); !prepared) {
         return failed(prepared);
-    if (const Qx::Status created = session.create(); !created)
+    }
+    if (const Qx::Status created = session.create(); !created) {
         return failed(created);
-    if (const Qx::Status saved = interchange::saveImport(import); !saved)
+    }
+    if (const Qx::Status saved = interchange::saveImport(import); !saved) {
         return failed(saved);
+    }
     item = import.sequence->get_cookie();
     return kDone;
 }
@@ -103,8 +113,9 @@ void addImportCommand(CLI::App& app, CommandWork& work) {
             arguments->options.rate = arguments->rate;
             cookie item;
             const int code = importFile(arguments->options, item);
-            if (code == kDone)
+            if (code == kDone) {
                 writeOut(item.asString() + "\n");
+            }
             return code;
         };
     });

@@ -21,31 +21,37 @@ struct SalvageArguments {
 
 int runSalvage(const SalvageArguments& arguments) {
     ProjectSession session(arguments.into);
-    if (const Qx::Status prepared = session.prepare({}); !prepared)
+    if (const Qx::Status prepared = session.prepare({}); !prepared) {
         return failed(prepared);
+    }
     EditPtr edit;
     std::vector<String> lost;
-    if (const Qx::Status salvaged = salvageEdit(arguments.file, edit, lost); !salvaged)
+    if (const Qx::Status salvaged = salvageEdit(arguments.file, edit, lost); !salvaged) {
         return failed(Qx::Status::failure("nothing could be salvaged: " + salvaged.reason()));
+    }
     // A fresh project takes the edit's rate.
-    if (const Qx::Status prepared = session.prepare(edit->getFrameRate()); !prepared)
+    if (const Qx::Status prepared = session.prepare(edit->getFrameRate()); !prepared) {
         return failed(prepared);
-    if (const Qx::Status created = session.create(); !created)
+    }
+    if (const Qx::Status created = session.create(); !created) {
         return failed(created);
+    }
     edit->set_cookie(interchange::provisionalCookie(0));
     edit->Opts().setCookie("PROJECT_COOKIE", Qx::currentProject().project);
     edit->init_dirty();
     interchange::Import made;
     made.sequence = edit;
-    if (const Qx::Status saved = interchange::saveImport(made); !saved)
+    if (const Qx::Status saved = interchange::saveImport(made); !saved) {
         return failed(saved);
+    }
     const cookie item = edit->get_cookie();
     if (arguments.json) {
         writeOut(salvageJson(item, *edit, lost));
         return kDone;
     }
-    for (const String& line : lost)
+    for (const String& line : lost) {
         reportProgress("lost: " + line);
+    }
     writeOut(item.asString() + "\n");
     return kDone;
 }

@@ -37,8 +37,9 @@ bool isBackupExtension(const String& extension) {
 /// file with an edit's extension that is named after no item gives the invalid cookie.
 bool itemOfFile(const String& name, cookie& item) {
     const String file = isBackupExtension(Qx::extensionOf(name)) ? Qx::withoutExtension(name) : name;
-    if (Qx::extensionOf(file) != getEditFilenameExt())
+    if (Qx::extensionOf(file) != getEditFilenameExt()) {
         return false;
+    }
     item = cookie(std::string_view(Qx::withoutExtension(file)));
     item = item.isStorable() ? item : invalid_cookie;
     return true;
@@ -47,8 +48,9 @@ bool itemOfFile(const String& name, cookie& item) {
 /// The names of a folder; none of one that is not there or is a link.
 Qx::Status namesIn(const String& folder, std::vector<String>& names) {
     names.clear();
-    if (kindOf(folder) != Qx::FileKind::Folder)
+    if (kindOf(folder) != Qx::FileKind::Folder) {
         return {};
+    }
     const Qx::FileError error = Qx::fileSystem().list(folder, names);
     return error ? Qx::Status::failure(error.text()) : Qx::Status();
 }
@@ -75,40 +77,49 @@ private:
 };
 
 void Verifying::add(const cookie& item, const String& name, bool needsItem) {
-    if (!m_items.empty() && std::find(m_items.begin(), m_items.end(), item) == m_items.end())
+    if (!m_items.empty() && std::find(m_items.begin(), m_items.end(), item) == m_items.end()) {
         return;
+    }
     m_found.push_back(item);
     VerifiedFile& file = m_files.emplace_back();
     file.name = name;
     verifyEditFile(Qx::joinPath(m_folder, name), file.faults);
-    if (needsItem && !item.is_valid())
+    if (needsItem && !item.is_valid()) {
         file.faults.push_back("its name is not that of an item, so nothing opens it; rename it to a cookie");
+    }
 }
 
 Qx::Status Verifying::addMilestones() {
     std::vector<String> items;
-    if (Qx::Status listed = namesIn(Qx::joinPath(m_folder, kMilestones), items); !listed)
+    if (Qx::Status listed = namesIn(Qx::joinPath(m_folder, kMilestones), items); !listed) {
         return listed;
+    }
     for (const String& name : items) {
         const cookie item = cookie(std::string_view(name));
         const String folder = Qx::joinPath(kMilestones, name);
         std::vector<String> copies;
-        if (Qx::Status listed = namesIn(Qx::joinPath(m_folder, folder), copies); !listed)
+        if (Qx::Status listed = namesIn(Qx::joinPath(m_folder, folder), copies); !listed) {
             return listed;
-        for (const String& copy : copies)
-            if (item.isStorable() && copy.starts_with(name + "."))
+        }
+        for (const String& copy : copies) {
+            if (item.isStorable() && copy.starts_with(name + ".")) {
                 add(item, Qx::joinPath(folder, copy), false);
+            }
+        }
     }
     return {};
 }
 
 Qx::Status Verifying::run() {
     std::vector<String> names;
-    if (const Qx::FileError error = Qx::fileSystem().list(m_folder, names); error)
+    if (const Qx::FileError error = Qx::fileSystem().list(m_folder, names); error) {
         return Qx::Status::failure(error.text());
-    for (const String& name : names)
-        if (cookie item; itemOfFile(name, item))
+    }
+    for (const String& name : names) {
+        if (cookie item; itemOfFile(name, item)) {
             add(item, name, true);
+        }
+    }
     return addMilestones();
 }
 
@@ -124,8 +135,9 @@ String verifyTable(const std::vector<VerifiedFile>& files, const Console& consol
         }
         ++unsound;
         String why;
-        for (const String& fault : file.faults)
+        for (const String& fault : file.faults) {
             why += (why.empty() ? "" : "; ") + console.safe(fault);
+        }
         out += "  " + console.inked(Console::Ink::Error, "NOT SOUND") + ": " + why + "\n";
     }
     return out +
@@ -134,26 +146,34 @@ String verifyTable(const std::vector<VerifiedFile>& files, const Console& consol
 
 int runVerify(const VerifyArguments& arguments) {
     std::vector<cookie> items;
-    for (const std::string& text : arguments.items)
-        if (!readCookie(text, items.emplace_back()))
+    for (const std::string& text : arguments.items) {
+        if (!readCookie(text, items.emplace_back())) {
             return kWrongUsage;
+        }
+    }
     ProjectSession session(arguments.project);
-    if (const Qx::Status opened = session.openExisting(); !opened)
+    if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
     Verifying verifying(session.folder(), items);
-    if (const Qx::Status ran = verifying.run(); !ran)
+    if (const Qx::Status ran = verifying.run(); !ran) {
         return failed(ran);
-    if (arguments.json)
+    }
+    if (arguments.json) {
         writeOut(verifyJson(verifying.files()));
-    else
+    } else {
         writeOut(verifyTable(verifying.files(), Console::forStandardOutput()));
+    }
     int code = kDone;
-    for (const VerifiedFile& file : verifying.files())
+    for (const VerifiedFile& file : verifying.files()) {
         code = file.faults.empty() ? code : static_cast<int>(kFailed);
-    for (const cookie& item : items)
-        if (!verifying.found(item))
+    }
+    for (const cookie& item : items) {
+        if (!verifying.found(item)) {
             code = failed(Qx::Status::failure("there is no edit " + item.asString() + " in the project " +
                                               session.root() + "; 'qmedit list' shows those there are"));
+        }
+    }
     return code;
 }
 
