@@ -85,6 +85,7 @@ TagBag::OpenResult TagBag::open(const cookie& item, const String& inFolder, eEdi
         result = openFile(behaviour);
     }
     m_contents->isOpen = result == Opened || result == NewStore;
+    m_contents->lastResult = result;
     return result;
 }
 
@@ -206,6 +207,10 @@ TagBag::OpenResult TagBag::openScanning(const String& file, const ScanNamer& nam
 
 const String& TagBag::openError() const {
     return m_contents->openError;
+}
+
+TagBag::OpenResult TagBag::lastOpenResult() const {
+    return m_contents->lastResult;
 }
 
 bool TagBag::isOpen() const {

@@ -68,6 +68,8 @@ public:
                             std::vector<StoredObjectInfo>& unchecked);
     /// One sentence for a person: the path, what is wrong and what can be done. Empty after a success.
     [[nodiscard]] const String& openError() const;
+    /// The result of the last `open`, also after the bag was closed; `Missing` before the first.
+    [[nodiscard]] OpenResult lastOpenResult() const;
     [[nodiscard]] bool isOpen() const;
     void close();
 
