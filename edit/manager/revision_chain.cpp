@@ -62,19 +62,29 @@ Qx::Status RevisionChain::move(int from, int to) const {
     return asStatus(Qx::fileSystem().rename(path(from), path(to)));
 }
 
+int RevisionChain::newest() const {
+    int number = 1;
+    while (number <= m_depth && !has(number)) {
+        ++number;
+    }
+    return number <= m_depth ? number : 0;
+}
+
 Qx::Status RevisionChain::rotate() {
     if (m_depth == 1) {
         return {};
     }
-    if (has(m_depth)) {
+    int firstFree = 1;
+    while (firstFree <= m_depth && has(firstFree)) {
+        ++firstFree;
+    }
+    if (firstFree > m_depth) {
+        firstFree = m_depth;
         if (Qx::Status status = asStatus(Qx::fileSystem().remove(path(m_depth))); !status) {
             return status;
         }
     }
-    for (int number = m_depth - 1; number >= 1; --number) {
-        if (!has(number)) {
-            continue;
-        }
+    for (int number = firstFree - 1; number >= 1; --number) {
         if (Qx::Status status = move(number, number + 1); !status) {
             return status;
         }
@@ -93,42 +103,30 @@ Qx::Status RevisionChain::push() {
 }
 
 int RevisionChain::restoreNewest() {
-    int newest = 1;
-    while (newest <= m_depth && !has(newest)) {
-        ++newest;
-    }
-    if (newest > m_depth || Qx::fileSystem().rename(path(newest), m_file)) {
+    const int restored = newest();
+    if (restored == 0 || Qx::fileSystem().rename(path(restored), m_file)) {
         return 0;
     }
-    for (int number = newest + 1; number <= m_depth; ++number) {
-        if (has(number) && !move(number, number - newest)) {
+    for (int number = restored + 1; number <= m_depth; ++number) {
+        if (has(number) && !move(number, number - restored)) {
             break; // what is left keeps its order; a hole is passed over
         }
     }
-    return newest;
+    return restored;
 }
 
-Qx::Status RevisionChain::pop() {
-    if (!has(1)) {
-        return Qx::Status::failure("there is no backup " + path(1));
-    }
-    if (Qx::Status status = asStatus(Qx::fileSystem().rename(path(1), m_file)); !status) {
-        return status;
-    }
-    for (int number = 2; number <= m_depth; ++number) {
-        if (has(number) && !move(number, number - 1)) {
-            break;
+bool RevisionChain::deleteTail(int keep) {
+    for (int number = m_depth; number > std::max(keep, 0); --number) {
+        if (has(number) && Qx::fileSystem().remove(path(number))) {
+            return false;
         }
     }
-    return {};
+    return true;
 }
 
-void RevisionChain::deleteTail(int keep) {
-    for (int number = std::max(keep, 0) + 1; number <= m_depth; ++number) {
-        if (Qx::fileSystem().remove(path(number))) {
-            break;
-        }
-    }
+Qx::Status RevisionChain::makeDurable() const {
+    return asStatus(
+        Qx::retryInterrupted([this] { return Qx::fileSystem().syncFolder(Qx::folderOf(m_file)); }));
 }
 
 String getUndoExtension(int number) {

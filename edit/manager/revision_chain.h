@@ -38,10 +38,13 @@ public:
     [[nodiscard]] bool exists() const;
     /// The numbers that are there, newest first.
     [[nodiscard]] std::vector<int> numbers() const;
+    /// The number of the newest backup in the depth; 0 if there is none.
+    [[nodiscard]] int newest() const;
 
-    /// Makes room for a backup 1: deletes the oldest of a full chain and moves each k to k + 1, from the
-    /// oldest down. With depth 1 only backup 1 is deleted when the edit file replaces it. On a failure the
-    /// moves made so far stay: every revision is still there, some one place further on.
+    /// Makes room for a backup 1: moves each k to k + 1, from the oldest down, after deleting the oldest of a
+    /// full chain. What lies behind a hole in the chain stays where it is: the hole takes up the move, and
+    /// nothing is deleted while there is one. With depth 1 nothing is done, as the edit file replaces backup
+    /// 1. On a failure the moves made so far stay: every revision is still there, some one place further on.
     Qx::Status rotate();
     /// Rotates, then moves the edit file to backup 1.
     Qx::Status push();
@@ -49,11 +52,11 @@ public:
     /// backup k moves to k - n. Returns its number n; 0 when there is none or it could not be moved, with
     /// nothing changed.
     int restoreNewest();
-    /// Moves backup 1 over the edit file's name and each k to k - 1. Fails, with nothing changed, without a
-    /// backup 1.
-    Qx::Status pop();
-    /// Deletes the backups from `keep` + 1 on; stops at the first that cannot be deleted or after the depth.
-    void deleteTail(int keep);
+    /// Deletes the backups from `keep` + 1 to the depth, the oldest first, so that what a crash leaves is a
+    /// chain still; stops at the first that cannot be deleted. True if none is left there.
+    bool deleteTail(int keep);
+    /// Makes the names durable. The moves above are not, each by itself: whoever makes them calls this last.
+    Qx::Status makeDurable() const;
 
 private:
     [[nodiscard]] Qx::Status move(int from, int to) const;

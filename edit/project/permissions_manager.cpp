@@ -5,6 +5,7 @@
 #include "platform/services/log.h"
 
 #include <functional>
+#include <map>
 #include <mutex>
 #include <set>
 
@@ -43,6 +44,7 @@ struct Records {
     String folder;                      ///< whose records these are
     configb stored = emptyRecords();    ///< as in the file
     configb transient = emptyRecords(); ///< of items that are never stored, or without a project folder
+    std::map<cookie, String> noted;     ///< owners that items name themselves
     std::set<int> rights;
 
     /// Reads the file of the current project unless that was done. A file that cannot be read counts as
@@ -54,6 +56,7 @@ struct Records {
         }
         if (folder != current) {
             transient.clear();
+            noted.clear();
         }
         stored.clear();
         folder = current;
@@ -65,6 +68,12 @@ struct Records {
         if (auto status = readStore(permissionsPath(folder), stored, found); !status) {
             herc_printf("PermissionsManager::read: %s\n", status.reason().c_str());
         }
+    }
+
+    [[nodiscard]] String ownerOf(const cookie& item) {
+        read();
+        const auto place = noted.find(item);
+        return place == noted.end() ? of(item).getString(keyFor(kOwnerPrefix, item)) : place->second;
     }
 
     [[nodiscard]] const configb& of(const cookie& item) const {
@@ -118,8 +127,18 @@ String PermissionsManager::getCurrentUser() {
 
 String PermissionsManager::getOwner(const cookie& item) {
     const std::lock_guard hold(records().mutex);
-    records().read();
-    return records().of(item).getString(keyFor(kOwnerPrefix, item));
+    return records().ownerOf(item);
+}
+
+void PermissionsManager::noteOwner(const cookie& item, const String& owner, bool onlyIfNone) {
+    if (!item.is_valid() || owner.empty() || !Qx::isUtf8(owner)) {
+        return;
+    }
+    const std::lock_guard hold(records().mutex);
+    const String known = records().ownerOf(item);
+    if (known != owner && (!onlyIfNone || known.empty())) {
+        records().noted[item] = owner;
+    }
 }
 
 Qx::Status PermissionsManager::setOwner(const cookie& item, const String& user, bool onlyIfNone) {
@@ -131,13 +150,20 @@ Qx::Status PermissionsManager::setOwner(const cookie& item, const String& user, 
     }
     const String key = keyFor(kOwnerPrefix, item);
     const std::lock_guard hold(records().mutex);
-    return records().change(item, [&](configb& store) {
+    if (onlyIfNone && !records().ownerOf(item).empty()) {
+        return {};
+    }
+    Qx::Status status = records().change(item, [&](configb& store) {
         const String before = store.getString(key);
         if (before == user || (onlyIfNone && !before.empty())) {
             return false;
         }
         return user.empty() ? store.remove(key) : store.setString(key, user);
     });
+    if (status) {
+        records().noted.erase(item);
+    }
+    return status;
 }
 
 bool PermissionsManager::getReadOnly(const cookie& item) {

@@ -27,6 +27,11 @@ public:
     /// Records the owner; an empty name forgets it. With `onlyIfNone` an owner who is recorded already stays.
     /// Fails for the invalid cookie and for a name that is not UTF-8.
     static Qx::Status setOwner(const cookie& item, const String& user, bool onlyIfNone);
+    /// Takes notice of the owner that an item's own file names, for the session: in memory only, no file is
+    /// written. It is what `getOwner` answers until another owner is recorded or another project becomes the
+    /// current one. With `onlyIfNone` an owner who is known already stays. An empty name, one that is not
+    /// UTF-8 and the invalid cookie are ignored.
+    static void noteOwner(const cookie& item, const String& owner, bool onlyIfNone);
     /// True if the current user may not change the item. A mark holds for every user, the owner among them.
     [[nodiscard]] static bool getReadOnly(const cookie& item);
     static Qx::Status setReadOnly(const cookie& item, bool readOnly);

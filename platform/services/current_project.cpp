@@ -2,6 +2,7 @@
 
 #include "platform/services/files.h"
 
+#include <atomic>
 #include <mutex>
 #include <pwd.h>
 #include <unistd.h>
@@ -25,6 +26,7 @@ String userOfProcess() {
 struct State {
     std::mutex mutex;
     CurrentProject project;
+    std::atomic<unsigned> generation{1};
 
     State() { project.user = userOfProcess(); }
 };
@@ -47,7 +49,16 @@ CurrentProject currentProject() {
 
 void setCurrentProject(const CurrentProject& project) {
     const std::lock_guard hold(state().mutex);
+    const bool isAnother =
+        state().project.project != project.project || state().project.rootFolder != project.rootFolder;
     state().project = project;
+    if (isAnother) {
+        ++state().generation;
+    }
+}
+
+unsigned currentProjectGeneration() {
+    return state().generation.load();
 }
 
 } // namespace Qx

@@ -26,5 +26,8 @@ struct QM_API CurrentProject {
 /// empty and the user is that of the process.
 QM_API CurrentProject currentProject();
 QM_API void setCurrentProject(const CurrentProject& project);
+/// Rises whenever another project or root folder is set: whoever keeps what belongs to a project asks for it
+/// cheaply.
+QM_API unsigned currentProjectGeneration();
 
 } // namespace Qx

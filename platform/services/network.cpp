@@ -35,19 +35,19 @@ void send(const Message& message) {
     if (!networkMode()) {
         return;
     }
-    std::shared_ptr<Service> service;
-    {
-        const std::lock_guard hold(state().mutex);
-        service = state().service;
-    }
-    if (service) {
-        service->send(message);
+    if (const std::shared_ptr<Service> carrier = service()) {
+        carrier->send(message);
     }
 }
 
-std::shared_ptr<Service> setService(std::shared_ptr<Service> service) {
+std::shared_ptr<Service> setService(std::shared_ptr<Service> replacement) {
     const std::lock_guard hold(state().mutex);
-    return std::exchange(state().service, std::move(service));
+    return std::exchange(state().service, std::move(replacement));
+}
+
+std::shared_ptr<Service> service() {
+    const std::lock_guard hold(state().mutex);
+    return state().service;
 }
 
 } // namespace Qx::Network

@@ -13,6 +13,7 @@ namespace Qx::Network {
 /// Message kinds. The numbers travel between machines: do not change them.
 enum MessageKind : int {
     EditWritten = 2,     ///< an edit's file was stored
+    EditDeleted = 3,     ///< an edit's file was deleted, with its backups
     EditBeingChanged = 5 ///< a user began to change an item
 };
 
@@ -43,5 +44,7 @@ QM_API void send(const Message& message);
 
 /// Installs the service; null removes it. Returns the one before. The caller shares ownership.
 QM_API std::shared_ptr<Service> setService(std::shared_ptr<Service> service);
+/// The service in place; null if none.
+[[nodiscard]] QM_API std::shared_ptr<Service> service();
 
 } // namespace Qx::Network

@@ -82,6 +82,7 @@ TagBag::OpenResult TagBag::open(const cookie& item, const String& inFolder, eEdi
         result = openFile(behaviour);
     }
     m_contents->isOpen = result == Opened || result == NewStore;
+    m_contents->lastResult = result;
     return result;
 }
 
@@ -152,6 +153,10 @@ TagBag::OpenResult TagBag::openSalvaging(const String& file, std::vector<StoredO
 
 const String& TagBag::openError() const {
     return m_contents->openError;
+}
+
+TagBag::OpenResult TagBag::lastOpenResult() const {
+    return m_contents->lastResult;
 }
 
 bool TagBag::isOpen() const {

@@ -52,6 +52,8 @@ public:
     OpenResult openSalvaging(const String& path, std::vector<StoredObjectInfo>& lost);
     /// One sentence for a person: the path, what is wrong and what can be done. Empty after a success.
     [[nodiscard]] const String& openError() const;
+    /// The result of the last `open`, also after the bag was closed; `Missing` before the first.
+    [[nodiscard]] OpenResult lastOpenResult() const;
     [[nodiscard]] bool isOpen() const;
     void close();
 

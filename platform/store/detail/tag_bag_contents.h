@@ -65,6 +65,7 @@ public:
     String extension;
     bool isOpen = false;
     String openError;
+    OpenResult lastResult = Missing;
     String objectError;
     size_t numPacked = 0;
     size_t numKept = 0;

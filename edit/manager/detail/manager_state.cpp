@@ -1,0 +1,137 @@
+#include "edit/manager/detail/manager_state.h"
+
+#include "edit/manager/edit_record.h"
+#include "edit/manager/revision_chain.h"
+#include "platform/services/log.h"
+
+namespace {
+
+/// Keeps the file of another program as undo backup 1 if it is not the one this process knows.
+bool keepForeignFile(const ManagerState::CachedEdit& entry, int depth) {
+    const Qx::FileInfo present = fileInfo(entry.path);
+    if (present.kind != Qx::FileKind::Regular || isSameFile(entry.file, present)) {
+        return true;
+    }
+    const Qx::Status kept = RevisionChain(entry.path, RevisionChain::Undo, depth).push();
+    if (!kept) {
+        herc_printf(
+            "edit_manager: %s was changed by another program and could not be kept as a backup, so it "
+            "was not written: %s\n",
+            entry.path.c_str(), kept.reason().c_str());
+        return false;
+    }
+    herc_printf(
+        "edit_manager: %s was changed by another program; that version is kept as its undo backup 1\n",
+        entry.path.c_str());
+    return true;
+}
+
+} // namespace
+
+ManagerState& managerState() {
+    static auto& state = *new ManagerState;
+    return state;
+}
+
+bool isNoItem(const cookie& item) {
+    return !item.is_valid() || (item.word(0) == 0 && item.word(1) == 0 && item.word(2) == 0);
+}
+
+Qx::FileInfo fileInfo(const String& path) {
+    Qx::FileInfo info;
+    if (path.empty() || Qx::retryInterrupted([&] { return Qx::fileSystem().info(path, info); })) {
+        return {};
+    }
+    return info;
+}
+
+bool isSameFile(const Qx::FileInfo& a, const Qx::FileInfo& b) {
+    return a.kind == b.kind && a.device == b.device && a.inode == b.inode && a.size == b.size &&
+           a.modifiedNs == b.modifiedNs;
+}
+
+const ManagerMessages& managerMessages() {
+    static const ManagerMessages messages;
+    return messages;
+}
+
+namespace {
+/// Interns the message types when the library loads.
+[[maybe_unused]] const ManagerMessages& internedAtLoad = managerMessages();
+} // namespace
+
+ManagerState::CachedEdit& ManagerState::put(const cookie& item, EditPtr edit, String path,
+                                            const Qx::FileInfo& file) {
+    auto entry = std::make_unique<CachedEdit>();
+    entry->item = item;
+    entry->edit = std::move(edit);
+    entry->path = std::move(path);
+    entry->file = file;
+    std::unique_ptr<CachedEdit>& place = cache[item];
+    place = std::move(entry);
+    return *place;
+}
+
+std::unique_ptr<ManagerState::CachedEdit> ManagerState::removeCacheEntry(const cookie& item) {
+    const auto place = cache.find(item);
+    if (place == cache.end()) {
+        return nullptr;
+    }
+    std::unique_ptr<CachedEdit> entry = std::move(place->second);
+    cache.erase(place);
+    removeFromDirtyList(item);
+    return entry;
+}
+
+void ManagerState::noteFile(CachedEdit& entry) {
+    entry.file = fileInfo(entry.path);
+}
+
+bool ManagerState::write(CachedEdit& entry) {
+    Edit& edit = *entry.edit;
+    if (!edit.needsToBeWritten()) {
+        return true;
+    }
+    EditManagerLock writers{Qx::folderOf(entry.path)};
+    if (!takeWritersLock(writers) || !keepForeignFile(entry, backupDepth)) {
+        return false;
+    }
+    if (!edit.write_file(Qx::widen(entry.path))) {
+        herc_printf("edit_manager: %s\n", edit.lastFileError().c_str());
+        // The file may have been replaced and only not been made durable.
+        noteFile(entry);
+        return false;
+    }
+    noteFile(entry);
+    entry.ownDescription.reset();
+    removeFromDirtyList(entry.item);
+    records.put(entry.item, editRecordOf(edit, &entry.file));
+    return true;
+}
+
+void ManagerState::addToDirtyList(const cookie& item) {
+    const std::lock_guard hold(dirtyMutex);
+    dirty.insert(item);
+}
+
+void ManagerState::removeFromDirtyList(const cookie& item) {
+    const std::lock_guard hold(dirtyMutex);
+    dirty.erase(item);
+}
+
+bool takeWritersLock(EditManagerLock& writers) {
+    const Qx::Status status = writers.take(true);
+    if (!status) {
+        herc_printf("edit_manager: nothing was written: %s\n", status.reason().c_str());
+    }
+    return status.isOk();
+}
+
+CachedEditScope::CachedEditScope(const cookie& item, const EditPtr& edit)
+    : m_section(edit->section()), m_turn(managerState().queue, item),
+      m_isWritable(takeWritersLock(m_writers)), m_lock(managerState().lock), m_entry(nullptr) {
+    ManagerState::CachedEdit* const found = managerState().findCacheEntry(item);
+    if (m_isWritable && found != nullptr && found->edit == edit) {
+        m_entry = found;
+    }
+}

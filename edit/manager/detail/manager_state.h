@@ -1,0 +1,143 @@
+#pragma once
+
+#include "edit/manager/detail/project_records.h"
+#include "edit/manager/edit_manager.h"
+#include "edit/manager/edit_manager_lock.h"
+#include "edit/manager/milestone_ring.h"
+#include "edit/manager/multiple_access_queue.h"
+#include "platform/base/critical_section.h"
+#include "platform/services/files.h"
+
+#include <atomic>
+#include <map>
+#include <memory>
+#include <optional>
+#include <set>
+
+/// What the manager holds. One object for the process, never destroyed, so that a handle dropped while the
+/// process ends finds it.
+///
+/// Locks, in the order in which they are taken:
+///
+///   1. the section of an edit
+///   2. access to its item on `queue`
+///   3. the writers' lock of the project, against other processes (`EditManagerLock`)
+///   4. `lock`, the "edit manager lock": guards everything here but what is said to guard itself
+///   5. `dirtyMutex`, and those of `records`
+///
+/// Who changes an edit holds 1 and may call the manager; so nothing waits for a section while it holds one of
+/// the others, but for an edit that nobody else can have. No observer is told under 2 to 5.
+struct ManagerState {
+    /// A cached edit with what is known of its file: another program that replaced the file since is noticed.
+    struct CachedEdit : EditCacheEntry {
+        String path; ///< of its file; empty for an item that has none
+        Qx::FileInfo
+            file; ///< as this process last read, wrote or moved it; of kind Missing when there is none
+        /// What the revision that an undo or redo brought back says of itself, until it is changed.
+        std::optional<EditModification> ownDescription;
+    };
+
+    criticalSection lock;
+    std::map<cookie, std::unique_ptr<CachedEdit>> cache;
+    cookie lastOpened;
+    size_t cachedAtLastOpen = 0;
+    std::optional<int> cacheLimit; ///< read on the first opening
+    cookie newProject;
+    cookie project; ///< the one whose edits are in the cache; invalid when there is none
+    EditPtr projectEdit;
+    int backupDepth = 10;
+    std::function<void(bool)> uiDelete;
+    std::function<bool()> confirmUpdate;
+
+    std::mutex dirtyMutex;
+    std::set<cookie> dirty; ///< guarded by `dirtyMutex`
+
+    /// \name Guard themselves
+    /// @{
+    Qx::MultipleAccessQueue<cookie> queue;
+    ProjectRecords records;
+    Notifier notifier;
+    ValServer<cookie> focus;
+    ValServer<cookie> source;
+    ValServer<cookie> record;
+    ValServer<bool> mixerBypass;
+    std::atomic<edit_manager*> instance{nullptr};
+    std::atomic<unsigned> projectGeneration{0}; ///< of the current project that `project` was taken from
+    /// @}
+
+    using Hold = std::lock_guard<criticalSection>;
+
+    /// The entry of an item; null if there is none. Under the lock.
+    [[nodiscard]] CachedEdit* findCacheEntry(const cookie& item) {
+        const auto place = cache.find(item);
+        return place == cache.end() ? nullptr : place->second.get();
+    }
+    /// Puts an edit (or, with a null one, a remembered failure) in an item's place. Under the lock.
+    CachedEdit& put(const cookie& item, EditPtr edit, String path, const Qx::FileInfo& file);
+    /// Takes an entry out, unwritten, and returns it. Under the lock; the entry is to be destroyed after it.
+    [[nodiscard]] std::unique_ptr<CachedEdit> removeCacheEntry(const cookie& item);
+
+    /// Writes an edit if it needs it. What another program put in its file's place since it was read is kept
+    /// as an undo backup first. False if it could not be written; the edit is then still dirty. Under the
+    /// edit's section and the lock.
+    bool write(CachedEdit& entry);
+    /// What the edit's file is at this moment is taken as known.
+    static void noteFile(CachedEdit& entry);
+
+    void addToDirtyList(const cookie& item);
+    void removeFromDirtyList(const cookie& item);
+
+    void tell(const NotifyMsgType& type, const cookie& item) {
+        notifier.notify(NotifyMsg(type, item.asString()));
+    }
+};
+
+/// The state of the process.
+ManagerState& managerState();
+
+/// Holds what a sequence of moves of one cached edit's files needs, locks 1 to 4 in order, and makes sure
+/// that the edit is still the item's.
+class CachedEditScope {
+public:
+    CachedEditScope(const cookie& item, const EditPtr& edit);
+    /// Null when the edit left the cache meanwhile, or other processes could not be kept away (logged).
+    [[nodiscard]] ManagerState::CachedEdit* entry() const { return m_entry; }
+    /// False in the second case.
+    [[nodiscard]] bool isWritable() const { return m_isWritable; }
+
+private:
+    ManagerState::Hold m_section;
+    Qx::AccessScope<cookie> m_turn;
+    EditManagerLock m_writers;
+    bool m_isWritable;
+    ManagerState::Hold m_lock;
+    ManagerState::CachedEdit* m_entry;
+};
+
+/// True for what is no item at all: the invalid cookie, or three zero words.
+[[nodiscard]] bool isNoItem(const cookie& item);
+/// Information about a file; of kind Missing also when the system refuses it.
+[[nodiscard]] Qx::FileInfo fileInfo(const String& path);
+/// True if both tell of one and the same unchanged file, or of none.
+[[nodiscard]] bool isSameFile(const Qx::FileInfo& a, const Qx::FileInfo& b);
+/// Takes the writers' lock of the project that a file belongs to, waiting for other processes; a failure is
+/// logged.
+[[nodiscard]] bool takeWritersLock(EditManagerLock& writers);
+/// The message types of the manager.
+struct ManagerMessages {
+    NotifyMsgType projectChanged{"editmanProjectChanged"};
+    NotifyMsgType projectExit{"editmanExitProject"};
+    NotifyMsgType flushChanges{"editmanFlushChanges"};
+    NotifyMsgType invalidateCache{"editmanInvalidateCache"};
+    NotifyMsgType editDeleted{"editDeleted"};
+};
+const ManagerMessages& managerMessages();
+/// Writes a cached edit if it needs it and is in the cache still; with a ring, a milestone is made where one
+/// is due. False if it could not be written.
+bool writeCached(const cookie& item, const EditPtr& edit, const MilestoneRing* milestones);
+/// Brings the records up to date with the edits in memory that changed, and with what was gathered. Not under
+/// the manager's lock.
+void storeRecords();
+/// The record of an item as its edit in memory, else its file, says it; without a file, what is recorded.
+/// False if there is none. Not under the manager's lock.
+[[nodiscard]] bool currentRecord(const cookie& item, projdb::Record& record);

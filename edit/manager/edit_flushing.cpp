@@ -1,0 +1,173 @@
+#include "edit/manager/detail/manager_state.h"
+#include "edit/manager/milestone_ring.h"
+#include "platform/media/frame_rate.h"
+#include "platform/services/current_project.h"
+#include "platform/services/log.h"
+
+namespace {
+
+/// Writes the edit with its milestone: the header tells of the milestone before the copy is made.
+bool writeWithMilestone(ManagerState::CachedEdit& entry, const MilestoneRing& milestones) {
+    ManagerState& state = managerState();
+    Edit& edit = *entry.edit;
+    const int64_t before = edit.Opts().getInt64(MilestoneRing::kHeaderKey);
+    edit.Opts().setInt64(MilestoneRing::kHeaderKey, static_cast<int64_t>(edit.getModificationCount()));
+    if (!state.write(entry)) {
+        edit.Opts().setInt64(MilestoneRing::kHeaderKey, before);
+        return false;
+    }
+    if (const Qx::Status status = milestones.makeMilestoneBackup(entry.edit, entry.path); !status) {
+        herc_printf("edit_manager::flush_changes: no milestone of %s was made: %s\n",
+                    entry.item.asString().c_str(), status.reason().c_str());
+        edit.Opts().setInt64(MilestoneRing::kHeaderKey, before);
+    }
+    return state.write(entry);
+}
+
+EditPtr cachedEdit(const cookie& item) {
+    ManagerState& state = managerState();
+    const ManagerState::Hold hold(state.lock);
+    const ManagerState::CachedEdit* const found = state.findCacheEntry(item);
+    return found == nullptr ? EditPtr() : found->edit;
+}
+
+Vector<cookie> dirtyItems() {
+    ManagerState& state = managerState();
+    const std::lock_guard hold(state.dirtyMutex);
+    return {state.dirty.begin(), state.dirty.end()};
+}
+
+} // namespace
+
+bool writeCached(const cookie& item, const EditPtr& edit, const MilestoneRing* milestones) {
+    ManagerState& state = managerState();
+    const CachedEditScope scope(item, edit);
+    if (!scope.isWritable() || scope.entry() == nullptr) {
+        return scope.isWritable();
+    }
+    ManagerState::CachedEdit& entry = *scope.entry();
+    // Before the question: what becomes dirty from here on goes onto the list again.
+    state.removeFromDirtyList(item);
+    if (!edit->needsToBeWritten()) {
+        return true;
+    }
+    const bool written = milestones != nullptr && milestones->isMilestoneBackupRequired(edit)
+                             ? writeWithMilestone(entry, *milestones)
+                             : state.write(entry);
+    if (!written) {
+        state.addToDirtyList(item);
+    }
+    return written;
+}
+
+bool edit_manager::flush_edit(const cookie& item) {
+    const EditPtr edit = openEdit(item, eOpenExisting);
+    if (!edit.valid()) {
+        return false;
+    }
+    const bool written = writeCached(item, edit, nullptr);
+    storeRecords();
+    return written;
+}
+
+bool edit_manager::flush_changes() {
+    ManagerState& state = managerState();
+    state.notifier.notify(NotifyMsg(flushChangesMsgType(), String()));
+    // The number of the next cookie is stored whenever one is handed out: there is nothing to advance.
+    const MilestoneRing milestones;
+    bool allWritten = true;
+    {
+        // Taken once for all; an edit that cannot be written without it says so itself.
+        EditManagerLock writers;
+        const Vector<cookie> items = dirtyItems();
+        if (!items.empty()) {
+            static_cast<void>(writers.take(true).isOk());
+        }
+        for (const cookie& item : items) {
+            const EditPtr edit = cachedEdit(item);
+            if (!edit.valid()) {
+                state.removeFromDirtyList(item);
+            } else if (!writeCached(item, edit, &milestones)) {
+                allWritten = false;
+            }
+        }
+        const cookie project = get_current_project_cookie();
+        if (const EditPtr edit = cachedEdit(project); edit.valid()) {
+            allWritten = writeCached(project, edit, nullptr) && allWritten;
+        }
+    }
+    storeRecords();
+    const Qx::CurrentProject project = Qx::currentProject();
+    setProjDBValue("PROJECT_NAME", project.name);
+    setProjDBValue("PROJECT_RATE", Qx::FrameRate(project.frameRateCode).asString());
+    return allWritten;
+}
+
+void edit_manager::addToDirtyList(const cookie& item) {
+    managerState().addToDirtyList(item);
+}
+
+size_t edit_manager::numDirty() {
+    ManagerState& state = managerState();
+    const std::lock_guard hold(state.dirtyMutex);
+    return state.dirty.size();
+}
+
+namespace {
+
+void reportLost(const cookie& item) {
+    LogBoth("edit_manager::close_all_edits(): edit %s was closed with changes that could not be written\n",
+            cookie_string(item).c_str());
+}
+
+/// Writes and drops what nobody else holds, and forgets what could not be opened. Appends the items that
+/// others hold.
+void closeUnreferenced(Vector<cookie>& held) {
+    ManagerState& state = managerState();
+    const ManagerState::Hold hold(state.lock);
+    for (auto place = state.cache.begin(); place != state.cache.end();) {
+        ManagerState::CachedEdit& entry = *place->second;
+        if (entry.edit.valid() && entry.edit->refCount() > 1) {
+            held.push_back(entry.item);
+            ++place;
+            continue;
+        }
+        if (entry.edit.valid()) {
+            const ManagerState::Hold section(entry.edit->section());
+            if (!state.write(entry)) {
+                reportLost(entry.item);
+            }
+        }
+        state.removeFromDirtyList(entry.item);
+        place = state.cache.erase(place);
+    }
+}
+
+} // namespace
+
+void edit_manager::close_all_edits() {
+    ManagerState& state = managerState();
+    Vector<cookie> held;
+    closeUnreferenced(held);
+    for (const cookie& item : held) {
+        const EditPtr edit = cachedEdit(item);
+        if (!edit.valid()) {
+            continue;
+        }
+        // With the reference that is asked with, in the place of the one here.
+        if (const int references = edit->refCount(); references > 2) {
+            herc_printf("edit_manager::close_all_edits(): edit %s has %d references\n",
+                        cookie_string(item).c_str(), references);
+        }
+        if (!writeCached(item, edit, nullptr)) {
+            reportLost(item);
+        }
+        std::unique_ptr<ManagerState::CachedEdit> dropped;
+        const ManagerState::Hold hold(state.lock);
+        if (const ManagerState::CachedEdit* found = state.findCacheEntry(item);
+            found != nullptr && found->edit == edit) {
+            dropped = state.removeCacheEntry(item);
+        }
+    }
+    storeRecords();
+}

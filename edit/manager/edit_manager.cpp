@@ -1,0 +1,195 @@
+#include "edit/manager/edit_manager.h"
+
+#include "edit/manager/detail/manager_state.h"
+#include "edit/project/permissions_manager.h"
+#include "platform/services/config_int.h"
+#include "platform/services/crash_flag.h"
+#include "platform/services/log.h"
+#include "platform/services/network.h"
+
+#include <algorithm>
+
+namespace {
+
+void hear(const Qx::Network::Message& message) {
+    switch (message.kind) {
+    case Qx::Network::EditWritten:
+        edit_manager::reloadRequest(message.item, true);
+        break;
+    case Qx::Network::EditDeleted:
+        edit_manager::handleNetDelete(message.item);
+        break;
+    default:
+        break;
+    }
+}
+
+} // namespace
+
+edit_manager::edit_manager() {
+    ManagerState& state = managerState();
+    Qx::Network::setNetworkMode(false);
+    delete state.instance.load();
+    {
+        const ManagerState::Hold hold(state.lock);
+        state.newProject = cookie("P0001000");
+        state.backupDepth = std::max(config_int("backup_depth", 10), 1);
+        state.cacheLimit.reset();
+        state.lastOpened = invalid_cookie;
+        state.cachedAtLastOpen = 0;
+        state.projectGeneration = 0;
+        state.instance = this;
+    }
+    EditRegistry::install(this);
+    static_cast<void>(check_current_project(eOpenOrCreate));
+    if (PermissionsManager::hasRight(PermissionsManager::NetworkRight)) {
+        m_service = Qx::Network::service();
+        if (m_service) {
+            m_listening = m_service->listen(hear);
+        }
+    }
+}
+
+edit_manager::~edit_manager() {
+    ManagerState& state = managerState();
+    herc_printf("edit_manager::~edit_manager: closing down edit manager\n");
+    m_listening.reset();
+    std::function<void(bool)> uiDelete;
+    std::function<bool()> confirmUpdate;
+    {
+        const ManagerState::Hold hold(state.lock);
+        uiDelete.swap(state.uiDelete);
+        confirmUpdate.swap(state.confirmUpdate);
+    }
+    if (get_crash_flag() != 0) {
+        flush_changes();
+    }
+    if (state.records.isOpen() && confirmUpdate && confirmUpdate() && !update_projdb()) {
+        herc_printf("edit_manager::~edit_manager: projdb update interrupted\n");
+    }
+    if (uiDelete) {
+        uiDelete(true);
+    }
+    EditPtr projectEdit;
+    {
+        const ManagerState::Hold hold(state.lock);
+        std::swap(projectEdit, state.projectEdit);
+    }
+    projectEdit.invalidate();
+    close_all_edits();
+    state.records.close();
+    const ManagerState::Hold hold(state.lock);
+    state.project = invalid_cookie;
+    state.projectGeneration = 0;
+    {
+        const std::lock_guard holdDirty(state.dirtyMutex);
+        state.dirty.clear();
+    }
+    if (state.instance.load() == this) {
+        state.instance = nullptr;
+        EditRegistry::install(nullptr);
+    }
+}
+
+edit_manager* edit_manager::theEditManager() {
+    return managerState().instance.load();
+}
+
+void edit_manager::theEditManager(edit_manager* manager) {
+    edit_manager* const present = theEditManager();
+    if (present == manager) {
+        return;
+    }
+    delete present;
+    if (manager != nullptr) {
+        managerState().instance = manager;
+        EditRegistry::install(manager);
+    }
+}
+
+void edit_exit() {
+    ManagerState& state = managerState();
+    edit_manager* const manager = edit_manager::theEditManager();
+    if (get_crash_flag() != 0) {
+        size_t numCached = 0;
+        cookie last;
+        {
+            const ManagerState::Hold hold(state.lock);
+            numCached = state.cachedAtLastOpen;
+            last = state.lastOpened;
+        }
+        LogBoth("edit_manager : Num cached edits  - %d\n", static_cast<int>(numCached));
+        if (last.is_valid()) {
+            LogBoth("edit_manager : Last opened edit  - %s\n", cookie_string(last).c_str());
+        }
+    }
+    herc_printf("edit_exit: closing down edit manager\n");
+    delete manager;
+    herc_printf("edit_exit: closed down edit manager\n");
+}
+
+void edit_manager::setUiDeleteFn(std::function<void(bool)> callback) {
+    ManagerState& state = managerState();
+    const ManagerState::Hold hold(state.lock);
+    state.uiDelete.swap(callback);
+}
+
+void edit_manager::setConfirmUpdateFn(std::function<bool()> callback) {
+    ManagerState& state = managerState();
+    const ManagerState::Hold hold(state.lock);
+    state.confirmUpdate.swap(callback);
+}
+
+ValServer<cookie>& edit_manager::getFocusEditServer() {
+    return managerState().focus;
+}
+cookie edit_manager::getFocusEditCookie() {
+    return getFocusEditServer().getValue();
+}
+void edit_manager::setFocusEditCookie(const cookie& item) {
+    getFocusEditServer().setValue(item);
+}
+ValServer<cookie>& edit_manager::getSourceEditServer() {
+    return managerState().source;
+}
+cookie edit_manager::getSourceEditCookie() {
+    return getSourceEditServer().getValue();
+}
+void edit_manager::setSourceEditCookie(const cookie& item) {
+    getSourceEditServer().setValue(item);
+}
+ValServer<cookie>& edit_manager::getRecordEditServer() {
+    return managerState().record;
+}
+cookie edit_manager::getRecordEditCookie() {
+    return getRecordEditServer().getValue();
+}
+void edit_manager::setRecordEditCookie(const cookie& item) {
+    getRecordEditServer().setValue(item);
+}
+ValServer<bool>& edit_manager::getMixerBypassServer() {
+    return managerState().mixerBypass;
+}
+void edit_manager::setMixerBypass(bool bypass) {
+    getMixerBypassServer().setValue(bypass);
+}
+
+NotifyMsgType edit_manager::projChangedMsgType() {
+    return managerMessages().projectChanged;
+}
+NotifyMsgType edit_manager::projExitMsgType() {
+    return managerMessages().projectExit;
+}
+NotifyMsgType edit_manager::flushChangesMsgType() {
+    return managerMessages().flushChanges;
+}
+NotifyMsgType edit_manager::invalidateCacheMsgType() {
+    return managerMessages().invalidateCache;
+}
+NotifyMsgType edit_manager::editDeletedMsgType() {
+    return managerMessages().editDeleted;
+}
+
+Qx::Ptr<Qx::Guard> edit_manager::registerNotification(NotifyMsgType type, Notifier::Listener listener) {
+    return managerState().notifier.addListener(type, std::move(listener));
+}

@@ -1,0 +1,208 @@
+#pragma once
+
+#include "edit/model/edit.h"
+#include "edit/model/edit_registry.h"
+#include "platform/base/vector.h"
+#include "platform/notify/notifier.h"
+#include "platform/notify/val_server.h"
+#include "platform/services/network.h"
+
+#include <functional>
+#include <memory>
+
+class projdb;
+
+using CookieVec = Vector<cookie>;
+
+/// The outcome of the project operations.
+enum class eStatus { Ok = 0, NoProject = 1, NotFound = 2, NotWritable = 3 };
+
+/// One place of the cache: an item and its edit. A null edit remembers that the item could not be opened.
+struct EditCacheEntry {
+    cookie item;
+    EditPtr edit;
+};
+
+/// The one registry of open edits of a process. It finds an edit by its cookie, reads it when it is not
+/// cached, falls back to its backups when its file is missing or unreadable, writes changed edits, keeps
+/// their revisions, and tells the rest of the system when the project changes, changes are flushed, the cache
+/// is dropped or an edit is deleted. What it leaves to others: reading and writing a file (`Edit`), the
+/// numbered files beside one
+/// (`RevisionChain`), milestone copies (`MilestoneRing`), the project's records (`projdb`).
+///
+/// All operations are static; the one instance exists for its roles towards others: it is the model's
+/// `EditRegistry` and hears messages of other seats. Without an instance opening yields a null handle.
+///
+/// Threads: any thread may call anything. One recursive lock guards the cache, the dirty list, the project
+/// edit and every write of an edit file made here; it is never held while a file is read. Openings of one
+/// item take turns. An edit itself is not locked: who changes it while another thread flushes must hold its
+/// section, as the flush does.
+///
+/// Nothing here throws.
+class QM_API edit_manager : public EditRegistry {
+public:
+    /// Replaces any manager there is, clears network mode and becomes the model's registry. Settings are read
+    /// here: "backup_depth" (10, at least 1).
+    edit_manager();
+    /// Shuts down: flushes when the crash flag is set, brings the project's records up to date if the
+    /// platform agrees, calls the user interface's delete callback, closes every edit.
+    ~edit_manager() override;
+
+    [[nodiscard]] static edit_manager* theEditManager();
+    /// Installs an instance (owned from then on) in the place of the present one, which is destroyed. Null
+    /// only destroys.
+    static void theEditManager(edit_manager* manager);
+
+    /// \name Opening and the cache
+    /// A cached edit, or a failure that is remembered, costs one lookup under the lock, no file and no
+    /// memory.
+    /// @{
+    [[nodiscard]] EditPtr open(const cookie& item, eEditOpenBehaviour behaviour) override;
+    /// The same without an instance at hand.
+    [[nodiscard]] static EditPtr openEdit(const cookie& item, eEditOpenBehaviour behaviour);
+    /// True if the edit is in memory.
+    [[nodiscard]] static bool get_present(const cookie& item);
+    /// How many items the cache has, remembered failures included.
+    [[nodiscard]] static size_t numCached();
+    /// With `limit` not -1 and at least `limit` entries: writes and drops the first edit, in the order of
+    /// cookies, that nobody but the cache holds. At most one a call. An edit that cannot be written stays.
+    static void limitEditCache(int limit);
+    /// Drops an edit from the cache, unwritten, so that the next opening reads its file; forgets a remembered
+    /// failure. Handles that others hold stay usable, but their edit is no longer the item's: changes to it
+    /// are not written any more. Observers hear "editmanInvalidateCache" first. False if it was not there.
+    static bool invalidateCache(const cookie& item);
+    /// An edit's file was changed elsewhere: drops the edit and, with `reopen`, opens it again if it was in
+    /// memory, telling its holders of the revision change before. An edit with changes of its own is not
+    /// dropped: what the file holds is kept as an undo backup at the next write.
+    static void reloadRequest(const cookie& item, bool reopen);
+    /// @}
+
+    /// \name Writing
+    /// @{
+    static bool flush_edit(const cookie& item);
+    /// Writes every changed edit, with milestones where they are due, and the project edit. Edits that could
+    /// not be written stay on the dirty list. True if all were written.
+    static bool flush_changes();
+    void addToDirtyList(const cookie& item) override;
+    [[nodiscard]] static size_t numDirty();
+    static void close_all_edits();
+    /// @}
+
+    /// \name Revisions
+    /// The code of the backups is `RevisionChain`, of the milestones `MilestoneRing`.
+    /// @{
+    /// Makes an undo backup of the edit's present state. The edit stays in memory; its file goes until it is
+    /// written next. False, with nothing changed but perhaps a write, for an edit that is read-only, does not
+    /// open or cannot be written.
+    static bool backup_edit(const cookie& item);
+    [[nodiscard]] static bool undoExists(const cookie& item);
+    [[nodiscard]] static bool redoExists(const cookie& item);
+    /// Steps back or forward one revision; the clipboard edit goes with it where the revision used it. False
+    /// if there is no such revision or a step failed; then the edit's file is as it was or in the chain.
+    static bool undoRequest(const cookie& item);
+    static bool redoRequest(const cookie& item);
+    static void delete_redo_edits(const cookie& item, int keep);
+    static void delete_backup_edits(const cookie& item, int keep);
+    [[nodiscard]] static int backupDepth();
+    /// @}
+
+    /// \name Deleting
+    /// @{
+    /// Deletes an edit's file with all its backups, after the notices. False for one that is read-only or in
+    /// use by others than the cache, unless `force`, or whose file could not be removed.
+    static bool delete_edit_file_and_backups(const cookie& item, bool force);
+    static bool deleteEditFilesAndBackups(const CookieVec& items, bool force);
+    /// The paths of an edit's file and all its backups that are there, the file first, then undo, then redo.
+    [[nodiscard]] static Vector<String> getEditFiles(const cookie& item);
+    /// Tells the edit's observers, and those of "editDeleted", that it is about to go. A hidden edit's
+    /// deletion is told only with the setting "notify_hidden_deleted".
+    static void issuePreDeletionNotifications(const cookie& item);
+    /// An edit was deleted at another seat: notices, then it leaves the cache unwritten.
+    static void handleNetDelete(const cookie& item);
+    /// @}
+
+    /// \name Project
+    /// @{
+    /// Closes the present project and makes `project` the current one: its folder must be there, or with
+    /// behaviours 1 and 2 is made. Observers hear "editmanProjectChanged".
+    static eStatus set_current_project(const cookie& project, eEditOpenBehaviour behaviour);
+    /// Ok if a project is current; adopts the one the application has set.
+    static eStatus check_current_project(eEditOpenBehaviour behaviour);
+    /// Flushes, tells observers of "editmanExitProject", closes every edit and the project's records.
+    static void exitProject();
+    /// The project edit; null if there is none. Valid while the project is current.
+    [[nodiscard]] static Edit* get_current_project();
+    [[nodiscard]] static cookie get_current_project_cookie();
+    /// True if the project has no edit file.
+    [[nodiscard]] static bool projectIsEmpty();
+    [[nodiscard]] static String getProjectName(const cookie& project);
+    [[nodiscard]] static Qx::Ed2Support::TVStd getProjectTvStd(const cookie& project);
+    /// One line for people: name, rate, number of edits.
+    [[nodiscard]] static String getProjectSummary(const cookie& project);
+    /// The next free edit cookie; invalid when none can be had.
+    [[nodiscard]] static cookie new_edit();
+    /// @}
+
+    /// \name The project's records
+    /// @{
+    [[nodiscard]] static bool getProjDBValue(const String& key, String& value,
+                                             const cookie& project = invalid_cookie);
+    static bool setProjDBValue(const String& key, const String& value);
+    /// The records of the current project; null without one. Opened on first use.
+    [[nodiscard]] static projdb* get_projdb();
+    /// Makes the records say what the files say. `progress` hears done and total and may answer false to
+    /// interrupt. False if it was interrupted or could not be done.
+    static bool update_projdb(const std::function<bool(size_t done, size_t total)>& progress = nullptr);
+    void updateProjdbRec(const cookie& item, bool create) override;
+    /// @}
+
+    /// \name Followed values
+    /// @{
+    [[nodiscard]] static ValServer<cookie>& getFocusEditServer();
+    [[nodiscard]] static cookie getFocusEditCookie();
+    static void setFocusEditCookie(const cookie& item);
+    [[nodiscard]] static ValServer<cookie>& getSourceEditServer();
+    [[nodiscard]] static cookie getSourceEditCookie();
+    static void setSourceEditCookie(const cookie& item);
+    [[nodiscard]] static ValServer<cookie>& getRecordEditServer();
+    [[nodiscard]] static cookie getRecordEditCookie();
+    static void setRecordEditCookie(const cookie& item);
+    [[nodiscard]] static ValServer<bool>& getMixerBypassServer();
+    static void setMixerBypass(bool bypass);
+    /// @}
+
+    /// \name Notifications
+    /// The text of a message is the cookie's text where it is about one item.
+    /// @{
+    [[nodiscard]] static NotifyMsgType projChangedMsgType();
+    [[nodiscard]] static NotifyMsgType projExitMsgType();
+    [[nodiscard]] static NotifyMsgType flushChangesMsgType();
+    [[nodiscard]] static NotifyMsgType invalidateCacheMsgType();
+    [[nodiscard]] static NotifyMsgType editDeletedMsgType();
+    [[nodiscard]] static Qx::Ptr<Qx::Guard> registerNotification(NotifyMsgType type,
+                                                                 Notifier::Listener listener);
+    static void deregisterNotification(Qx::Ptr<Qx::Guard>& subscription) { subscription.reset(); }
+    /// @}
+
+    /// \name Memory reclamation
+    /// @{
+    /// Drops unreferenced edits until none is left.
+    virtual void limitUsage();
+    /// Drops at most one.
+    virtual void purge();
+    virtual void reportUsage();
+    /// @}
+
+    /// Called with true when the manager shuts down, so that a user interface can let go of its edits.
+    static void setUiDeleteFn(std::function<void(bool)> callback);
+    /// Asked at shut-down whether the project's records shall be brought up to date. Without one they are
+    /// not.
+    static void setConfirmUpdateFn(std::function<bool()> callback);
+
+private:
+    std::shared_ptr<Qx::Network::Service> m_service;
+    std::shared_ptr<void> m_listening; ///< to other seats, for a user with the network right
+};
+
+/// The library's exit hook: reports and destroys the manager. After a crash it says what was open.
+QM_API void edit_exit();

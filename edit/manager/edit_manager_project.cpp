@@ -1,0 +1,220 @@
+#include "edit/manager/detail/manager_state.h"
+#include "edit/project/cookie_allocator.h"
+#include "edit/project/project_details.h"
+#include "platform/services/current_project.h"
+#include "platform/services/edit_filenames.h"
+#include "platform/services/log.h"
+
+#include <algorithm>
+
+namespace {
+
+/// Takes the project that the application has set as the current one.
+eStatus adoptProject(unsigned generation) {
+    ManagerState& state = managerState();
+    const Qx::CurrentProject current = Qx::currentProject();
+    const String folder = current.folder();
+    {
+        const ManagerState::Hold hold(state.lock);
+        state.project = folder.empty() ? invalid_cookie : current.project;
+        state.projectGeneration = generation;
+    }
+    if (folder.empty()) {
+        return eStatus::NoProject;
+    }
+    state.records.use(folder);
+    state.tell(edit_manager::projChangedMsgType(), current.project);
+    return eStatus::Ok;
+}
+
+/// Writes and drops what belongs to the project.
+void leaveProject() {
+    ManagerState& state = managerState();
+    state.tell(edit_manager::projExitMsgType(), edit_manager::get_current_project_cookie());
+    EditPtr projectEdit;
+    {
+        const ManagerState::Hold hold(state.lock);
+        std::swap(projectEdit, state.projectEdit);
+    }
+    projectEdit.invalidate();
+    edit_manager::close_all_edits();
+    state.records.close();
+    const ManagerState::Hold hold(state.lock);
+    state.project = invalid_cookie;
+    state.projectGeneration = 0;
+}
+
+/// The settings of a project that is not the current one.
+bool readDetails(const cookie& project, ProjectDetails& details) {
+    Qx::CurrentProject other = Qx::currentProject();
+    const bool isCurrent = !project.is_valid() || project == other.project;
+    details.name = other.name;
+    details.frameRateCode = other.frameRateCode;
+    details.dropFrame = other.dropFrame;
+    if (isCurrent) {
+        return true;
+    }
+    other.project = project;
+    // `openOrCreate` would make a project that is not there.
+    return !other.folder().empty() && Qx::fileExists(Qx::joinPath(other.folder(), "Project.txt")) &&
+           ProjectDetails::openOrCreate(other.rootFolder, project, ProjectDetails(), details).isOk();
+}
+
+size_t numEditFiles(const cookie& project) {
+    Qx::CurrentProject named = Qx::currentProject();
+    if (project.is_valid()) {
+        named.project = project;
+    }
+    std::vector<String> names;
+    if (named.folder().empty() || Qx::fileSystem().list(named.folder(), names)) {
+        return 0;
+    }
+    return static_cast<size_t>(std::count_if(names.begin(), names.end(), [](const String& name) {
+        return Qx::extensionOf(name) == getEditFilenameExt() &&
+               cookie(std::string_view(Qx::withoutExtension(name))).is_valid();
+    }));
+}
+
+} // namespace
+
+eStatus edit_manager::check_current_project(eEditOpenBehaviour) {
+    ManagerState& state = managerState();
+    const unsigned generation = Qx::currentProjectGeneration();
+    bool leaves = false;
+    {
+        const ManagerState::Hold hold(state.lock);
+        if (state.projectGeneration.load() == generation) {
+            return state.project.is_valid() ? eStatus::Ok : eStatus::NoProject;
+        }
+        // Others that ask meanwhile go on: the edits in the cache know their files.
+        state.projectGeneration = generation;
+        leaves = state.project.is_valid();
+    }
+    if (leaves) {
+        leaveProject();
+    }
+    return adoptProject(generation);
+}
+
+eStatus edit_manager::set_current_project(const cookie& project, eEditOpenBehaviour behaviour) {
+    ManagerState& state = managerState();
+    Qx::CurrentProject wanted = Qx::currentProject();
+    wanted.project = project;
+    if (project.type() != Cookie_Type::Project || wanted.folder().empty()) {
+        return eStatus::NoProject;
+    }
+    const bool mayMake = behaviour == eOpenNew || behaviour == eOpenOrCreate;
+    const bool isThere = fileInfo(wanted.folder()).kind == Qx::FileKind::Folder;
+    if (!isThere && !mayMake) {
+        return eStatus::NotFound;
+    }
+    ProjectDetails details;
+    details.frameRateCode = wanted.frameRateCode;
+    details.dropFrame = wanted.dropFrame;
+    details.defaultEditMedium = wanted.defaultEditMedium;
+    if (mayMake || Qx::fileExists(Qx::joinPath(wanted.folder(), "Project.txt"))) {
+        const Qx::Status opened = ProjectDetails::openOrCreate(wanted.rootFolder, project, details, details);
+        if (!opened) {
+            herc_printf("edit_manager::set_current_project( %s ) : %s\n", cookie_string(project).c_str(),
+                        opened.reason().c_str());
+            return isThere ? eStatus::NotFound : eStatus::NotWritable;
+        }
+        wanted.name = details.name;
+        wanted.frameRateCode = details.frameRateCode;
+        wanted.dropFrame = details.dropFrame;
+        wanted.defaultEditMedium = details.defaultEditMedium;
+    } else {
+        wanted.name.clear();
+    }
+    bool leaves = false;
+    {
+        const ManagerState::Hold hold(state.lock);
+        leaves = state.project.is_valid();
+    }
+    if (leaves) {
+        exitProject();
+    }
+    Qx::setCurrentProject(wanted);
+    return adoptProject(Qx::currentProjectGeneration());
+}
+
+void edit_manager::exitProject() {
+    flush_changes();
+    leaveProject();
+}
+
+Edit* edit_manager::get_current_project() {
+    ManagerState& state = managerState();
+    const cookie project = get_current_project_cookie();
+    if (!project.is_valid()) {
+        return nullptr;
+    }
+    {
+        const ManagerState::Hold hold(state.lock);
+        if (state.projectEdit.valid()) {
+            return state.projectEdit;
+        }
+    }
+    const EditPtr opened = openEdit(project, eOpenOrCreate);
+    const ManagerState::Hold hold(state.lock);
+    if (!state.projectEdit.valid()) {
+        state.projectEdit = opened;
+    }
+    return state.projectEdit;
+}
+
+cookie edit_manager::get_current_project_cookie() {
+    ManagerState& state = managerState();
+    const ManagerState::Hold hold(state.lock);
+    return state.project;
+}
+
+bool edit_manager::projectIsEmpty() {
+    return numEditFiles(invalid_cookie) == 0;
+}
+
+String edit_manager::getProjectName(const cookie& project) {
+    ProjectDetails details;
+    String name;
+    if (readDetails(project, details)) {
+        return details.name;
+    }
+    return getProjDBValue("PROJECT_NAME", name, project) ? name : String();
+}
+
+Qx::Ed2Support::TVStd edit_manager::getProjectTvStd(const cookie& project) {
+    ProjectDetails details;
+    String rateText;
+    Qx::FrameRate rate;
+    if (readDetails(project, details)) {
+        rate = Qx::FrameRate(details.frameRateCode);
+    } else if (getProjDBValue("PROJECT_RATE", rateText, project)) {
+        rate = Qx::FrameRate::fromString(rateText);
+    }
+    switch (rate.code()) {
+    case Qx::FrameRate::Fps24:
+        return Qx::Ed2Support::tvStdFromText("pal_24");
+    case Qx::FrameRate::Fps25:
+        return Qx::Ed2Support::tvStdFromText("pal");
+    case Qx::FrameRate::Fps29_97:
+        return Qx::Ed2Support::tvStdFromText("ntsc");
+    default:
+        return {};
+    }
+}
+
+String edit_manager::getProjectSummary(const cookie& project) {
+    ProjectDetails details;
+    if (!readDetails(project, details)) {
+        return {};
+    }
+    const String name = details.name.empty() ? project.asString() : details.name;
+    const size_t edits = numEditFiles(project);
+    return name + ", " + Qx::FrameRate(details.frameRateCode).asString() + " frames a second, " +
+           std::to_string(edits) + (edits == 1 ? " edit" : " edits");
+}
+
+cookie edit_manager::new_edit() {
+    const String folder = Qx::currentProject().folder();
+    return folder.empty() ? invalid_cookie : CookieAllocator(folder).allocateOne();
+}

@@ -1,0 +1,278 @@
+#include "edit/manager/detail/manager_state.h"
+#include "edit/manager/revision_chain.h"
+#include "edit/project/permissions_manager.h"
+#include "platform/services/config_int.h"
+#include "platform/services/current_project.h"
+#include "platform/services/edit_filenames.h"
+#include "platform/services/log.h"
+#include "platform/services/timed_task.h"
+
+#include <exception>
+#include <new>
+
+namespace {
+
+/// One opening of an item that is not in the cache, with its turn on the access queue. What it moves is moved
+/// under the writers' lock of the project, which is not held while a file is read.
+class Opening {
+public:
+    Opening(const cookie& item, eEditOpenBehaviour behaviour)
+        : m_item(item), m_behaviour(behaviour), m_file(getFilenameForCookie(item)),
+          m_undo(m_file, RevisionChain::Undo, managerState().backupDepth), m_writers(Qx::folderOf(m_file)) {}
+
+    EditPtr run();
+
+private:
+    [[nodiscard]] EditPtr makeNew();
+    /// A fresh edit that reads the item's file; null when it does not read. Nothing is thrown on.
+    [[nodiscard]] EditPtr read(eEditOpenBehaviour behaviour);
+    [[nodiscard]] EditPtr readExisting();
+    [[nodiscard]] EditPtr readBackups();
+    [[nodiscard]] bool moveAside(const String& name);
+    [[nodiscard]] bool restoreMissing();
+    int restoreNewest();
+    [[nodiscard]] String freeCorruptName(int counter) const;
+    EditPtr succeed(EditPtr edit);
+
+    cookie m_item;
+    eEditOpenBehaviour m_behaviour;
+    String m_file;
+    RevisionChain m_undo;
+    EditManagerLock m_writers;
+    Qx::FileInfo m_read;    ///< the file as it was before it was read last
+    bool m_refused = false; ///< the file may be sound, but could not be read here
+};
+
+EditPtr Opening::run() {
+    ManagerState& state = managerState();
+    static Qx::TimedTask::Counter& counter = Qx::TimedTask::named("editman").section("open");
+    const Qx::TimedTask::Section timed(counter);
+    const Qx::AccessScope<cookie> turn(state.queue, m_item);
+    {
+        const ManagerState::Hold hold(state.lock);
+        const ManagerState::CachedEdit* const found = state.findCacheEntry(m_item);
+        if (found != nullptr && (found->edit.valid() || m_behaviour != eOpenNew)) {
+            if (found->edit.valid() && found->edit->get_cookie() != m_item) {
+                herc_printf("edit_manager::open: handles do not match\n");
+            }
+            return found->edit;
+        }
+    }
+    herc_printf(5, "edit_manager::open(%s)\n", cookie_string(m_item).c_str());
+
+    EditPtr edit;
+    if (m_file.empty()) {
+        herc_printf("edit_manager::open( %s ) : no file can be named after it; set a project folder\n",
+                    cookie_string(m_item).c_str());
+    } else if (m_behaviour == eOpenNew) {
+        edit = makeNew();
+    } else if (m_behaviour == eOpenExisting || m_behaviour == eOpenOrCreate) {
+        if (Qx::fileExists(m_file) || restoreMissing()) {
+            edit = readExisting();
+        }
+        if (!edit.valid() && m_behaviour == eOpenOrCreate && !m_refused) {
+            edit = read(eOpenOrCreate);
+        }
+    }
+    if (edit.valid()) {
+        return succeed(std::move(edit));
+    }
+    const ManagerState::Hold hold(state.lock);
+    state.put(m_item, EditPtr(), m_file, {});
+    return {};
+}
+
+EditPtr Opening::makeNew() {
+    EditPtr edit(new Edit);
+    try {
+        edit->read_file(m_item, eOpenNew);
+    } catch (const std::exception&) {
+        // The fresh edit is handed out as it is.
+    }
+    // Nothing was read: a file that is there is kept as a backup when the edit is written over it.
+    m_read = {};
+    return edit;
+}
+
+EditPtr Opening::read(eEditOpenBehaviour behaviour) {
+    m_refused = false;
+    m_read = fileInfo(m_file);
+    try {
+        EditPtr edit(new Edit);
+        if (edit->readFile(Qx::widen(m_file), behaviour) == Edit::kReadOk) {
+            return edit;
+        }
+        // What the system refuses (no permission, too many open files), and what a later version of this
+        // program wrote, is not damaged: it stays where it is.
+        const TagBag::OpenResult result = edit->objectStore().lastOpenResult();
+        m_refused = result == TagBag::NotOpened || result == TagBag::Newer;
+        herc_printf("edit_manager::open( %s ) : %s\n", cookie_string(m_item).c_str(),
+                    edit->lastFileError().c_str());
+    } catch (const std::bad_alloc&) {
+        m_refused = true;
+        herc_printf("edit_manager::open( %s ) : there is not enough memory to read it\n",
+                    cookie_string(m_item).c_str());
+    } catch (const std::exception& error) {
+        herc_printf("edit_manager::open( %s ) : reading failed: %s\n", cookie_string(m_item).c_str(),
+                    error.what());
+    }
+    return {};
+}
+
+int Opening::restoreNewest() {
+    const int restored = m_undo.restoreNewest();
+    if (restored != 0) {
+        static_cast<void>(m_undo.makeDurable());
+    }
+    return restored;
+}
+
+bool Opening::restoreMissing() {
+    if (!m_undo.exists() || !takeWritersLock(m_writers)) {
+        return false;
+    }
+    // Another process may have put the file back meanwhile.
+    if (!Qx::fileExists(m_file)) {
+        const int restored = restoreNewest();
+        herc_printf("edit_manager::open( %s ) - missing, trying backup %d \n", cookie_string(m_item).c_str(),
+                    restored);
+    }
+    m_writers.release();
+    return Qx::fileExists(m_file);
+}
+
+EditPtr Opening::readExisting() {
+    // A file that another process puts in the place of one that does not read is read in its turn.
+    for (int attempt = 0; attempt < 3; ++attempt) {
+        if (EditPtr edit = read(m_behaviour); edit.valid()) {
+            return edit;
+        }
+        if (m_refused) {
+            return {};
+        }
+        if (moveAside(m_file + ".CORRUPT")) {
+            return readBackups();
+        }
+        if (isSameFile(m_read, fileInfo(m_file))) {
+            return {};
+        }
+    }
+    return {};
+}
+
+/// Moves the file that was read last to another name. False if it could not be moved or is another file.
+/// The writers' lock is held afterwards if it was moved.
+bool Opening::moveAside(const String& name) {
+    if (!takeWritersLock(m_writers)) {
+        return false;
+    }
+    Qx::FileError error;
+    if (isSameFile(m_read, fileInfo(m_file))) {
+        error = Qx::fileSystem().rename(m_file, name);
+        if (!error) {
+            return true;
+        }
+        herc_printf("edit_manager::open( %s ) : %s\n", cookie_string(m_item).c_str(), error.text().c_str());
+    }
+    m_writers.release();
+    return false;
+}
+
+/// A name beside the edit for a backup that does not read: none that is there is replaced.
+String Opening::freeCorruptName(int counter) const {
+    String name;
+    do {
+        name = m_file + String::format(".CORRUPT.%d", counter++);
+    } while (fileInfo(name).kind != Qx::FileKind::Missing);
+    return name;
+}
+
+EditPtr Opening::readBackups() {
+    const bool hasBackups = m_undo.exists();
+    for (int counter = 1; hasBackups; ++counter) {
+        herc_printf("edit_manager::open( %s ) - edit::read_file() failed, trying backup %d\n",
+                    cookie_string(m_item).c_str(), counter);
+        const int restored = restoreNewest();
+        m_writers.release();
+        if (restored == 0) {
+            break;
+        }
+        if (EditPtr edit = read(m_behaviour); edit.valid()) {
+            return edit;
+        }
+        if (m_refused || !moveAside(freeCorruptName(counter))) {
+            break;
+        }
+    }
+    m_writers.release();
+    if (hasBackups) {
+        LogBoth("edit_manager::open( %s ) - No usable backups found\n", cookie_string(m_item).c_str());
+    }
+    return {};
+}
+
+EditPtr Opening::succeed(EditPtr edit) {
+    ManagerState& state = managerState();
+    if (Qx::fileExists(m_file)) {
+        // The time of last access is a convenience: a file system that refuses it does no harm.
+        static_cast<void>(Qx::fileSystem().touch(m_file, true).code);
+    }
+    if (edit->get_cookie() != m_item) {
+        herc_printf("edit_manager::open: funny, handles do not match\n");
+    }
+    // Before others can find it, so that no change of theirs is taken for clean.
+    edit->set_dirty(false);
+    const String owner = edit->getOwner();
+    const bool isEdit = edit->isEdit();
+    {
+        const ManagerState::Hold hold(state.lock);
+        state.put(m_item, edit, m_file, m_read);
+        state.cachedAtLastOpen = state.cache.size();
+    }
+    PermissionsManager::noteOwner(m_item, owner, !isEdit);
+    return edit;
+}
+
+} // namespace
+
+EditPtr edit_manager::openEdit(const cookie& item, eEditOpenBehaviour behaviour) {
+    ManagerState& state = managerState();
+    if (item.isBlack() || isNoItem(item) || state.instance.load() == nullptr) {
+        return {};
+    }
+    if (state.projectGeneration.load() != Qx::currentProjectGeneration()) {
+        static_cast<void>(check_current_project(behaviour));
+    }
+    {
+        const ManagerState::Hold hold(state.lock);
+        if (!state.cacheLimit) {
+            state.cacheLimit = config_int("edit_cache_size", -1);
+        }
+        if (*state.cacheLimit != -1) {
+            limitEditCache(*state.cacheLimit);
+        }
+        state.lastOpened = item;
+        const ManagerState::CachedEdit* const found = state.findCacheEntry(item);
+        if (found != nullptr && (found->edit.valid() || behaviour != eOpenNew)) {
+            return found->edit;
+        }
+    }
+    return Opening(item, behaviour).run();
+}
+
+EditPtr edit_manager::open(const cookie& item, eEditOpenBehaviour behaviour) {
+    return openEdit(item, behaviour);
+}
+
+bool edit_manager::get_present(const cookie& item) {
+    ManagerState& state = managerState();
+    const ManagerState::Hold hold(state.lock);
+    const ManagerState::CachedEdit* const found = state.findCacheEntry(item);
+    return found != nullptr && found->edit.valid();
+}
+
+size_t edit_manager::numCached() {
+    ManagerState& state = managerState();
+    const ManagerState::Hold hold(state.lock);
+    return state.cache.size();
+}

@@ -1,0 +1,98 @@
+#include "edit/manager/edit_record.h"
+
+#include "platform/media/timecode.h"
+#include "platform/services/current_project.h"
+
+namespace {
+
+int flagsOf(const Edit& edit, edit_log_type_t type) {
+    int flags = edit.get_hidden() != 0 ? kRecordHidden : 0;
+    switch (type) {
+    case kLogGhost3:
+        flags |= kRecordGhost3;
+        break;
+    case kLogGhost4:
+        flags |= kRecordGhost4;
+        break;
+    case kLogGhost5:
+        flags |= kRecordGhost5;
+        break;
+    case kLogGhost6:
+        flags |= kRecordGhost6;
+        break;
+    default:
+        break;
+    }
+    return flags;
+}
+
+String chansOf(const Edit& edit) {
+    const unsigned video = edit.getNumChans(VideoChan, Edit_Chan_SubType::NONE);
+    const unsigned audio = edit.getNumChans(AudioChan);
+    const unsigned effects = edit.getNumChans(VideoChan, Edit_Chan_SubType::ALIAS);
+    String text;
+    const auto add = [&text](char one, char several, unsigned count) {
+        if (count > 0) {
+            text += (count > 1 ? several : one) + std::to_string(count);
+        }
+    };
+    add('V', 'V', video);
+    add('a', 'A', audio);
+    add('f', 'F', effects);
+    return text;
+}
+
+String timeText(double seconds) {
+    const Qx::CurrentProject project = Qx::currentProject();
+    const Qx::FrameRate rate(project.frameRateCode);
+    const int64_t frames = rate.toFrames(seconds);
+    if (!rate.valid() || frames < 0 || frames >= Qx::framesPerDay(rate, project.dropFrame)) {
+        return {};
+    }
+    return Qx::timecodeText(frames, rate, project.dropFrame);
+}
+
+} // namespace
+
+projdb::Record editRecordOf(const Edit& edit, const Qx::FileInfo* file) {
+    projdb::Record record;
+    const edit_log_type_t type = edit.get_log_type();
+    const double start = edit.getStartTime();
+    const double end = edit.getEndTime();
+    record[projdb::Type] = Edit::log_type_string_get_ms(type);
+    record[projdb::Flags] = std::to_string(flagsOf(edit, type));
+    record[projdb::Chans] = chansOf(edit);
+    record[projdb::StartTime] = timeText(start);
+    record[projdb::EndTime] = timeText(end);
+    record[projdb::Name] = edit.getName();
+    record[projdb::Rate] = edit.getFrameRate().asString();
+    record[projdb::Duration] = Qx::doubleToText(end - start);
+    record[projdb::NumChans] = std::to_string(edit.getNumChans());
+    record[projdb::Created] = std::to_string(edit.getCreationTime());
+    record[projdb::Modified] = std::to_string(edit.getModificationTime());
+    record[projdb::Owner] = edit.getOwner();
+    if (file != nullptr) {
+        stampRecord(record, *file);
+    }
+    return record;
+}
+
+void stampRecord(projdb::Record& record, const Qx::FileInfo& file) {
+    record[projdb::FileSize] = std::to_string(file.size);
+    record[projdb::FileTime] = std::to_string(file.modifiedNs);
+}
+
+bool isRecordOfFile(const projdb::Record& record, const Qx::FileInfo& file) {
+    return record[projdb::FileSize] == std::to_string(file.size) &&
+           record[projdb::FileTime] == std::to_string(file.modifiedNs);
+}
+
+double recordTime(const String& text) {
+    const Qx::CurrentProject project = Qx::currentProject();
+    const Qx::FrameRate rate(project.frameRateCode);
+    Qx::TimecodeFields fields;
+    if (text.empty() || !rate.valid() || !Qx::parseTimecode(text, rate, fields)) {
+        return Qx::kNoTime;
+    }
+    return rate.toSeconds(Qx::timecodeFrames(fields, rate, project.dropFrame));
+}

@@ -1,0 +1,197 @@
+#include "edit/manager/detail/manager_state.h"
+#include "edit/manager/edit_record.h"
+#include "platform/services/current_project.h"
+#include "platform/services/edit_filenames.h"
+#include "platform/services/log.h"
+
+#include <exception>
+
+namespace {
+
+/// The record of an edit in memory, gathered. False if it is not there.
+bool gatherFromMemory(const cookie& item, projdb::Record& record) {
+    ManagerState& state = managerState();
+    EditPtr edit;
+    {
+        const ManagerState::Hold hold(state.lock);
+        if (const ManagerState::CachedEdit* const found = state.findCacheEntry(item)) {
+            edit = found->edit;
+        }
+    }
+    if (!edit.valid()) {
+        return false;
+    }
+    const ManagerState::Hold section(edit->section());
+    record = editRecordOf(*edit, nullptr);
+    const ManagerState::Hold hold(state.lock);
+    const ManagerState::CachedEdit* const entry = state.findCacheEntry(item);
+    if (entry == nullptr || entry->edit != edit) {
+        return false;
+    }
+    if (entry->file.kind == Qx::FileKind::Regular && !edit->isDirty(true)) {
+        stampRecord(record, entry->file);
+    }
+    state.records.put(item, record);
+    return true;
+}
+
+/// The record that an item's file gives, read without the cache and without recovery.
+projdb::Record readFromFile(const String& path, const Qx::FileInfo& info) {
+    projdb::Record record;
+    stampRecord(record, info);
+    try {
+        EditPtr edit(new Edit);
+        edit->setNetworkNotificationSuppressed(true);
+        if (edit->readFile(Qx::widen(path), eOpenExisting) == Edit::kReadOk) {
+            return editRecordOf(*edit, &info);
+        }
+        record[projdb::Damage] = edit->lastFileError();
+    } catch (const std::exception& error) {
+        record[projdb::Damage] = path + " cannot be read: " + error.what();
+    }
+    return record;
+}
+
+/// Brings one record up to date; false if there is none.
+bool refreshRecord(projdb& records, const cookie& item, projdb::Record& record) {
+    ManagerState& state = managerState();
+    if (state.records.takeStale(item) && gatherFromMemory(item, record)) {
+        return true;
+    }
+    const bool found = records.find(item, record);
+    if (edit_manager::get_present(item)) {
+        return found || gatherFromMemory(item, record);
+    }
+    const String path = getFilenameForCookie(item);
+    const Qx::FileInfo info = fileInfo(path);
+    if (info.kind != Qx::FileKind::Regular || (found && isRecordOfFile(record, info))) {
+        return found;
+    }
+    record = readFromFile(path, info);
+    state.records.put(item, record);
+    return true;
+}
+
+/// The items of the project: those with a file, and those of which only backups are there at the moment.
+Qx::Status listItems(std::set<cookie>& items) {
+    std::vector<String> names;
+    if (const Qx::FileError error = Qx::fileSystem().list(Qx::currentProject().folder(), names)) {
+        return Qx::Status::failure(error.text());
+    }
+    constexpr size_t kTextSize = 8;
+    for (const String& name : names) {
+        const cookie item{std::string_view(name).substr(0, kTextSize)};
+        const String rest = name.substr(std::min(kTextSize, name.size()));
+        const bool isEdit = rest == getEditFilenameExt() || rest.starts_with(getEditFilenameExt() + ".U");
+        if (item.is_valid() && isEdit) {
+            items.insert(item);
+        }
+    }
+    return {};
+}
+
+void removeRecordsBut(projdb& records, const std::set<cookie>& items) {
+    ManagerState& state = managerState();
+    Vector<cookie> gone;
+    records.forEach([&](const cookie& item, const projdb::Record&) {
+        if (!items.contains(item)) {
+            gone.push_back(item);
+        }
+        return true;
+    });
+    for (const cookie& item : gone) {
+        if (!edit_manager::get_present(item)) {
+            state.records.remove(item);
+        }
+    }
+}
+
+} // namespace
+
+void storeRecords() {
+    ManagerState& state = managerState();
+    projdb::Record record;
+    for (const cookie& item : state.records.takeStale()) {
+        gatherFromMemory(item, record);
+    }
+    state.records.store();
+}
+
+bool currentRecord(const cookie& item, projdb::Record& record) {
+    ManagerState& state = managerState();
+    state.records.store();
+    const std::shared_ptr<projdb> records = state.records.database();
+    if (records == nullptr || !item.isStorable() || !refreshRecord(*records, item, record)) {
+        return false;
+    }
+    state.records.store();
+    return record[projdb::Damage].empty();
+}
+
+projdb* edit_manager::get_projdb() {
+    storeRecords();
+    return managerState().records.database().get();
+}
+
+bool edit_manager::update_projdb(const std::function<bool(size_t done, size_t total)>& progress) {
+    ManagerState& state = managerState();
+    storeRecords();
+    const std::shared_ptr<projdb> records = state.records.database();
+    std::set<cookie> items;
+    if (records == nullptr) {
+        return false;
+    }
+    if (const Qx::Status status = listItems(items); !status) {
+        herc_printf("edit_manager::update_projdb: %s\n", status.reason().c_str());
+        return false;
+    }
+    constexpr size_t kStoreEvery = 64;
+    size_t done = 0;
+    projdb::Record record;
+    for (const cookie& item : items) {
+        if (progress && !progress(done, items.size())) {
+            state.records.store();
+            return false;
+        }
+        static_cast<void>(refreshRecord(*records, item, record));
+        if (++done % kStoreEvery == 0) {
+            state.records.store();
+        }
+    }
+    removeRecordsBut(*records, items);
+    state.records.store();
+    return !progress || progress(done, items.size());
+}
+
+void edit_manager::updateProjdbRec(const cookie& item, bool) {
+    managerState().records.markStale(item);
+}
+
+bool edit_manager::getProjDBValue(const String& key, String& value, const cookie& project) {
+    const Qx::CurrentProject current = Qx::currentProject();
+    if (!project.is_valid() || project == current.project) {
+        const std::shared_ptr<projdb> records = managerState().records.database();
+        return records != nullptr && records->getValue(key, value);
+    }
+    Qx::CurrentProject other = current;
+    other.project = project;
+    // Asking for a value does not make records where there are none.
+    if (other.folder().empty() || !Qx::fileExists(Qx::joinPath(other.folder(), projdb::kFileName))) {
+        return false;
+    }
+    projdb records;
+    return records.open(other.folder()) && records.getValue(key, value);
+}
+
+bool edit_manager::setProjDBValue(const String& key, const String& value) {
+    const std::shared_ptr<projdb> records = managerState().records.database();
+    if (records == nullptr) {
+        return false;
+    }
+    const Qx::Status status = records->setValue(key, value);
+    if (!status) {
+        herc_printf("edit_manager: the project's value %s was not stored: %s\n", key.c_str(),
+                    status.reason().c_str());
+    }
+    return status.isOk();
+}

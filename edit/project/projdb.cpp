@@ -1,0 +1,116 @@
+#include "edit/project/projdb.h"
+
+#include "platform/services/files.h"
+#include "platform/services/log.h"
+
+#include <vector>
+
+namespace {
+
+/// In the order of the columns.
+constexpr const char* kNames[projdb::kNumColumns] = {
+    "Type",     "Flags",   "chans",    "start time", "end time",  "name",      "rate",  "duration",
+    "channels", "created", "modified", "owner",      "file size", "file time", "damage"};
+
+std::vector<String> columnNames() {
+    return {std::begin(kNames), std::end(kNames)};
+}
+
+projdb::Record recordOf(const std::vector<String>& fields) {
+    projdb::Record record;
+    for (size_t i = 0; i < fields.size() && i < projdb::kNumColumns; ++i) {
+        record[static_cast<projdb::Column>(i)] = fields[i];
+    }
+    return record;
+}
+
+/// Moves a damaged file out of the way, and what the table keeps beside it.
+Qx::Status setAside(const String& path) {
+    if (const Qx::FileError error = Qx::fileSystem().rename(path, path + ".DAMAGED")) {
+        return Qx::Status::failure(error.text());
+    }
+    for (const char* const beside : {"-wal", "-shm", "-journal"}) {
+        if (Qx::fileExists(path + beside)) {
+            if (const Qx::FileError error = Qx::fileSystem().remove(path + beside)) {
+                return Qx::Status::failure(error.text());
+            }
+        }
+    }
+    return {};
+}
+
+} // namespace
+
+const char* projdb::columnName(Column column) {
+    return kNames[column];
+}
+
+Qx::Status projdb::open(const String& folder) {
+    if (folder.empty()) {
+        return Qx::Status::failure("there is no project folder to keep records in");
+    }
+    const String path = Qx::joinPath(folder, kFileName);
+    oledb::OpenResult result = m_table.open(path, columnNames());
+    if (result == oledb::Damaged) {
+        const String damage = m_table.lastError();
+        if (Qx::Status status = setAside(path); !status) {
+            return status;
+        }
+        herc_printf("projdb: %s; it was set aside as %s.DAMAGED and is made again from the edits\n",
+                    damage.c_str(), kFileName);
+        result = m_table.open(path, columnNames());
+    }
+    m_isNew = result == oledb::Made;
+    return m_table.isOpen() ? Qx::Status() : Qx::Status::failure(m_table.lastError());
+}
+
+void projdb::close() {
+    m_table.close();
+}
+
+bool projdb::find(const cookie& item, Record& record) const {
+    std::vector<String> fields;
+    if (!m_table.findRecord(item.asString(), fields)) {
+        return false;
+    }
+    record = recordOf(fields);
+    return true;
+}
+
+bool projdb::getField(const cookie& item, int column, String& text) const {
+    return m_table.getField(item.asString(), column, text);
+}
+
+Qx::Status projdb::put(const cookie& item, const Record& record) {
+    if (!item.isStorable()) {
+        return Qx::Status::failure(item.asString() + " names no stored item, so it has no record");
+    }
+    std::vector<String> fields(kNumColumns);
+    for (int i = 0; i < kNumColumns; ++i) {
+        fields[static_cast<size_t>(i)] = record[static_cast<Column>(i)];
+    }
+    return m_table.putRecord(item.asString(), fields);
+}
+
+Qx::Status projdb::remove(const cookie& item) {
+    return m_table.removeRecord(item.asString());
+}
+
+Qx::Status projdb::removeAll() {
+    return m_table.removeAllRecords();
+}
+
+void projdb::forEach(const std::function<bool(const cookie& item, const Record& record)>& callback) const {
+    m_table.forEachRecord([&](const String& key, const std::vector<String>& fields) {
+        const cookie item{std::string_view(key)};
+        return !item.is_valid() || callback(item, recordOf(fields));
+    });
+}
+
+Qx::Status projdb::setValue(const String& name, const String& value) {
+    String before;
+    if (getValue(name, before) && before == value) {
+        return {};
+    }
+    return m_table.setValue(name, value);
+}
