@@ -74,6 +74,10 @@ void Editor::doClipboardEditing(edit_operation op) {
             clipboard->addLevelsChan(kept, copy);
         }
     }
+    if (clipboard->getNumChans() == 0) {
+        // Nothing was there; an edit without channels cannot be stored.
+        setCel(*clipboard, {VideoChan, Edit_Chan_SubType::NONE}, nullptr);
+    }
     edit.Opts().setInt("CLIPBOARD_USED", 1);
     clipboard->setChangeDescription(editModificationOf(op), true);
 }
