@@ -41,11 +41,11 @@ edit_operation getCoreEditOperation(edit_operation op) {
     case Op::BackReplace:
     case Op::BackReplaceMarked:
     case Op::ReplaceMaterial:
-        return Op::Replace;
+        return kCoreReplace;
     case Op::InsertMarked:
     case Op::BackInsert:
     case Op::BackInsertMarked:
-        return Op::Insert;
+        return kCoreInsert;
     default:
         return op;
     }
@@ -53,7 +53,7 @@ edit_operation getCoreEditOperation(edit_operation op) {
 
 bool editOpRequiresSourceAndDest(edit_operation op) {
     const edit_operation core = getCoreEditOperation(op);
-    return core == Op::Replace || core == Op::Insert || core == Op::FillBlack;
+    return core == kCoreReplace || core == kCoreInsert || core == Op::FillBlack;
 }
 
 bool editOpIsInterTrack(edit_operation op) {
@@ -67,7 +67,7 @@ bool editOpIsBackwards(edit_operation op) {
 
 bool editOpAffectsTrackSync(edit_operation op) {
     const edit_operation core = getCoreEditOperation(op);
-    return core == Op::Insert || core == Op::Remove;
+    return core == kCoreInsert || core == kCoreRemove;
 }
 
 bool editOpCanAffectTrackLength(edit_operation op) {
@@ -75,7 +75,7 @@ bool editOpCanAffectTrackLength(edit_operation op) {
 }
 
 bool editOpRequiresClipboard(edit_operation op) {
-    return getCoreEditOperation(op) != Op::Insert;
+    return getCoreEditOperation(op) != kCoreInsert;
 }
 
 std::string_view editOperationName(edit_operation op) {

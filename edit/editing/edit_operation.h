@@ -68,10 +68,17 @@ enum class edit_operation : int {
     ReplaceMaterial = 16
 };
 
+/// \name The cores: what is done to one channel
+/// @{
+inline constexpr edit_operation kCoreReplace = edit_operation::ReplaceMarked;
+inline constexpr edit_operation kCoreInsert = edit_operation::Insert;
+inline constexpr edit_operation kCoreRemove = edit_operation::Remove;
+/// @}
+
 /// The number of values.
 inline constexpr int kNumEditOperations = 17;
 
-/// What is done to each channel's cel: `Replace`, `Insert`, `Remove`, or the operation itself.
+/// What is done to each channel's cel: `kCoreReplace`, `kCoreInsert`, `kCoreRemove`, or the operation itself.
 [[nodiscard]] QM_API edit_operation getCoreEditOperation(edit_operation op);
 /// True if it works from a source module into a destination module, else within the destination alone.
 [[nodiscard]] QM_API bool editOpRequiresSourceAndDest(edit_operation op);

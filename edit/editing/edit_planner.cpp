@@ -184,7 +184,7 @@ bool Editor::Planner::pairChannels(const EditModule& destination, Edit::ChanType
         if (i >= to.size() && (!mayAdd || i >= needed)) {
             break;
         }
-        const bool opensOrEnds = m_core == Op::Insert || m_op == Op::ReplaceToEnd;
+        const bool opensOrEnds = m_core == kCoreInsert || m_op == Op::ReplaceToEnd;
         if (i >= from.size() && !opensOrEnds) {
             break;
         }
@@ -211,7 +211,7 @@ bool Editor::Planner::findLay(const Target& target, const EditModule& destinatio
         if (!destinationRegion(destination, target.chan, own)) {
             return false;
         }
-        const double length = m_core == Op::Insert ? m_markedLength : own.length();
+        const double length = m_core == kCoreInsert ? m_markedLength : own.length();
         lay.at = lay.open = own.start();
         if (target.source.valid()) {
             const double mark = editOpIsBackwards(m_op) ? outMark(m_source, target.source) - length
@@ -245,7 +245,7 @@ bool Editor::Planner::addSourceSteps(Target target, const EditModule& destinatio
     }
     const Edit& edit = *m_source.getEdit();
     const size_t index = addTarget(target);
-    if (m_core == Op::Insert) {
+    if (m_core == kCoreInsert) {
         addInsert(index, lay);
     } else if (m_op == Op::FillBlack) {
         addFillBlack(index, lay);
@@ -257,7 +257,7 @@ bool Editor::Planner::addSourceSteps(Target target, const EditModule& destinatio
             m_destination.getEdit()->get_edit_cel_p(m_destination.getEdit()->getIdx(target.chan));
         const double end = lay.open + m_span.length();
         if (its != nullptr && its->get_end_time() > end + kTimeTolerance) {
-            addStep(Op::Remove, index, end, its->get_end_time() - end);
+            addStep(kCoreRemove, index, end, its->get_end_time() - end);
         }
     }
     return m_reason.empty();
@@ -270,12 +270,12 @@ void Editor::Planner::addInsert(size_t target, const Lay& lay) {
     const bool whole = lay.at == lay.open && lay.region.length() == length;
     const Range all = source.valid() && whole ? lay.region : Range(0, length);
     if (!source.valid() || !whole) {
-        addBlackStep(Op::Insert, target, lay.open, length);
+        addBlackStep(kCoreInsert, target, lay.open, length);
     }
     if (source.valid()) {
         addCopyStep(target, lay.at, *m_source.getEdit(), source, whole ? all : lay.region);
         if (whole && !m_plan->steps.empty()) {
-            m_plan->steps.back().core = Op::Insert;
+            m_plan->steps.back().core = kCoreInsert;
             m_plan->steps.back().length = length;
         }
     }

@@ -118,7 +118,6 @@ void Editor::Planner::addStep(Op core, size_t target, double at, double length,
     step.length = length;
     step.part = std::move(part);
     step.levelsRange = Range(0, length);
-    step.materialOnly = m_op == Op::ReplaceMaterial;
     step.withLevels = m_op != Op::ReplaceMaterial;
     m_plan->steps.push_back(std::move(step));
 }
@@ -140,7 +139,7 @@ void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, co
                ": the channel is incomplete or the region is no usable time");
         return;
     }
-    addStep(Op::Replace, target, at, region.length(), part);
+    addStep(kCoreReplace, target, at, region.length(), part);
     Step& step = m_plan->steps.back();
     if (its.type.type != AudioChan || !step.withLevels) {
         return;
@@ -172,10 +171,10 @@ bool Editor::Planner::checkSteps() {
         }
         plan.at = std::min(plan.at, step.at);
         end = std::max(end, step.end());
-        laidEnd = step.core == Op::Remove ? laidEnd : std::max(laidEnd, step.end());
+        laidEnd = step.core == kCoreRemove ? laidEnd : std::max(laidEnd, step.end());
     }
     plan.length = end - plan.at;
-    if (m_core == Op::Remove || editOpIsBackwards(m_op)) {
+    if (m_core == kCoreRemove || editOpIsBackwards(m_op)) {
         plan.current = plan.at;
     } else {
         plan.current =
@@ -201,7 +200,7 @@ bool Editor::Planner::checkStep(const Step& step) {
     if (const auto& nodes = levels.getNodeStore().nodes(); !nodes.empty()) {
         last = std::max(last, nodes.back().time);
     }
-    const double grows = step.core == Op::Insert ? step.length : 0;
+    const double grows = step.core == kCoreInsert ? step.length : 0;
     // A step that follows an insert works in the room that it made.
     if (std::max(last, step.at) + grows > cel::kGreatestTime || step.end() > cel::kGreatestTime) {
         return refuse(what + " would reach beyond the greatest time that an edit can hold");
@@ -209,7 +208,7 @@ bool Editor::Planner::checkStep(const Step& step) {
     if (its != nullptr && its->numEvents() % 2 != 0) {
         return refuse(what + ": the channel's last event is incomplete");
     }
-    if (step.core != Op::Remove && step.part == nullptr) {
+    if (step.core != kCoreRemove && step.part == nullptr) {
         return refuse(what + ": there is nothing to lay");
     }
     return true;
@@ -224,11 +223,11 @@ void Editor::Planner::findShifts() {
     for (const Step& step : m_plan->steps) {
         Target& target = m_plan->targets[step.target];
         const cel* const its = edit.get_edit_cel_p(edit.getIdx(target.chan));
-        if (step.core == Op::Replace || its == nullptr) {
+        if (step.core == kCoreReplace || its == nullptr) {
             continue;
         }
-        target.movesFrom = step.core == Op::Insert ? step.at : step.end();
-        target.shift = step.core == Op::Insert ? step.length : -step.length;
+        target.movesFrom = step.core == kCoreInsert ? step.at : step.end();
+        target.shift = step.core == kCoreInsert ? step.length : -step.length;
         const double end = its->get_end_time();
         target.moves = end > target.movesFrom + kTimeTolerance && !its->isEmpty(Range(target.movesFrom, end));
     }

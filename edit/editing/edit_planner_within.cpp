@@ -44,10 +44,10 @@ bool Editor::Planner::planRemoveOrLift() {
             target.type = kind;
             target.chan = chan;
             const size_t index = addTarget(target);
-            if (m_core == Op::Remove) {
-                addStep(Op::Remove, index, region.start(), region.length());
+            if (m_core == kCoreRemove) {
+                addStep(kCoreRemove, index, region.start(), region.length());
             } else {
-                addBlackStep(Op::Replace, index, region.start(),
+                addBlackStep(kCoreReplace, index, region.start(),
                              std::min(region.end(), end) - region.start());
             }
         }
@@ -128,7 +128,7 @@ bool Editor::Planner::addCopies(const Vector<IdStamp>& chans) {
     if (m_op == Op::MoveTrack && own > kTimeTolerance) {
         target.chan = chans[0];
         target.source = IdStamp();
-        addBlackStep(Op::Replace, addTarget(target), region.start(), own);
+        addBlackStep(kCoreReplace, addTarget(target), region.start(), own);
     }
     return m_reason.empty();
 }

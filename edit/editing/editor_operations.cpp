@@ -29,11 +29,11 @@ bool Editor::EditOpPerformer::doEdit(cel& its, const Step& step, cel::IdMap& cop
                                      cel::IdMap& splits) const {
     const cel::Range all(0, step.length);
     switch (step.core) {
-    case Op::Replace:
+    case kCoreReplace:
         return its.replace(step.part.get(), all, step.at, copied, m_op == Op::ReplaceMaterial, &splits);
-    case Op::Insert:
+    case kCoreInsert:
         return its.insert(step.part.get(), all, step.at, copied, &splits);
-    case Op::Remove:
+    case kCoreRemove:
         return its.remove({step.at, step.end()}, &splits);
     default:
         herc_printf("EditOpPerformer::doEdit() : Unhandled EditOperation\n");
@@ -45,11 +45,11 @@ void Editor::EditOpPerformer::doLevels(AudLevelsCel& its, const Step& step) {
     if (!its.valid() || !step.withLevels) {
         return;
     }
-    if (step.core == Op::Replace) {
+    if (step.core == kCoreReplace) {
         its.replace(step.levels, step.levelsRange, step.at);
-    } else if (step.core == Op::Insert) {
+    } else if (step.core == kCoreInsert) {
         its.insert(step.levels, step.levelsRange, step.at);
-    } else if (step.core == Op::Remove) {
+    } else if (step.core == kCoreRemove) {
         its.remove({step.at, step.end()});
     }
 }
@@ -65,7 +65,7 @@ void Editor::makeChanges(edit_operation op) {
         if (its == nullptr) {
             continue; // a channel that could not be added; `autoAddTracks` has reported it
         }
-        if (step.core != Op::Remove && editing_detail::isContinuous(target.type)) {
+        if (step.core != kCoreRemove && editing_detail::isContinuous(target.type)) {
             its->fillToTime(step.at);
         }
         cel::IdMap copied;

@@ -18,7 +18,7 @@ struct Editor::Target {
 
 /// One change of one channel, ready to be made.
 struct Editor::Step {
-    edit_operation core = edit_operation::NoOperation; ///< `Replace`, `Insert` or `Remove`
+    edit_operation core = edit_operation::NoOperation; ///< `kCoreReplace` and its like
     size_t target = 0;
     double at = 0;                   ///< where it begins in the destination
     double length = 0;               ///< of what is laid or removed
@@ -26,7 +26,6 @@ struct Editor::Step {
     AudLevelsCel levels;             ///< its levels; an invalid one for none
     cel::Range levelsRange;
     bool withLevels = true;
-    bool materialOnly = false;
     [[nodiscard]] double end() const { return at + length; }
 };
 
