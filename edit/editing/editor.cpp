@@ -1,8 +1,7 @@
 #include "edit/editing/editor.h"
 
-#include "edit/editing/detail/edit_plan.h"
+#include "edit/editing/detail/cue_follower.h"
 #include "edit/manager/edit_manager.h"
-#include "platform/base/ole_splat.h"
 #include "platform/services/config_int.h"
 #include "platform/services/log.h"
 
@@ -116,9 +115,12 @@ void Editor::performEdit(edit_operation op, Result& result) {
 void Editor::perform(edit_operation op, Result& result) {
     doClipboardEditing(op);
     autoAddLevels();
-    makeChanges(op);
+    CueFollower cues(*m_destination.getEdit(), *m_plan, op);
+    makeChanges(op, cues);
+    cues.follow();
     padTracksWithBlack(op);
     simplifyBlack();
+    m_destination.getEdit()->get_cues().update_edit_time();
     verifyTracks();
     verifyAudioNodes();
     result.m_syncLoss = recordInterTrackSyncLosses();

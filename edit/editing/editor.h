@@ -150,7 +150,7 @@ private:
     void performEdit(const EditModule& source, edit_operation op, Result& result);
     void performEdit(edit_operation op, Result& result);
     void perform(edit_operation op, Result& result);
-    void makeChanges(edit_operation op);
+    void makeChanges(edit_operation op, CueFollower& cues);
     void bindEffects(const cel::IdMap& copied, const cel::IdMap& splits);
     void padTracksWithBlack(edit_operation op);
     void simplifyBlack();

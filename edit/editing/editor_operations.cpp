@@ -55,10 +55,9 @@ void Editor::EditOpPerformer::doLevels(AudLevelsCel& its, const Step& step) {
 }
 
 /// Makes the plan's changes, in order, and sees to what hangs on the events.
-void Editor::makeChanges(edit_operation op) {
+void Editor::makeChanges(edit_operation op, CueFollower& cues) {
     const EditOpPerformer performer(op, {m_plan->at, m_plan->at + m_plan->length});
     const Edit& edit = *m_destination.getEdit();
-    CueFollower cues(*m_destination.getEdit(), *m_plan, op);
     for (const Step& step : m_plan->steps) {
         const Target& target = m_plan->targets[step.target];
         cel* const its = celOf(target.chan);
@@ -82,7 +81,6 @@ void Editor::makeChanges(edit_operation op) {
             m_touched.push_back(target.chan);
         }
     }
-    cues.follow();
 }
 
 void Editor::bindEffects(const cel::IdMap& copied, const cel::IdMap& splits) {
