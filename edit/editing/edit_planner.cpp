@@ -36,10 +36,6 @@ IdStamp otherEye(const Edit& edit, const IdStamp& chan) {
     return {};
 }
 
-bool isUsable(const cel::Range& range) {
-    return range.start() > -kTimeTolerance && range.end() <= cel::kGreatestTime;
-}
-
 } // namespace
 
 Editor::Planner::Planner(const EditModule& source, const EditModule& destination, edit_operation op,
@@ -121,9 +117,8 @@ bool Editor::Planner::findSourceSpan() {
     if (m_span.end() == kNoTime) {
         return refuse("the source has one mark and no current time; set the other mark");
     }
-    if (!isUsable(m_span)) {
-        return refuse("the source's marked region begins before its start, at " +
-                      secondsText(m_span.start()) + " s");
+    if (!checkSourceRegion(m_span)) {
+        return false;
     }
     if (!(m_span.length() > kTimeTolerance)) {
         return refuse("the source's region is empty; mark a part that is at least one frame long");
@@ -231,11 +226,16 @@ bool Editor::Planner::findLay(const Target& target, const EditModule& destinatio
         return refuse("the " + String(lay.region.end() >= kNoTime ? "source" : "destination") +
                       " has neither a mark nor a current time");
     }
-    if (!isUsable(lay.region)) {
-        return refuse("the source's region would begin before its start, at " +
-                      secondsText(lay.region.start()) + " s");
+    return checkSourceRegion(lay.region);
+}
+
+bool Editor::Planner::checkSourceRegion(const Range& region) {
+    if (!(region.start() > -kTimeTolerance)) {
+        return refuse("the source's region begins before its start, at " + secondsText(region.start()) +
+                      " s");
     }
-    return true;
+    return region.end() <= cel::kGreatestTime ||
+           refuse("the source's region ends beyond the greatest time that an edit can hold");
 }
 
 bool Editor::Planner::addSourceSteps(Target target, const EditModule& destination) {

@@ -1,5 +1,6 @@
 #include "edit/editing/detail/edit_plan.h"
 
+#include <algorithm>
 #include <cmath>
 
 using Qx::kTimeTolerance;
@@ -8,12 +9,11 @@ using Qx::kTimeTolerance;
 /// so before.
 bool Editor::recordInterTrackSyncLosses() {
     Edit& edit = *m_destination.getEdit();
-    double place = Qx::kNoTime;
-    for (const Target& target : m_plan->targets) {
-        place = std::min(place, target.movesFrom);
-    }
-    if (place == Qx::kNoTime) {
-        return false; // nothing moves
+    // What stays, of the channels that take no part, from here on is no longer in step with what moves.
+    const double place = m_plan->at;
+    if (std::none_of(m_plan->targets.begin(), m_plan->targets.end(),
+                     [](const Target& target) { return target.shift != 0; })) {
+        return false;
     }
     struct Movement {
         IdStamp chan;

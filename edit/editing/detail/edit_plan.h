@@ -66,6 +66,7 @@ private:
     bool pairChannels(const EditModule& destination, Edit::ChanType type, std::vector<Target>& pairs);
     bool findSourceSpan();
     bool findLay(const Target& target, const EditModule& destination, Lay& lay);
+    bool checkSourceRegion(const Range& region);
     bool addSourceSteps(Target target, const EditModule& destination);
     void addInsert(size_t target, const Lay& lay);
     void addFillBlack(size_t target, const Lay& lay);

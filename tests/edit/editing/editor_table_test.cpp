@@ -116,9 +116,9 @@ protected:
         edit.invalidate();
 
         ASSERT_TRUE(edit_manager::undoRequest(item));
-        EXPECT_EQ(contentState(*edit_manager::openEdit(item, eOpenExisting)), stateBefore);
+        EXPECT_STREQ(contentState(*edit_manager::openEdit(item, eOpenExisting)).c_str(), stateBefore.c_str());
         ASSERT_TRUE(edit_manager::redoRequest(item));
-        EXPECT_EQ(contentState(*edit_manager::openEdit(item, eOpenExisting)), stateAfter);
+        EXPECT_STREQ(contentState(*edit_manager::openEdit(item, eOpenExisting)).c_str(), stateAfter.c_str());
     }
 };
 
