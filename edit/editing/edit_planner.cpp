@@ -115,7 +115,7 @@ bool Editor::Planner::findSourceSpan() {
     const double end = m_source.getEdit()->getEndTime();
     m_span = m_source.isMarked() ? m_source.getMarkedRegion(m_mode) : Range(0, rounded(end));
     if (m_span.end() == kNoTime) {
-        return refuse("the source has one mark and no current time; set the other mark");
+        return refuse("the source needs two different marks, or one and a current time");
     }
     if (!checkSourceRegion(m_span)) {
         return false;

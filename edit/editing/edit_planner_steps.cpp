@@ -92,7 +92,7 @@ bool Editor::Planner::destinationRegion(const EditModule& destination, const IdS
         return refuse("the destination has no marked region; set an in and an out mark");
     }
     if (region.end() == kNoTime) {
-        return refuse("the destination has one mark and no current time; set the other mark");
+        return refuse("the destination needs two different marks, or one and a current time");
     }
     if (!(region.length() > kTimeTolerance)) {
         return refuse("the destination's marked region is empty; it must be at least one frame long");

@@ -6,6 +6,8 @@
 
 #include <functional>
 
+struct EditReport;
+
 namespace CLI {
 class App;
 }
@@ -22,6 +24,8 @@ using CommandWork = std::function<int()>;
 void addImportCommand(CLI::App& app, CommandWork& work);
 void addListCommand(CLI::App& app, CommandWork& work);
 void addShowCommand(CLI::App& app, CommandWork& work);
+void addApplyCommand(CLI::App& app, CommandWork& work);
+void addDiffCommand(CLI::App& app, CommandWork& work);
 void addHeaderCommand(CLI::App& app, CommandWork& work);
 void addDemoCommand(CLI::App& app, CommandWork& work);
 void addCompletionCommand(CLI::App& app, CommandWork& work);
@@ -43,6 +47,8 @@ struct ShowOptions {
     bool allEvents = false;
 };
 int showEdit(const ShowOptions& options);
+/// Draws an edit on standard output, without its table of events.
+void drawEdit(const EditReport& report);
 /// Imports a file as `qmedit import` does and sets `item` to the edit that was made. The cookie is not
 /// printed.
 struct ImportOptions {

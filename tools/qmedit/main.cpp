@@ -44,6 +44,8 @@ int runCommandLine(int count, char** arguments) {
     addListCommand(app, work);
     addShowCommand(app, work);
     addHeaderCommand(app, work);
+    addApplyCommand(app, work);
+    addDiffCommand(app, work);
     addDemoCommand(app, work);
     addCompletionCommand(app, work);
 

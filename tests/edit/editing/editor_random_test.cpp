@@ -12,7 +12,11 @@ using Op = edit_operation;
 namespace {
 
 /// Operations in all, and the runs that they are divided into, each from edits of its own.
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+constexpr int kOperations = 20000;
+#else
 constexpr int kOperations = 100000;
+#endif
 constexpr int kRuns = 20;
 
 constexpr double kFrame = 0.04;

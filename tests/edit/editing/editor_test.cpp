@@ -66,7 +66,7 @@ TEST_F(EditorTest, ARefusedOperationHasChangedNothing) {
         {"source's region is empty", Op::Insert, {1, 1, 1}, {1}},
         {"source's region is empty", Op::Insert, {1, 1.01}, {1}}, // less than a frame
         {"before its marked region", Op::Insert, {5, 6}, {1}},
-        {"one mark and no current time", Op::Insert, {1, kNone, kNone}, {1}},
+        {"two different marks", Op::Insert, {1, kNone, kNone}, {1}},
         {"neither a mark nor a current time", Op::Insert, {1, 2}, {kNone, kNone, kNone}},
         {"before its start", Op::Replace, {-1, 2}, {1}},
         {"before the start of the edit", Op::BackReplace, {1, 3}, {kNone, 1}},
