@@ -65,7 +65,8 @@ bool Editor::doPreEditTasks(const EditModule& source, edit_operation op) {
     m_clipboardReady = editOpRequiresClipboard(op) && (m_flags & (KeepClipboard | NoBackup)) == 0 &&
                        !m_destination.getEdit()->get_cookie().isClipboard() &&
                        !m_source->get_cookie().isClipboard() && edit_manager::theEditManager() != nullptr;
-    if (!backUp()) {
+    // Observers are told of the backup and may change the edit: what was planned before would be out of date.
+    if (!backUp() || !makePlan(source, op)) {
         return false;
     }
     autoAddTracks();
