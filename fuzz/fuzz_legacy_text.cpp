@@ -40,6 +40,10 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     if (edit.getNumChans(VideoChan) == 0) {
         return 0; // has no text
     }
+    const cue_list& cues = edit.get_cues();
+    if (cues.get_num_cue_points(CueFlag::kKept) != cues.get_num_cue_points(0)) {
+        return 0; // as many cues are written as are kept, from the first on, whether these are or not
+    }
     file.setBytes(textOf(edit));
     Edit again;
     if (!again.readFromLegacyFile(L"/E0001000.ed2")) {

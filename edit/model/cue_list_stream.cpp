@@ -76,6 +76,7 @@ void cue_list::unpack(PStream& stream) {
     }
     std::vector<cue_point> cues;
     const uint32_t count = stream.getCount(cue_point::kLeastPackedSize + 1);
+    cues.reserve(count); // no more than the stream can hold
     for (uint32_t i = 0; i < count && stream.good(); ++i) {
         cues.emplace_back().unpack(stream, stream.getCookedChar());
     }

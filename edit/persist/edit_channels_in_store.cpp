@@ -1,45 +1,8 @@
 #include "edit/model/channel_group_list.h"
-#include "edit/persist/detail/edit_file.h"
+#include "edit/persist/detail/edit_salvaging.h"
+#include "edit/persist/detail/stored_channels.h"
 #include "platform/base/attrib_value_pair.h"
 #include "platform/services/log.h"
-
-/// Which cel the store's bytes under each Celid name were made from, and with which channel information: a
-/// cel keeps its bytes only under the name and with the information that they hold.
-struct Edit::StoredCels {
-    struct Entry {
-        std::weak_ptr<const cel> content;
-        String name;
-        IdStamp id;
-        String subType;
-        String materialInfo;
-    };
-    std::vector<Entry> entries;
-
-    [[nodiscard]] bool holds(size_t number, const Entry& wanted) const {
-        if (number >= entries.size()) {
-            return false;
-        }
-        const Entry& entry = entries[number];
-        return entry.content.lock() == wanted.content.lock() && entry.name == wanted.name &&
-               entry.id == wanted.id && entry.subType == wanted.subType &&
-               entry.materialInfo == wanted.materialInfo;
-    }
-};
-
-/// A cel as it was read, before it is a channel.
-struct EditFile::LoadedCel {
-    Qx::Ptr<cel> content;
-    Edit::ChanType type;
-    bool ownName = false;      ///< its name was given to the channel, not made from its place
-    bool kindIsStated = false; ///< the header says what kind of channel it is
-};
-
-/// A levels cel that has its audio channel.
-struct EditFile::LoadedLevels {
-    AudLevelsCel levels;
-    IdStamp audio;
-    String name; ///< empty unless the levels channel has one of its own
-};
 
 namespace {
 
@@ -87,27 +50,45 @@ static Qx::Status findKind(const configb& header, int number, EditFile::LoadedCe
     return {};
 }
 
-Qx::Status EditFile::loadCels(Edit& edit, std::vector<LoadedCel>& cels) {
-    for (int n = 0;; ++n) {
-        const String object = EditKeys::numbered(EditKeys::kCelid, n);
-        if (!edit.m_store.contains(object)) {
-            return {};
+static Qx::Status loadCel(TagBag& store, const configb& header, int number, EditFile::LoadedCel& loaded) {
+    const String object = EditKeys::numbered(EditKeys::kCelid, number);
+    loaded.content = std::make_shared<cel>();
+    if (!store.readObject(object, *loaded.content)) {
+        return Qx::Status::failure("object " + object + " is not a cel that reads (" + store.objectError() +
+                                   ")");
+    }
+    return findKind(header, number, loaded);
+}
+
+Qx::Status EditFile::loadCels(Edit& edit, std::vector<LoadedCel>& cels, Salvaging* salvaging) {
+    const int last = salvaging == nullptr ? -1 : salvaging->lastCel();
+    for (int n = 0; n <= last || edit.m_store.contains(EditKeys::numbered(EditKeys::kCelid, n)); ++n) {
+        if (!edit.m_store.contains(EditKeys::numbered(EditKeys::kCelid, n))) {
+            salvaging->celMissing(n);
+            continue;
         }
         LoadedCel loaded;
-        loaded.content = std::make_shared<cel>();
-        if (!edit.m_store.readObject(object, *loaded.content)) {
-            return Qx::Status::failure("object " + object + " is not a cel that reads (" +
-                                       edit.m_store.objectError() + ")");
+        Qx::Status status = loadCel(edit.m_store, edit.m_header, n, loaded);
+        if (salvaging != nullptr && salvaging->guessKind(loaded)) {
+            status = {};
         }
-        if (Qx::Status kind = findKind(edit.m_header, n, loaded); !kind) {
-            return kind;
+        if (!status && salvaging == nullptr) {
+            return status;
+        }
+        if (!status) {
+            salvaging->celFailed(n, status.reason());
+            continue;
+        }
+        if (salvaging != nullptr) {
+            salvaging->celRead(n, loaded);
         }
         cels.push_back(std::move(loaded));
     }
+    return {};
 }
 
 Qx::Status EditFile::loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
-                                std::vector<LoadedLevels>& levels) {
+                                std::vector<LoadedLevels>& levels, Salvaging* salvaging) {
     for (int m = 0;; ++m) {
         const Qx::AttribValuePair pair = levelsPair(edit.m_header, m);
         if (!pair.valid()) {
@@ -121,14 +102,23 @@ Qx::Status EditFile::loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
                                     candidate.content->editChannelId() == loaded.audio);
         }
         if (!hasAudio || !edit.m_store.contains(pair.attrib())) {
+            if (salvaging != nullptr) {
+                salvaging->levelsMissing(m, hasAudio);
+                continue;
+            }
             herc_printf("EditFile::loadLevels( %s ) - levels %d have no audio channel or no nodes\n",
                         edit.get_cookie_str().c_str(), m);
             continue;
         }
         loaded.levels = AudLevelsCel::createFromStore(IdStamp(std::string_view(pair.attrib())), edit.m_store);
         if (!loaded.levels.valid()) {
-            return Qx::Status::failure("object " + pair.attrib() + " is not a level envelope that reads (" +
-                                       edit.m_store.objectError() + ")");
+            const String why = "object " + pair.attrib() + " is not a level envelope that reads (" +
+                               edit.m_store.objectError() + ")";
+            if (salvaging == nullptr) {
+                return Qx::Status::failure(why);
+            }
+            salvaging->levelsFailed(m, why);
+            continue;
         }
         loaded.name = edit.m_header.getString(EditKeys::numbered(EditKeys::kLevelsName, m));
         levels.push_back(std::move(loaded));
@@ -167,12 +157,12 @@ Qx::Status EditFile::setupChannels(Edit& edit, std::vector<LoadedCel>& cels) {
 
 // Telecine and pulldown are settled by the source media and change no event here, so a read ends with the
 // limits.
-Qx::Status EditFile::readCels(Edit& edit) {
+Qx::Status EditFile::readCels(Edit& edit, Salvaging* salvaging) {
     std::vector<LoadedCel> cels;
     std::vector<LoadedLevels> levels;
-    Qx::Status status = loadCels(edit, cels);
+    Qx::Status status = loadCels(edit, cels, salvaging);
     if (status) {
-        status = loadLevels(edit, cels, levels);
+        status = loadLevels(edit, cels, levels, salvaging);
     }
     if (!status) {
         return status;

@@ -128,8 +128,17 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
     return status;
 }
 
+namespace {
+
+/// The first line behind the header, whose texts may hold the words that sections begin with; 0 without one.
+unsigned behindHeader(const TextFile& file) {
+    return static_cast<unsigned>(file.find(EditKeys::kHeaderEnd, 0, true) + 1);
+}
+
+} // namespace
+
 void Edit::readED2Cues(const TextFile& file) {
-    const int section = file.find(kCueSection);
+    const int section = file.find(kCueSection, behindHeader(file));
     int count = 0;
     if (section < 0 ||
         !Qx::textToInt(std::string_view(file[static_cast<unsigned>(section)])
@@ -152,7 +161,7 @@ void Edit::readED2Cues(const TextFile& file) {
 
 Qx::Status Edit::readED2Cels(const TextFile& file) {
     const int count = m_header.getInt(EditKeys::kNumChans);
-    int at = -1;
+    int at = static_cast<int>(behindHeader(file)) - 1;
     for (int sections = 0; sections < count; ++sections) {
         at = file.find(kChannelLine, static_cast<unsigned>(at + 1));
         if (at < 0) {

@@ -210,6 +210,25 @@ StoreVerdict readStoreTable(std::span<const std::byte> file, std::vector<StoredO
     return {};
 }
 
+std::vector<StoredObject> readSoundRows(std::span<const std::byte> file, uint64_t offset) {
+    std::vector<StoredObject> rows;
+    if (offset < kStoreHeaderSize || offset > file.size()) {
+        return rows;
+    }
+    PStream stream(file.subspan(offset));
+    while (stream.remaining() >= kLeastRowSize && rows.size() < kMaxStoredObjects) {
+        String complaint;
+        const StoredObject row = takeRow(stream, complaint);
+        if (!complaint.empty()) {
+            break;
+        }
+        if (row.offset >= kStoreHeaderSize && judgeStoredObject(file, row).empty()) {
+            rows.push_back(row);
+        }
+    }
+    return rows;
+}
+
 StoreVerdict judgeStorePlaces(std::span<const std::byte> file, std::span<const StoredObject> objects) {
     const StoreHeader header = decodeStoreHeader(file);
     uint64_t position = kStoreHeaderSize;

@@ -6,6 +6,9 @@
 #include "platform/store/detail/tag_bag_contents.h"
 
 #include <cerrno>
+#include <list>
+#include <map>
+#include <set>
 
 using namespace Qx::detail;
 
@@ -145,6 +148,57 @@ TagBag::OpenResult TagBag::openSalvaging(const String& file, std::vector<StoredO
         }
     }
     bag.takeImage(objects, complaints, false);
+    bag.folder = Qx::folderOf(file);
+    bag.extension = Qx::extensionOf(Qx::fileNameOf(file));
+    bag.isOpen = true;
+    return Opened;
+}
+
+TagBag::OpenResult TagBag::openScanning(const String& file, const ScanNamer& nameOf,
+                                        std::vector<StoredObjectInfo>& unchecked) {
+    close();
+    unchecked.clear();
+    Contents& bag = *m_contents;
+    const OpenResult seen = lookAt(file, bag.openError);
+    if (seen != Opened) {
+        return seen;
+    }
+    StoreVerdict verdict;
+    if (const Qx::FileError error = bag.image.read(file, false, verdict)) {
+        bag.image.drop();
+        bag.openError = readFailure(error, file);
+        return NotOpened;
+    }
+    std::vector<StoredObject> objects;
+    std::list<ScanLabel> labels;
+    if (verdict.state != StoreState::Foreign && verdict.state != StoreState::Newer) {
+        std::map<std::string_view, size_t> before;
+        for (ScannedObject& found : scanStore(bag.image.bytes())) {
+            const size_t number = before[found.form]++;
+            if (found.object.name.empty()) {
+                const ScanLabel& label = labels.emplace_back(nameOf(found.form, number));
+                found.object.name = label.name;
+                found.object.layer = label.layer;
+                if (!isStoredName(label.name) || !isStoredName(label.layer)) {
+                    continue;
+                }
+                unchecked.push_back(infoOf(found.object, "no checksum vouches for it"));
+                unchecked.back().layer = String(found.form);
+            }
+            objects.push_back(found.object);
+        }
+    }
+    if (objects.empty()) {
+        bag.image.drop();
+        if (verdict.isSound()) {
+            verdict = StoreVerdict::damaged("no object can be found in it");
+        }
+        bag.openError = verdict.sentence(file);
+        return resultOf(verdict.state);
+    }
+    std::set<std::string_view> taken;
+    std::erase_if(objects, [&](const StoredObject& object) { return !taken.insert(object.name).second; });
+    bag.takeImage(objects, {}, false);
     bag.folder = Qx::folderOf(file);
     bag.extension = Qx::extensionOf(Qx::fileNameOf(file));
     bag.isOpen = true;

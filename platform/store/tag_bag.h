@@ -50,6 +50,22 @@ public:
     /// flush cannot replace the damaged file before `setId` (and `setFolder`) tell where the salvage shall
     /// go.
     OpenResult openSalvaging(const String& path, std::vector<StoredObjectInfo>& lost);
+    /// What `openScanning` takes an object for that no table names.
+    struct ScanLabel {
+        String name;  ///< empty leaves the object out
+        String layer; ///< full name of its most derived layer
+    };
+    /// The label for the short name of an object's most derived layer, `form`. `before` tells how many
+    /// objects of that layer stand before it in the file.
+    using ScanNamer = std::function<ScanLabel(std::string_view form, size_t before)>;
+    /// Opens what can be found of a damaged store whose table is not whole, of one that was cut off for
+    /// instance. Rows of the table that still read, and whose object's bytes have the checksum that they
+    /// tell, give their objects as they are. The other objects are looked for by their form; nothing vouches
+    /// for those but that, so whoever unpacks them checks what they hold. `unchecked` tells of them; their
+    /// layer there is the short one. Of two objects with one name the first stays. Otherwise as
+    /// `openSalvaging`; Damaged when there is no object at all.
+    OpenResult openScanning(const String& path, const ScanNamer& nameOf,
+                            std::vector<StoredObjectInfo>& unchecked);
     /// One sentence for a person: the path, what is wrong and what can be done. Empty after a success.
     [[nodiscard]] const String& openError() const;
     /// The result of the last `open`, also after the bag was closed; `Missing` before the first.

@@ -21,8 +21,9 @@ int failed(const Qx::Status& status) {
 
 bool readCookie(const String& text, cookie& item) {
     item = cookie(text, true);
-    if (item.isStorable())
+    if (item.isStorable()) {
         return true;
+    }
     reportError("'" + text +
                 "' is no cookie; a cookie is a letter and seven digits or letters, such as E0001000 "
                 "('qmedit list' shows those of the project)");

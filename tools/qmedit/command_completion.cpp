@@ -10,9 +10,11 @@ namespace {
 /// The long options of a command, as words.
 String optionWords(const CLI::App& command) {
     String words;
-    for (const CLI::Option* option : command.get_options())
-        for (const std::string& name : option->get_lnames())
+    for (const CLI::Option* option : command.get_options()) {
+        for (const std::string& name : option->get_lnames()) {
             words += (words.empty() ? "--" : " --") + String(name);
+        }
+    }
     return words;
 }
 
@@ -40,13 +42,13 @@ _qmedit() {
     COMPREPLY=()
     for ((i = 1; i < COMP_CWORD; i++)); do
         case ${COMP_WORDS[i]} in
-        --project | --rate | --type) ((i++)) ;;
+        --project | --into | --rate | --type) ((i++)) ;;
         -*) ;;
         *) command=${COMP_WORDS[i]}; break ;;
         esac
     done
     case $previous in
-    --project)
+    --project | --into)
         mapfile -t COMPREPLY < <(compgen -d -- "$current")
         compopt -o filenames 2>/dev/null
         return ;;
@@ -61,10 +63,10 @@ _qmedit() {
         return
     fi
     case $command in
-    import)
+    import | salvage)
         mapfile -t COMPREPLY < <(compgen -f -- "$current")
         compopt -o filenames 2>/dev/null ;;
-    show | header) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;;
+    show | header | export | verify) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;;
     completion) mapfile -t COMPREPLY < <(compgen -W bash -- "$current") ;;
     esac
 }
@@ -82,7 +84,7 @@ void addCompletionCommand(CLI::App& app, CommandWork& work) {
         ->type_name("")
         ->check(CLI::IsMember({"bash"}));
     command->footer("Example:\n  source <(qmedit completion bash)");
-    command->callback([&app, &work] {
+    command->callback([shell, &app, &work] { // the option writes to it: it lives as long as the command
         work = [&app] {
             writeOut(bashCompletion(app));
             return static_cast<int>(kDone);

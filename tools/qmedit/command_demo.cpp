@@ -19,13 +19,15 @@ Qx::Status findExample(String& path) {
     std::error_code code;
     const std::filesystem::path program = std::filesystem::read_symlink("/proc/self/exe", code);
     std::vector<std::filesystem::path> folders;
-    if (!code)
+    if (!code) {
         folders.push_back(program.parent_path().parent_path() / "share" / "quillmarch" / "examples");
+    }
     folders.emplace_back(QMEDIT_EXAMPLES_IN_TREE);
     for (const std::filesystem::path& folder : folders) {
         path = (folder / kExample).string();
-        if (Qx::fileExists(path))
+        if (Qx::fileExists(path)) {
             return {};
+        }
     }
     return Qx::Status::failure("the example " + String(kExample) + " is neither in " +
                                folders.front().string() +
@@ -37,30 +39,36 @@ Qx::Status makeFolder(String& folder) {
     std::error_code code;
     const std::filesystem::path base = std::filesystem::temp_directory_path(code);
     std::string name = ((code ? std::filesystem::path("/tmp") : base) / "quillmarch-demo-XXXXXX").string();
-    if (::mkdtemp(name.data()) == nullptr)
+    if (::mkdtemp(name.data()) == nullptr) {
         return Qx::Status::failure("cannot make a folder for the demo like " + name +
                                    "; name one with --project DIR");
+    }
     folder = name;
     return {};
 }
 
 int runDemo(String project) {
     ImportOptions importing;
-    if (const Qx::Status found = findExample(importing.file); !found)
+    if (const Qx::Status found = findExample(importing.file); !found) {
         return failed(found);
-    if (project.empty())
-        if (const Qx::Status made = makeFolder(project); !made)
+    }
+    if (project.empty()) {
+        if (const Qx::Status made = makeFolder(project); !made) {
             return failed(made);
+        }
+    }
     importing.project = project;
 
     reportProgress("Importing " + importing.file);
     ShowOptions showing;
-    if (const int code = importFile(importing, showing.item); code != kDone)
+    if (const int code = importFile(importing, showing.item); code != kDone) {
         return code;
+    }
     showing.project = project;
     reportProgress("Saved as edit " + showing.item.asString() + " in " + project + "; read back from there:");
-    if (const int code = showEdit(showing); code != kDone)
+    if (const int code = showEdit(showing); code != kDone) {
         return code;
+    }
     writeOut("The project is kept in " + project +
              ". To look further:\n"
              "  qmedit list --project " +

@@ -22,24 +22,26 @@ String valueText(const configb::Value& value, const Console& console) {
     return std::visit(
         [&](const auto& content) -> String {
             using Type = std::decay_t<decltype(content)>;
-            if constexpr (std::is_same_v<Type, String>)
+            if constexpr (std::is_same_v<Type, String>) {
                 return console.safe(content);
-            else if constexpr (std::is_same_v<Type, cookie>)
+            } else if constexpr (std::is_same_v<Type, cookie>) {
                 return content.asString();
-            else if constexpr (std::is_same_v<Type, double>)
+            } else if constexpr (std::is_same_v<Type, double>) {
                 return Qx::doubleToText(content);
-            else if constexpr (std::is_same_v<Type, bool>)
+            } else if constexpr (std::is_same_v<Type, bool>) {
                 return content ? "true" : "false";
-            else
+            } else {
                 return String(std::to_string(content));
+            }
         },
         value);
 }
 
 String headerTable(const configb& header, const std::vector<String>& keys, const Console& console) {
     int width = 0;
-    for (const String& key : keys)
+    for (const String& key : keys) {
         width = std::max(width, safe_text::columns(console.safe(key)));
+    }
     String out;
     for (const String& key : keys) {
         const configb::Value* value = header.find(key);
@@ -52,30 +54,35 @@ String headerTable(const configb& header, const std::vector<String>& keys, const
 
 int runHeader(const HeaderOptions& options) {
     cookie item;
-    if (!readCookie(options.item, item))
+    if (!readCookie(options.item, item)) {
         return kWrongUsage;
+    }
     ProjectSession session(options.project);
-    if (const Qx::Status opened = session.openExisting(); !opened)
+    if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
     EditPtr edit;
-    if (const Qx::Status read = session.readEdit(item, edit); !read)
+    if (const Qx::Status read = session.readEdit(item, edit); !read) {
         return failed(read);
+    }
     const configb& header = std::as_const(*edit).Opts();
     std::vector<String> keys = header.keys();
     if (!options.key.empty()) {
-        if (!header.contains(options.key))
+        if (!header.contains(options.key)) {
             return failed(Qx::Status::failure("the header of " + item.asString() + " has no key '" +
                                               options.key + "'; 'qmedit header " + item.asString() +
                                               "' shows those it has"));
+        }
         std::erase_if(keys, [&](const String& key) { return !String::equalNoCase(key, options.key); });
     }
     const Console console = Console::forStandardOutput();
-    if (options.json)
+    if (options.json) {
         writeOut(headerJson(header, keys));
-    else if (!options.key.empty())
+    } else if (!options.key.empty()) {
         writeOut(valueText(*header.find(options.key), console) + "\n");
-    else
+    } else {
         writeOut(headerTable(header, keys, console));
+    }
     return kDone;
 }
 

@@ -4,6 +4,8 @@
 #include "tools/qmedit/project_session.h"
 
 #include "interchange/edl_import.h"
+#include "interchange/legacy_text.h"
+#include "platform/services/files.h"
 
 #include <CLI/CLI.hpp>
 
@@ -15,43 +17,69 @@ constexpr const char* kRates = "23.976, 24, 25, 29.97, 30, 47.952, 48, 50, 59.94
 
 /// Tells what the import met; returns the number of losses.
 size_t reportLosses(const interchange::LossReport& report) {
-    for (const String& line : report.lines())
+    for (const String& line : report.lines()) {
         reportProgress(line);
+    }
     return report.losses().size();
 }
 
 String checkRate(const std::string& rate) {
-    if (Qx::FrameRate::fromString(rate).valid())
+    if (Qx::FrameRate::fromString(rate).valid()) {
         return {};
+    }
     return "'" + rate + "' is no frame rate; give one of " + kRates;
+}
+
+bool isLegacyText(const String& file) {
+    return String::equalNoCase(Qx::extensionOf(Qx::fileNameOf(file)), ".ed2");
+}
+
+Qx::Status readSource(const String& file, const ImportOptions& options, interchange::Import& import) {
+    if (isLegacyText(file)) {
+        if (!options.rate.empty()) {
+            return Qx::Status::failure(file + ": legacy text states its frame rate; leave out --rate");
+        }
+        return interchange::importLegacyText(file, import);
+    }
+    const Qx::FrameRate rate = Qx::FrameRate::fromString(options.rate);
+    interchange::ImportOptions importing;
+    importing.rate = rate.valid() ? rate : Qx::projectFrameRate();
+    importing.strict = options.strict;
+    return interchange::importEdl(file, importing, import);
 }
 
 } // namespace
 
 int importFile(const ImportOptions& options, cookie& item) {
     String file;
-    if (const Qx::Status checked = checkImportSource(options.file, file); !checked)
+    if (const Qx::Status checked = checkImportSource(options.file, file); !checked) {
         return failed(checked);
+    }
     ProjectSession session(options.project);
-    const Qx::FrameRate rate = Qx::FrameRate::fromString(options.rate);
-    if (const Qx::Status prepared = session.prepare(rate); !prepared)
+    if (const Qx::Status prepared = session.prepare(Qx::FrameRate::fromString(options.rate)); !prepared) {
         return failed(prepared);
+    }
 
-    interchange::ImportOptions importing;
-    importing.rate = rate.valid() ? rate : Qx::projectFrameRate();
-    importing.strict = options.strict;
     interchange::Import import;
-    if (const Qx::Status read = interchange::importEdl(file, importing, import); !read)
+    if (const Qx::Status read = readSource(file, options, import); !read) {
         return failed(read);
+    }
     const size_t losses = reportLosses(import.report);
-    if (options.strict && losses > 0)
+    if (options.strict && losses > 0) {
         return failed(Qx::Status::failure(
             options.file + String::format(": %zu loss%s", losses, losses == 1 ? "" : "es") +
             ", so nothing was imported; without --strict the edit is made all the same"));
-    if (const Qx::Status created = session.create(); !created)
+    }
+    // A fresh project takes the rate of the edit, which a legacy text states.
+    if (const Qx::Status prepared = session.prepare(import.sequence->getFrameRate()); !prepared) {
+        return failed(prepared);
+    }
+    if (const Qx::Status created = session.create(); !created) {
         return failed(created);
-    if (const Qx::Status saved = interchange::saveImport(import); !saved)
+    }
+    if (const Qx::Status saved = interchange::saveImport(import); !saved) {
         return failed(saved);
+    }
     item = import.sequence->get_cookie();
     return kDone;
 }
@@ -64,8 +92,10 @@ void addImportCommand(CLI::App& app, CommandWork& work) {
     };
     const auto arguments = std::make_shared<Arguments>();
     CLI::App* command =
-        app.add_subcommand("import", "Make an edit of another tool's cut list (CMX 3600 EDL)");
-    command->add_option("FILE", arguments->file, "The list: an EDL")->required()->type_name("");
+        app.add_subcommand("import", "Make an edit of a cut list (CMX 3600 EDL) or of legacy text (.ed2)");
+    command->add_option("FILE", arguments->file, "The list: an EDL, or a legacy text by its extension .ed2")
+        ->required()
+        ->type_name("");
     addProjectOption(*command, arguments->options.project);
     command
         ->add_option("--rate", arguments->rate,
@@ -83,8 +113,9 @@ void addImportCommand(CLI::App& app, CommandWork& work) {
             arguments->options.rate = arguments->rate;
             cookie item;
             const int code = importFile(arguments->options, item);
-            if (code == kDone)
+            if (code == kDone) {
                 writeOut(item.asString() + "\n");
+            }
             return code;
         };
     });

@@ -26,15 +26,17 @@ String localTime(int64_t seconds) {
     std::tm fields{};
     char text[32];
     if (seconds <= 0 || localtime_r(&time, &fields) == nullptr ||
-        std::strftime(text, sizeof text, "%Y-%m-%d %H:%M", &fields) == 0)
+        std::strftime(text, sizeof text, "%Y-%m-%d %H:%M", &fields) == 0) {
         return "-";
+    }
     return text;
 }
 
 /// The rows of the table, each with one text a column; a damaged edit has its reason in the last.
 std::vector<String> cells(const ListedEdit& edit, const Console& console) {
-    if (!edit.damage.empty())
+    if (!edit.damage.empty()) {
         return {edit.item.asString(), "damaged", "-", "-", "-", "-", console.safe(edit.damage)};
+    }
     return {edit.item.asString(),
             edit.type.empty() ? "-" : edit.type,
             edit.rate.valid() ? edit.rate.asString() : "-",
@@ -48,12 +50,15 @@ String listTable(const std::vector<ListedEdit>& edits, const Console& console) {
     const std::vector<String> heading = {"cookie", "type", "rate", "duration", "chans", "modified", "name"};
     constexpr bool rightAligned[] = {false, false, true, true, true, false, false};
     std::vector<std::vector<String>> rows = {heading};
-    for (const ListedEdit& edit : edits)
+    for (const ListedEdit& edit : edits) {
         rows.push_back(cells(edit, console));
+    }
     std::vector<int> widths(heading.size());
-    for (const auto& row : rows)
-        for (size_t i = 0; i + 1 < row.size(); ++i)
+    for (const auto& row : rows) {
+        for (size_t i = 0; i + 1 < row.size(); ++i) {
             widths[i] = std::max(widths[i], safe_text::columns(row[i]));
+        }
+    }
 
     String out;
     for (size_t r = 0; r < rows.size(); ++r) {
@@ -79,24 +84,29 @@ String listTable(const std::vector<ListedEdit>& edits, const Console& console) {
 
 int runList(const ListOptions& options) {
     ProjectSession session(options.project);
-    if (const Qx::Status opened = session.openExisting(); !opened)
+    if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
     std::vector<ListedEdit> edits;
     std::vector<String> others;
-    if (const Qx::Status listed = session.list(edits, others); !listed)
+    if (const Qx::Status listed = session.list(edits, others); !listed) {
         return failed(listed);
-    for (const String& name : others)
+    }
+    for (const String& name : others) {
         reportWarning(Qx::joinPath(session.folder(), name) + " is passed over: its name is no cookie");
-    if (!options.type.empty())
+    }
+    if (!options.type.empty()) {
         std::erase_if(
             edits, [&](const ListedEdit& edit) { return edit.damage.empty() && edit.type != options.type; });
-    if (options.json)
+    }
+    if (options.json) {
         writeOut(listJson(edits));
-    else if (!edits.empty())
+    } else if (!edits.empty()) {
         writeOut(listTable(edits, Console::forStandardOutput()));
-    else
+    } else {
         reportProgress("the project " + session.root() + " holds no edit" +
                        (options.type.empty() ? "" : " of that type"));
+    }
     return kDone;
 }
 

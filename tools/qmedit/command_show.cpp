@@ -16,11 +16,14 @@ namespace {
 void reportMissingShots(const EditReport& report) {
     size_t count = 0;
     const SourceReport* first = nullptr;
-    for (const SourceReport& source : report.sources)
-        if (!source.problem.empty() && count++ == 0)
+    for (const SourceReport& source : report.sources) {
+        if (!source.problem.empty() && count++ == 0) {
             first = &source;
-    if (first == nullptr)
+        }
+    }
+    if (first == nullptr) {
         return;
+    }
     const String more = count > 1 ? String::format(" (and %zu more)", count - 1) : String();
     reportWarning("the shot " + first->strip.asString() + more + " has no name here: " + first->problem);
 }
@@ -29,11 +32,13 @@ void reportMissingShots(const EditReport& report) {
 
 int showEdit(const ShowOptions& options) {
     ProjectSession session(options.project);
-    if (const Qx::Status opened = session.openExisting(); !opened)
+    if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
     EditPtr edit;
-    if (const Qx::Status read = session.readEdit(options.item, edit); !read)
+    if (const Qx::Status read = session.readEdit(options.item, edit); !read) {
         return failed(read);
+    }
     const EditReport report = reportOf(*edit, session.sourceNamer());
     reportMissingShots(report);
     if (options.json) {
@@ -43,8 +48,9 @@ int showEdit(const ShowOptions& options) {
     const Console console = Console::forStandardOutput();
     EventTableOptions table;
     table.fitToWidth = console.terminal();
-    if (options.allEvents)
+    if (options.allEvents) {
         table.eventsPerChannel = std::numeric_limits<size_t>::max();
+    }
     writeOut("\n" + editSummary(report, console) + "\n");
     writeOut(trackPicture(report, console));
     writeOut(eventTable(report, console, table));
@@ -76,8 +82,9 @@ void addShowCommand(CLI::App& app, CommandWork& work) {
                     "The picture is as wide as the terminal, or as $COLUMNS says.");
     command->callback([arguments, &work] {
         work = [arguments] {
-            if (!readCookie(arguments->item, arguments->options.item))
+            if (!readCookie(arguments->item, arguments->options.item)) {
                 return static_cast<int>(kWrongUsage);
+            }
             return showEdit(arguments->options);
         };
     });

@@ -22,11 +22,14 @@ using CommandWork = std::function<int()>;
 /// \name Each declares its command, its options and its help, in a file of its own
 /// @{
 void addImportCommand(CLI::App& app, CommandWork& work);
+void addExportCommand(CLI::App& app, CommandWork& work);
 void addListCommand(CLI::App& app, CommandWork& work);
 void addShowCommand(CLI::App& app, CommandWork& work);
 void addApplyCommand(CLI::App& app, CommandWork& work);
 void addDiffCommand(CLI::App& app, CommandWork& work);
 void addHeaderCommand(CLI::App& app, CommandWork& work);
+void addVerifyCommand(CLI::App& app, CommandWork& work);
+void addSalvageCommand(CLI::App& app, CommandWork& work);
 void addDemoCommand(CLI::App& app, CommandWork& work);
 void addCompletionCommand(CLI::App& app, CommandWork& work);
 /// @}

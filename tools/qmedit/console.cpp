@@ -25,22 +25,25 @@ const char* environment(const char* name) {
 }
 
 bool localeIsUtf8() {
-    for (const char* name : {"LC_ALL", "LC_CTYPE", "LANG"})
+    for (const char* name : {"LC_ALL", "LC_CTYPE", "LANG"}) {
         if (const char* value = environment(name)) {
             const String lower = String(value).lower();
             return lower.find("utf-8") != String::npos || lower.find("utf8") != String::npos;
         }
+    }
     return false;
 }
 
 int terminalWidth(bool terminal) {
     int width = 0;
     if (const char* columns = environment("COLUMNS");
-        columns != nullptr && Qx::textToInt(columns, width) && width > 0)
+        columns != nullptr && Qx::textToInt(columns, width) && width > 0) {
         return std::clamp(width, kLeastWidth, kGreatestWidth);
+    }
     winsize size{};
-    if (terminal && ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0)
+    if (terminal && ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0) {
         return std::clamp(int{size.ws_col}, kLeastWidth, kGreatestWidth);
+    }
     return kDefaultWidth;
 }
 
@@ -69,8 +72,9 @@ String Console::safe(std::string_view text) const {
 }
 
 const char* Console::begin(Ink ink) const {
-    if (!m_colour)
+    if (!m_colour) {
         return "";
+    }
     switch (ink) {
     case Ink::None:
         return "\x1b[0m";
@@ -101,23 +105,27 @@ const char* Console::begin(Ink ink) const {
 }
 
 String Console::inked(Ink ink, std::string_view text) const {
-    if (!m_colour || ink == Ink::None || text.empty())
+    if (!m_colour || ink == Ink::None || text.empty()) {
         return String(text);
+    }
     return String(begin(ink)) + String(text) + begin(Ink::None);
 }
 
 void writeOut(std::string_view text) {
     errno = 0;
-    if (outputError == 0 && std::fwrite(text.data(), 1, text.size(), stdout) != text.size())
+    if (outputError == 0 && std::fwrite(text.data(), 1, text.size(), stdout) != text.size()) {
         outputError = errno != 0 ? errno : EIO;
+    }
 }
 
 bool finishOutput() {
     errno = 0;
-    if (std::fflush(stdout) != 0 && outputError == 0)
+    if (std::fflush(stdout) != 0 && outputError == 0) {
         outputError = errno != 0 ? errno : EIO;
-    if (outputError == 0)
+    }
+    if (outputError == 0) {
         return true;
+    }
     reportError(String("cannot write standard output: ") + std::strerror(outputError));
     return false;
 }
@@ -137,10 +145,12 @@ void reportProgress(std::string_view text) {
 void routeLibraryLog() {
     const bool wanted = environment("QMEDIT_LOG") != nullptr;
     Qx::setLogSink([wanted](std::string_view line) {
-        if (!wanted)
+        if (!wanted) {
             return;
-        while (!line.empty() && (line.back() == '\n' || line.back() == ' '))
+        }
+        while (!line.empty() && (line.back() == '\n' || line.back() == ' ')) {
             line.remove_suffix(1);
+        }
         reportProgress(line);
     });
     Qx::setStandardOutputSink([](std::string_view) {});

@@ -21,10 +21,12 @@ Json textOrNull(const String& text, bool known) {
 
 /// The rate as a number: 25 where it is whole, else the digits that people write (29.97).
 Json rateNumber(Qx::FrameRate rate) {
-    if (!rate.valid())
+    if (!rate.valid()) {
         return {};
-    if (rate.denominator() == 1)
+    }
+    if (rate.denominator() == 1) {
         return rate.numerator();
+    }
     double value = 0;
     return Qx::textToDouble(rate.asString(), value) ? Json(value) : Json();
 }
@@ -65,8 +67,9 @@ void addLines(String& out, const char* indent, const Range& range, const ToJson&
         out += String(indent) + toJson(element);
         first = false;
     }
-    if (!first)
+    if (!first) {
         out += String("\n") + String(indent).substr(2);
+    }
 }
 
 /// The fields of `object` without its braces.
@@ -113,8 +116,9 @@ Json groupJson(const GroupReport& group) {
     Json json;
     json["type"] = group.type;
     json["channels"] = Json::array();
-    for (const IdStamp& id : group.channels)
+    for (const IdStamp& id : group.channels) {
         json["channels"].push_back(id.asString());
+    }
     return json;
 }
 
@@ -122,12 +126,13 @@ Json headerValue(const configb::Value& value) {
     return std::visit(
         [](const auto& content) -> Json {
             using Type = std::decay_t<decltype(content)>;
-            if constexpr (std::is_same_v<Type, cookie>)
+            if constexpr (std::is_same_v<Type, cookie>) {
                 return content.asString();
-            else if constexpr (std::is_same_v<Type, double>)
+            } else if constexpr (std::is_same_v<Type, double>) {
                 return std::isfinite(content) ? Json(content) : Json();
-            else
+            } else {
                 return content;
+            }
         },
         value);
 }
@@ -165,8 +170,9 @@ String editJson(const EditReport& report) {
     head["modified"] = textOrNull(isoTime(report.modified), report.modified > 0);
 
     String out = "{";
-    for (const auto& [key, value] : head.items())
+    for (const auto& [key, value] : head.items()) {
         out += "\n  " + dumped(key) + ": " + dumped(value) + ",";
+    }
     out += "\n  \"channels\": [";
     addLines(out, "    ", report.channels,
              [&](const ChannelReport& channel) { return channelJson(report, channel); });
@@ -185,9 +191,11 @@ String listJson(const std::vector<ListedEdit>& edits) {
 
 String headerJson(const configb& header, const std::vector<String>& keys) {
     Json json = Json::object();
-    for (const String& key : keys)
-        if (const configb::Value* value = header.find(key); value != nullptr)
+    for (const String& key : keys) {
+        if (const configb::Value* value = header.find(key); value != nullptr) {
             json[key] = headerValue(*value);
+        }
+    }
     return String(json.dump(2, ' ', false, Json::error_handler_t::replace)) + "\n";
 }
 
@@ -196,7 +204,35 @@ String isoTime(int64_t seconds) {
     std::tm fields{};
     char text[32];
     if (gmtime_r(&time, &fields) == nullptr ||
-        std::strftime(text, sizeof text, "%Y-%m-%dT%H:%M:%SZ", &fields) == 0)
+        std::strftime(text, sizeof text, "%Y-%m-%dT%H:%M:%SZ", &fields) == 0) {
         return {};
+    }
     return text;
+}
+
+String verifyJson(const std::vector<VerifiedFile>& files) {
+    String out = "[";
+    addLines(out, "  ", files, [](const VerifiedFile& file) {
+        Json json;
+        json["file"] = file.name;
+        json["sound"] = file.faults.empty();
+        json["faults"] = Json::array();
+        for (const String& fault : file.faults) {
+            json["faults"].push_back(std::string(fault));
+        }
+        return dumped(json);
+    });
+    return out + "]\n";
+}
+
+String salvageJson(const cookie& item, const Edit& edit, const std::vector<String>& lost) {
+    Json json;
+    json["cookie"] = item.asString();
+    json["name"] = edit.getName();
+    json["channels"] = edit.getNumChans();
+    json["lost"] = Json::array();
+    for (const String& line : lost) {
+        json["lost"].push_back(std::string(line));
+    }
+    return dumped(json) + "\n";
 }

@@ -18,5 +18,17 @@
 /// Header values by key, in order: an object.
 [[nodiscard]] String headerJson(const configb& header, const std::vector<String>& keys);
 
+/// A file that `qmedit verify` checked.
+struct VerifiedFile {
+    String name;                ///< below the project's folder
+    std::vector<String> faults; ///< empty for a sound one
+};
+
+/// Checked files: an array of objects.
+[[nodiscard]] String verifyJson(const std::vector<VerifiedFile>& files);
+
+/// What a salvage made: an object.
+[[nodiscard]] String salvageJson(const cookie& item, const Edit& edit, const std::vector<String>& lost);
+
 /// "2026-11-21T11:30:00Z" for seconds since 1970, UTC; empty for a time that has no date.
 [[nodiscard]] String isoTime(int64_t seconds);

@@ -11,14 +11,18 @@
 namespace {
 
 SourceKind kindOf(const cookie& strip) {
-    if (strip.isBlack())
+    if (strip.isBlack()) {
         return SourceKind::Black;
-    if (strip.isEffectGraph())
+    }
+    if (strip.isEffectGraph()) {
         return SourceKind::Effect;
-    if (strip.isInput())
+    }
+    if (strip.isInput()) {
         return SourceKind::Input;
-    if (strip.isMagic())
+    }
+    if (strip.isMagic()) {
         return SourceKind::Magic;
+    }
     const bool media = strip.type() == Cookie_Type::Video || strip.type() == Cookie_Type::Sound;
     return media ? SourceKind::Media : SourceKind::Shot;
 }
@@ -31,15 +35,18 @@ public:
 
     size_t indexOf(const channel_event& event) {
         // An event whose stamp is a channel's shows that channel.
-        if (event.strip.isAlias() || event.id.getMagicType() == IdStampMagic::Channel)
+        if (event.strip.isAlias() || event.id.getMagicType() == IdStampMagic::Channel) {
             return indexOfAlias(event);
-        if (m_lastValid && event.strip == m_lastStrip)
+        }
+        if (m_lastValid && event.strip == m_lastStrip) {
             return m_lastIndex;
+        }
         const auto [place, added] = m_strips.try_emplace(event.strip, m_sources.size());
         if (added) {
             m_sources.push_back({event.strip, kindOf(event.strip), {}, {}, m_dropFrame});
-            if (m_namer && m_sources.back().kind == SourceKind::Shot)
+            if (m_namer && m_sources.back().kind == SourceKind::Shot) {
                 m_namer(m_sources.back());
+            }
         }
         m_lastStrip = event.strip;
         m_lastValid = true;
@@ -50,9 +57,10 @@ public:
 private:
     size_t indexOfAlias(const channel_event& event) {
         const auto [place, added] = m_channels.try_emplace(event.id, m_sources.size());
-        if (added)
+        if (added) {
             m_sources.push_back(
                 {event.strip, SourceKind::Alias, m_edit.getChanDisplayName(event.id), {}, m_dropFrame});
+        }
         return place->second;
     }
 
@@ -72,8 +80,9 @@ void takePairs(const cel& content, double quarterFrame, SourceTable& table, std:
     for (int i = 0; i + 1 < content.numEvents(); i += 2) {
         const channel_event* in = content.getChanEventPtr(i);
         const channel_event* out = content.getChanEventPtr(i + 1);
-        if (in == nullptr || out == nullptr)
+        if (in == nullptr || out == nullptr) {
             return;
+        }
         pairs.push_back({in->editTime, out->editTime, in->stripTime, out->stripTime, in->velocity,
                          in->rampQFrames * quarterFrame, out->rampQFrames * quarterFrame,
                          table.indexOf(*in)});
@@ -94,18 +103,22 @@ void takeCues(const Edit& edit, std::vector<CueReport>& cues) {
     const cue_list& list = edit.get_cues();
     const size_t count = list.get_num_cue_points(0);
     cues.reserve(count);
-    for (size_t i = 0; i < count; ++i)
-        if (const cue_point* cue = list.get_cue_point(i, 0); cue != nullptr)
+    for (size_t i = 0; i < count; ++i) {
+        if (const cue_point* cue = list.get_cue_point(i, 0); cue != nullptr) {
             cues.push_back({cue->editTime(), cue->secondTime() - cue->editTime(), cue->text(), cue->code(),
                             cue->channel() == kAnyCueChan ? -1 : cue->channel(), cue->attached()});
+        }
+    }
     std::stable_sort(cues.begin(), cues.end(),
                      [](const CueReport& a, const CueReport& b) { return a.time < b.time; });
 }
 
 void takeGroups(const Edit& edit, std::vector<GroupReport>& groups) {
-    for (unsigned i = 0; i < edit.numGroups(); ++i)
-        if (const ChannelGroup* group = edit.getTrackGroup(i); group != nullptr)
+    for (unsigned i = 0; i < edit.numGroups(); ++i) {
+        if (const ChannelGroup* group = edit.getTrackGroup(i); group != nullptr) {
             groups.push_back({group->getType(), {group->getChans().begin(), group->getChans().end()}});
+        }
+    }
 }
 
 } // namespace
@@ -151,8 +164,9 @@ EditReport reportOf(const Edit& edit, const SourceNamer& namer) {
         channel.name = edit.getChanDisplayName(channel.id);
         channel.type = edit.getChanType(i);
         channel.subtype = edit.getChanSubtype(i);
-        if (const cel* content = edit.get_edit_cel_p(i); content != nullptr)
+        if (const cel* content = edit.get_edit_cel_p(i); content != nullptr) {
             takePairs(*content, quarterFrame, table, channel.pairs);
+        }
         report.channels.push_back(std::move(channel));
     }
     takeCues(edit, report.cues);

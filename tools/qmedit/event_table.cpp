@@ -21,14 +21,16 @@ String shortLength(const EditReport& report, double seconds) {
     const size_t sign = text.starts_with('-') ? 1 : 0;
     const size_t frames = text.find_last_of(":;");
     const size_t digit = text.find_first_not_of("0:;", sign);
-    if (frames != String::npos && frames > sign)
+    if (frames != String::npos && frames > sign) {
         text.erase(sign, std::min(digit, frames - 1) - sign);
+    }
     return text;
 }
 
 String speedText(double velocity) {
-    if (velocity == 0)
+    if (velocity == 0) {
         return "freeze";
+    }
     return String::format("%ld%%", std::lround(std::clamp(velocity, -1e6, 1e6) * 100));
 }
 
@@ -36,14 +38,17 @@ class Table {
 public:
     Table(const EditReport& report, const Console& console, const EventTableOptions& options)
         : m_report(report), m_console(console), m_options(options) {
-        for (const SourceReport& source : report.sources)
+        for (const SourceReport& source : report.sources) {
             m_labels.push_back(sourceLabel(source, console));
+        }
     }
 
     [[nodiscard]] String text() {
-        for (const ChannelReport& channel : m_report.channels)
-            if (!channel.isLevels())
+        for (const ChannelReport& channel : m_report.channels) {
+            if (!channel.isLevels()) {
                 addChannel(channel);
+            }
+        }
         addCues();
         return std::move(m_text);
     }
@@ -66,8 +71,9 @@ private:
 
 void Table::addName(String name, const String& notes, int used, Ink ink) {
     const int room = m_console.width() - used - safe_text::columns(notes);
-    if (m_options.fitToWidth)
+    if (m_options.fitToWidth) {
         name = safe_text::fitted(name, std::max(room, kLeastNameColumns), m_console.ellipsis());
+    }
     m_text += m_console.inked(ink, name) + m_console.inked(Ink::Dim, notes) + "\n";
 }
 
@@ -86,12 +92,15 @@ void Table::addEvent(const ChannelReport& channel, size_t index, const String& l
     m_text += "  " + (sourceTimes ? m_report.sourceTimecode(source, pair.stripOut) : none);
     m_text += "  " + safe_text::padded(length, m_lengthColumns, "", true) + "  ";
     String notes;
-    if (pair.velocity != 1)
+    if (pair.velocity != 1) {
         notes += " (" + speedText(pair.velocity) + ")";
-    if (pair.fadeIn > 0)
+    }
+    if (pair.fadeIn > 0) {
         notes += " (fade in " + shortLength(m_report, pair.fadeIn) + ")";
-    if (pair.fadeOut > 0)
+    }
+    if (pair.fadeOut > 0) {
         notes += " (fade out " + shortLength(m_report, pair.fadeOut) + ")";
+    }
     addName(m_labels[pair.source], notes,
             1 + m_numberColumns + 4 * (kTimecodeColumns + 2) + m_lengthColumns + 4, inkOf(source));
 }
@@ -112,8 +121,9 @@ void Table::addChannel(const ChannelReport& channel) {
     m_text += m_console.inked(Ink::Dim,
                               String::format("  %zu event%s", pairs.size(), pairs.size() == 1 ? "" : "s"));
     m_text += "\n";
-    if (shown == 0)
+    if (shown == 0) {
         return;
+    }
     String heading = " " + String(static_cast<size_t>(m_numberColumns - 1), ' ') +
                      "#  record in    record out   source in    source out   ";
     heading += safe_text::padded("length", m_lengthColumns, "", true) + "  name";
@@ -129,16 +139,18 @@ void Table::addChannel(const ChannelReport& channel) {
         }
         addEvent(channel, i, lengths[i]);
     }
-    if (shown < pairs.size())
+    if (shown < pairs.size()) {
         m_text += m_console.inked(Ink::Dim, String(static_cast<size_t>(m_numberColumns + 3), ' ') +
                                                 String::format("and %zu more; --events shows all",
                                                                pairs.size() - shown)) +
                   "\n";
+    }
 }
 
 void Table::addCues() {
-    if (m_report.cues.empty())
+    if (m_report.cues.empty()) {
         return;
+    }
     const size_t count = m_report.cues.size();
     const size_t shown = std::min(count, m_options.eventsPerChannel);
     m_text += "\n " + m_console.inked(Ink::Bold, "Markers");
@@ -150,10 +162,11 @@ void Table::addCues() {
         const String note = colour.empty() ? String() : " (" + colour.lower() + ")";
         addName(m_console.safe(cue.text), note, 20, Ink::None);
     }
-    if (shown < count)
+    if (shown < count) {
         m_text += m_console.inked(Ink::Dim,
                                   String::format("       and %zu more; --events shows all", count - shown)) +
                   "\n";
+    }
 }
 
 } // namespace

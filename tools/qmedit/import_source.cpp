@@ -15,13 +15,16 @@ constexpr size_t kSniffedBytes = size_t{64} * 1024;
 /// The start of a file, at most `kSniffedBytes`.
 Qx::FileError readStart(const String& path, String& start) {
     std::unique_ptr<Qx::OpenFile> file;
-    if (Qx::FileError error = Qx::fileSystem().open(path, Qx::OpenMode::Read, file); error)
+    if (Qx::FileError error = Qx::fileSystem().open(path, Qx::OpenMode::Read, file); error) {
         return error;
+    }
     start.resize(kSniffedBytes);
     size_t filled = 0;
-    for (size_t got = 1; got > 0 && filled < start.size(); filled += got)
-        if (Qx::FileError error = file->read(start.data() + filled, start.size() - filled, got); error)
+    for (size_t got = 1; got > 0 && filled < start.size(); filled += got) {
+        if (Qx::FileError error = file->read(start.data() + filled, start.size() - filled, got); error) {
             return error;
+        }
+    }
     start.resize(filled);
     return {};
 }
@@ -39,8 +42,9 @@ bool isDigit(char c) {
 bool isEdlLine(const String& line) {
     const String text = line.trimmed();
     const String upper = text.substr(0, 6);
-    if (upper.upper().starts_with("TITLE:") || upper.upper().starts_with("FCM:"))
+    if (upper.upper().starts_with("TITLE:") || upper.upper().starts_with("FCM:")) {
         return true;
+    }
     const auto blank = std::find_if_not(text.begin(), text.end(), isDigit);
     return blank != text.begin() && blank != text.end() && (*blank == ' ' || *blank == '\t') &&
            std::count(text.begin(), text.end(), ':') >= 4;
@@ -48,8 +52,9 @@ bool isEdlLine(const String& line) {
 
 bool looksLikeEdl(String start) {
     std::replace(start.begin(), start.end(), '\r', '\n');
-    if (start.starts_with("\xEF\xBB\xBF"))
+    if (start.starts_with("\xEF\xBB\xBF")) {
         start.erase(0, 3);
+    }
     const std::vector<String> lines = start.split('\n', true);
     return std::any_of(lines.begin(), lines.end(), isEdlLine);
 }
@@ -60,18 +65,25 @@ Qx::Status failure(const String& path, int line, const String& what) {
 
 Qx::Status checkContent(const String& path, const String& start) {
     const String extension = Qx::extensionOf(Qx::fileNameOf(path)).lower();
-    if (extension == getEditFilenameExt() || start.starts_with("QME"))
+    if (extension == getEditFilenameExt() || start.starts_with("QME")) {
         return failure(path, 0,
                        "this is an edit file, which needs no import; copy it into a project's folder "
                        "(DIR/P0001000) and look at it with 'qmedit show COOKIE --project DIR'");
-    if (start.empty())
+    }
+    if (start.empty()) {
         return failure(path, 1, "the file is empty; export the list again and import that");
-    if (const size_t zero = start.find('\0'); zero != String::npos)
+    }
+    if (const size_t zero = start.find('\0'); zero != String::npos) {
         return failure(path, lineOf(start, zero),
-                       "not text but binary data; import reads CMX 3600 edit decision lists (EDL)");
-    if (extension != ".edl" && !looksLikeEdl(start))
-        return failure(
-            path, 1, "no EDL: it has no TITLE, FCM or event line; import reads CMX 3600 edit decision lists");
+                       "not text but binary data; import reads CMX 3600 edit decision lists (.edl) and "
+                       "legacy text (.ed2)");
+    }
+    if (extension != ".edl" && extension != ".ed2" && !looksLikeEdl(start)) {
+        return failure(path, 1,
+                       "no EDL: it has no TITLE, FCM or event line; import reads CMX 3600 edit decision "
+                       "lists (.edl) and "
+                       "legacy text (.ed2)");
+    }
     return {};
 }
 
@@ -80,26 +92,33 @@ Qx::Status checkContent(const String& path, const String& start) {
 Qx::Status checkImportSource(const String& path, String& resolved) {
     resolved = path;
     Qx::FileInfo info;
-    if (const Qx::FileError error = Qx::fileSystem().info(path, info); error)
+    if (const Qx::FileError error = Qx::fileSystem().info(path, info); error) {
         return Qx::Status::failure(error.text());
+    }
     if (info.kind == Qx::FileKind::Link) {
         std::error_code code;
         const std::filesystem::path target =
             std::filesystem::canonical(std::filesystem::path(path.c_str()), code);
-        if (code)
+        if (code) {
             return failure(path, 0, "the link leads to no file; give the list itself");
+        }
         resolved = target.string();
-        if (const Qx::FileError error = Qx::fileSystem().info(resolved, info); error)
+        if (const Qx::FileError error = Qx::fileSystem().info(resolved, info); error) {
             return Qx::Status::failure(error.text());
+        }
     }
-    if (info.kind == Qx::FileKind::Missing)
+    if (info.kind == Qx::FileKind::Missing) {
         return failure(path, 0, "there is no such file; check the name");
-    if (info.kind == Qx::FileKind::Folder)
+    }
+    if (info.kind == Qx::FileKind::Folder) {
         return failure(path, 0, "this is a folder; give the EDL file in it");
-    if (info.kind != Qx::FileKind::Regular)
+    }
+    if (info.kind != Qx::FileKind::Regular) {
         return failure(path, 0, "not a regular file; save the list to a file and import that");
+    }
     String start;
-    if (const Qx::FileError error = readStart(resolved, start); error)
+    if (const Qx::FileError error = readStart(resolved, start); error) {
         return Qx::Status::failure(error.text());
+    }
     return checkContent(path, start);
 }

@@ -41,11 +41,14 @@ int runCommandLine(int count, char** arguments) {
 
     CommandWork work;
     addImportCommand(app, work);
+    addExportCommand(app, work);
     addListCommand(app, work);
     addShowCommand(app, work);
     addHeaderCommand(app, work);
     addApplyCommand(app, work);
     addDiffCommand(app, work);
+    addVerifyCommand(app, work);
+    addSalvageCommand(app, work);
     addDemoCommand(app, work);
     addCompletionCommand(app, work);
 

@@ -31,15 +31,18 @@ cookie projectOfFolder(const String& folder) {
 cookie projectIn(const String& root) {
     std::vector<String> names;
     if (kindOf(Qx::joinPath(root, kUsualProject.asString())) != Qx::FileKind::Missing ||
-        Qx::fileSystem().list(root, names))
+        Qx::fileSystem().list(root, names)) {
         return kUsualProject;
+    }
     cookie found;
-    for (const String& name : names)
+    for (const String& name : names) {
         if (const cookie project = projectOfFolder(Qx::joinPath(root, name)); project.is_valid()) {
-            if (found.is_valid())
+            if (found.is_valid()) {
                 return kUsualProject;
+            }
             found = project;
         }
+    }
     return found.is_valid() ? found : kUsualProject;
 }
 
@@ -47,8 +50,9 @@ cookie projectIn(const String& root) {
 Qx::Status damage(const String& path, const String& reason) {
     String text = (reason.find(path) == String::npos ? path + ": " : String()) + reason;
     const String backup = path + ".U1";
-    if (Qx::fileExists(backup))
+    if (Qx::fileExists(backup)) {
         text += "; its newest backup is " + backup;
+    }
     return Qx::Status::failure(std::move(text));
 }
 
@@ -56,10 +60,12 @@ Qx::Status damage(const String& path, const String& reason) {
 
 ProjectSession::ProjectSession(const String& option) : m_root(option), m_project(kUsualProject) {
     const char* environment = std::getenv("QMEDIT_PROJECT");
-    if (m_root.empty())
+    if (m_root.empty()) {
         m_root = environment != nullptr && *environment != '\0' ? environment : "./quillmarch-project";
-    while (m_root.size() > 1 && m_root.back() == '/')
+    }
+    while (m_root.size() > 1 && m_root.back() == '/') {
         m_root.pop_back();
+    }
     if (const cookie itself = projectOfFolder(m_root); itself.is_valid()) {
         m_project = itself;
         m_root = Qx::folderOf(m_root);
@@ -86,10 +92,11 @@ void ProjectSession::makeCurrentUnwritten(Qx::FrameRate rate) const {
 }
 
 Qx::Status ProjectSession::openExisting() {
-    if (!exists())
+    if (!exists()) {
         return Qx::Status::failure(
             "there is no project in " + m_root +
             "; name another with --project DIR, or make one with 'qmedit import FILE'");
+    }
     // Settings that are not there are not written by reading.
     if (!Qx::fileExists(Qx::joinPath(folder(), "Project.txt"))) {
         makeCurrentUnwritten({});
@@ -107,8 +114,9 @@ Qx::Status ProjectSession::openExisting() {
 }
 
 Qx::Status ProjectSession::prepare(Qx::FrameRate rateOfFresh) {
-    if (exists())
+    if (exists()) {
         return openExisting();
+    }
     m_rateOfFresh = rateOfFresh;
     makeCurrentUnwritten(rateOfFresh);
     return {};
@@ -117,27 +125,33 @@ Qx::Status ProjectSession::prepare(Qx::FrameRate rateOfFresh) {
 Qx::Status ProjectSession::create() {
     ProjectDetails defaults;
     defaults.name = Qx::fileNameOf(m_root);
-    if (!Qx::isUtf8(defaults.name))
+    if (!Qx::isUtf8(defaults.name)) {
         defaults.name.clear();
-    if (m_rateOfFresh.valid())
+    }
+    if (m_rateOfFresh.valid()) {
         defaults.frameRateCode = m_rateOfFresh.code();
+    }
     ProjectDetails details;
-    if (Qx::Status opened = ProjectDetails::openOrCreate(m_root, m_project, defaults, details); !opened)
+    if (Qx::Status opened = ProjectDetails::openOrCreate(m_root, m_project, defaults, details); !opened) {
         return opened;
+    }
     details.makeCurrent();
-    if (const Qx::Status started = edit_init(); !started)
+    if (const Qx::Status started = edit_init(); !started) {
         reportWarning(started.reason());
+    }
     return {};
 }
 
 Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
     const String path = getFilenameForCookie(item);
-    if (kindOf(path) == Qx::FileKind::Missing)
+    if (kindOf(path) == Qx::FileKind::Missing) {
         return Qx::Status::failure("there is no edit " + item.asString() + " in the project " + m_root +
                                    "; 'qmedit list' shows those there are");
+    }
     EditPtr read(new Edit);
-    if (read->read_file(item, eOpenExisting) != Edit::kReadOk)
+    if (read->read_file(item, eOpenExisting) != Edit::kReadOk) {
         return damage(path, read->lastFileError());
+    }
     edit = read;
     return {};
 }
@@ -162,16 +176,19 @@ ListedEdit ProjectSession::listed(const cookie& item) const {
 
 Qx::Status ProjectSession::list(std::vector<ListedEdit>& edits, std::vector<String>& others) const {
     std::vector<String> names;
-    if (const Qx::FileError error = Qx::fileSystem().list(folder(), names); error)
+    if (const Qx::FileError error = Qx::fileSystem().list(folder(), names); error) {
         return Qx::Status::failure(error.text());
+    }
     for (const String& name : names) {
-        if (Qx::extensionOf(name) != getEditFilenameExt())
+        if (Qx::extensionOf(name) != getEditFilenameExt()) {
             continue;
+        }
         const cookie item(std::string_view(Qx::withoutExtension(name)));
-        if (item.isStorable())
+        if (item.isStorable()) {
             edits.push_back(listed(item));
-        else
+        } else {
             others.push_back(name);
+        }
     }
     return {};
 }
@@ -179,19 +196,22 @@ Qx::Status ProjectSession::list(std::vector<ListedEdit>& edits, std::vector<Stri
 SourceNamer ProjectSession::sourceNamer() {
     return [this](SourceReport& source) {
         const auto [place, added] = m_known.try_emplace(source.strip);
-        if (added)
+        if (added) {
             place->second = look(source.strip);
+        }
         source.name = place->second.name;
         source.problem = place->second.problem;
-        if (source.problem.empty())
+        if (source.problem.empty()) {
             source.dropFrame = place->second.dropFrame;
+        }
     };
 }
 
 ProjectSession::Known ProjectSession::look(const cookie& item) const {
     EditPtr edit;
-    if (const Qx::Status read = readEdit(item, edit); !read)
+    if (const Qx::Status read = readEdit(item, edit); !read) {
         return {{}, read.reason(), false};
+    }
     const bool dropFrame = std::as_const(*edit).Opts().getBool(interchange::EdlKey::kDropFrame);
     return {edit->getName(), {}, dropFrame && edit->getFrameRate().hasDropFrame()};
 }

@@ -50,17 +50,20 @@ size_t decode(std::string_view text, char32_t& point) {
                           : lead < 0xF0 ? 3
                           : lead < 0xF5 ? 4
                                         : 0;
-    if (length == 0 || text.size() < length || !Qx::isUtf8(text.substr(0, length)))
+    if (length == 0 || text.size() < length || !Qx::isUtf8(text.substr(0, length))) {
         return 0;
+    }
     point = length == 1 ? lead : lead & (0x7Fu >> length);
-    for (size_t i = 1; i < length; ++i)
+    for (size_t i = 1; i < length; ++i) {
         point = point << 6 | (static_cast<unsigned char>(text[i]) & 0x3Fu);
+    }
     return length;
 }
 
 int columnsOf(char32_t point) {
-    if (point < 0x300)
+    if (point < 0x300) {
         return 1;
+    }
     return contains(kCombining, point) ? 0 : contains(kWide, point) ? 2 : 1;
 }
 
@@ -74,14 +77,15 @@ String escaped(std::string_view text, bool asciiOnly) {
     while (!text.empty()) {
         char32_t point = 0;
         const size_t length = decode(text, point);
-        if (length == 0)
+        if (length == 0) {
             out += String::format("\\x%02x", static_cast<unsigned>(static_cast<unsigned char>(text[0])));
-        else if (point < 0x20 || point == 0x7F)
+        } else if (point < 0x20 || point == 0x7F) {
             out += String::format("\\x%02x", static_cast<unsigned>(point));
-        else if (point > 0x7F && (asciiOnly || contains(kUnseen, point)))
+        } else if (point > 0x7F && (asciiOnly || contains(kUnseen, point))) {
             out += String::format("\\u{%x}", static_cast<unsigned>(point));
-        else
+        } else {
             out.append(text.substr(0, length));
+        }
         text.remove_prefix(std::max<size_t>(length, 1));
     }
     return out;
@@ -99,8 +103,9 @@ int columns(std::string_view utf8) {
 }
 
 String fitted(std::string_view utf8, int width, std::string_view ellipsis) {
-    if (width <= 0)
+    if (width <= 0) {
         return {};
+    }
     size_t fits = 0;     // bytes that leave the ellipsis its column
     size_t position = 0; // bytes that fit without one
     int used = 0;
@@ -108,12 +113,14 @@ String fitted(std::string_view utf8, int width, std::string_view ellipsis) {
         char32_t point = 0;
         const size_t length = std::max<size_t>(decode(utf8.substr(position), point), 1);
         const int wide = columnsOf(point);
-        if (used + wide > width)
+        if (used + wide > width) {
             return String(utf8.substr(0, fits)) + String(ellipsis);
+        }
         used += wide;
         position += length;
-        if (used < width || ellipsis.empty())
+        if (used < width || ellipsis.empty()) {
             fits = position;
+        }
     }
     return String(utf8);
 }
@@ -121,8 +128,9 @@ String fitted(std::string_view utf8, int width, std::string_view ellipsis) {
 String padded(std::string_view utf8, int width, std::string_view ellipsis, bool right) {
     String text = fitted(utf8, width, ellipsis);
     const int missing = width - columns(text);
-    if (missing > 0)
+    if (missing > 0) {
         text.insert(right ? 0 : text.size(), static_cast<size_t>(missing), ' ');
+    }
     return text;
 }
 

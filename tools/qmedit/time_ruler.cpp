@@ -26,13 +26,17 @@ int64_t framesOfLabel(int64_t count, Qx::FrameRate rate, bool dropFrame) {
 
 /// Labels between two marks: the least of the customary steps that leaves a label its room.
 int64_t stepFor(int64_t least, int64_t nominal) {
-    for (const int64_t frames : {1, 2, 5, 10})
-        if (frames >= least && frames < nominal)
+    for (const int64_t frames : {1, 2, 5, 10}) {
+        if (frames >= least && frames < nominal) {
             return frames;
+        }
+    }
     for (const int64_t seconds :
-         {1, 2, 5, 10, 15, 30, 60, 120, 300, 600, 900, 1800, 3600, 7200, 21600, 43200})
-        if (seconds * nominal >= least)
+         {1, 2, 5, 10, 15, 30, 60, 120, 300, 600, 900, 1800, 3600, 7200, 21600, 43200}) {
+        if (seconds * nominal >= least) {
             return seconds * nominal;
+        }
+    }
     const int64_t day = 24 * 3600 * nominal;
     return (least / day + 1) * day;
 }
@@ -42,21 +46,25 @@ int64_t stepFor(int64_t least, int64_t nominal) {
 std::vector<RulerMark> rulerMarks(const EditReport& report, int columns) {
     std::vector<RulerMark> marks;
     const int64_t length = report.frames(report.duration());
-    if (length <= 0 || columns < 2 || !report.rate.valid())
+    if (length <= 0 || columns < 2 || !report.rate.valid()) {
         return marks;
+    }
     const int64_t step = stepFor(length * kColumnsOfMark / (columns - 1) + 1, report.rate.nominal());
     const int64_t origin = report.frames(report.origin);
     const int64_t first = origin + report.frames(report.start);
     for (int64_t label = std::max<int64_t>(first, 0) / step * step;; label += step) {
         const int64_t frame = framesOfLabel(label, report.rate, report.dropFrame);
         // The last mark keeps room for its label.
-        if (frame > first + length - length * (kColumnsOfMark - 2) / (columns - 1))
+        if (frame > first + length - length * (kColumnsOfMark - 2) / (columns - 1)) {
             break;
-        if (frame >= first)
+        }
+        if (frame >= first) {
             marks.push_back({report.rate.toSeconds(frame - origin),
                              Qx::timecodeText(frame, report.rate, report.dropFrame)});
+        }
     }
-    if (marks.empty())
+    if (marks.empty()) {
         marks.push_back({report.start, report.recordTimecode(report.start)});
+    }
     return marks;
 }

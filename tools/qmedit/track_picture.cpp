@@ -52,40 +52,47 @@ public:
     explicit Row(int columns) : m_cells(static_cast<size_t>(columns)) {}
 
     void set(int column, std::string_view sign, Ink ink) {
-        if (column >= 0 && column < static_cast<int>(m_cells.size()))
+        if (column >= 0 && column < static_cast<int>(m_cells.size())) {
             m_cells[static_cast<size_t>(column)] = {String(sign), ink};
+        }
     }
     /// Lays text over cells, a cell a column; a wide character empties the cell after it.
     void setText(int column, std::string_view text, Ink ink) {
         while (!text.empty()) {
             const size_t length = firstCharacter(text);
             const int wide = safe_text::columns(text.substr(0, length));
-            if (wide == 0 && column > 0)
+            if (wide == 0 && column > 0) {
                 m_cells[static_cast<size_t>(column - 1)].sign.append(text.substr(0, length));
-            else
+            } else {
                 set(column, text.substr(0, length), ink);
-            if (wide == 2)
+            }
+            if (wide == 2) {
                 set(column + 1, "", ink);
+            }
             column += wide;
             text.remove_prefix(length);
         }
     }
     [[nodiscard]] bool blank(int from, int to) const {
-        for (int i = std::max(from, 0); i < to && i < static_cast<int>(m_cells.size()); ++i)
-            if (m_cells[static_cast<size_t>(i)].sign != " ")
+        for (int i = std::max(from, 0); i < to && i < static_cast<int>(m_cells.size()); ++i) {
+            if (m_cells[static_cast<size_t>(i)].sign != " ") {
                 return false;
+            }
+        }
         return to <= static_cast<int>(m_cells.size());
     }
     [[nodiscard]] String text(const Console& console) const {
         size_t end = m_cells.size();
-        while (end > 0 && m_cells[end - 1].sign == " " && m_cells[end - 1].ink == Ink::None)
+        while (end > 0 && m_cells[end - 1].sign == " " && m_cells[end - 1].ink == Ink::None) {
             --end;
+        }
         String out;
         for (size_t i = 0; i < end;) {
             size_t next = i;
             String run;
-            for (; next < end && m_cells[next].ink == m_cells[i].ink; ++next)
+            for (; next < end && m_cells[next].ink == m_cells[i].ink; ++next) {
                 run += m_cells[next].sign;
+            }
             out += console.inked(m_cells[i].ink, run);
             i = next;
         }
@@ -99,8 +106,9 @@ private:
     };
     static size_t firstCharacter(std::string_view text) {
         size_t length = 1;
-        while (length < text.size() && (static_cast<unsigned char>(text[length]) & 0xC0u) == 0x80u)
+        while (length < text.size() && (static_cast<unsigned char>(text[length]) & 0xC0u) == 0x80u) {
             ++length;
+        }
         return length;
     }
     std::vector<Cell> m_cells;
@@ -148,11 +156,14 @@ private:
 
 Picture::Picture(const EditReport& report, const Console& console)
     : m_report(report), m_console(console), m_signs(console.utf8() ? kUtf8Signs : kAsciiSigns) {
-    for (const SourceReport& source : report.sources)
+    for (const SourceReport& source : report.sources) {
         m_labels.push_back(sourceLabel(source, console));
-    for (const ChannelReport& channel : report.channels)
-        if (!channel.isLevels())
+    }
+    for (const ChannelReport& channel : report.channels) {
+        if (!channel.isLevels()) {
             m_nameColumns = std::max(m_nameColumns, safe_text::columns(console.safe(channel.name)));
+        }
+    }
     m_nameColumns = std::min(m_nameColumns, kWidestChannelName);
     m_columns = console.width() - m_nameColumns - 3;
 }
@@ -169,8 +180,9 @@ String Picture::gutter(std::string_view name) const {
 
 void Picture::addLine(std::string_view name, const Row& row) {
     const String body = row.text(m_console);
-    if (name.empty() && body.empty())
+    if (name.empty() && body.empty()) {
         return;
+    }
     m_text += gutter(name) + body + "\n";
 }
 
@@ -185,21 +197,25 @@ void Picture::addRuler() {
 }
 
 void Picture::addCues() {
-    if (m_report.cues.empty())
+    if (m_report.cues.empty()) {
         return;
+    }
     Row row(m_columns);
-    for (const CueReport& cue : m_report.cues)
-        if (cue.time >= m_report.start && cue.time <= m_report.end)
+    for (const CueReport& cue : m_report.cues) {
+        if (cue.time >= m_report.start && cue.time <= m_report.end) {
             row.set(columnOf(cue.time), m_signs.cue, Ink::Cue);
+        }
+    }
     for (const CueReport& cue : m_report.cues) {
         // A marker's text stands beside it only where it is whole and touches no other.
         const String label = m_console.safe(cue.text);
         const int room = safe_text::columns(label) + 2;
         const int column = columnOf(cue.time);
-        if (row.blank(column + 1, column + room))
+        if (row.blank(column + 1, column + room)) {
             row.setText(column + 2, label, Ink::Cue);
-        else if (column >= room && row.blank(column - room, column))
+        } else if (column >= room && row.blank(column - room, column)) {
             row.setText(column - room + 1, label, Ink::Cue);
+        }
     }
     addLine("", row);
 }
@@ -215,44 +231,55 @@ void Picture::addRule(const Lanes* above, const Lanes* below) {
         sign += has(below, &Lanes::stem, i) ? kDown : 0;
         sign += has(above, &Lanes::covered, i - 1) || has(below, &Lanes::covered, i - 1) ? kLeft : 0;
         sign += has(above, &Lanes::covered, i) || has(below, &Lanes::covered, i) ? kRight : 0;
-        if (sign != 0)
+        if (sign != 0) {
             row.set(i, m_signs.rules[sign], Ink::Dim);
+        }
     }
     addLine("", row);
 }
 
 Ink Picture::inkOf(const ChannelReport& channel, const SourceReport& source, size_t index) const {
-    if (source.kind == SourceKind::Black)
+    if (source.kind == SourceKind::Black) {
         return Ink::Black;
-    if (!source.problem.empty())
+    }
+    if (!source.problem.empty()) {
         return Ink::Error;
-    if (channel.type == AudioChan)
+    }
+    if (channel.type == AudioChan) {
         return index % 2 == 0 ? Ink::Audio : Ink::AudioOther;
-    if (channel.subtype == Edit_Chan_SubType::ALIAS || source.kind == SourceKind::Effect)
+    }
+    if (channel.subtype == Edit_Chan_SubType::ALIAS || source.kind == SourceKind::Effect) {
         return Ink::Effect;
+    }
     return index % 2 == 0 ? Ink::Video : Ink::VideoOther;
 }
 
 void Picture::drawFill(const PairReport& pair, int from, int to, Ink ink, Row& row) {
-    for (int i = from; i < to; ++i)
+    for (int i = from; i < to; ++i) {
         row.set(i, ink == Ink::Black ? m_signs.black : " ", ink);
+    }
     int first = from;
     int last = to;
-    if (pair.fadeIn > 0)
+    if (pair.fadeIn > 0) {
         first = std::clamp(columnOf(pair.in + pair.fadeIn), from + 1, to);
-    if (pair.fadeOut > 0)
+    }
+    if (pair.fadeOut > 0) {
         last = std::clamp(columnOf(pair.out - pair.fadeOut), first, std::max(first, to - 1));
-    for (int i = from; i < first; ++i)
+    }
+    for (int i = from; i < first; ++i) {
         row.set(i, m_signs.fadeIn, ink);
-    for (int i = last; i < to; ++i)
+    }
+    for (int i = last; i < to; ++i) {
         row.set(i, m_signs.fadeOut, ink);
+    }
     m_showsFade = m_showsFade || first > from || last < to;
     m_showsBlack = m_showsBlack || ink == Ink::Black;
     const String& label = m_labels[pair.source];
     const int room = last - first;
     // Black is known by its shade; a part of the word would hide it.
-    if (ink == Ink::Black && safe_text::columns(label) > room)
+    if (ink == Ink::Black && safe_text::columns(label) > room) {
         return;
+    }
     const bool spaced = room > safe_text::columns(label) + 1;
     // In a narrow pair every column is worth a letter.
     row.setText(first + (spaced ? 1 : 0),
@@ -264,12 +291,14 @@ void Picture::drawPair(const ChannelReport& channel, size_t index, Row& row, Lan
     const int in = columnOf(pair.in);
     const int out = columnOf(pair.out);
     const bool narrow = in == out;
-    for (int i = in; i < out; ++i)
+    for (int i = in; i < out; ++i) {
         lanes.covered[static_cast<size_t>(i)] = true;
+    }
     for (const int column : {in, out}) {
         const bool dense = narrow && lanes.edge[static_cast<size_t>(column)];
-        if (dense || !lanes.edge[static_cast<size_t>(column)])
+        if (dense || !lanes.edge[static_cast<size_t>(column)]) {
             row.set(column, dense ? m_signs.denseCut : m_signs.cut, Ink::Dim);
+        }
         m_showsDense = m_showsDense || dense;
         lanes.edge[static_cast<size_t>(column)] = true;
         lanes.stem[static_cast<size_t>(column)] = !dense;
@@ -289,8 +318,9 @@ void Picture::drawPair(const ChannelReport& channel, size_t index, Row& row, Lan
 Lanes Picture::addChannel(const ChannelReport& channel) {
     Lanes lanes(static_cast<size_t>(m_columns));
     Row row(m_columns);
-    for (size_t i = 0; i < channel.pairs.size(); ++i)
+    for (size_t i = 0; i < channel.pairs.size(); ++i) {
         drawPair(channel, i, row, lanes);
+    }
     addLine(channel.name.empty() ? "?" : channel.name, row);
     return lanes;
 }
@@ -298,8 +328,9 @@ Lanes Picture::addChannel(const ChannelReport& channel) {
 void Picture::addLegend() {
     std::vector<String> parts;
     const auto add = [&](bool shown, const char* sign, const char* meaning) {
-        if (shown)
+        if (shown) {
             parts.push_back(String(sign) + " " + meaning);
+        }
     };
     add(m_showsCut, m_signs.cut, "cut");
     add(m_showsDense, m_signs.denseCut, "several cuts");
@@ -313,8 +344,9 @@ void Picture::addLegend() {
         line.clear();
     };
     for (const String& part : parts) {
-        if (!line.empty() && safe_text::columns(line) + 3 + safe_text::columns(part) > m_columns)
+        if (!line.empty() && safe_text::columns(line) + 3 + safe_text::columns(part) > m_columns) {
             finish();
+        }
         line += (line.empty() ? "" : "   ") + part;
     }
     finish();
@@ -327,8 +359,9 @@ String Picture::text() {
     bool first = true;
     String rows;
     for (const ChannelReport& channel : m_report.channels) {
-        if (channel.isLevels())
+        if (channel.isLevels()) {
             continue;
+        }
         // The rule between two channels depends on both, so the lower one is drawn before it.
         rows.swap(m_text);
         m_text.clear();
@@ -350,8 +383,9 @@ String joined(const std::vector<String>& parts, const char* separator, int width
     String lines;
     String line;
     for (const String& part : parts) {
-        if (part.empty())
+        if (part.empty()) {
             continue;
+        }
         const String longer = line.empty() ? " " + part : line + separator + part;
         if (!line.empty() && safe_text::columns(longer) > width) {
             lines += line + "\n";
@@ -366,17 +400,20 @@ String joined(const std::vector<String>& parts, const char* separator, int width
 } // namespace
 
 String sourceLabel(const SourceReport& source, const Console& console) {
-    if (!source.problem.empty())
+    if (!source.problem.empty()) {
         return "missing " + source.strip.asString();
+    }
     if (source.kind != SourceKind::Black && source.kind != SourceKind::Effect &&
-        source.kind != SourceKind::Input)
+        source.kind != SourceKind::Input) {
         return source.name.empty() ? source.strip.asString() : console.safe(source.name);
+    }
     return sourceKindText(source.kind);
 }
 
 String trackPicture(const EditReport& report, const Console& console) {
-    if (!(report.duration() > 0))
+    if (!(report.duration() > 0)) {
         return " The edit has no events.\n";
+    }
     return Picture(report, console).text();
 }
 
@@ -395,14 +432,16 @@ String editSummary(const EditReport& report, const Console& console) {
                                      report.recordTimecode(report.end),
                                  report.lengthText(report.duration()) + " long"};
     const auto add = [&](size_t count, const char* kind) {
-        if (count > 0)
+        if (count > 0) {
             parts.push_back(String::format("%zu %s", count, kind));
+        }
     };
     add(effects, "effects");
     add(video, "video");
     add(audio, "audio");
-    if (report.channels.empty())
+    if (report.channels.empty()) {
         parts.push_back("no channels");
+    }
     const String lines = joined(parts, console.utf8() ? " · " : ", ", console.width() - 1);
     const String name = report.name.empty() ? String("(no name)") : console.safe(report.name);
     return " " + console.inked(Ink::Bold, name) + "\n" + lines;

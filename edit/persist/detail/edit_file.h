@@ -36,6 +36,9 @@ void removeNumbered(configb& header, const char* name, int from);
 /// a step that fails says why in one sentence.
 class EditFile {
 public:
+    /// What a salvage does with the parts that fail (edit_salvaging.h).
+    class Salvaging;
+
     /// While it lives, changes of the header and of channels do not dirty the edit: for changes that a load
     /// or a save itself makes.
     class Quiet {
@@ -68,9 +71,15 @@ public:
     /// @{
     static Qx::Status readHeader(Edit& edit);
     static Qx::Status readCues(Edit& edit);
-    static Qx::Status readCels(Edit& edit);
+    /// With `salvaging`, what fails is told there and the rest is read.
+    static Qx::Status readCels(Edit& edit, Salvaging* salvaging = nullptr);
     static Qx::Status readGroups(Edit& edit);
     /// @}
+
+    /// Reads all that is sound of a file into an edit without a file. Fails when that makes no edit.
+    static Qx::Status salvage(Edit& edit, const String& path, Salvaging& salvaging);
+    /// Brings an edit that was salvaged up to date; what fails is told in `lost`.
+    static void convert(Edit& edit, std::vector<String>& lost);
 
     /// \name Writing
     /// @{
@@ -96,8 +105,8 @@ public:
     struct LoadedLevels;
 
 private:
-    static Qx::Status loadCels(Edit& edit, std::vector<LoadedCel>& cels);
+    static Qx::Status loadCels(Edit& edit, std::vector<LoadedCel>& cels, Salvaging* salvaging);
     static Qx::Status loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
-                                 std::vector<LoadedLevels>& levels);
+                                 std::vector<LoadedLevels>& levels, Salvaging* salvaging);
     static Qx::Status setupChannels(Edit& edit, std::vector<LoadedCel>& cels);
 };

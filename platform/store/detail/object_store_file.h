@@ -76,6 +76,9 @@ StoreVerdict judgeStoreHeader(std::span<const std::byte> bytes, uint64_t fileSiz
 /// Reads the table of a file; the header need not be sound. Judges the table's place, checksum, names and
 /// form, not the places that it tells of.
 StoreVerdict readStoreTable(std::span<const std::byte> file, std::vector<StoredObject>& objects);
+/// The rows from `offset` on that read, up to the first that does not, whatever the table's checksum says.
+/// Only those whose object's bytes have the checksum that the row tells.
+std::vector<StoredObject> readSoundRows(std::span<const std::byte> file, uint64_t offset);
 /// Judges where the objects lie and that every byte between them is zero.
 StoreVerdict judgeStorePlaces(std::span<const std::byte> file, std::span<const StoredObject> objects);
 /// What is wrong with one object's bytes; empty when they are within the file and as they were written.

@@ -11,6 +11,17 @@ namespace Qx::detail {
 Status salvageStore(const String& path, StoreImage& image, std::vector<StoredObject>& objects,
                     std::vector<String>& complaints, StoreVerdict& verdict);
 
+/// An object that was found in a file without a whole table.
+struct ScannedObject {
+    StoredObject object;   ///< its name and layer are empty where no row tells them
+    std::string_view form; ///< the short name of its most derived layer; empty where its bytes do not tell it
+};
+
+/// Looks for objects in a file whose table is not whole, in the order of the file. Rows of the table that
+/// read and whose checksum fits come first; the rest of the file is searched at each place where an object
+/// may begin for a packed hierarchy of layers.
+std::vector<ScannedObject> scanStore(std::span<const std::byte> file);
+
 StoredObjectInfo infoOf(const StoredObject& object, const String& complaint);
 
 } // namespace Qx::detail

@@ -1,8 +1,10 @@
 // The packed form, and streams that lie.
 
 #include "edit/model/cel.h"
+#include "platform/media/level_store.h"
 #include "platform/store/pstream.h"
 #include "support/cel_layout.h"
+#include "support/memory_meter.h"
 
 #include <gtest/gtest.h>
 
@@ -121,6 +123,29 @@ TEST(CelStream, RandomDamageNeverMakesABadCel) {
             ASSERT_EQ(its.numEvents(), 0) << "seed " << seed;
         }
     }
+}
+
+TEST(CelStream, UnpackingTakesBoundedMemory) {
+    cel its;
+    Aud::DynamicLevelControl::Store levels;
+    for (int i = 0; i < 20'000; ++i) {
+        ASSERT_NE(its.appendEventPair(cookie("E0001000"), 0, i, 1).valid(), 0);
+        levels.insertNode(i, 0.5F);
+    }
+    const auto within = [](const Bytes& bytes, auto& into) {
+        const test::MemoryMeter meter;
+        PStream stream{std::span<const std::byte>(bytes)};
+        into.unpack(stream);
+        EXPECT_TRUE(stream.good());
+        EXPECT_LE(meter.peak(), 4 * bytes.size() + (64U << 10));
+    };
+    cel readCel;
+    within(packed(its), readCel);
+    PStream stream;
+    levels.pack(stream);
+    Aud::DynamicLevelControl::Store readLevels;
+    within(stream.bytes(), readLevels);
+    EXPECT_EQ(readLevels, levels);
 }
 
 TEST(CelStream, AnOpenPairIsNotPacked) {

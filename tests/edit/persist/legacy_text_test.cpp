@@ -51,6 +51,20 @@ TEST_F(LegacyTextTest, ExportImportExportGivesTheSameText) {
     expectRoundTrips(40);
 }
 
+TEST_F(LegacyTextTest, HeaderTextsThatLookLikeSectionsAreNone) {
+    Edit edit;
+    edit.set_cookie(cookie(test::kItem));
+    edit.addChan(VideoChan);
+    edit.setName("CUE_LIST_ENTRIES 7");
+    edit.Opts().setString("CHANNEL_NAME V", "CHANNEL_NAME A1 SUBTYPE:NONE");
+    const String first = textOf(edit);
+    Edit read;
+    ASSERT_TRUE(read.readFromLegacyFile(path())) << read.lastFileError();
+    EXPECT_EQ(read.getNumChans(), 1);
+    EXPECT_EQ(read.getName(), edit.getName());
+    EXPECT_EQ(textOf(read, "again.ed2"), first);
+}
+
 TEST_F(LegacyTextTest, ForeignLocalesChangeNothing) {
     int tried = 0;
     for (const char* name : {"de_DE.UTF-8", "tr_TR.UTF-8", "de_DE.utf8", "tr_TR.utf8"}) {

@@ -1,5 +1,6 @@
 #include "cue_fixture.h"
 #include "support/recording_log.h"
+#include "support/temporary_folder.h"
 
 #include <algorithm>
 #include <gtest/gtest.h>
@@ -302,17 +303,27 @@ TEST(ChannelGroups, RandomChannelAndGroupChangesKeepTheInvariants) {
     for (unsigned seed = 1; seed <= 12; ++seed) {
         SCOPED_TRACE("seed " + std::to_string(seed));
         std::mt19937 random(seed);
-        const Tracks t(4, 24, 32);
-        Edit& edit = *t.edit;
+        const test::TemporaryFolder folder;
+        EditPtr current = Tracks(4, 24, 32).edit;
+        current->set_cookie(cookie("E0001000"));
         const auto below = [&random](unsigned n) { return static_cast<unsigned>(random() % n); };
         const auto anyChan = [&] {
-            return edit.getId(static_cast<int>(below(static_cast<unsigned>(edit.getNumChans()))));
+            return current->getId(static_cast<int>(below(static_cast<unsigned>(current->getNumChans()))));
         };
-        for (int i = 0; i < edit.getNumChans(); ++i) {
-            edit.get_cues().add_cue_point(test::marker(edit.getId(i).asString().c_str(), i, i));
+        for (int i = 0; i < current->getNumChans(); ++i) {
+            current->get_cues().add_cue_point(test::marker(current->getId(i).asString().c_str(), i, i));
         }
         NaiveGroups naive;
         for (int step = 0; step < 300; ++step) {
+            if (step % 30 == 29) {
+                // What goes on is the edit as it was saved and read again.
+                current->set_dirty(true);
+                const WString path = Qx::widen(folder.path("E0001000.qme"));
+                ASSERT_TRUE(current->write_file(path)) << current->lastFileError();
+                current = new Edit;
+                ASSERT_EQ(current->readFile(path, eOpenExisting), Edit::kReadOk) << current->lastFileError();
+            }
+            Edit& edit = *current;
             const IdStamp chan = anyChan();
             switch (below(6)) {
             case 0: {
@@ -347,7 +358,7 @@ TEST(ChannelGroups, RandomChannelAndGroupChangesKeepTheInvariants) {
                 naive.group(chans);
             }
             }
-            ASSERT_EQ(t.groups(), naive.groups) << "step " << step;
+            ASSERT_EQ(contents(*edit.retrieveGroupsList()), naive.groups) << "step " << step;
             std::set<IdStamp> grouped;
             for (const auto& group : naive.groups) {
                 ASSERT_GT(group.size(), 1u);

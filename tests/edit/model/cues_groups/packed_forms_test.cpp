@@ -1,4 +1,5 @@
 #include "cue_fixture.h"
+#include "support/memory_meter.h"
 
 #include <gtest/gtest.h>
 #include <limits>
@@ -176,6 +177,15 @@ TEST(PackedGroups, SmallGroupsAreDroppedAndBadFormsRefused) {
 
 namespace {
 
+/// Unpacks, and sees that it takes no more memory than four times the input and a constant.
+template <typename List>
+bool unpackedWithinBounds(List& list, const std::vector<std::byte>& bytes) {
+    const test::MemoryMeter meter;
+    const bool good = unpacked(list, bytes);
+    EXPECT_LE(meter.peak(), 4 * bytes.size() + (64u << 10)) << bytes.size() << " bytes";
+    return good;
+}
+
 /// Ten million bytes, half of them random and half good forms with random damage, in pieces.
 template <typename List>
 void throwBytesAt(const List& good, unsigned seed) {
@@ -198,7 +208,7 @@ void throwBytesAt(const List& good, unsigned seed) {
         }
         thrown += bytes.size();
         List list;
-        if (unpacked(list, bytes)) {
+        if (unpackedWithinBounds(list, bytes)) {
             List again;
             ASSERT_TRUE(unpacked(again, packed(list))) << "seed " << seed << " at " << thrown;
             ASSERT_EQ(packed(again), packed(list)) << "seed " << seed << " at " << thrown;
@@ -209,6 +219,35 @@ void throwBytesAt(const List& good, unsigned seed) {
 }
 
 } // namespace
+
+TEST(PackedForms, TheSmallestItemsTakeBoundedMemory) {
+    // What is smallest in a stream grows the most in memory.
+    cue_list cues;
+    cues.add_cue_point(test::marker("", 0));
+    auto many = packed(cues);
+    const std::vector<std::byte> cue(many.begin() + 4, many.end() - 4);
+    const std::vector<std::byte> end(many.end() - 4, many.end());
+    constexpr unsigned kItems = 50'000;
+    const auto repeated = [](const std::vector<std::byte>& item, const std::vector<std::byte>& tail) {
+        PStream stream;
+        stream.setUnsignedLong(kItems);
+        for (unsigned i = 0; i < kItems; ++i) {
+            stream.setRaw(item.data(), item.size());
+        }
+        stream.setRaw(tail.data(), tail.size());
+        return stream.bytes();
+    };
+    cue_list readCues;
+    EXPECT_TRUE(unpackedWithinBounds(readCues, repeated(cue, end)));
+    EXPECT_EQ(readCues.get_num_cue_points(0), kItems);
+
+    ChannelGroupList groups;
+    groups.addGroup({IdStamp::fresh(IdStampMagic::Channel), IdStamp::fresh(IdStampMagic::Channel)},
+                    ChannelGroup::eStereo);
+    many = packed(groups);
+    ChannelGroupList readGroups;
+    EXPECT_TRUE(unpackedWithinBounds(readGroups, repeated({many.begin() + 4, many.end()}, {})));
+}
 
 TEST(PackedForms, TenMillionRandomBytes) {
     throwBytesAt(manyCues(), 11);

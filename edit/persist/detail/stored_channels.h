@@ -1,0 +1,41 @@
+#pragma once
+
+#include "edit/persist/detail/edit_file.h"
+
+/// Which cel the store's bytes under each Celid name were made from, and with which channel information: a
+/// cel keeps its bytes only under the name and with the information that they hold.
+struct Edit::StoredCels {
+    struct Entry {
+        std::weak_ptr<const cel> content;
+        String name;
+        IdStamp id;
+        String subType;
+        String materialInfo;
+    };
+    std::vector<Entry> entries;
+
+    [[nodiscard]] bool holds(size_t number, const Entry& wanted) const {
+        if (number >= entries.size()) {
+            return false;
+        }
+        const Entry& entry = entries[number];
+        return entry.content.lock() == wanted.content.lock() && entry.name == wanted.name &&
+               entry.id == wanted.id && entry.subType == wanted.subType &&
+               entry.materialInfo == wanted.materialInfo;
+    }
+};
+
+/// A cel as it was read, before it is a channel.
+struct EditFile::LoadedCel {
+    Qx::Ptr<cel> content;
+    Edit::ChanType type;
+    bool ownName = false;      ///< its name was given to the channel, not made from its place
+    bool kindIsStated = false; ///< the header says what kind of channel it is
+};
+
+/// A levels cel that has its audio channel.
+struct EditFile::LoadedLevels {
+    AudLevelsCel levels;
+    IdStamp audio;
+    String name; ///< empty unless the levels channel has one of its own
+};

@@ -1,0 +1,344 @@
+#include "edit/persist/edit_salvage.h"
+
+#include "edit/model/channel_group_list.h"
+#include "edit/persist/detail/edit_salvaging.h"
+#include "platform/base/attrib_value_pair.h"
+#include "platform/store/edit_header_proxy.h"
+
+#include <exception>
+
+// ---- what is lost
+
+void EditFile::Salvaging::setUnsound(const std::vector<StoredObjectInfo>& objects) {
+    for (const StoredObjectInfo& object : objects) {
+        m_unsound.emplace(object.name, object.reason);
+    }
+}
+
+void EditFile::Salvaging::begin(Edit& edit, bool headerLost) {
+    m_edit = &edit;
+    m_headerLost = headerLost;
+}
+
+bool EditFile::Salvaging::loseIfUnsound(const String& object, const String& part) {
+    const auto found = m_unsound.find(object);
+    if (found == m_unsound.end()) {
+        return false;
+    }
+    lose(part + ": " + found->second);
+    m_unsound.erase(found);
+    return true;
+}
+
+int EditFile::Salvaging::lastCel() const {
+    int last = -1;
+    const String prefix = EditKeys::kCelid;
+    const auto look = [&](const String& name) {
+        int number = 0;
+        if (name.starts_with(prefix) && Qx::textToInt(std::string_view(name).substr(prefix.size()), number) &&
+            EditKeys::numbered(EditKeys::kCelid, number) == name && number < kMostCels) {
+            last = std::max(last, number);
+        }
+    };
+    for (const String& name : m_edit->m_store.names()) {
+        look(name);
+    }
+    for (const auto& [name, why] : m_unsound) {
+        look(name);
+    }
+    // A channel whose object is gone altogether is known by its kind.
+    for (int n = last + 1;
+         n < kMostCels && m_edit->m_header.contains(EditKeys::numbered(EditKeys::kCelKind, n)); ++n) {
+        last = n;
+    }
+    return last;
+}
+
+char EditFile::Salvaging::kindOf(int number) const {
+    const String kind = m_edit->m_header.getString(EditKeys::numbered(EditKeys::kCelKind, number));
+    return kind.empty() ? '?' : kind.front();
+}
+
+// The number from 1 of an audio channel among its kind.
+int EditFile::Salvaging::audioIndex(int number) const {
+    int index = 1;
+    for (int n = 0; n < number; ++n) {
+        index += kindOf(n) == 'A' ? 1 : 0;
+    }
+    return index;
+}
+
+// The name that a channel has by its place. One of its own lies in its cel.
+String EditFile::Salvaging::channelName(int number) const {
+    switch (kindOf(number)) {
+    case 'V':
+        // Both are of this kind, so that the number of neither is known from its place.
+        return "a video or effects channel";
+    case 'A': {
+        const bool named =
+            m_edit->m_header.getString(EditKeys::numbered(EditKeys::kCelKind, number)).find(' ') !=
+            String::npos;
+        return "channel A" + std::to_string(audioIndex(number)) + (named ? " (with a name of its own)" : "");
+    }
+    default:
+        return "a channel";
+    }
+}
+
+void EditFile::Salvaging::renumberHeader() {
+    if (!m_celsLost || m_headerLost) {
+        return;
+    }
+    configb& header = m_edit->m_header;
+    const struct {
+        const char* name;
+        bool isAudio; ///< goes by the number of the audio channel
+        bool isDouble;
+    } keys[] = {{EditKeys::kSyncLoss, false, true},
+                {EditKeys::kSyncError, true, true},
+                {EditKeys::kSoundOutput, true, false},
+                {EditKeys::kSoundOutputXFade, true, false}};
+    for (const auto& key : keys) {
+        const configb before(header);
+        EditKeys::removeNumbered(header, key.name, 0);
+        int audio = 0;
+        for (size_t i = 0; i < m_read.size(); ++i) {
+            const bool isAudio = kindOf(m_read[i]) == 'A';
+            audio += isAudio ? 1 : 0;
+            const String from = EditKeys::numbered(key.name, key.isAudio ? audioIndex(m_read[i]) : m_read[i]);
+            const String to = EditKeys::numbered(key.name, key.isAudio ? audio : static_cast<int>(i));
+            if (!before.contains(from) || (key.isAudio && !isAudio)) {
+                continue;
+            }
+            if (key.isDouble) {
+                header.setDouble(to, before.getDouble(from));
+            } else {
+                header.setInt(to, before.getInt(from));
+            }
+        }
+    }
+}
+
+void EditFile::Salvaging::celMissing(int number) {
+    const String object = EditKeys::numbered(EditKeys::kCelid, number);
+    const String part = channelName(number) + " (object " + object + ")";
+    m_celsLost = true;
+    if (!loseIfUnsound(object, part)) {
+        lose(part + ": the file does not hold it");
+    }
+}
+
+void EditFile::Salvaging::celFailed(int number, const String& why) {
+    m_celsLost = true;
+    lose(channelName(number) + ": " + why);
+}
+
+String EditFile::Salvaging::levelsName(int number) const {
+    const String own = m_edit->m_header.getString(EditKeys::numbered(EditKeys::kLevelsName, number));
+    return own.empty() ? "levels " + std::to_string(number + 1) : "levels \"" + own + "\"";
+}
+
+void EditFile::Salvaging::levelsMissing(int number, bool hasAudio) {
+    const Qx::AttribValuePair pair(
+        std::string_view(m_edit->m_header.getString(EditKeys::numbered(EditKeys::kLevels, number))));
+    const String part = levelsName(number);
+    // Levels that outlived their audio channel are no damage.
+    if (!loseIfUnsound(pair.attrib(), part) && (hasAudio || m_celsLost)) {
+        lose(part + (hasAudio ? ": the file does not hold them" : ": their audio channel is lost"));
+    }
+}
+
+void EditFile::Salvaging::levelsFailed(int number, const String& why) {
+    lose(levelsName(number) + ": " + why);
+}
+
+void EditFile::Salvaging::celRead(int number, const LoadedCel& loaded) {
+    m_read.push_back(number);
+    m_audioSeen = m_audioSeen || loaded.type.type == AudioChan;
+}
+
+bool EditFile::Salvaging::guessKind(LoadedCel& loaded) {
+    const cel& content = *loaded.content;
+    const String& name = content.editChannelName();
+    const bool byPlace = name.size() > 1 && (name.front() == 'V' || name.front() == 'A') &&
+                         name.find_first_not_of("0123456789", 1) == String::npos;
+    if (!m_headerLost || byPlace || content.is_good_cel() == 0 || !content.editChannelId().valid() ||
+        content.editChannelSubType() != Edit::subTypeText(Edit_Chan_SubType::NONE)) {
+        return false;
+    }
+    loaded.type = {m_audioSeen ? AudioChan : VideoChan, Edit_Chan_SubType::NONE};
+    loaded.ownName = true;
+    loaded.kindIsStated = true;
+    lose("channel \"" + name + "\": its kind is lost with the header; taken for " +
+         (m_audioSeen ? "an audio" : "a video") + " channel");
+    return true;
+}
+
+void EditFile::Salvaging::finish() {
+    while (!m_unsound.empty()) {
+        loseIfUnsound(String(m_unsound.begin()->first), "object " + m_unsound.begin()->first);
+    }
+}
+
+// ---- reading
+
+namespace {
+
+/// The labels of objects that are found without a table.
+TagBag::ScanLabel labelOf(std::string_view form, size_t before) {
+    const EditHeaderProxy header;
+    const cue_list cues;
+    const ChannelGroupList groups;
+    const cel content;
+    if (form == content.shortLayerName()) {
+        return {EditKeys::numbered(EditKeys::kCelid, static_cast<int>(before)), content.layerName()};
+    }
+    if (form == header.shortLayerName() && before == 0) {
+        return {EditHeaderProxy::EditHeaderId, header.layerName()};
+    }
+    if (form == cues.shortLayerName() && before == 0) {
+        return {EditKeys::kCues, cues.layerName()};
+    }
+    if (form == groups.shortLayerName() && before == 0) {
+        return {ChannelGroupList::Id, groups.layerName()};
+    }
+    return {};
+}
+
+} // namespace
+
+// Opens the store with what can be had of it.
+static Qx::Status openDamaged(TagBag& store, const String& path, EditFile::Salvaging& salvaging) {
+    std::vector<StoredObjectInfo> objects;
+    const TagBag::OpenResult result = store.openSalvaging(path, objects);
+    if (result == TagBag::Opened) {
+        std::vector<StoredObjectInfo> all;
+        String damage;
+        const Qx::Status examined = examineStore(path, all, damage);
+        if (examined && !damage.empty() && objects.empty()) {
+            salvaging.lose(damage); // what is wrong is no object's
+        }
+        salvaging.setUnsound(objects);
+        return {};
+    }
+    const String why = store.openError();
+    if (result != TagBag::Damaged || !salvaging.mayScan()) {
+        return Qx::Status::failure(why);
+    }
+    if (store.openScanning(path, labelOf, objects) != TagBag::Opened) {
+        return Qx::Status::failure(why + "; no object could be found in it either");
+    }
+    salvaging.lose("the table of the objects: " + why);
+    for (const StoredObjectInfo& object : objects) {
+        salvaging.lose("object " + object.name + " is doubtful: it was found by its form, and " +
+                       object.reason);
+    }
+    return {};
+}
+
+Qx::Status EditFile::salvage(Edit& edit, const String& path, Salvaging& salvaging) {
+    const Quiet quiet(edit);
+    reset(edit);
+    edit.m_initialising = true;
+    if (Qx::Status opened = openDamaged(edit.m_store, path, salvaging); !opened) {
+        return opened;
+    }
+    const Qx::Status header = readHeader(edit);
+    salvaging.begin(edit, !header);
+    if (!header && !salvaging.loseIfUnsound(EditHeaderProxy::EditHeaderId, "the header")) {
+        salvaging.lose("the header: " + header.reason());
+    }
+    if (!salvaging.loseIfUnsound(EditKeys::kCues, "the cues")) {
+        if (Qx::Status cues = readCues(edit); !cues) {
+            salvaging.lose("the cues: " + cues.reason());
+            edit.m_store.removeObject(EditKeys::kCues);
+        }
+    }
+    if (Qx::Status cels = readCels(edit, &salvaging); !cels) {
+        return cels;
+    }
+    // The cels have other numbers where some are lost: none is to be taken over as the bytes it was.
+    edit.m_storedCels.reset();
+    for (const String& name : edit.m_store.names()) {
+        if (name.starts_with(EditKeys::kCelid)) {
+            edit.m_store.removeObject(name);
+        }
+    }
+    salvaging.renumberHeader();
+    for (const char* name : {ChannelGroupList::Id, ChannelGroupList::IdForDefaultGrouping}) {
+        salvaging.loseIfUnsound(name, name == ChannelGroupList::Id ? "the channel groups"
+                                                                   : "the default channel groups");
+    }
+    while (true) {
+        const Qx::Status groups = readGroups(edit);
+        if (groups) {
+            break;
+        }
+        salvaging.lose("the channel groups: " + groups.reason());
+        for (const char* name : {ChannelGroupList::Id, ChannelGroupList::IdForDefaultGrouping}) {
+            if (edit.m_store.contains(name) && edit.m_store.openObject(name) == nullptr) {
+                edit.m_store.removeObject(name);
+            }
+        }
+    }
+    salvaging.finish();
+    edit.getInfoFromHeader();
+    return {};
+}
+
+static Qx::Status salvageInto(const String& path, EditPtr& edit, std::vector<String>& lost, bool mayScan) {
+    EditPtr read(new Edit);
+    EditFile::Salvaging salvaging(lost, mayScan);
+    if (Qx::Status status = EditFile::salvage(*read, path, salvaging); !status) {
+        return status;
+    }
+    EditFile::convert(*read, lost);
+    edit = read;
+    return {};
+}
+
+void EditFile::convert(Edit& edit, std::vector<String>& lost) {
+    try {
+        edit.doEditConversions();
+    } catch (const std::exception& error) {
+        lost.push_back(String("bringing the edit up to date failed: ") + error.what());
+    }
+}
+
+void verifyEditFile(const String& path, std::vector<String>& faults) {
+    EditPtr edit;
+    std::vector<String> found;
+    const Qx::Status status = salvageInto(path, edit, found, false);
+    faults.insert(faults.end(), found.begin(), found.end());
+    if (!status) {
+        faults.push_back(status.reason());
+        return;
+    }
+    // Objects that nothing above reads are sound unless their class is known and refuses them.
+    TagBag& store = edit->objectStore();
+    for (const String& name : store.names()) {
+        const bool cue = name == EditKeys::kCues || name == EditHeaderProxy::EditHeaderId;
+        const bool known = cue || name.starts_with(EditKeys::kCelid);
+        if (!known && store.openObject(name) == nullptr &&
+            store.objectError().find("does not know") == String::npos) {
+            faults.push_back(store.objectError());
+        }
+    }
+}
+
+Qx::Status salvageEdit(const String& path, EditPtr& edit, std::vector<String>& lost) {
+    EditPtr read;
+    std::vector<String> found;
+    if (Qx::Status status = salvageInto(path, read, found, true); !status) {
+        return status;
+    }
+    read->set_cookie(invalid_cookie);
+    configb& header = read->Opts();
+    header.setInt("IS_BACKUP", 0);
+    header.setCookie("UNDO_COOKIE", invalid_cookie);
+    header.setCookie("REDO_COOKIE", invalid_cookie);
+    read->init_dirty();
+    lost.insert(lost.end(), found.begin(), found.end());
+    edit = read;
+    return {};
+}

@@ -1,0 +1,69 @@
+#include "support/memory_meter.h"
+
+#include <atomic>
+#include <cstdlib>
+#include <malloc.h>
+#include <new>
+
+namespace {
+
+std::atomic<size_t> held{0};
+std::atomic<size_t> most{0};
+std::atomic<size_t> allocations{0};
+
+void* take(size_t size) {
+    void* const memory = std::malloc(size == 0 ? 1 : size);
+    if (memory == nullptr) {
+        throw std::bad_alloc();
+    }
+    ++allocations;
+    const size_t now = held += malloc_usable_size(memory);
+    size_t before = most;
+    while (before < now && !most.compare_exchange_weak(before, now)) {
+    }
+    return memory;
+}
+
+void giveBack(void* memory) noexcept {
+    if (memory != nullptr) {
+        held -= malloc_usable_size(memory);
+        std::free(memory);
+    }
+}
+
+} // namespace
+
+void* operator new(size_t size) {
+    return take(size);
+}
+void* operator new[](size_t size) {
+    return take(size);
+}
+void operator delete(void* memory) noexcept {
+    giveBack(memory);
+}
+void operator delete[](void* memory) noexcept {
+    giveBack(memory);
+}
+void operator delete(void* memory, size_t) noexcept {
+    giveBack(memory);
+}
+void operator delete[](void* memory, size_t) noexcept {
+    giveBack(memory);
+}
+
+namespace test {
+
+MemoryMeter::MemoryMeter() : m_before(held), m_allocationsBefore(allocations) {
+    most = m_before;
+}
+
+size_t MemoryMeter::peak() const {
+    return most - m_before;
+}
+
+size_t MemoryMeter::numAllocations() const {
+    return allocations - m_allocationsBefore;
+}
+
+} // namespace test

@@ -1,0 +1,23 @@
+#pragma once
+
+#include <cstddef>
+
+namespace test {
+
+/// Measures what is taken from the heap through `operator new` in this process, all threads together. A
+/// program that uses it lists support/memory_meter.cpp among its sources.
+class MemoryMeter {
+public:
+    /// Measures from here.
+    MemoryMeter();
+    /// The most that was held at once since then, in bytes beyond what was held before.
+    [[nodiscard]] size_t peak() const;
+    /// How often memory was asked for since then.
+    [[nodiscard]] size_t numAllocations() const;
+
+private:
+    size_t m_before;
+    size_t m_allocationsBefore;
+};
+
+} // namespace test
