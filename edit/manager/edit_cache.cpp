@@ -11,16 +11,9 @@ void edit_manager::limitEditCache(int limit) {
         return;
     }
     for (const auto& [item, entry] : state.cache) {
-        if (!entry->edit.valid() || entry->edit->refCount() > 1) {
-            continue;
-        }
-        // Nobody else has the edit, so its section is free.
-        bool written = false;
-        {
-            const ManagerState::Hold section(entry->edit->section());
-            written = state.write(*entry);
-        }
-        if (written) {
+        // An edit that is never written and holds changes stays.
+        if (entry->edit.valid() && state.writeUnreferenced(*entry) == ManagerState::Unreferenced::Written &&
+            !entry->edit->isDirty(true)) {
             evicted = state.removeCacheEntry(entry->item);
             return;
         }

@@ -127,14 +127,14 @@ void closeUnreferenced(Vector<cookie>& held) {
     const ManagerState::Hold hold(state.lock);
     for (auto place = state.cache.begin(); place != state.cache.end();) {
         ManagerState::CachedEdit& entry = *place->second;
-        if (entry.edit.valid() && entry.edit->refCount() > 1) {
-            held.push_back(entry.item);
-            ++place;
-            continue;
-        }
         if (entry.edit.valid()) {
-            const ManagerState::Hold section(entry.edit->section());
-            if (!state.write(entry)) {
+            const ManagerState::Unreferenced outcome = state.writeUnreferenced(entry);
+            if (outcome == ManagerState::Unreferenced::InUse) {
+                held.push_back(entry.item);
+                ++place;
+                continue;
+            }
+            if (outcome == ManagerState::Unreferenced::NotWritten) {
                 reportLost(entry.item);
             }
         }
@@ -147,6 +147,12 @@ void closeUnreferenced(Vector<cookie>& held) {
 
 void edit_manager::close_all_edits() {
     ManagerState& state = managerState();
+    EditPtr projectEdit; // opened again when it is asked for
+    {
+        const ManagerState::Hold hold(state.lock);
+        std::swap(projectEdit, state.projectEdit);
+    }
+    projectEdit.invalidate();
     Vector<cookie> held;
     closeUnreferenced(held);
     for (const cookie& item : held) {

@@ -89,7 +89,7 @@ int EditInfo::m_get_event_count(int chan) const {
 }
 
 int EditInfo::m_get_channel_type(int chan) const {
-    return ed().valid() ? m_edit->getChanType(chan) : NoChan;
+    return static_cast<int>(ed().valid() ? m_edit->getChanType(chan) : NoChan);
 }
 
 bool EditInfo::hasLetter(char letter) const {

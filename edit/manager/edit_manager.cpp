@@ -70,25 +70,15 @@ edit_manager::~edit_manager() {
     if (uiDelete) {
         uiDelete(true);
     }
-    EditPtr projectEdit;
-    {
-        const ManagerState::Hold hold(state.lock);
-        std::swap(projectEdit, state.projectEdit);
-    }
-    projectEdit.invalidate();
+    state.instance = nullptr; // from here on nothing opens any more
     close_all_edits();
     state.records.close();
+    EditRegistry::install(nullptr);
     const ManagerState::Hold hold(state.lock);
     state.project = invalid_cookie;
     state.projectGeneration = 0;
-    {
-        const std::lock_guard holdDirty(state.dirtyMutex);
-        state.dirty.clear();
-    }
-    if (state.instance.load() == this) {
-        state.instance = nullptr;
-        EditRegistry::install(nullptr);
-    }
+    const std::lock_guard holdDirty(state.dirtyMutex);
+    state.dirty.clear();
 }
 
 edit_manager* edit_manager::theEditManager() {
@@ -101,10 +91,8 @@ void edit_manager::theEditManager(edit_manager* manager) {
         return;
     }
     delete present;
-    if (manager != nullptr) {
-        managerState().instance = manager;
-        EditRegistry::install(manager);
-    }
+    managerState().instance = manager;
+    EditRegistry::install(manager);
 }
 
 void edit_exit() {

@@ -27,25 +27,34 @@ struct EditCacheEntry {
 /// cached, falls back to its backups when its file is missing or unreadable, writes changed edits, keeps
 /// their revisions, and tells the rest of the system when the project changes, changes are flushed, the cache
 /// is dropped or an edit is deleted. What it leaves to others: reading and writing a file (`Edit`), the
-/// numbered files beside one
-/// (`RevisionChain`), milestone copies (`MilestoneRing`), the project's records (`projdb`).
+/// numbered files beside one (`RevisionChain`), milestone copies (`MilestoneRing`), the project's records
+/// (`projdb`).
 ///
 /// All operations are static; the one instance exists for its roles towards others: it is the model's
 /// `EditRegistry` and hears messages of other seats. Without an instance opening yields a null handle.
 ///
-/// Threads: any thread may call anything. One recursive lock guards the cache, the dirty list, the project
-/// edit and every write of an edit file made here; it is never held while a file is read. Openings of one
-/// item take turns. An edit itself is not locked: who changes it while another thread flushes must hold its
-/// section, as the flush does.
+/// Threads: any thread may call anything. One recursive lock guards the cache, the project edit and every
+/// write of an edit file made here; it is never held while an edit file is read. Openings of one item take
+/// turns. An edit itself is not locked: who changes it while another thread flushes must hold its section, as
+/// the flush does. Under an edit's section every operation may be called but those that write many edits
+/// (`flush_changes`, `close_all_edits`, undo and redo, which flush, and leaving a project): they take the
+/// sections of others. Observers are told under none of the manager's locks.
+///
+/// Processes: what is written, renamed and deleted here is so under the project's `EditManagerLock`. A file
+/// that another process put in an edit's place since it was read is never lost: it becomes an undo backup
+/// when the edit is written.
 ///
 /// Nothing here throws.
 class QM_API edit_manager : public EditRegistry {
 public:
-    /// Replaces any manager there is, clears network mode and becomes the model's registry. Settings are read
-    /// here: "backup_depth" (10, at least 1).
+    /// Destroys any manager there is (which must have been made with `new`), clears network mode and becomes
+    /// the model's registry, with an empty cache. "backup_depth" (10, at least 1) is read here, and
+    /// "edit_cache_size" (-1, no limit) at the first opening. For a user with the network right it hears the
+    /// messages of the service that is in place: an edit that another seat stored is read again, one that it
+    /// deleted leaves the cache.
     edit_manager();
-    /// Shuts down: flushes when the crash flag is set, brings the project's records up to date if the
-    /// platform agrees, calls the user interface's delete callback, closes every edit.
+    /// Shuts down: flushes when the crash flag is set, brings the project's records up to date if they are
+    /// open and the platform agrees, calls the user interface's delete callback, closes every edit.
     ~edit_manager() override;
 
     [[nodiscard]] static edit_manager* theEditManager();
@@ -65,26 +74,33 @@ public:
     /// How many items the cache has, remembered failures included.
     [[nodiscard]] static size_t numCached();
     /// With `limit` not -1 and at least `limit` entries: writes and drops the first edit, in the order of
-    /// cookies, that nobody but the cache holds. At most one a call. An edit that cannot be written stays.
+    /// cookies, that nobody but the cache holds. At most one a call. An edit with changes that cannot be
+    /// written stays, and the next one is tried.
     static void limitEditCache(int limit);
     /// Drops an edit from the cache, unwritten, so that the next opening reads its file; forgets a remembered
     /// failure. Handles that others hold stay usable, but their edit is no longer the item's: changes to it
     /// are not written any more. Observers hear "editmanInvalidateCache" first. False if it was not there.
     static bool invalidateCache(const cookie& item);
     /// An edit's file was changed elsewhere: drops the edit and, with `reopen`, opens it again if it was in
-    /// memory, telling its holders of the revision change before. An edit with changes of its own is not
-    /// dropped: what the file holds is kept as an undo backup at the next write.
+    /// memory. Observers hear "editmanInvalidateCache" first. An edit with changes of its own is not dropped:
+    /// what the file holds is kept as an undo backup at the next write.
     static void reloadRequest(const cookie& item, bool reopen);
     /// @}
 
     /// \name Writing
     /// @{
+    /// Opens the edit and writes it if it was changed. False if it does not open or could not be written.
     static bool flush_edit(const cookie& item);
-    /// Writes every changed edit, with milestones where they are due, and the project edit. Edits that could
+    /// Sends "editmanFlushChanges", so that editors push what they hold back into their edits, and then
+    /// writes every changed edit, with milestones where they are due, and the project edit. Edits that could
     /// not be written stay on the dirty list. True if all were written.
     static bool flush_changes();
     void addToDirtyList(const cookie& item) override;
+    /// How many edits wait to be written.
     [[nodiscard]] static size_t numDirty();
+    /// Writes every edit and empties the cache; edits that others hold are logged with their references, and
+    /// changes to them are not written any more. One that could not be written is told of on standard output
+    /// too.
     static void close_all_edits();
     /// @}
 
@@ -92,15 +108,24 @@ public:
     /// The code of the backups is `RevisionChain`, of the milestones `MilestoneRing`.
     /// @{
     /// Makes an undo backup of the edit's present state. The edit stays in memory; its file goes until it is
-    /// written next. False, with nothing changed but perhaps a write, for an edit that is read-only, does not
-    /// open or cannot be written.
+    /// written next. An edit whose file is missing because it was not changed since its last backup is
+    /// written first, so that every call leaves one more file. What could be redone is deleted. False for an
+    /// edit that is read-only, does not open, or whose files could not be written or moved; the chain may
+    /// then have moved on by one place, and what could be redone may be gone.
     static bool backup_edit(const cookie& item);
+    /// True if there is any undo backup, also one beyond the depth.
     [[nodiscard]] static bool undoExists(const cookie& item);
+    /// True if there is a redo backup 1 (or a later one in the depth, where a crash has left a hole).
     [[nodiscard]] static bool redoExists(const cookie& item);
-    /// Steps back or forward one revision; the clipboard edit goes with it where the revision used it. False
-    /// if there is no such revision or a step failed; then the edit's file is as it was or in the chain.
+    /// Steps back or forward one revision; the clipboard edit goes with it where the revision used it. The
+    /// edit's file becomes the revision's, byte for byte, and the edit is read again into another object,
+    /// which is clean. Those who watch either object are told; the description of the change that was undone,
+    /// inverted, or of the one that was redone, is published to those who follow the object that is opened.
+    /// False if there is no such revision, the edit is read-only for the user, or a move failed, which is
+    /// taken back.
     static bool undoRequest(const cookie& item);
     static bool redoRequest(const cookie& item);
+    /// Delete the backups from `keep` + 1 to the depth, the oldest first.
     static void delete_redo_edits(const cookie& item, int keep);
     static void delete_backup_edits(const cookie& item, int keep);
     [[nodiscard]] static int backupDepth();
@@ -109,7 +134,8 @@ public:
     /// \name Deleting
     /// @{
     /// Deletes an edit's file with all its backups, after the notices. False for one that is read-only or in
-    /// use by others than the cache, unless `force`, or whose file could not be removed.
+    /// use by others than the cache, unless `force`, whose files could not be removed, and for one that has
+    /// none. Other seats are told. Milestones stay, and what was set aside as ".CORRUPT".
     static bool delete_edit_file_and_backups(const cookie& item, bool force);
     static bool deleteEditFilesAndBackups(const CookieVec& items, bool force);
     /// The paths of an edit's file and all its backups that are there, the file first, then undo, then redo.
@@ -124,13 +150,18 @@ public:
     /// \name Project
     /// @{
     /// Closes the present project and makes `project` the current one: its folder must be there, or with
-    /// behaviours 1 and 2 is made. Observers hear "editmanProjectChanged".
+    /// behaviours 1 and 2 is made. Its settings become those of `Qx::currentProject`. Observers hear
+    /// "editmanProjectChanged". `NoProject` for a cookie that names no project and without a root folder,
+    /// `NotFound` for one that is not there or does not read, `NotWritable` for one that cannot be made;
+    /// nothing has changed then.
     static eStatus set_current_project(const cookie& project, eEditOpenBehaviour behaviour);
-    /// Ok if a project is current; adopts the one the application has set.
+    /// Ok if a project is current. When the application has set another one meanwhile, the edits of the one
+    /// before are written to their own folder and closed, and that one is adopted.
     static eStatus check_current_project(eEditOpenBehaviour behaviour);
     /// Flushes, tells observers of "editmanExitProject", closes every edit and the project's records.
     static void exitProject();
-    /// The project edit; null if there is none. Valid while the project is current.
+    /// The edit of the project's own cookie, opened or made when it is first asked for; null without a
+    /// project. Valid until the edits are closed.
     [[nodiscard]] static Edit* get_current_project();
     [[nodiscard]] static cookie get_current_project_cookie();
     /// True if the project has no edit file.

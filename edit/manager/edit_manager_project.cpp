@@ -31,12 +31,6 @@ eStatus adoptProject(unsigned generation) {
 void leaveProject() {
     ManagerState& state = managerState();
     state.tell(edit_manager::projExitMsgType(), edit_manager::get_current_project_cookie());
-    EditPtr projectEdit;
-    {
-        const ManagerState::Hold hold(state.lock);
-        std::swap(projectEdit, state.projectEdit);
-    }
-    projectEdit.invalidate();
     edit_manager::close_all_edits();
     state.records.close();
     const ManagerState::Hold hold(state.lock);
@@ -91,6 +85,8 @@ eStatus edit_manager::check_current_project(eEditOpenBehaviour) {
         leaves = state.project.is_valid();
     }
     if (leaves) {
+        // Rates are asked of the project that is current already: what would be recorded may be wrong.
+        state.records.close();
         leaveProject();
     }
     return adoptProject(generation);
@@ -124,7 +120,12 @@ eStatus edit_manager::set_current_project(const cookie& project, eEditOpenBehavi
         wanted.dropFrame = details.dropFrame;
         wanted.defaultEditMedium = details.defaultEditMedium;
     } else {
-        wanted.name.clear();
+        String rate;
+        wanted.name = getProjectName(project);
+        if (getProjDBValue("PROJECT_RATE", rate, project) && Qx::FrameRate::fromString(rate).valid()) {
+            wanted.frameRateCode = Qx::FrameRate::fromString(rate).code();
+        }
+        wanted.dropFrame = wanted.dropFrame && Qx::FrameRate(wanted.frameRateCode).hasDropFrame();
     }
     bool leaves = false;
     {

@@ -8,7 +8,8 @@
 
 namespace {
 
-/// The record of an edit in memory, gathered. False if it is not there.
+/// The record of an edit in memory, gathered. False if it is not there, or is being changed at the moment:
+/// then it counts as stale, as nothing is waited for here.
 bool gatherFromMemory(const cookie& item, projdb::Record& record) {
     ManagerState& state = managerState();
     EditPtr edit;
@@ -21,7 +22,11 @@ bool gatherFromMemory(const cookie& item, projdb::Record& record) {
     if (!edit.valid()) {
         return false;
     }
-    const ManagerState::Hold section(edit->section());
+    const std::unique_lock<criticalSection> section(edit->section(), std::try_to_lock);
+    if (!section.owns_lock()) {
+        state.records.markStale(item);
+        return false;
+    }
     record = editRecordOf(*edit, nullptr);
     const ManagerState::Hold hold(state.lock);
     const ManagerState::CachedEdit* const entry = state.findCacheEntry(item);

@@ -1,6 +1,7 @@
 #include "edit/manager/milestone_ring.h"
 
 #include "edit/model/edit.h"
+#include "platform/services/atomic_batch.h"
 #include "platform/services/config_int.h"
 #include "platform/services/current_project.h"
 #include "platform/services/files.h"
@@ -63,6 +64,7 @@ Qx::Status MilestoneRing::makeMilestoneBackup(const EditPtr& edit, const String&
     if (Qx::Status status = makeMilestoneFolder(item); !status) {
         return status;
     }
+    const Qx::AtomicBatch::Pause atOnce;
     const String name = item.asString() + "." + std::to_string(slot(edit->getModificationCount()));
     const Qx::FileError error =
         Qx::copyFile(file, Qx::joinPath(getMilestoneFolder(invalid_cookie, item), name));

@@ -2,6 +2,7 @@
 
 #include "edit/manager/edit_record.h"
 #include "edit/manager/revision_chain.h"
+#include "platform/services/atomic_batch.h"
 #include "platform/services/log.h"
 
 namespace {
@@ -89,9 +90,11 @@ void ManagerState::noteFile(CachedEdit& entry) {
 
 bool ManagerState::write(CachedEdit& entry) {
     Edit& edit = *entry.edit;
-    if (!edit.needsToBeWritten()) {
+    if (entry.item.type() == Cookie_Type::Transient || !edit.needsToBeWritten()) {
         return true;
     }
+    // What is moved next must be the file that is written here, also inside a caller's batch.
+    const Qx::AtomicBatch::Pause atOnce;
     EditManagerLock writers{Qx::folderOf(entry.path)};
     if (!takeWritersLock(writers) || !keepForeignFile(entry, backupDepth)) {
         return false;
@@ -107,6 +110,17 @@ bool ManagerState::write(CachedEdit& entry) {
     removeFromDirtyList(entry.item);
     records.put(entry.item, editRecordOf(edit, &entry.file));
     return true;
+}
+
+ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry) {
+    if (entry.edit->refCount() > 1) {
+        return Unreferenced::InUse;
+    }
+    const std::unique_lock<criticalSection> section(entry.edit->section(), std::try_to_lock);
+    if (!section.owns_lock()) {
+        return Unreferenced::InUse;
+    }
+    return write(entry) ? Unreferenced::Written : Unreferenced::NotWritten;
 }
 
 void ManagerState::addToDirtyList(const cookie& item) {
@@ -127,8 +141,20 @@ bool takeWritersLock(EditManagerLock& writers) {
     return status.isOk();
 }
 
+namespace {
+
+/// The folder of a cached edit's file, which may be that of a project which is being left.
+String folderOfCached(const cookie& item) {
+    ManagerState& state = managerState();
+    const ManagerState::Hold hold(state.lock);
+    const ManagerState::CachedEdit* const found = state.findCacheEntry(item);
+    return found == nullptr || found->path.empty() ? String() : Qx::folderOf(found->path);
+}
+
+} // namespace
+
 CachedEditScope::CachedEditScope(const cookie& item, const EditPtr& edit)
-    : m_section(edit->section()), m_turn(managerState().queue, item),
+    : m_section(edit->section()), m_turn(managerState().queue, item), m_writers(folderOfCached(item)),
       m_isWritable(takeWritersLock(m_writers)), m_lock(managerState().lock), m_entry(nullptr) {
     ManagerState::CachedEdit* const found = managerState().findCacheEntry(item);
     if (m_isWritable && found != nullptr && found->edit == edit) {

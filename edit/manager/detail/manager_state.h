@@ -26,7 +26,8 @@
 ///   5. `dirtyMutex`, and those of `records`
 ///
 /// Who changes an edit holds 1 and may call the manager; so nothing waits for a section while it holds one of
-/// the others, but for an edit that nobody else can have. No observer is told under 2 to 5.
+/// the others. An edit to which the cache has the only reference, seen under 4, is nobody's to change: its
+/// section is free and is tried for. No observer is told under 2 to 5.
 struct ManagerState {
     /// A cached edit with what is known of its file: another program that replaced the file since is noticed.
     struct CachedEdit : EditCacheEntry {
@@ -81,6 +82,10 @@ struct ManagerState {
     /// as an undo backup first. False if it could not be written; the edit is then still dirty. Under the
     /// edit's section and the lock.
     bool write(CachedEdit& entry);
+    /// What became of an edit that nobody but the cache should have.
+    enum class Unreferenced { Written, NotWritten, InUse };
+    /// Writes such an edit. Under the lock.
+    Unreferenced writeUnreferenced(CachedEdit& entry);
     /// What the edit's file is at this moment is taken as known.
     static void noteFile(CachedEdit& entry);
 

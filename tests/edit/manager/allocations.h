@@ -1,0 +1,10 @@
+#pragma once
+
+#include <cstddef>
+
+namespace test {
+
+/// How often this thread has called the global `operator new`.
+size_t allocations();
+
+} // namespace test

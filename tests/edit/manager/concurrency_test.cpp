@@ -1,0 +1,113 @@
+#include "edit/manager/edit_info.h"
+#include "tests/edit/manager/managed_project.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <chrono>
+#include <random>
+#include <thread>
+
+namespace {
+
+using test::ManagedProject;
+
+constexpr int kThreads = 32;
+constexpr int kItems = 50;
+/// The first items are counters: they are changed, written and evicted only, so no change may be lost.
+constexpr int kCounters = 10;
+
+cookie itemAt(int i) {
+    return {Cookie_Type::Edit, i + 1, 0};
+}
+
+void addOne(const cookie& item) {
+    const EditPtr edit(item, eOpenExisting);
+    const std::lock_guard<criticalSection> hold(edit->section());
+    edit->Opts().setInt("COUNT", edit->Opts().getInt("COUNT") + 1);
+    edit->setChangeDescription(kPropertiesChanged, true);
+}
+
+/// One action of a user on one of the other items.
+void actOn(const cookie& item, unsigned action) {
+    switch (action % 16) {
+    case 0:
+        edit_manager::backup_edit(item);
+        break;
+    case 1:
+        edit_manager::undoRequest(item);
+        break;
+    case 2:
+        edit_manager::redoRequest(item);
+        break;
+    case 3:
+        edit_manager::reloadRequest(item, true);
+        break;
+    case 4:
+        edit_manager::flush_changes();
+        break;
+    case 5: {
+        const EditInfo info(item, eOpenExisting);
+        EXPECT_EQ(info.getLogType(), kLogEdit);
+        EXPECT_TRUE(info.getFlags() == 0 && !info.hasAudioTracks());
+        break;
+    }
+    case 6:
+    case 7:
+        edit_manager::flush_edit(item);
+        break;
+    default:
+        ManagedProject::change(String::format("%u", action), item);
+        break;
+    }
+}
+
+TEST(Concurrency, ThirtyTwoThreadsOnFiftyEditsLoseNothing) {
+    const ManagedProject project;
+    for (int i = 0; i < kItems; ++i) {
+        ManagedProject::save("0", itemAt(i));
+    }
+    std::array<std::atomic<int>, kCounters> counts{};
+    const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(3);
+    const auto work = [&](unsigned seed) {
+        std::mt19937 random(seed);
+        while (std::chrono::steady_clock::now() < end) {
+            const int i = static_cast<int>(random() % kItems);
+            const unsigned action = static_cast<unsigned>(random());
+            if (i >= kCounters) {
+                actOn(itemAt(i), action);
+            } else {
+                addOne(itemAt(i));
+                ++counts[static_cast<size_t>(i)];
+                if (action % 4 == 0) {
+                    edit_manager::flush_edit(itemAt(i));
+                }
+            }
+            if (action % 64 == 0) {
+                edit_manager::limitEditCache(0);
+            }
+        }
+    };
+    std::vector<std::thread> threads;
+    for (unsigned t = 0; t < kThreads; ++t) {
+        threads.emplace_back(work, t + 1);
+    }
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+    edit_manager::close_all_edits();
+    EXPECT_EQ(edit_manager::numCached(), 0U);
+    for (int i = 0; i < kItems; ++i) {
+        const EditPtr edit(itemAt(i), eOpenExisting);
+        ASSERT_TRUE(edit.valid()) << i;
+        if (i < kCounters) {
+            EXPECT_EQ(edit->Opts().getInt("COUNT"), counts[static_cast<size_t>(i)].load()) << i;
+        }
+    }
+    for (const auto& entry : std::filesystem::directory_iterator(std::filesystem::path(project.folder()))) {
+        EXPECT_EQ(entry.path().string().find("CORRUPT"), std::string::npos) << entry.path();
+    }
+    EXPECT_FALSE(project.log.contains("could not be")) << project.log.log();
+}
+
+} // namespace

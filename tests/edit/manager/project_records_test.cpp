@@ -1,0 +1,235 @@
+#include "edit/manager/edit_info.h"
+#include "edit/manager/edit_record.h"
+#include "edit/project/projdb.h"
+#include "tests/edit/manager/managed_project.h"
+#include "tests/support/faulty_file_system.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using test::kEdit;
+using test::ManagedProject;
+
+const cookie kOther("E0002000");
+
+/// A channel with one clip of ten seconds and twelve frames.
+void addClip(const EditPtr& edit, Edit_Chan_Type type, Edit_Chan_SubType subtype = Edit_Chan_SubType::NONE) {
+    cel* const content = edit->get_edit_cel_p(edit->addChan(type, nullptr, true, subtype));
+    content->appendEventPair(cookie("M0001000"), 0, 2, 10.48);
+}
+
+/// Makes an edit with so many audio and effects channels beside its video channel, and writes it.
+void makeEdit(const cookie& item, int audio, int effects) {
+    const EditPtr edit(item, eOpenNew);
+    for (int i = 0; i < audio; ++i) {
+        addClip(edit, AudioChan);
+    }
+    for (int i = 0; i < effects; ++i) {
+        addClip(edit, VideoChan, Edit_Chan_SubType::ALIAS);
+    }
+    edit->setName("named");
+    ASSERT_TRUE(edit_manager::flush_edit(item));
+}
+
+TEST(EditInfo, GivesTheSameAnswersOpenOrNot) {
+    const struct {
+        int audio;
+        int effects;
+        const char* chans;
+    } cases[] = {{0, 0, "V1"}, {1, 1, "V1a1f1"}, {2, 1, "V1A2f1"}, {4, 2, "V1A4F2"}};
+    for (const auto& [audio, effects, chans] : cases) {
+        SCOPED_TRACE(chans);
+        const ManagedProject project;
+        makeEdit(kEdit, audio, effects);
+        EditPtr(kEdit, eOpenExisting)->set_hidden(audio);
+        ASSERT_TRUE(edit_manager::flush_edit(kEdit));
+        EditPtr open(kEdit, eOpenExisting);
+        const EditInfo opened(open);
+        String answers[2];
+        for (const bool isOpen : {true, false}) {
+            if (!isOpen) {
+                open.invalidate();
+                edit_manager::close_all_edits();
+            }
+            const EditInfo info = isOpen ? opened : EditInfo(kEdit, eOpenExisting);
+            answers[isOpen ? 1 : 0] =
+                String::format("%d %d %d %d %d %d %.2f %.2f %.2f", info.hasAudioTracks(), info.hasFxTracks(),
+                               info.isHidden(), info.isSoundOnlyShot(), info.getFlags(), info.getLogType(),
+                               info.getStartTime(), info.getEndTime(), info.getDuration());
+            EXPECT_EQ(info.getAttrib("CHANS"), chans);
+            EXPECT_EQ(info.getAttribW("name"), L"named");
+            EXPECT_EQ(info.getAttrib("no such"), "");
+            if (!isOpen) {
+                EXPECT_FALSE(edit_manager::get_present(kEdit)) << "answered without opening";
+                EXPECT_EQ(info.m_get_event_count(-2), -1);
+                EXPECT_FALSE(edit_manager::get_present(kEdit));
+                EXPECT_EQ(info.m_get_num_chans(), 1 + audio + effects);
+                EXPECT_TRUE(edit_manager::get_present(kEdit));
+                EXPECT_EQ(info.m_get_event_count(0), effects == 0 ? 0 : 2);
+                EXPECT_EQ(info.m_get_channel_type(0), VideoChan);
+                EXPECT_EQ(info.m_get_real_channel(17), 17);
+            }
+        }
+        EXPECT_EQ(answers[0], answers[1]);
+    }
+}
+
+TEST(EditInfo, ReadsTheKindOfItemFromItsRow) {
+    const struct {
+        const char* type;
+        const char* flags;
+        edit_log_type_t expected;
+    } cases[] = {{"ghost", "1536", kLogGhost4}, {"ghost", "3072", kLogGhost3}, {"ghost", "2176", kLogGhost5},
+                 {"ghost", "128", kLogGhost6},  {"ghost", "8", kLogNone},      {"ghost", "", kLogNone},
+                 {"shot", "1536", kLogShot},    {"FXT", "0", kLogTemplate},    {"", "x", kLogNone}};
+    const ManagedProject project;
+    for (const auto& [type, flags, expected] : cases) {
+        projdb::Record record;
+        record[projdb::Type] = type;
+        record[projdb::Flags] = flags;
+        record[projdb::Chans] = "A2";
+        record[projdb::StartTime] = "00:00:01:05";
+        record[projdb::EndTime] = "00:01:00:00";
+        ASSERT_TRUE(edit_manager::get_projdb()->put(kEdit, record));
+        const EditInfo info(kEdit, eOpenExisting);
+        EXPECT_EQ(info.getLogType(), expected) << type << " " << flags;
+        EXPECT_TRUE(info.hasAudioTracks() && info.isSoundOnlyShot() && !info.hasFxTracks());
+        EXPECT_EQ(info.isHidden(), String(flags) == "8");
+        EXPECT_DOUBLE_EQ(info.getStartTime(), 1.2);
+        EXPECT_DOUBLE_EQ(info.getDuration(), 58.8);
+    }
+}
+
+TEST(EditInfo, KnowsNothingWithoutRecords) {
+    const ManagedProject project;
+    Qx::setCurrentProject({});
+    const EditInfo info(kEdit, eOpenExisting);
+    EXPECT_EQ(info.getFlags(), 0);
+    EXPECT_FALSE(info.isHidden() || info.hasAudioTracks() || info.isSoundOnlyShot());
+    EXPECT_EQ(info.getStartTime(), Qx::kNoTime);
+    EXPECT_EQ(info.getDuration(), Qx::kNoTime);
+    EXPECT_EQ(info.getLogType(), kLogNone);
+    EXPECT_EQ(info.m_get_num_chans(), 0);
+    EXPECT_EQ(edit_manager::get_projdb(), nullptr);
+    EXPECT_FALSE(edit_manager::setProjDBValue("a", "b"));
+}
+
+TEST(EditInfo, NeverAnswersFromARowThatItsFileHasLeftBehind) {
+    const ManagedProject project;
+    makeEdit(kEdit, 2, 0);
+    const std::string two = project.read("E0001000.qme");
+    makeEdit(kOther, 1, 0);
+    edit_manager::close_all_edits();
+    EXPECT_TRUE(EditInfo(kEdit, eOpenExisting).hasAudioTracks());
+    ASSERT_TRUE(edit_manager::delete_edit_file_and_backups(kEdit, false));
+    EXPECT_FALSE(EditInfo(kEdit, eOpenExisting).hasAudioTracks());
+    project.write("E0001000.qme", two); // by another program
+    EXPECT_TRUE(EditInfo(kEdit, eOpenExisting).hasAudioTracks());
+    project.write("E0001000.qme", project.read("E0002000.qme")); // by another program again
+    EXPECT_FALSE(EditInfo(kEdit, eOpenExisting).hasAudioTracks());
+    // A change that is not written yet shows at once, and not as what the file says.
+    const EditPtr open(kOther, eOpenExisting);
+    open->addChan(AudioChan);
+    projdb::Record record;
+    ASSERT_TRUE(edit_manager::get_projdb()->find(kOther, record));
+    EXPECT_EQ(record[projdb::Chans], "V1A2");
+    EXPECT_EQ(record[projdb::FileSize], "");
+    ASSERT_TRUE(edit_manager::flush_changes());
+    ASSERT_TRUE(edit_manager::get_projdb()->find(kOther, record));
+    EXPECT_EQ(record[projdb::FileSize], std::to_string(project.read("E0002000.qme").size()));
+}
+
+/// All records as text.
+String recordsText() {
+    String text;
+    edit_manager::get_projdb()->forEach([&](const cookie& item, const projdb::Record& record) {
+        text += item.asString();
+        for (int i = 0; i < projdb::kNumColumns; ++i) {
+            text += "|" + record[static_cast<projdb::Column>(i)];
+        }
+        text += "\n";
+        return true;
+    });
+    return text;
+}
+
+TEST(ProjectRecords, AreMadeAgainWhenTheyAreLostOrDamaged) {
+    const ManagedProject project;
+    for (int i = 1; i <= 5; ++i) {
+        makeEdit(cookie(Cookie_Type::Edit, i, 0), i, 0);
+    }
+    project.write("E0006000.qme", "no edit");
+    edit_manager::close_all_edits();
+    ASSERT_TRUE(edit_manager::update_projdb());
+    const String records = recordsText();
+    EXPECT_EQ(edit_manager::get_projdb()->numRecords(), 6U);
+    EXPECT_NE(records.find("E0006000.qme"), std::string::npos) << "says why it cannot be read";
+    const struct {
+        const char* what;
+        const char* bytes;
+    } faults[] = {{"deleted", nullptr}, {"damaged", "This is no table of records."}};
+    for (const auto& [what, bytes] : faults) {
+        SCOPED_TRACE(what);
+        ManagedProject::stopManager();
+        for (const char* const name : {"Project.db", "Project.db-wal", "Project.db-shm"}) {
+            std::filesystem::remove(std::filesystem::path(project.folder() + "/" + name));
+        }
+        if (bytes != nullptr) {
+            project.write("Project.db", bytes);
+        }
+        ManagedProject::startManager();
+        ASSERT_NE(edit_manager::get_projdb(), nullptr);
+        EXPECT_EQ(edit_manager::get_projdb()->numRecords(), 0U);
+        EXPECT_TRUE(edit_manager::get_projdb()->isNew());
+        EXPECT_EQ(project.read("Project.db.DAMAGED"), bytes == nullptr ? "(missing)" : bytes);
+        ASSERT_TRUE(edit_manager::update_projdb());
+        EXPECT_EQ(recordsText(), records);
+    }
+    EXPECT_TRUE(project.has("E0006000.qme")) << "listing sets nothing aside";
+}
+
+TEST(ProjectRecords, AnUpdateReadsOnlyWhatChangedAndCanBeInterrupted) {
+    const ManagedProject project;
+    makeEdit(kEdit, 1, 0);
+    makeEdit(kOther, 1, 0);
+    edit_manager::close_all_edits();
+    test::FaultyFileSystem system;
+    ASSERT_TRUE(edit_manager::update_projdb());
+    EXPECT_EQ(system.count("open read E000"), 0U) << "written a moment ago";
+    project.write("E0003000.qme", project.read("E0001000.qme"));
+    EXPECT_FALSE(edit_manager::update_projdb([](size_t done, size_t total) {
+        EXPECT_EQ(total, 3U);
+        return done < 1;
+    }));
+    EXPECT_EQ(system.count("open read E000"), 0U);
+    ASSERT_TRUE(edit_manager::update_projdb());
+    EXPECT_EQ(system.count("open read E000"), 1U);
+    std::filesystem::remove(std::filesystem::path(project.folder() + "/E0001000.qme"));
+    std::vector<size_t> steps;
+    ASSERT_TRUE(
+        edit_manager::update_projdb([&](size_t done, size_t) { return steps.push_back(done), true; }));
+    EXPECT_EQ(steps, (std::vector<size_t>{0, 1, 2}));
+    EXPECT_EQ(edit_manager::get_projdb()->numRecords(), 2U);
+    edit_manager::setConfirmUpdateFn([&] {
+        system.failWhere("list P0001000", EIO);
+        return true;
+    });
+    ManagedProject::stopManager();
+    EXPECT_TRUE(project.log.contains("edit_manager::~edit_manager: projdb update interrupted\n"));
+}
+
+TEST(ProjectRecords, OfAnotherRateAreDropped) {
+    const ManagedProject project;
+    makeEdit(kEdit, 1, 0);
+    ASSERT_NE(edit_manager::get_projdb(), nullptr);
+    ManagedProject::stopManager();
+    Qx::CurrentProject faster = Qx::currentProject();
+    faster.frameRateCode = Qx::FrameRate::Fps50;
+    Qx::setCurrentProject(faster);
+    ManagedProject::startManager();
+    EXPECT_EQ(edit_manager::get_projdb()->numRecords(), 0U);
+    EXPECT_NEAR(EditInfo(kEdit, eOpenExisting).getEndTime(), 12.48, 0.021);
+}
+
+} // namespace

@@ -1,0 +1,184 @@
+#include "edit/manager/edit_manager.h"
+#include "tests/edit/manager/managed_project.h"
+#include "tests/support/faulty_file_system.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using test::kEdit;
+using test::ManagedProject;
+
+/// The bytes of an edit file of a given name.
+std::string editBytes(const String& name) {
+    ManagedProject project;
+    ManagedProject::save(name);
+    return project.read("E0001000.qme");
+}
+
+/// What a letter of a drawing stands for: a sound edit of that name, '!' a truncated one, '?' no edit at all.
+std::string bytesFor(char letter) {
+    switch (letter) {
+    case '!': {
+        const std::string whole = editBytes("cut");
+        return whole.substr(0, whole.size() / 2);
+    }
+    case '?':
+        return "This is not an edit.";
+    default:
+        return editBytes(String(1, letter));
+    }
+}
+
+/// The names of the project's folder in a row: the edit file, undo 1 to 3, redo 1.
+const char* const kNames[] = {"E0001000.qme", "E0001000.qme.U1", "E0001000.qme.U2", "E0001000.qme.U3",
+                              "E0001000.qme.R1"};
+
+String lineFor(int backup) {
+    return String::format("edit_manager::open( E0001000 ) - edit::read_file() failed, trying backup %d\n",
+                          backup);
+}
+const char* const kNoneUsable = "edit_manager::open( E0001000 ) - No usable backups found\n";
+
+TEST(Recovery, EveryStateOfTheFilesOpensAsFarAsItCan) {
+    const struct {
+        const char* files;  ///< edit, U1, U2, U3, R1; '-' for none
+        const char* opened; ///< the name of the edit that opens; null for none
+        const char* left;   ///< the files afterwards
+        int corrupt;        ///< how many files were set aside
+        const char* logged;
+    } cases[] = {
+        {"E----", "E", "E----", 0, ""},
+        {"EabcR", "E", "EabcR", 0, ""},
+        {"-----", nullptr, "-----", 0, ""},
+        {"----R", nullptr, "----R", 0, ""},
+        {"-abcR", "a", "abc-R", 0, "open( E0001000 ) - missing, trying backup 1 \n"},
+        {"--bc-", "b", "bc---", 0, "open( E0001000 ) - missing, trying backup 2 \n"},
+        {"!a---", "a", "a----", 1, "trying backup 1\n"},
+        {"?abcR", "a", "abc-R", 1, "trying backup 1\n"},
+        {"!!b--", "b", "b----", 2, "trying backup 2\n"},
+        {"?!?c-", "c", "c----", 3, "trying backup 3\n"},
+        {"-!b--", "b", "b----", 1, "trying backup 1\n"},
+        {"!-b--", "b", "b----", 1, "trying backup 1\n"},
+        {"?----", nullptr, "-----", 1, ""},
+        {"!?!?R", nullptr, "----R", 4, kNoneUsable},
+    };
+    for (const auto& [files, opened, left, corrupt, logged] : cases) {
+        SCOPED_TRACE(files);
+        std::string bytes[5];
+        for (size_t i = 0; i < 5; ++i) {
+            bytes[i] = files[i] == '-' ? "" : bytesFor(files[i]);
+        }
+        ManagedProject project;
+        for (size_t i = 0; i < 5; ++i) {
+            if (files[i] != '-') {
+                project.write(kNames[i], bytes[i]);
+            }
+        }
+        EXPECT_EQ(ManagedProject::nameOf(), opened == nullptr ? "(null)" : opened);
+        EXPECT_TRUE(project.log.contains(logged)) << project.log.log();
+        std::string found;
+        for (size_t i = 0; i < 5; ++i) {
+            const std::string now = project.read(kNames[i]);
+            size_t origin = 0;
+            while (origin < 5 && (files[origin] == '-' || bytes[origin] != now)) {
+                ++origin;
+            }
+            found += now == "(missing)" ? '-' : origin < 5 ? files[origin] : '#';
+        }
+        EXPECT_EQ(found, left);
+        // What does not read is kept, each under a name of its own.
+        int setAside = 0;
+        for (const auto& entry :
+             std::filesystem::directory_iterator(std::filesystem::path(project.folder()))) {
+            setAside += entry.path().string().find(".CORRUPT") != std::string::npos ? 1 : 0;
+        }
+        EXPECT_EQ(setAside, corrupt);
+        if (corrupt > 0 && files[0] != '-') {
+            EXPECT_EQ(project.read("E0001000.qme.CORRUPT"), bytes[0]);
+        }
+    }
+}
+
+TEST(Recovery, TellsOfEachBackupAndToTheUserWhenNoneIsLeft) {
+    ManagedProject project;
+    for (const char* const name : kNames) {
+        project.write(name, "nothing");
+    }
+    EXPECT_EQ(ManagedProject::nameOf(), "(null)");
+    for (int backup = 1; backup <= 4; ++backup) {
+        EXPECT_TRUE(project.log.contains(lineFor(backup)));
+    }
+    EXPECT_EQ(project.log.standardOutput(), kNoneUsable);
+    EXPECT_EQ(project.read("E0001000.qme.R1"), "nothing");
+}
+
+TEST(Recovery, AFailureIsRememberedUntilItIsForgottenOrReplaced) {
+    ManagedProject project;
+    EXPECT_EQ(ManagedProject::nameOf(), "(null)");
+    EXPECT_EQ(edit_manager::numCached(), 1U);
+    EXPECT_FALSE(edit_manager::get_present(kEdit));
+    const std::string sound = [] { return bytesFor('E'); }();
+    Qx::CurrentProject again;
+    again.rootFolder = project.root().path();
+    Qx::setCurrentProject(again);
+    ManagedProject::startManager();
+    EXPECT_EQ(ManagedProject::nameOf(), "(null)");
+    project.write("E0001000.qme", sound);
+    test::FaultyFileSystem system;
+    EXPECT_EQ(ManagedProject::nameOf(), "(null)");
+    EXPECT_EQ(system.numOperations(), 0U) << "a remembered failure asks nothing of the disk";
+    EXPECT_TRUE(edit_manager::invalidateCache(kEdit));
+    EXPECT_FALSE(edit_manager::invalidateCache(kEdit));
+    EXPECT_EQ(ManagedProject::nameOf(), "E");
+
+    const cookie other("E0002000");
+    EXPECT_FALSE(EditPtr(other, eOpenExisting).valid());
+    EXPECT_FALSE(EditPtr(other, static_cast<eEditOpenBehaviour>(3)).valid());
+    EXPECT_TRUE(EditPtr(other, eOpenNew).valid());
+}
+
+TEST(Recovery, WhatTheSystemRefusesIsNotSetAside) {
+    ManagedProject project;
+    ManagedProject::save("sound");
+    ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+    ManagedProject::save("sound too");
+    edit_manager::close_all_edits();
+    {
+        test::FaultyFileSystem system;
+        system.failWhere("open read E0001000.qme", EMFILE);
+        for (const auto behaviour : {eOpenExisting, eOpenOrCreate}) {
+            EXPECT_FALSE(EditPtr(kEdit, behaviour).valid());
+            edit_manager::invalidateCache(kEdit);
+        }
+        EXPECT_EQ(system.count("rename"), 0U);
+    }
+    EXPECT_EQ(ManagedProject::nameOf(), "sound too");
+}
+
+TEST(Recovery, AFileOfAnotherProgramIsKeptAsABackup) {
+    const std::string theirs = bytesFor('T');
+    ManagedProject project;
+    ManagedProject::save("mine");
+    ManagedProject::change("mine, changed");
+    project.write("E0001000.qme", theirs);
+    EXPECT_TRUE(edit_manager::flush_changes());
+    EXPECT_EQ(project.read("E0001000.qme.U1"), theirs);
+    EXPECT_TRUE(project.log.contains("changed by another program"));
+    // Another process that opens an edit between a backup and the next write puts the backup back.
+    ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+    const std::string kept = project.read("E0001000.qme.U1");
+    std::filesystem::rename(std::filesystem::path(project.folder() + "/E0001000.qme.U1"),
+                            std::filesystem::path(project.folder() + "/E0001000.qme"));
+    EXPECT_TRUE(ManagedProject::save("more"));
+    EXPECT_EQ(project.read("E0001000.qme.U1"), kept);
+    // An edit that is started afresh does not bury the one that is there.
+    edit_manager::close_all_edits();
+    const std::string old = project.read("E0001000.qme");
+    const EditPtr fresh(kEdit, eOpenNew);
+    fresh->setName("fresh");
+    EXPECT_TRUE(edit_manager::flush_changes());
+    EXPECT_EQ(project.read("E0001000.qme.U1"), old);
+}
+
+} // namespace

@@ -1,0 +1,151 @@
+#include "edit/manager/revision_chain.h"
+
+#include "tests/support/faulty_file_system.h"
+#include "tests/support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+#include <deque>
+#include <random>
+
+namespace {
+
+/// A chain drawn as text: the edit file's letter, then a letter a backup, '-' for none: "E:ab-d".
+class ChainFiles {
+public:
+    explicit ChainFiles(int depth) : m_chain(file(), RevisionChain::Undo, depth) {}
+
+    void draw(const std::string& drawing) {
+        place(file(), drawing[0]);
+        for (size_t i = 2; i < drawing.size(); ++i) {
+            place(m_chain.path(static_cast<int>(i) - 1), drawing[i]);
+        }
+    }
+    [[nodiscard]] std::string drawn(int upTo) const {
+        std::string drawing = letter("E0001000.qme") + ":";
+        for (int i = 1; i <= upTo; ++i) {
+            drawing += letter("E0001000.qme.U" + std::to_string(i));
+        }
+        return drawing;
+    }
+    [[nodiscard]] RevisionChain& chain() { return m_chain; }
+    [[nodiscard]] String file() const { return m_folder.path("E0001000.qme"); }
+    [[nodiscard]] const test::TemporaryFolder& folder() const { return m_folder; }
+
+private:
+    static void place(const String& path, char letter) {
+        if (letter != '-') {
+            std::ofstream(path.c_str()) << letter;
+        }
+    }
+    [[nodiscard]] std::string letter(const std::string& name) const {
+        const std::string bytes = m_folder.read(name);
+        return bytes == "(missing)" ? "-" : bytes;
+    }
+
+    test::TemporaryFolder m_folder;
+    RevisionChain m_chain;
+};
+
+TEST(RevisionChain, MovesWholeFilesAndPassesOverHoles) {
+    enum Action { Push, Restore, Delete0, Delete1 };
+    const struct {
+        int depth;
+        const char* before;
+        Action action;
+        const char* after;
+        int answer;
+    } cases[] = {
+        {4, "E:----", Push, "-:E---", 1},    {4, "E:abcd", Push, "-:Eabc", 1},
+        {4, "E:ab--", Push, "-:Eab-", 1},    {1, "E:a", Push, "-:E", 1},
+        {4, "-:abcd", Push, "-:abcd", 0},    {4, "E:-bcd", Push, "-:Ebcd", 1},
+        {4, "E:ab-d", Push, "-:Eabd", 1},    {4, "-:abcd", Restore, "a:bcd-", 1},
+        {4, "-:-bc-", Restore, "b:c---", 2}, {4, "-:--cd", Restore, "c:d---", 3},
+        {4, "E:a-c-", Restore, "a:-c--", 1}, {4, "E:----", Restore, "E:----", 0},
+        {1, "-:a", Restore, "a:-", 1},       {2, "-:--c", Restore, "-:--c", 0},
+        {4, "E:abcd", Delete0, "E:----", 1}, {4, "E:abcd", Delete1, "E:a---", 1},
+        {4, "E:a-c-", Delete0, "E:----", 1}, {2, "E:abc", Delete0, "E:--c", 1},
+    };
+    for (const auto& [depth, before, action, after, answer] : cases) {
+        SCOPED_TRACE(testing::Message() << before << " depth " << depth << " action " << action);
+        ChainFiles files(depth);
+        files.draw(before);
+        RevisionChain& chain = files.chain();
+        const int got = action == Push      ? static_cast<int>(chain.push().isOk())
+                        : action == Restore ? chain.restoreNewest()
+                                            : static_cast<int>(chain.deleteTail(action == Delete1 ? 1 : 0));
+        EXPECT_EQ(got, answer);
+        EXPECT_EQ(files.drawn(static_cast<int>(std::string(before).size()) - 2), after);
+    }
+}
+
+TEST(RevisionChain, NamesOnlyItsOwnFiles) {
+    EXPECT_EQ(getUndoExtension(3), "U3");
+    EXPECT_EQ(getRedoExtension(12), "R12");
+    EXPECT_EQ(getUndoExtension(-1), "U*");
+    ChainFiles files(3);
+    for (const char* const other :
+         {"E0001000.qme.U01", "E0001000.qme.U+1", "E0001000.qme.U0", "E0001000.qme.U", "E0001000.qme.R1",
+          "E0001000.qme.U2x", "E0002000.qme.U1"}) {
+        files.folder().write(other, "x");
+    }
+    EXPECT_FALSE(files.chain().exists());
+    files.folder().write("E0001000.qme.U12", "x");
+    EXPECT_TRUE(files.chain().exists()) << "beyond the depth";
+    EXPECT_EQ(files.chain().newest(), 0);
+}
+
+TEST(RevisionChain, RandomStepsMatchAModelAlsoWithFailures) {
+    for (unsigned seed = 1; seed <= 40; ++seed) {
+        SCOPED_TRACE(testing::Message() << "seed " << seed);
+        std::mt19937 random(seed);
+        const int depth = 1 + static_cast<int>(random() % 5);
+        ChainFiles files(depth);
+        test::FaultyFileSystem system;
+        std::deque<char> model;
+        char file = '-';
+        char next = 'a';
+        for (int step = 0; step < 60; ++step) {
+            if (file == '-') {
+                file = next;
+                files.draw(std::string(1, next) + ":");
+                next = next == 'z' ? 'a' : static_cast<char>(next + 1);
+            }
+            system.reset();
+            const bool fails = random() % 4 == 0;
+            if (fails) {
+                system.failWhere("rename E0001000.qme", EIO); // every move
+            }
+            const auto action = random() % 3;
+            if (action == 0) {
+                // A full chain of more than one has lost its oldest by the time that a move fails.
+                if (static_cast<int>(model.size()) == depth && (depth > 1 || !fails)) {
+                    model.pop_back();
+                }
+                EXPECT_EQ(files.chain().push().isOk(), !fails);
+                if (!fails) {
+                    model.push_front(file);
+                    file = '-';
+                }
+            } else if (action == 1) {
+                const bool restores = !fails && !model.empty();
+                EXPECT_EQ(files.chain().restoreNewest(), restores ? 1 : 0);
+                if (restores) {
+                    file = model.front();
+                    model.pop_front();
+                }
+            } else if (random() % 4 == 0) {
+                const size_t keep = random() % 4;
+                EXPECT_TRUE(files.chain().deleteTail(static_cast<int>(keep)));
+                model.resize(std::min(model.size(), keep));
+            }
+            system.reset();
+            std::string expected = std::string(1, file) + ":";
+            expected.append(model.begin(), model.end());
+            expected.append(static_cast<size_t>(depth) - model.size(), '-');
+            ASSERT_EQ(files.drawn(depth), expected) << "step " << step;
+        }
+    }
+}
+
+} // namespace

@@ -1,0 +1,262 @@
+#include "edit/manager/milestone_ring.h"
+#include "edit/project/permissions_manager.h"
+#include "platform/services/config_int.h"
+#include "tests/edit/manager/managed_project.h"
+#include "tests/support/faulty_file_system.h"
+
+#include <gtest/gtest.h>
+
+#include <random>
+
+namespace {
+
+using test::kEdit;
+using test::ManagedProject;
+
+/// A setting while it lives.
+class Setting {
+public:
+    Setting(const char* name, int value) : m_name(name) { Qx::setConfigInt(name, value); }
+    ~Setting() { Qx::clearConfigInt(m_name); }
+    Setting(const Setting&) = delete;
+    Setting& operator=(const Setting&) = delete;
+
+private:
+    const char* m_name;
+};
+
+void randomChange(std::mt19937& random, int number) {
+    const EditPtr edit(kEdit, eOpenExisting);
+    const std::lock_guard<criticalSection> hold(edit->section());
+    switch (random() % 4) {
+    case 0:
+        edit->addChan(AudioChan);
+        break;
+    case 1:
+        edit->set_current_time(0, 1.0 + number);
+        break;
+    case 2:
+        edit->get_edit_cel_p(0)->appendEventPair(cookie(Cookie_Type::Material, number + 1, 0), number,
+                                                 edit->getEndTime(), 2.5);
+        edit->setChangeDescription(kOpInsert, true);
+        break;
+    default:
+        break;
+    }
+    edit->setName(String::format("revision %d", number));
+}
+
+TEST(Undo, GoesBackToTheStartAndOnToTheEndByteForByte) {
+    for (unsigned seed = 1; seed <= 3; ++seed) {
+        SCOPED_TRACE(testing::Message() << "seed " << seed);
+        std::mt19937 random(seed);
+        ManagedProject project;
+        std::vector<std::string> revisions;
+        ManagedProject::save("start");
+        constexpr int kSteps = 10;
+        for (int i = 0; i < kSteps; ++i) {
+            revisions.push_back(project.read("E0001000.qme"));
+            ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+            EXPECT_FALSE(project.has("E0001000.qme"));
+            randomChange(random, i);
+            ASSERT_TRUE(edit_manager::flush_changes());
+            // The backup is the file itself; what was read of the bytes before it holds.
+            EXPECT_EQ(project.read("E0001000.qme.U1"), revisions.back());
+        }
+        revisions.push_back(project.read("E0001000.qme"));
+        const auto check = [&](int at) {
+            EXPECT_EQ(project.read("E0001000.qme"), revisions[static_cast<size_t>(at)]) << at;
+            const EditPtr edit(kEdit, eOpenExisting);
+            ASSERT_TRUE(edit.valid());
+            EXPECT_FALSE(edit->isDirty(true));
+            EXPECT_EQ(edit->getName(), at == 0 ? String("start") : String::format("revision %d", at - 1));
+            EXPECT_EQ(edit_manager::undoExists(kEdit), at > 0);
+            EXPECT_EQ(edit_manager::redoExists(kEdit), at < kSteps);
+        };
+        for (int round = 0; round < 2; ++round) {
+            for (int at = kSteps - 1; at >= 0; --at) {
+                ASSERT_TRUE(edit_manager::undoRequest(kEdit));
+                check(at);
+            }
+            EXPECT_FALSE(edit_manager::undoRequest(kEdit));
+            for (int at = 1; at <= kSteps; ++at) {
+                ASSERT_TRUE(edit_manager::redoRequest(kEdit));
+                check(at);
+            }
+            EXPECT_FALSE(edit_manager::redoRequest(kEdit));
+        }
+        // A backup after an undo ends what could be redone.
+        ASSERT_TRUE(edit_manager::undoRequest(kEdit));
+        ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+        EXPECT_FALSE(edit_manager::redoExists(kEdit));
+    }
+}
+
+TEST(Undo, AnEditThatWasNotChangedSinceItsBackupIsWrittenFirst) {
+    ManagedProject project;
+    ManagedProject::save("a");
+    for (int i = 1; i <= 3; ++i) {
+        ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+        EXPECT_TRUE(project.has("E0001000.qme.U" + std::to_string(i)));
+    }
+    ASSERT_TRUE(edit_manager::undoRequest(kEdit));
+    EXPECT_TRUE(project.has("E0001000.qme"));
+    EXPECT_EQ(ManagedProject::nameOf(), "a");
+}
+
+TEST(Undo, TellsThoseWhoHoldTheEditAndThoseWhoOpenItAgain) {
+    ManagedProject project;
+    ManagedProject::save("a");
+    ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+    ManagedProject::save("b");
+    const EditPtr held(kEdit, eOpenExisting);
+    std::vector<String> heard;
+    const auto watch = [&](const EditPtr& edit, const char* who) {
+        return edit->addListener({}, [&heard, who](const NotifyMsg& message) {
+            heard.push_back(String(who) + message.type().name() + " " + message.text());
+        });
+    };
+    const auto guard = watch(held, "");
+    std::vector<Qx::Ptr<Qx::Guard>> guards;
+    EditPtr reopened;
+    const auto follow = edit_manager::registerNotification(
+        edit_manager::invalidateCacheMsgType(),
+        [&](const NotifyMsg& message) { heard.push_back(message.text()); });
+    held->set_cel_cues_loaded(true);
+    held->setOwner("bert", false);
+    ASSERT_TRUE(edit_manager::undoRequest(kEdit));
+    reopened = EditPtr(kEdit, eOpenExisting);
+    EXPECT_NE(static_cast<Edit*>(reopened), static_cast<Edit*>(held));
+    EXPECT_EQ(heard,
+              (std::vector<String>{"impendingRevChange E0001000 2", "E0001000", "revChange E0001000 2"}));
+    EXPECT_TRUE(reopened->get_cel_cues_loaded());
+    EXPECT_EQ(reopened->getOwner(), "bert");
+    EXPECT_EQ(reopened->getChangeDescription(), EditModification(kNameChanged).invert());
+    EXPECT_FALSE(reopened->isDirty(true));
+    EXPECT_EQ(edit_manager::numDirty(), 0U);
+    // What is done to the object that was left behind does not reach the file.
+    held->setName("stale");
+    EXPECT_TRUE(edit_manager::flush_changes());
+    edit_manager::close_all_edits();
+    EXPECT_EQ(ManagedProject::nameOf(), "a");
+    ASSERT_TRUE(edit_manager::redoRequest(kEdit));
+    EXPECT_EQ(EditPtr(kEdit, eOpenExisting)->getChangeDescription(), EditModification(kNameChanged));
+}
+
+TEST(Undo, TheClipboardGoesWithTheRevisionThatUsedIt) {
+    for (const bool follows : {true, false}) {
+        const Setting setting("undo_clipboard", follows ? 1 : 0);
+        ManagedProject project;
+        ManagedProject::save("edit before");
+        ManagedProject::save("clip before", clipboard_cookie);
+        ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+        ASSERT_TRUE(edit_manager::backup_edit(clipboard_cookie));
+        ManagedProject::save("clip after", clipboard_cookie);
+        EditPtr(kEdit, eOpenExisting)->Opts().setInt("CLIPBOARD_USED", 1);
+        ManagedProject::save("edit after");
+        ASSERT_TRUE(edit_manager::undoRequest(kEdit));
+        EXPECT_EQ(ManagedProject::nameOf(), "edit before");
+        EXPECT_EQ(ManagedProject::nameOf(clipboard_cookie), follows ? "clip before" : "clip after");
+        ASSERT_TRUE(edit_manager::redoRequest(kEdit));
+        EXPECT_EQ(ManagedProject::nameOf(clipboard_cookie), "clip after");
+        ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+        EXPECT_EQ(EditPtr(kEdit, eOpenExisting)->Opts().getInt("CLIPBOARD_USED", 7), 0);
+    }
+}
+
+TEST(Undo, KeepsToTheDepthAndToReadOnlyMarks) {
+    for (const int depth : {-3, 1, 2}) {
+        const Setting setting("backup_depth", depth);
+        ManagedProject project;
+        for (int i = 0; i < 4; ++i) {
+            ManagedProject::save(String::format("%d", i));
+            ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+        }
+        EXPECT_EQ(edit_manager::backupDepth(), std::max(depth, 1));
+        EXPECT_TRUE(project.has("E0001000.qme.U1"));
+        EXPECT_EQ(project.has("E0001000.qme.U2"), depth == 2);
+        EXPECT_FALSE(project.has("E0001000.qme.U3"));
+    }
+    ManagedProject project;
+    ManagedProject::save("a");
+    ASSERT_TRUE(PermissionsManager::setReadOnly(kEdit, true));
+    EXPECT_FALSE(edit_manager::backup_edit(kEdit));
+    EXPECT_TRUE(project.log.contains("Attempt to backup read-only edit\n"));
+    EXPECT_FALSE(project.has("E0001000.qme.U1"));
+    EXPECT_FALSE(edit_manager::backup_edit(cookie("E0009000"))) << "there is none";
+}
+
+TEST(Undo, AStepThatFailsLeavesTheRevisionsAsTheyWere) {
+    ManagedProject project;
+    ManagedProject::save("a");
+    ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+    ManagedProject::save("b");
+    const std::string file = project.read("E0001000.qme");
+    const std::string undo = project.read("E0001000.qme.U1");
+    for (const char* const fault :
+         {"rename E0001000.qme E0001000.qme.R1", "rename E0001000.qme.U1 E0001000.qme"}) {
+        test::FaultyFileSystem system;
+        system.failWhere(fault, EIO);
+        EXPECT_FALSE(edit_manager::undoRequest(kEdit));
+        EXPECT_EQ(project.read("E0001000.qme"), file);
+        EXPECT_EQ(project.read("E0001000.qme.U1"), undo);
+        EXPECT_EQ(ManagedProject::nameOf(), "b");
+    }
+    {
+        test::FaultyFileSystem system;
+        system.failWhere("rename E0001000.qme E0001000.qme.U1", EIO);
+        EXPECT_FALSE(edit_manager::backup_edit(kEdit));
+        EXPECT_EQ(project.read("E0001000.qme"), file);
+    }
+    EXPECT_TRUE(edit_manager::undoRequest(kEdit));
+    EXPECT_EQ(ManagedProject::nameOf(), "a");
+}
+
+TEST(Milestones, AreDueByCountAndGoRoundTheSlots) {
+    const struct {
+        unsigned mods;
+        unsigned perEdit;
+        uint64_t count;
+        int64_t last;
+        bool due;
+        uint64_t slot;
+    } cases[] = {
+        {10, 10, 25, 10, true, 2}, {10, 10, 19, 10, false, 1}, {10, 10, 20, 10, true, 2},
+        {10, 10, 99, 0, true, 9},  {10, 10, 100, 0, true, 0},  {10, 10, 9, 0, false, 0},
+        {5, 4, 19, 0, true, 4},    {0, 10, 25, 0, false, 0},   {10, 0, 25, 0, false, 0},
+        {1, 1, 7, 6, true, 0},
+    };
+    for (const auto& [mods, perEdit, count, last, due, slot] : cases) {
+        const MilestoneRing ring(mods, perEdit);
+        const EditPtr edit(new Edit);
+        edit->Opts().setInt64("MOD_COUNT", static_cast<int64_t>(count));
+        edit->Opts().setInt64("MILESTONE", last);
+        EXPECT_EQ(ring.isMilestoneBackupRequired(edit), due) << count << " after " << last;
+        EXPECT_EQ(ring.slot(count), slot) << count;
+        edit->set_cookie(clipboard_cookie);
+        EXPECT_FALSE(ring.isMilestoneBackupRequired(edit));
+    }
+}
+
+TEST(Milestones, AreCopiesOfTheFileMadeWhileFlushing) {
+    ManagedProject project;
+    const auto slot = [&](int number) {
+        return project.root().read("P0001000/Milestones/E0001000/E0001000." + std::to_string(number));
+    };
+    for (int i = 1; i <= 9; ++i) {
+        ManagedProject::change(String::format("%d", i));
+    }
+    EXPECT_TRUE(edit_manager::flush_changes());
+    EXPECT_EQ(slot(0), "(missing)");
+    ManagedProject::change("ten");
+    EXPECT_TRUE(edit_manager::flush_changes());
+    EXPECT_EQ(slot(1), project.read("E0001000.qme"));
+    EXPECT_EQ(EditPtr(kEdit, eOpenExisting)->Opts().getInt64("MILESTONE"), 10);
+    ManagedProject::change("eleven");
+    EXPECT_TRUE(edit_manager::flush_changes());
+    EXPECT_NE(slot(1), project.read("E0001000.qme"));
+    EXPECT_EQ(slot(1).size() > 100, true);
+    EXPECT_EQ(slot(2), "(missing)");
+}
+
+} // namespace
