@@ -5,6 +5,8 @@
 #include "platform/services/config_int.h"
 #include "platform/services/log.h"
 
+#include <mutex>
+
 namespace {
 
 /// Tells the edit's observers of channels that were added, a message for each kind.
@@ -41,6 +43,8 @@ Editor::Result Editor::applyInternal(const EditModule& source, const EditModule&
     m_destination = destination;
     m_destination.verify();
     Edit& edit = *m_destination.getEdit();
+    // Whoever saves edits on another thread waits until this one is whole again.
+    const std::lock_guard<criticalSection> hold(edit.section());
     const int numChans = edit.getNumChans();
     if (!doPreEditTasks(source, op)) {
         result.m_reason = m_refusal;

@@ -58,8 +58,9 @@
 /// The source may be the edit of the destination: the result is as if it had been copied first.
 ///
 /// Observers of the destination's change description hear of an operation exactly once, when it is done.
-/// Threads: one thread at a time for the edits involved, as for `Edit`. Nothing here throws but when memory
-/// runs out.
+/// Threads: one thread at a time for the edits involved, as for `Edit`. The destination's section is held
+/// throughout, and the clipboard's while it is filled, so that the manager may save on another thread; who
+/// shares the source holds that. Nothing here throws but when memory runs out.
 class QM_API Editor {
 public:
     /// Flags of `apply`, to be combined. Another bit refuses the operation.

@@ -1,6 +1,7 @@
 #include "edit/editing/detail/edit_plan.h"
 
 #include <algorithm>
+#include <mutex>
 
 using editing_detail::isContinuous;
 using editing_detail::makePart;
@@ -39,6 +40,7 @@ void Editor::doClipboardEditing(edit_operation op) {
     if (!clipboard.valid() || !editing_detail::isWritable(*clipboard)) {
         return;
     }
+    const std::lock_guard<criticalSection> hold(clipboard->section());
     clearClipboard(*clipboard);
     clipboard->setFrameRate(edit.getFrameRate());
     for (size_t i = 0; i < m_plan->targets.size(); ++i) {

@@ -3,6 +3,9 @@
 
 #include "edit/project/permissions_manager.h"
 
+#include <atomic>
+#include <thread>
+
 using namespace test;
 using Op = edit_operation;
 
@@ -376,6 +379,24 @@ TEST_F(EditorTest, AFlatPictureGoesToBothEyes) {
     stereo->groupChannels({stereo->getId(0), stereo->getId(1)}, ChannelGroup::eStereoscopic);
     ASSERT_TRUE(apply(stereo, {}, edit, {0}, Op::Replace).valid());
     EXPECT_EQ(drawRows(*edit), (Rows{"V dd|dAAA", "V eedBBB", "A CffCCC"}));
+}
+
+TEST_F(EditorTest, AnotherThreadMaySaveMeanwhile) {
+    const EditPtr edit = make({"V ABCDEFGH", "A ABCDEFGH"});
+    const EditPtr from = editOf({"V dd", "A ff"});
+    std::atomic<bool> done{false};
+    std::thread saver([&] {
+        while (!done) {
+            edit_manager::flush_changes();
+        }
+    });
+    for (int i = 0; i < 20; ++i) {
+        EXPECT_TRUE(apply(from, {}, edit, {2}, Op::Insert).valid());
+        EXPECT_TRUE(apply({}, {}, edit, {2, 4}, Op::Remove).valid());
+    }
+    done = true;
+    saver.join();
+    EXPECT_EQ(drawRows(*edit), (Rows{"V ABCDEFGH", "A ABCDEFGH"}));
 }
 
 TEST_F(EditorTest, WithoutTheManagerItWorksUnbacked) {
