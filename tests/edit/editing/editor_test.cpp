@@ -1,4 +1,5 @@
 #include "tests/edit/editing/editing_fixture.h"
+#include "tests/support/faulty_file_system.h"
 #include "tests/support/tree_snapshot.h"
 
 #include "edit/project/permissions_manager.h"
@@ -379,6 +380,42 @@ TEST_F(EditorTest, AFlatPictureGoesToBothEyes) {
     stereo->groupChannels({stereo->getId(0), stereo->getId(1)}, ChannelGroup::eStereoscopic);
     ASSERT_TRUE(apply(stereo, {}, edit, {0}, Op::Replace).valid());
     EXPECT_EQ(drawRows(*edit), (Rows{"V dd|dAAA", "V eedBBB", "A CffCCC"}));
+}
+
+TEST_F(EditorTest, WhateverTheDiskDoesTheEditIsTheOldOrTheNew) {
+    bool reached = true;
+    size_t refusals = 0;
+    for (size_t fails = 1; reached; ++fails) {
+        SCOPED_TRACE(fails);
+        EditPtr edit = make({"V AAAABBB", "A CCCCDDD"}, static_cast<int>(1000 + fails));
+        const cookie item = edit->get_cookie();
+        const String before = contentState(*edit);
+        bool done = false;
+        String after;
+        {
+            FaultyFileSystem faulty;
+            faulty.failFrom(fails, EIO);
+            done = apply({}, {}, edit, {2, 5}, Op::Remove).valid();
+            reached = faulty.numOperations() >= fails;
+            after = contentState(*edit);
+        }
+        refusals += done ? 0 : 1;
+        EXPECT_EQ(drawRows(*edit).front(), done ? "V AABB" : "V AAAABBB");
+        EXPECT_TRUE(done || after == before);
+        EXPECT_TRUE(edit_manager::flush_changes());
+        edit.invalidate();
+        ASSERT_TRUE(edit_manager::invalidateCache(item));
+        edit = edit_manager::openEdit(item, eOpenExisting);
+        ASSERT_TRUE(edit.valid());
+        EXPECT_STREQ(contentState(*edit).c_str(), after.c_str());
+        edit.invalidate();
+        if (done) {
+            ASSERT_TRUE(edit_manager::undoRequest(item));
+            EXPECT_STREQ(contentState(*edit_manager::openEdit(item, eOpenExisting)).c_str(), before.c_str());
+        }
+        edit_manager::invalidateCache(clipboard_cookie);
+    }
+    EXPECT_GT(refusals, 3u);
 }
 
 TEST_F(EditorTest, AnotherThreadMaySaveMeanwhile) {
