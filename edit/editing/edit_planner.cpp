@@ -113,7 +113,8 @@ bool Editor::Planner::findSourceSpan() {
         return true;
     }
     const double end = m_source.getEdit()->getEndTime();
-    m_span = m_source.isMarked() ? m_source.getMarkedRegion(m_mode) : Range(0, rounded(end));
+    m_span = m_source.isMarked() ? m_source.getMarkedRegion(m_mode)
+                                 : Range(rounded(m_source.getEdit()->getStartTime()), rounded(end));
     if (m_span.end() == kNoTime) {
         return refuse("the source needs two different marks, or one and a current time");
     }

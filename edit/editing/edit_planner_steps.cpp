@@ -15,6 +15,26 @@ using Qx::kTimeTolerance;
 using Qx::MarkTypes::InMark;
 using Qx::MarkTypes::OutMark;
 
+namespace {
+
+/// A part of a shot as what names the shot itself: its moments by the shot's own clock, on which the part
+/// begins at `start`. Levels, fades and effects are the shot's own and are not repeated.
+std::shared_ptr<cel> referTo(const cookie& shot, const cel& part, double start) {
+    auto made = std::make_shared<cel>();
+    made->reserve(part.numPairs());
+    for (int i = 0; i + 1 < part.numEvents(); i += 2) {
+        const channel_event& in = *part.getChanEventPtr(i);
+        const double length = part.getChanEventPtr(i + 1)->editTime - in.editTime;
+        const bool black = in.strip.isBlack();
+        made->appendEventPair(black ? black_cookie : shot, black ? 0 : start + in.editTime, in.editTime,
+                              length);
+    }
+    made->simplify(Simplification::MergeThrough);
+    return made;
+}
+
+} // namespace
+
 namespace editing_detail {
 
 std::shared_ptr<cel> makePart(const cel* source, const cel::Range& region, bool fillGaps) {
@@ -134,6 +154,10 @@ void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, co
     const cel* const content = from.get_edit_cel_p(from.getIdx(chan));
     std::shared_ptr<cel> part =
         content != nullptr ? makePart(content, region, isContinuous(its.type)) : nullptr;
+    const bool refers = from.isShot() && from.get_cookie().isStorable() && &from != &*m_destination.getEdit();
+    if (refers && part != nullptr) {
+        part = referTo(from.get_cookie(), *part, region.start());
+    }
     if (part == nullptr) {
         refuse("a part of the source cannot be taken from " + from.getChanDisplayName(chan) +
                ": the channel is incomplete or the region is no usable time");
@@ -144,7 +168,7 @@ void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, co
     if (its.type.type != AudioChan || !step.withLevels) {
         return;
     }
-    const AudLevelsCel levels = editing_detail::levelsOf(from, chan);
+    const AudLevelsCel levels = refers ? AudLevelsCel() : editing_detail::levelsOf(from, chan);
     if (!levels.is_dummy()) {
         // A channel may be changed before its levels are laid elsewhere.
         step.levels = &from == &*m_destination.getEdit() ? levels.clone() : levels;

@@ -21,11 +21,16 @@
 /// added for those that hold something; otherwise the surplus is left out. Where the destination has more, an
 /// insert opens them with black, `ReplaceToEnd` ends them, and other operations leave them alone.
 ///
-/// **Regions.** The source region of a channel is its own marked region, else the module's, else all of the
-/// source. Regions of different channels keep their distance from one another. The place in the destination
-/// is a channel's own mark, else the module's (earliest in, latest out), else the current time. What the
-/// source does not have within its region is black. The lengths by which channels move are worked out once
-/// for all of them, so that picture and sound stay in step to the sample however many operations are done.
+/// **Shots.** A source that is a shot (`Edit::isShot`) is not copied but named: what is laid plays the shot,
+/// by the shot's own times, with the levels and effects that the shot has. The content of any other source is
+/// copied.
+///
+/// **Regions.** The source region of a channel is its own marked region, else the module's, else all that the
+/// source holds, from its first event to its last. Regions of different channels keep their distance from one
+/// another. The place in the destination is a channel's own mark, else the module's (earliest in, latest
+/// out), else the current time. What the source does not have within its region is black. The lengths by
+/// which channels move are worked out once for all of them, so that picture and sound stay in step to the
+/// sample however many operations are done.
 ///
 /// **Black.** Video and audio channels are continuous: an operation that lays something behind a channel's
 /// end fills up with black to it, gaps of what is laid become black, and where channels can change in length

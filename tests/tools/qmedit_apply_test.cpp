@@ -31,6 +31,21 @@ TEST_F(QmeditApply, TimesAreTimecodeFramesOrSeconds) {
     }
 }
 
+TEST_F(QmeditApply, AShotIsLaidByNameAndCountedFromItsBeginning) {
+    const nlohmann::json list = nlohmann::json::parse(run({"list", "--type", "shot", "--json"}).out);
+    const std::string shot = list[0]["cookie"];
+    ASSERT_EQ(list[0]["name"], "harbour"); // begins at 00:00:10:00
+    for (const char* times : {"", "@25f-50f", "@1s-2s", "@00:00:11:00-00:00:12:00"}) {
+        const test::ProgramResult result =
+            run({"apply", "insert", "--channels", "V", "--from", shot + times, "--to", m_edit + "@0s"});
+        ASSERT_EQ(result.code, 0) << result.err;
+        const nlohmann::json edit = shown(m_edit);
+        const nlohmann::json& laid = edit["channels"][0]["pairs"][0];
+        EXPECT_EQ(laid["name"], "harbour");
+        EXPECT_EQ(laid["strip_in"], *times == '\0' ? 250 : 275) << times;
+    }
+}
+
 TEST_F(QmeditApply, ATrialChangesNothingAndAnOperationIsKept) {
     const auto before = snapshot();
     ASSERT_EQ(run({"apply", "lift", "--to", m_edit + "@1s-3s", "--dry-run"}).code, 0);

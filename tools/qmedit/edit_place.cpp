@@ -41,10 +41,12 @@ Qx::Status parsePlace(const String& text, EditPlace& place) {
 Qx::Status parseEditTime(const String& text, const EditReport& report, double& seconds) {
     const String digits = text.substr(0, text.empty() ? 0 : text.size() - 1);
     double number = 0;
+    // A shot's times are those of its material's clock; what users count begins with the shot.
+    const double begin = report.type == kLogShot ? report.start : 0;
     if (!text.empty() && text.back() == 'f' && isDigits(digits) && Qx::textToDouble(digits, number)) {
-        seconds = report.rate.toSeconds(static_cast<int64_t>(number));
+        seconds = begin + report.rate.toSeconds(static_cast<int64_t>(number));
     } else if (!text.empty() && text.back() == 's' && Qx::textToDouble(digits, number) && number >= 0) {
-        seconds = number;
+        seconds = begin + number;
     } else {
         Qx::TimecodeFields fields;
         if (const Qx::Status read = Qx::parseTimecode(text, report.rate, fields); !read)

@@ -13,6 +13,6 @@ struct EditPlace {
 /// Takes the text apart. The times are not read yet. A failure says what is wrong with the text.
 Qx::Status parsePlace(const String& text, EditPlace& place);
 
-/// Reads a time of an edit: record timecode ("10:00:05:00", with ';' drop frame), frames from the edit's time
-/// 0 ("125f"), or seconds from there ("5s", "2.5s"). Gives seconds of edit time.
+/// Reads a time of an edit: record timecode ("10:00:05:00", with ';' drop frame), frames ("125f") or seconds
+/// ("5s", "2.5s") from the edit's time 0, in a shot from its beginning. Gives seconds of edit time.
 Qx::Status parseEditTime(const String& text, const EditReport& report, double& seconds);

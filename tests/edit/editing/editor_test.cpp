@@ -217,6 +217,31 @@ TEST_F(EditorTest, ChannelsWithMarksOfTheirOwnKeepTheirDistance) {
     EXPECT_EQ(drawRows(*edit), (Rows{"V AddAAAA", "A BBBffBB"}));
 }
 
+TEST_F(EditorTest, AShotIsNamedNotCopied) {
+    const EditPtr shot =
+        editOf({"V      ddee", "A      ffff"}); // begins at 5 s, as its material's clock does
+    shot->set_original_material(1);
+    shot->get_edit_cel_p(1)->get_start_ceh().set_strip_level(0.5F);
+    ASSERT_TRUE(shot->isShot());
+    const EditPtr edit = make({"V AAAA", "A BBBB"});
+    ASSERT_TRUE(apply(shot, {}, edit, {1}, Op::Insert).valid());
+    for (int chan = 0; chan < 2; ++chan) {
+        const cel& its = *edit->get_edit_cel_p(chan);
+        ASSERT_EQ(its.numPairs(), 3);
+        const channel_event& laid = *its.getChanEventPtr(2);
+        EXPECT_EQ(laid.strip, shot->get_cookie());
+        EXPECT_DOUBLE_EQ(laid.stripTime, 5);
+        EXPECT_DOUBLE_EQ(its.getChanEventPtr(3)->stripTime, 9);
+        EXPECT_EQ(laid.level, 1.0F);
+    }
+    ASSERT_TRUE(apply(shot, {4, 6}, edit, {0}, Op::Replace).valid()); // from before its beginning
+    EXPECT_TRUE(edit->get_edit_cel_p(0)->getChanEventPtr(0)->strip.isBlack());
+    EXPECT_DOUBLE_EQ(edit->get_edit_cel_p(0)->get_strip_time(1), 5);
+    // In its own place a shot is edited like anything else.
+    ASSERT_TRUE(apply(shot, {5, 6}, shot, {9}, Op::Insert).valid());
+    EXPECT_EQ(drawRows(*shot).front(), "V      ddeed");
+}
+
 TEST_F(EditorTest, SourceMayBeTheDestination) {
     const EditPtr edit = make({"V ABCDE", "A FGHIJ"});
     ASSERT_TRUE(apply(edit, {1, 4}, edit, {2}, Op::Insert).valid());
