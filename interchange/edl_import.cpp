@@ -109,6 +109,7 @@ String EdlImporting::shownName(const String& name, int line) {
 
 EditPtr EdlImporting::newEdit(const cookie& item, bool original) const {
     EditPtr edit(new Edit);
+    edit->setCreationDetails();
     // Dirty from the start, so that no header change below announces an item that no project has.
     edit->init_dirty();
     edit->set_cookie(item);

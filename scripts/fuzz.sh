@@ -19,7 +19,7 @@ fi
 one() {
     local name=$1 seconds=$2 log=build/fuzz/$1.log work
     work=$(mktemp -d)
-    if build/fuzz/fuzz/fuzz_"$name" -max_total_time="$seconds" -timeout=10 -rss_limit_mb=2048 \
+    if build/fuzz/fuzz/fuzz_"$name" -seed=20261121 -max_total_time="$seconds" -timeout=20 -rss_limit_mb=2048 \
             -artifact_prefix=build/fuzz/found/"$name"- "$work" fuzz/corpus/"$name" >"$log" 2>&1; then
         printf '%-14s %s\n' "$name" "$(grep -oE 'Done [0-9]+ runs in [0-9]+ second' "$log" | tail -n 1)s" >&2
     else

@@ -33,7 +33,7 @@ need() {
 }
 
 BUILD_PACKAGES="g++ cmake ninja-build libxxhash-dev libsqlite3-dev nlohmann-json3-dev libcli11-dev"
-TEST_PACKAGES="libgtest-dev pkg-config clang-format-14"
+TEST_PACKAGES="libgtest-dev pkg-config clang-format-14 locales"
 
 # follow LOG LABEL PID: a line of progress for a running build, from the "[3/120]" that ninja writes.
 follow() {

@@ -58,7 +58,7 @@ TEST_F(EditFileFaultsTest, ASaveThatFailsAnywhereLosesNothing) {
         operations = faulty.numOperations();
     }
     ASSERT_GT(operations, 5U);
-    for (const int code : {EIO, ENOSPC, EACCES}) {
+    for (const int code : {EIO, ENOSPC, EACCES, EROFS, EINTR}) {
         for (size_t n = 1; n <= operations; ++n) {
             SCOPED_TRACE(String::format("error %d at operation %zu", code, n));
             std::filesystem::remove(folder.path(kName));
@@ -124,19 +124,25 @@ TEST_F(EditFileFaultsTest, AReadThatFailsAnywhereSaysWhy) {
         ASSERT_EQ(contents(), "old");
         operations = faulty.numOperations();
     }
-    for (size_t n = 1; n <= operations; ++n) {
-        test::FaultyFileSystem faulty;
-        faulty.failAt(n, EIO);
-        const Edit edit(path(), eOpenExisting);
-        SCOPED_TRACE(faulty.operations()[n - 1]);
-        if (!edit.isBad()) {
-            EXPECT_EQ(stateOf(edit), oldState);
-            continue;
+    for (const int code : {EIO, EACCES, EINTR}) {
+        for (size_t n = 1; n <= operations; ++n) {
+            test::FaultyFileSystem faulty;
+            faulty.failAt(n, code);
+            const Edit edit(path(), eOpenExisting);
+            SCOPED_TRACE(faulty.operations()[n - 1] + ", " + std::strerror(code));
+            if (!edit.isBad()) {
+                EXPECT_EQ(stateOf(edit), oldState);
+                continue;
+            }
+            EXPECT_NE(code, EINTR) << "an interruption is no failure";
+            EXPECT_EQ(edit.getNumChans(), 0);
+            EXPECT_NE(edit.lastFileError().find(folder.path(kName)), String::npos) << edit.lastFileError();
+            EXPECT_NE(edit.lastFileError().find(std::strerror(code)), String::npos) << edit.lastFileError();
         }
-        EXPECT_EQ(edit.getNumChans(), 0);
-        EXPECT_NE(edit.lastFileError().find(folder.path(kName)), String::npos) << edit.lastFileError();
-        EXPECT_NE(edit.lastFileError().find(std::strerror(EIO)), String::npos) << edit.lastFileError();
     }
+    test::FaultyFileSystem faulty;
+    faulty.shortTransfers(7);
+    EXPECT_EQ(contents(), "old");
 }
 
 TEST_F(EditFileFaultsTest, DeathAtAnyWriteLeavesTheOldEditOrTheNewOne) {

@@ -1,6 +1,7 @@
 #include "edit/persist/edit_init.h"
 #include "edit/persist/revision_history.h"
 #include "edit_samples.h"
+#include "platform/services/clock.h"
 #include "platform/services/current_project.h"
 #include "platform/services/network.h"
 #include "platform/store/edit_header_proxy.h"
@@ -144,6 +145,22 @@ TEST_F(EditFileTest, SavingTwiceGivesTheSameBytesAndPacksNoCelAgain) {
     read.init_dirty();
     ASSERT_TRUE(read.write_file(path()));
     EXPECT_LE(read.objectStore().numPacked(), 2U);
+}
+
+TEST_F(EditFileTest, AThousandRoundsOfOpeningAndSavingLeaveTheBytes) {
+    const Qx::Clock before = Qx::setClock([] { return int64_t{1'800'000'000}; });
+    Edit edit;
+    test::fillAtRandom(edit, 11);
+    save(edit);
+    const std::string first = bytes("E0001000.qme");
+    for (int round = 0; round < 1000 && bytes("E0001000.qme") == first; ++round) {
+        Edit read(path(), eOpenExisting);
+        ASSERT_FALSE(read.isBad()) << round << ": " << read.lastFileError();
+        read.init_dirty();
+        ASSERT_TRUE(read.write_file(path())) << round << ": " << read.lastFileError();
+    }
+    EXPECT_EQ(bytes("E0001000.qme"), first);
+    Qx::setClock(before);
 }
 
 TEST_F(EditFileTest, NoMarkAndNoSyncLossLeaveNoKeys) {

@@ -1,4 +1,5 @@
 #include "store_fixture.h"
+#include "support/memory_meter.h"
 
 #include <chrono>
 #include <cstring>
@@ -180,7 +181,10 @@ TEST_F(HostileStore, TablesThatLieAreRefused) {
     for (const auto& [what, forge] : cases) {
         Forgery forgery;
         forge(forgery);
-        EXPECT_EQ(openBytes(forgery.file()), TagBag::Damaged) << what;
+        const auto file = forgery.file();
+        const test::MemoryMeter meter;
+        EXPECT_EQ(openBytes(file), TagBag::Damaged) << what;
+        EXPECT_LT(meter.peak(), file.size() + (64U << 20)) << what;
     }
     EXPECT_EQ(openBytes(Forgery().file()), TagBag::Opened) << m_bag.openError();
     EXPECT_EQ(openBytes(Forgery(0).file()), TagBag::Opened) << m_bag.openError();
