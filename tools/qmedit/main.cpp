@@ -47,6 +47,13 @@ int runCommandLine(int count, char** arguments) {
     addHeaderCommand(app, work);
     addVerifyCommand(app, work);
     addSalvageCommand(app, work);
+    addHistoryCommand(app, work);
+    addBackupCommand(app, work);
+    addUndoCommand(app, work);
+    addRedoCommand(app, work);
+    addRecoverCommand(app, work);
+    addDeleteCommand(app, work);
+    addFlushCommand(app, work);
     addDemoCommand(app, work);
     addCompletionCommand(app, work);
 
