@@ -53,8 +53,8 @@ Qx::Status findPlayers(ProjectSession& session, const cookie& item, String& play
 void reportRest(const cookie& item) {
     const std::vector<Revision> rest = revisionsOf(item);
     if (!rest.empty()) {
-        reportProgress(String::format("%zu milestone%s or file%s set aside stay; 'qmedit history ",
-                                      rest.size(), rest.size() == 1 ? "" : "s", rest.size() == 1 ? "" : "s") +
+        reportProgress(String::format("left in place (milestones and files set aside): %zu; 'qmedit history ",
+                                      rest.size()) +
                        item.asString() + "' shows them, 'qmedit recover " + item.asString() +
                        "' brings the edit back from them");
     }

@@ -109,8 +109,8 @@ int ManagedEdit::prepare(bool mayBeGone) {
     }
     m_session.manage();
     if (!mayBeGone && edit_manager::getEditFiles(m_item).empty()) {
-        return failed(Qx::Status::failure("there is no edit " + m_item.asString() + " in the project " +
-                                          m_session.root() + "; 'qmedit list' shows those there are"));
+        EditPtr none;
+        return failed(m_session.readEdit(m_item, none));
     }
     if (PermissionsManager::getReadOnly(m_item)) {
         return failed(Qx::Status::failure(m_item.asString() +

@@ -1,7 +1,6 @@
 #include "tools/qmedit/project_session.h"
 
 #include "edit/manager/edit_record.h"
-#include "edit/manager/revision_chain.h"
 #include "edit/persist/edit_init.h"
 #include "edit/project/project_details.h"
 #include "interchange/edl_records.h"
@@ -61,12 +60,24 @@ Qx::Status damage(const String& path, const String& reason) {
     return Qx::Status::failure(std::move(text));
 }
 
-/// True if the item has undo backups.
-bool isKept(const cookie& item) {
-    return RevisionChain(item, RevisionChain::Undo, 1).exists();
+/// The name of the edit file that a backup, or a file that was set aside, belongs to; empty for other names.
+String fileOfRevision(const String& name) {
+    const String mark = getEditFilenameExt() + ".";
+    const size_t end = name.find(mark);
+    if (end == String::npos) {
+        return {};
+    }
+    const std::string_view rest = std::string_view(name).substr(end + mark.size());
+    const bool isRevision = rest.starts_with('U') || rest.starts_with('R') || rest.starts_with("CORRUPT");
+    return isRevision ? String(name.substr(0, end)) + getEditFilenameExt() : String();
 }
 
-/// An item of the project's folder, and whether its own file is there or only backups of it are.
+String missingText(const cookie& item) {
+    return "its file is missing; 'qmedit history " + item.asString() +
+           "' shows what is left of it, 'qmedit recover " + item.asString() + "' brings it back";
+}
+
+/// An item of the project's folder, and whether its own file is there or only backups and what was set aside.
 struct ItemFile {
     cookie item;
     bool isThere;
@@ -76,11 +87,9 @@ struct ItemFile {
 std::vector<ItemFile> itemFiles(const std::vector<String>& names, std::vector<String>& others) {
     std::map<String, bool> stems;
     for (const String& name : names) {
-        const String extension = Qx::extensionOf(name);
-        if (extension == getEditFilenameExt()) {
+        if (Qx::extensionOf(name) == getEditFilenameExt()) {
             stems[Qx::withoutExtension(name)] = true;
-        } else if (const String file = Qx::withoutExtension(name);
-                   extension.starts_with(".U") && Qx::extensionOf(file) == getEditFilenameExt()) {
+        } else if (const String file = fileOfRevision(name); !file.empty()) {
             stems.try_emplace(Qx::withoutExtension(file), false);
         }
     }
@@ -98,7 +107,7 @@ std::vector<ItemFile> itemFiles(const std::vector<String>& names, std::vector<St
 ListedEdit missingEdit(const cookie& item) {
     ListedEdit entry;
     entry.item = item;
-    entry.damage = "its file is missing; 'qmedit recover " + item.asString() + "' brings back a backup";
+    entry.damage = missingText(item);
     return entry;
 }
 
@@ -220,10 +229,16 @@ Qx::Status ProjectSession::create() {
 Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
     const String path = getFilenameForCookie(item);
     if (kindOf(path) == Qx::FileKind::Missing) {
-        return isKept(item) ? Qx::Status::failure(path + " is missing; 'qmedit recover " + item.asString() +
-                                                  "' brings back a backup of it")
-                            : Qx::Status::failure("there is no edit " + item.asString() + " in the project " +
-                                                  m_root + "; 'qmedit list' shows those there are");
+        std::vector<String> names;
+        std::vector<String> others;
+        static_cast<void>(Qx::fileSystem().list(folder(), names).code);
+        for (const ItemFile& file : itemFiles(names, others)) {
+            if (file.item == item) {
+                return Qx::Status::failure(path + ": " + missingText(item));
+            }
+        }
+        return Qx::Status::failure("there is no edit " + item.asString() + " in the project " + m_root +
+                                   "; 'qmedit list' shows those there are");
     }
     EditPtr read(new Edit);
     if (read->read_file(item, eOpenExisting) != Edit::kReadOk) {
