@@ -2,6 +2,7 @@
 
 #include "edit/manager/edit_manager.h"
 #include "edit/manager/edit_manager_lock.h"
+#include "edit/project/permissions_manager.h"
 #include "platform/services/current_project.h"
 
 #include <csignal>
@@ -176,12 +177,27 @@ TEST_F(QmeditRevisions, RecoverTakesTheNewestSoundStateAndKeepsWhatItReplaces) {
     EXPECT_EQ(bytesOf(fileOf(item, ".CORRUPT.1")), "no edit");
     EXPECT_EQ(bytesOf(fileOf(item, ".CORRUPT")), "an earlier one");
     EXPECT_FALSE(fs::exists(fileOf(item, ".RECOVERY")));
+}
 
-    // Of a file of a later version nothing is known but that it is whole.
-    std::string later = first;
-    later[4] = static_cast<char>(later[4] + 1);
-    put(milestone, later);
-    EXPECT_TRUE(has(refused({"recover", item, "--from", "M3"}), "nothing was changed"));
+TEST_F(QmeditRevisions, WhatMayNotBeReadOrChangedStaysAsItIs) {
+    const String item = imported(kShortList);
+    renamed(item, "Second");
+    edited([&] { ASSERT_TRUE(PermissionsManager::setReadOnly(cookie(item), true)); });
+    const std::string whole = bytesOf(fileOf(item));
+    for (const std::string command : {"backup", "undo", "redo", "recover", "delete"}) {
+        EXPECT_TRUE(has(refused({command, item}), "read-only")) << command;
+    }
+    EXPECT_TRUE(has(refused({"delete", item, "--force"}), "read-only"));
+    EXPECT_EQ(whiches(item), "edit U1");
+    EXPECT_EQ(bytesOf(fileOf(item)), whole);
+
+    // A link is not followed, and not replaced either.
+    edited([&] { ASSERT_TRUE(PermissionsManager::setReadOnly(cookie(item), false)); });
+    fs::rename(fileOf(item), folder.path("elsewhere.qme").c_str());
+    fs::create_symlink(folder.path("elsewhere.qme").c_str(), fileOf(item));
+    EXPECT_TRUE(has(refused({"recover", item}), "cannot be read here"));
+    EXPECT_TRUE(has(refused({"recover", item, "--from", "U1"}), "cannot be read here"));
+    EXPECT_TRUE(fs::is_symlink(fileOf(item)));
 }
 
 TEST_F(QmeditRevisions, DeleteRefusesWhatAnEditPlaysAndTellsWhatGoes) {

@@ -73,7 +73,7 @@ String fileOfRevision(const String& name) {
 }
 
 String missingText(const cookie& item) {
-    return "its file is missing; 'qmedit history " + item.asString() +
+    return "its file is missing, or a program is about to write it; 'qmedit history " + item.asString() +
            "' shows what is left of it, 'qmedit recover " + item.asString() + "' brings it back";
 }
 
