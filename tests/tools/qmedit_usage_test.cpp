@@ -35,6 +35,16 @@ TEST_F(Qmedit, AnswersEveryUsageWithItsExitCodeAndStream) {
         {{"list"}, 1, "no project"},
         {{"show", "E0001000"}, 1, "no project"},
         {{"header", "E0001000"}, 1, "no project"},
+        {{"undo"}, 2, "COOKIE"},
+        {{"backup", "../E0001000"}, 2, "no cookie"},
+        {{"recover", "E0001000", "--from"}, 2, "--from"},
+        {{"history", "E0001000"}, 1, "no project"},
+        {{"backup", "E0001000"}, 1, "no project"},
+        {{"undo", "E0001000"}, 1, "no project"},
+        {{"redo", "E0001000"}, 1, "no project"},
+        {{"recover", "E0001000"}, 1, "no project"},
+        {{"delete", "E0001000"}, 1, "no project"},
+        {{"flush"}, 1, "no project"},
     };
     for (const Usage& usage : usages) {
         String shown;
@@ -51,7 +61,9 @@ TEST_F(Qmedit, AnswersEveryUsageWithItsExitCodeAndStream) {
 }
 
 TEST_F(Qmedit, HelpOfEachCommandHasAnExampleOfIt) {
-    for (const std::string command : {"import", "list", "show", "header", "demo", "completion"}) {
+    for (const std::string command :
+         {"import", "export", "list", "show", "header", "verify", "salvage", "history", "backup", "undo",
+          "redo", "recover", "delete", "flush", "demo", "completion"}) {
         const String help = run({command, "--help"}).out;
         const size_t example = help.find("Example:");
         ASSERT_NE(example, String::npos) << command;
@@ -84,6 +96,9 @@ TEST_F(Qmedit, CompletesCommandsOptionsAndCookiesInBash) {
     EXPECT_EQ(completed(program + " show ''", 2).find("E0001000"), 0u);
     EXPECT_EQ(completed(program + " header " + item, 2), item);
     EXPECT_EQ(completed(program + " import x --rate 29", 4), "29.97");
+    EXPECT_EQ(completed(program + " undo " + item, 2), item);
+    run({"backup", item});
+    EXPECT_EQ(completed(program + " recover " + item + " --from u", 4), "U1");
 }
 
 } // namespace

@@ -37,12 +37,23 @@ _qmedit_cookies() {
     done
 }
 
+_qmedit_states() {
+    local project=() item='' i
+    for ((i = 1; i < COMP_CWORD; i++)); do
+        [[ ${COMP_WORDS[i]} == --project ]] && project=(--project "${COMP_WORDS[i + 1]/#\~/$HOME}")
+        [[ ${COMP_WORDS[i]^^} =~ ^[A-Z][0-9A-Z]{7}$ ]] && item=${COMP_WORDS[i]}
+    done
+    "${COMP_WORDS[0]}" history "$item" "${project[@]}" 2>/dev/null | while read -r which rest; do
+        [[ $which =~ ^(U|R|M|CORRUPT)[.0-9]*$ ]] && printf '%s\n' "$which"
+    done
+}
+
 _qmedit() {
     local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]} command='' options='' i
     COMPREPLY=()
     for ((i = 1; i < COMP_CWORD; i++)); do
         case ${COMP_WORDS[i]} in
-        --project | --into | --rate | --type) ((i++)) ;;
+        --project | --into | --rate | --type | --from) ((i++)) ;;
         -*) ;;
         *) command=${COMP_WORDS[i]}; break ;;
         esac
@@ -53,6 +64,9 @@ _qmedit() {
         compopt -o filenames 2>/dev/null
         return ;;
     --rate) mapfile -t COMPREPLY < <(compgen -W '23.976 24 25 29.97 30 47.952 48 50 59.94 60' -- "$current"); return ;;
+    --from)
+        mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_states)" -- "${current^^}")
+        return ;;
     --type) mapfile -t COMPREPLY < <(compgen -W 'edit shot ghost magic reel FXT' -- "$current"); return ;;
     esac
     case $command in
@@ -66,7 +80,7 @@ _qmedit() {
     import | salvage)
         mapfile -t COMPREPLY < <(compgen -f -- "$current")
         compopt -o filenames 2>/dev/null ;;
-    show | header | export | verify) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;;
+    show | header | export | verify | history | backup | undo | redo | recover | delete) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;;
     completion) mapfile -t COMPREPLY < <(compgen -W bash -- "$current") ;;
     esac
 }

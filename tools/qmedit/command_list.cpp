@@ -2,6 +2,7 @@
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/project_session.h"
+#include "tools/qmedit/revisions.h"
 #include "tools/qmedit/safe_text.h"
 
 #include "platform/media/timecode.h"
@@ -10,27 +11,18 @@
 #include <CLI/CLI.hpp>
 
 #include <algorithm>
-#include <ctime>
 #include <memory>
 
 namespace {
+
+/// So many files take long enough to be read that a record is worth a word.
+constexpr size_t kManyFiles = 2000;
 
 struct ListOptions {
     String project;
     String type;
     bool json = false;
 };
-
-String localTime(int64_t seconds) {
-    const auto time = static_cast<std::time_t>(seconds);
-    std::tm fields{};
-    char text[32];
-    if (seconds <= 0 || localtime_r(&time, &fields) == nullptr ||
-        std::strftime(text, sizeof text, "%Y-%m-%d %H:%M", &fields) == 0) {
-        return "-";
-    }
-    return text;
-}
 
 /// The rows of the table, each with one text a column; a damaged edit has its reason in the last.
 std::vector<String> cells(const ListedEdit& edit, const Console& console) {
@@ -42,7 +34,7 @@ std::vector<String> cells(const ListedEdit& edit, const Console& console) {
             edit.rate.valid() ? edit.rate.asString() : "-",
             Qx::durationText(edit.rate.toFrames(edit.duration), edit.rate, false),
             String(std::to_string(edit.channels)),
-            localTime(edit.modified),
+            localTimeText(edit.modified),
             console.safe(edit.name)};
 }
 
@@ -94,6 +86,11 @@ int runList(const ListOptions& options) {
     }
     for (const String& name : others) {
         reportWarning(Qx::joinPath(session.folder(), name) + " is passed over: its name is no cookie");
+    }
+    if (Console::errorsToTerminal() && session.numRead() >= kManyFiles) {
+        reportProgress(String::format("%zu files were read; 'qmedit flush' makes a record of them, so that "
+                                      "the next listing is quick",
+                                      session.numRead()));
     }
     if (!options.type.empty()) {
         std::erase_if(

@@ -30,6 +30,13 @@ void addDiffCommand(CLI::App& app, CommandWork& work);
 void addHeaderCommand(CLI::App& app, CommandWork& work);
 void addVerifyCommand(CLI::App& app, CommandWork& work);
 void addSalvageCommand(CLI::App& app, CommandWork& work);
+void addHistoryCommand(CLI::App& app, CommandWork& work);
+void addBackupCommand(CLI::App& app, CommandWork& work);
+void addUndoCommand(CLI::App& app, CommandWork& work);
+void addRedoCommand(CLI::App& app, CommandWork& work);
+void addRecoverCommand(CLI::App& app, CommandWork& work);
+void addDeleteCommand(CLI::App& app, CommandWork& work);
+void addFlushCommand(CLI::App& app, CommandWork& work);
 void addDemoCommand(CLI::App& app, CommandWork& work);
 void addCompletionCommand(CLI::App& app, CommandWork& work);
 /// @}

@@ -67,6 +67,10 @@ Console Console::forStandardOutput() {
             terminal};
 }
 
+bool Console::errorsToTerminal() {
+    return isatty(STDERR_FILENO) == 1;
+}
+
 String Console::safe(std::string_view text) const {
     return safe_text::escaped(text, !m_utf8);
 }
@@ -140,6 +144,19 @@ void reportWarning(std::string_view text) {
 
 void reportProgress(std::string_view text) {
     errorLine("", text);
+}
+
+void showProgress(std::string_view text) {
+    static int shown = 0;
+    if (!Console::errorsToTerminal()) {
+        return;
+    }
+    const String line = safe_text::escaped(text, errorsAscii());
+    const int columns = safe_text::columns(line);
+    const String padding(static_cast<size_t>(std::max(shown - columns, 0)), ' ');
+    const String whole = "\r" + line + padding + (line.empty() ? "\r" : "");
+    std::fwrite(whole.data(), 1, whole.size(), stderr);
+    shown = columns;
 }
 
 void routeLibraryLog() {

@@ -28,6 +28,8 @@ public:
     /// by LC_ALL, LC_CTYPE or LANG, the first that is set; the width by COLUMNS, else by the terminal, else
     /// 100.
     [[nodiscard]] static Console forStandardOutput();
+    /// True if standard error is a terminal, where progress can be shown as it goes.
+    [[nodiscard]] static bool errorsToTerminal();
     /// A console of given abilities.
     Console(bool colour, bool utf8, int width, bool terminal)
         : m_colour(colour), m_utf8(utf8), m_terminal(terminal), m_width(width) {}
@@ -65,6 +67,10 @@ void reportError(std::string_view text);
 void reportWarning(std::string_view text);
 /// One line on standard error, as it is but made fit for a terminal.
 void reportProgress(std::string_view text);
+
+/// Shows how far a long work is on the terminal's last line, over what was shown there before; an empty text
+/// clears the line. Does nothing where standard error is no terminal.
+void showProgress(std::string_view text);
 
 /// Keeps the library's log off standard output. With QMEDIT_LOG set it goes to standard error, made fit for a
 /// terminal; without, it is dropped: what a user is to know is reported by the command.

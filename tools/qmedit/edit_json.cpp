@@ -225,6 +225,24 @@ String verifyJson(const std::vector<VerifiedFile>& files) {
     return out + "]\n";
 }
 
+String historyJson(const cookie& item, const std::vector<Revision>& revisions) {
+    String out = "{\n  \"cookie\": " + dumped(item.asString()) + ",\n  \"revisions\": [";
+    addLines(out, "    ", revisions, [](const Revision& revision) {
+        Json json;
+        const bool sound = revision.isSound();
+        json["which"] = revision.which;
+        json["file"] = revision.path;
+        json["name"] = textOrNull(revision.name, sound);
+        json["changed"] = textOrNull(isoTime(revision.time), revision.time > 0);
+        json["size"] = revision.size;
+        json["modifications"] = sound ? Json(revision.modifications) : Json();
+        json["change"] = textOrNull(revision.change, sound && !revision.change.empty());
+        json["damaged"] = textOrNull(revision.damage, !sound);
+        return dumped(json);
+    });
+    return out + "]\n}\n";
+}
+
 String salvageJson(const cookie& item, const Edit& edit, const std::vector<String>& lost) {
     Json json;
     json["cookie"] = item.asString();

@@ -2,6 +2,7 @@
 
 #include "tools/qmedit/edit_report.h"
 #include "tools/qmedit/project_session.h"
+#include "tools/qmedit/revisions.h"
 
 #include <vector>
 
@@ -26,6 +27,9 @@ struct VerifiedFile {
 
 /// Checked files: an array of objects.
 [[nodiscard]] String verifyJson(const std::vector<VerifiedFile>& files);
+
+/// The states of an edit: an object.
+[[nodiscard]] String historyJson(const cookie& item, const std::vector<Revision>& revisions);
 
 /// What a salvage made: an object.
 [[nodiscard]] String salvageJson(const cookie& item, const Edit& edit, const std::vector<String>& lost);

@@ -29,7 +29,7 @@ int reportUsage(const CLI::App& app, const CLI::ParseError& error) {
 }
 
 int runCommandLine(int count, char** arguments) {
-    CLI::App app("Edits of the Quillmarch editor on the command line: import, look, check.", "qmedit");
+    CLI::App app("Edits of the Quillmarch editor on the command line: import, look, check, undo.", "qmedit");
     app.set_version_flag("--version", "qmedit " QMEDIT_VERSION, "Print the version and exit");
     app.set_help_flag("-h,--help", "Print this help and exit");
     app.footer(kFooter);
@@ -49,6 +49,13 @@ int runCommandLine(int count, char** arguments) {
     addDiffCommand(app, work);
     addVerifyCommand(app, work);
     addSalvageCommand(app, work);
+    addHistoryCommand(app, work);
+    addBackupCommand(app, work);
+    addUndoCommand(app, work);
+    addRedoCommand(app, work);
+    addRecoverCommand(app, work);
+    addDeleteCommand(app, work);
+    addFlushCommand(app, work);
     addDemoCommand(app, work);
     addCompletionCommand(app, work);
 

@@ -1,5 +1,6 @@
 #include "tools/qmedit/project_session.h"
 
+#include "edit/manager/edit_record.h"
 #include "edit/persist/edit_init.h"
 #include "edit/project/project_details.h"
 #include "interchange/edl_records.h"
@@ -8,7 +9,10 @@
 #include "platform/services/files.h"
 #include "tools/qmedit/console.h"
 
+#include <chrono>
 #include <cstdlib>
+#include <map>
+#include <thread>
 
 namespace {
 
@@ -54,6 +58,86 @@ Qx::Status damage(const String& path, const String& reason) {
         text += "; its newest backup is " + backup;
     }
     return Qx::Status::failure(std::move(text));
+}
+
+/// The name of the edit file that a backup, or a file that was set aside, belongs to; empty for other names.
+String fileOfRevision(const String& name) {
+    const String mark = getEditFilenameExt() + ".";
+    const size_t end = name.find(mark);
+    if (end == String::npos) {
+        return {};
+    }
+    const std::string_view rest = std::string_view(name).substr(end + mark.size());
+    const bool isRevision = rest.starts_with('U') || rest.starts_with('R') || rest.starts_with("CORRUPT");
+    return isRevision ? String(name.substr(0, end)) + getEditFilenameExt() : String();
+}
+
+String missingText(const cookie& item) {
+    return "its file is missing, or a program is about to write it; 'qmedit history " + item.asString() +
+           "' shows what is left of it, 'qmedit recover " + item.asString() + "' brings it back";
+}
+
+/// An item of the project's folder, and whether its own file is there or only backups and what was set aside.
+struct ItemFile {
+    cookie item;
+    bool isThere;
+};
+
+/// The items that the names of a folder tell of, in order of their cookies.
+std::vector<ItemFile> itemFiles(const std::vector<String>& names, std::vector<String>& others) {
+    std::map<String, bool> stems;
+    for (const String& name : names) {
+        if (Qx::extensionOf(name) == getEditFilenameExt()) {
+            stems[Qx::withoutExtension(name)] = true;
+        } else if (const String file = fileOfRevision(name); !file.empty()) {
+            stems.try_emplace(Qx::withoutExtension(file), false);
+        }
+    }
+    std::vector<ItemFile> files;
+    for (const auto& [stem, isThere] : stems) {
+        if (const cookie item{std::string_view(stem)}; item.isStorable()) {
+            files.push_back({item, isThere});
+        } else if (isThere) {
+            others.push_back(stem + getEditFilenameExt());
+        }
+    }
+    return files;
+}
+
+ListedEdit missingEdit(const cookie& item) {
+    ListedEdit entry;
+    entry.item = item;
+    entry.damage = missingText(item);
+    return entry;
+}
+
+ListedEdit listedEdit(const cookie& item, const projdb::Record& record) {
+    ListedEdit entry;
+    entry.item = item;
+    entry.damage = record[projdb::Damage];
+    if (!entry.damage.empty()) {
+        return entry;
+    }
+    entry.type = record[projdb::Type];
+    entry.name = record[projdb::Name];
+    entry.rate = Qx::FrameRate::fromString(record[projdb::Rate]);
+    static_cast<void>(Qx::textToDouble(record[projdb::Duration], entry.duration));
+    static_cast<void>(Qx::textToInt(record[projdb::NumChans], entry.channels));
+    if (long long modified = 0; Qx::textToInt(record[projdb::Modified], modified)) {
+        entry.modified = modified;
+    }
+    return entry;
+}
+
+/// What cannot be stored is read again the next time.
+void storeRecords(projdb& records, const std::unordered_map<cookie, projdb::Record>& fresh) {
+    projdb::Transaction together(records);
+    for (const auto& [item, record] : fresh) {
+        if (!records.put(item, record)) {
+            return;
+        }
+    }
+    static_cast<void>(together.commit().isOk());
 }
 
 } // namespace
@@ -145,6 +229,14 @@ Qx::Status ProjectSession::create() {
 Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
     const String path = getFilenameForCookie(item);
     if (kindOf(path) == Qx::FileKind::Missing) {
+        std::vector<String> names;
+        std::vector<String> others;
+        static_cast<void>(Qx::fileSystem().list(folder(), names).code);
+        for (const ItemFile& file : itemFiles(names, others)) {
+            if (file.item == item) {
+                return Qx::Status::failure(path + ": " + missingText(item));
+            }
+        }
         return Qx::Status::failure("there is no edit " + item.asString() + " in the project " + m_root +
                                    "; 'qmedit list' shows those there are");
     }
@@ -156,39 +248,90 @@ Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
     return {};
 }
 
-ListedEdit ProjectSession::listed(const cookie& item) const {
-    ListedEdit entry;
-    entry.item = item;
-    EditPtr edit(new Edit);
-    if (edit->read_file(item, eOpenExisting) != Edit::kReadOk) {
-        const String& reason = edit->lastFileError();
-        entry.damage = reason.empty() ? String("cannot be read") : reason;
-        return entry;
+void ProjectSession::manage() {
+    if (m_manager == nullptr) {
+        m_manager = std::make_unique<edit_manager>();
     }
-    entry.type = Edit::log_type_string_get_ms(edit->get_log_type());
-    entry.name = edit->getName();
-    entry.rate = edit->getFrameRate();
-    entry.duration = edit->getEndTime() - edit->getStartTime();
-    entry.channels = edit->getNumChans();
-    entry.modified = edit->getModificationTime();
-    return entry;
 }
 
-Qx::Status ProjectSession::list(std::vector<ListedEdit>& edits, std::vector<String>& others) const {
+Qx::Status ProjectSession::lockForWriting() {
+    using Clock = std::chrono::steady_clock;
+    const Clock::time_point end = Clock::now() + std::chrono::seconds(kLockPatience);
+    m_writers = std::make_unique<EditManagerLock>(folder());
+    Qx::Status taken = m_writers->take();
+    // A folder that cannot be written is not waited for.
+    while (!taken && taken.reason().find(" is locked by ") != String::npos && Clock::now() < end) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        taken = m_writers->take();
+    }
+    return taken ? Qx::Status() : Qx::Status::failure("nothing was changed: " + taken.reason());
+}
+
+projdb* ProjectSession::openRecords() {
+    const String path = Qx::joinPath(folder(), projdb::kFileName);
+    Qx::FileInfo before;
+    if (Qx::fileSystem().info(path, before) || before.kind != Qx::FileKind::Regular) {
+        return nullptr;
+    }
+    manage();
+    projdb* const records = edit_manager::get_projdb();
+    Qx::FileInfo after;
+    if (!Qx::fileSystem().info(path, after) && after.inode != before.inode) {
+        reportWarning("the project's record was damaged; it was set aside as " + path +
+                      ".DAMAGED and is made again. It is only a cache: no edit is concerned");
+    }
+    return records;
+}
+
+/// What the record says of an item, or else its file; `fresh` gets what only the file told.
+projdb::Record ProjectSession::recordOf(const cookie& item, const Records& known, Records& fresh) {
+    const String path = getFilenameForCookie(item);
+    Qx::FileInfo info;
+    const bool hasInfo = !Qx::fileSystem().info(path, info) && info.kind == Qx::FileKind::Regular;
+    // A record of damage is not trusted: what kept a file from being read may be gone.
+    if (const auto place = known.find(item);
+        hasInfo && place != known.end() && isRecordOfFile(place->second, info) &&
+        place->second[projdb::Damage].empty() && !place->second[projdb::Modified].empty()) {
+        return place->second;
+    }
+    ++m_numRead;
+    projdb::Record record;
+    EditPtr edit(new Edit);
+    if (edit->read_file(item, eOpenExisting) == Edit::kReadOk) {
+        record = editRecordOf(*edit, &info);
+    } else {
+        const String& reason = edit->lastFileError();
+        record[projdb::Damage] = reason.empty() ? String("cannot be read") : reason;
+        stampRecord(record, info);
+    }
+    if (hasInfo) {
+        fresh[item] = record;
+    }
+    return record;
+}
+
+Qx::Status ProjectSession::list(std::vector<ListedEdit>& edits, std::vector<String>& others) {
     std::vector<String> names;
     if (const Qx::FileError error = Qx::fileSystem().list(folder(), names); error) {
         return Qx::Status::failure(error.text());
     }
-    for (const String& name : names) {
-        if (Qx::extensionOf(name) != getEditFilenameExt()) {
-            continue;
-        }
-        const cookie item(std::string_view(Qx::withoutExtension(name)));
-        if (item.isStorable()) {
-            edits.push_back(listed(item));
-        } else {
-            others.push_back(name);
-        }
+    projdb* const records = openRecords();
+    Records known;
+    Records fresh;
+    if (records != nullptr) {
+        known.reserve(records->numRecords());
+        records->forEach([&known](const cookie& item, const projdb::Record& record) {
+            known.emplace(item, record);
+            return true;
+        });
+    }
+    m_numRead = 0;
+    for (const ItemFile& file : itemFiles(names, others)) {
+        edits.push_back(file.isThere ? listedEdit(file.item, recordOf(file.item, known, fresh))
+                                     : missingEdit(file.item));
+    }
+    if (records != nullptr && !fresh.empty()) {
+        storeRecords(*records, fresh);
     }
     return {};
 }

@@ -1,9 +1,13 @@
 #pragma once
 
+#include "edit/manager/edit_manager.h"
+#include "edit/manager/edit_manager_lock.h"
 #include "edit/model/edit.h"
+#include "edit/project/projdb.h"
 #include "platform/base/status.h"
 #include "tools/qmedit/edit_report.h"
 
+#include <memory>
 #include <unordered_map>
 #include <vector>
 
@@ -22,7 +26,7 @@ struct ListedEdit {
 /// The project that a command works on: a folder, given by --project, else by $QMEDIT_PROJECT, else
 /// ./quillmarch-project, with the project's own folder (named by its cookie, P0001000) in it. The project's
 /// own folder may be given too. While a session is open, its project is the library's current one. Nothing is
-/// made or changed on the disk but by `create`.
+/// made or changed on the disk but by `create` and `lockForWriting`, and by `list` in a record that is there.
 class ProjectSession {
 public:
     /// The folder that a command works on, from the text of its --project option.
@@ -43,11 +47,24 @@ public:
     /// After `prepare`: makes what is missing on the disk.
     Qx::Status create();
 
+    /// Makes the edit manager, for the commands that work through it. It lives as long as the session.
+    void manage();
+    /// Takes the project's writers' lock for the rest of the session: a command that opens, changes and
+    /// writes takes it before it opens. Another process that holds it is waited for `kLockPatience` seconds;
+    /// a failure then names it.
+    Qx::Status lockForWriting();
+    static constexpr int kLockPatience = 2;
+
     /// Reads an edit. A failure names the file and says what to do.
     Qx::Status readEdit(const cookie& item, EditPtr& edit) const;
-    /// What there is to say of every edit file, in order of their cookies. `others` gets the names of files
-    /// with the edits' extension that are no cookie's. Fails only when the folder cannot be read.
-    Qx::Status list(std::vector<ListedEdit>& edits, std::vector<String>& others) const;
+    /// What there is to say of every edit file, in order of their cookies; an edit of which only backups
+    /// or damaged files that were set aside are there counts as damaged. `others` gets the names of files with the edits' extension that are no
+    /// cookie's. Where the project has a record ("Project.db") only the files that it does not tell of are
+    /// read, and it learns of them; without one every file is. What comes out is the same. Fails only when
+    /// the folder cannot be read.
+    Qx::Status list(std::vector<ListedEdit>& edits, std::vector<String>& others);
+    /// How many files the last listing had to read.
+    [[nodiscard]] size_t numRead() const { return m_numRead; }
     /// Looks names up in the project's files, each file read once a session.
     [[nodiscard]] SourceNamer sourceNamer();
 
@@ -59,12 +76,19 @@ private:
         bool dropFrame = false;
     };
 
+    using Records = std::unordered_map<cookie, projdb::Record>;
+
     void makeCurrentUnwritten(Qx::FrameRate rate) const;
-    [[nodiscard]] ListedEdit listed(const cookie& item) const;
+    /// The project's record; null when it has none or it cannot be used.
+    [[nodiscard]] projdb* openRecords();
+    [[nodiscard]] projdb::Record recordOf(const cookie& item, const Records& known, Records& fresh);
     [[nodiscard]] Known look(const cookie& item) const;
 
     String m_root;
     cookie m_project;
     Qx::FrameRate m_rateOfFresh;
     std::unordered_map<cookie, Known> m_known;
+    size_t m_numRead = 0;
+    std::unique_ptr<EditManagerLock> m_writers;
+    std::unique_ptr<edit_manager> m_manager; ///< goes first: what it writes at its end is written locked
 };

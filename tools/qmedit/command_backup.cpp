@@ -1,0 +1,56 @@
+#include "tools/qmedit/commands.h"
+#include "tools/qmedit/console.h"
+#include "tools/qmedit/managed_edit.h"
+#include "tools/qmedit/revisions.h"
+
+#include "platform/services/edit_filenames.h"
+
+#include <CLI/CLI.hpp>
+
+#include <memory>
+
+namespace {
+
+int runBackup(const EditArguments& arguments) {
+    ManagedEdit managed(arguments);
+    if (const int code = managed.prepare(); code != kDone) {
+        return code;
+    }
+    EditPtr edit;
+    if (!managed.open(edit)) {
+        return kFailed;
+    }
+    const cookie& item = managed.item();
+    const size_t numRedo = managed.numRedo();
+    const String change = changeText(edit->getChangeDescription());
+    if (!edit_manager::backup_edit(item)) {
+        return failed(Qx::Status::failure("no backup of " + item.asString() +
+                                          " was made; see whether the project can be written and has room "
+                                          "(QMEDIT_LOG=1 tells more)"));
+    }
+    // The backup was the edit's file: it is written again, so that other programs find the edit.
+    edit->init_dirty();
+    if (!edit_manager::flush_edit(item)) {
+        return failed(Qx::Status::failure(
+            item.asString() + " is kept whole as its undo backup 1, but " + getFilenameForCookie(item) +
+            " could not be written: " + edit->lastFileError() + "; 'qmedit recover " + item.asString() +
+            "' brings it back when there is room"));
+    }
+    writeOut(item.asString() + ": kept as undo backup 1" +
+             (change.empty() ? String() : " (last change: " + change + ")") +
+             String::format("; %zu to undo", managed.numUndo()) +
+             (numRedo == 0 ? String() : String::format("; %zu redo backups went", numRedo)) + "\n");
+    return kDone;
+}
+
+} // namespace
+
+void addBackupCommand(CLI::App& app, CommandWork& work) {
+    const auto arguments = std::make_shared<EditArguments>();
+    CLI::App* command = app.add_subcommand("backup", "Keep the present state of an edit as an undo backup");
+    addEditArguments(*command, *arguments);
+    command->footer("Example:\n  qmedit backup E0001000\n\n"
+                    "'qmedit undo' goes back to it. What could be redone goes; beyond the depth (10) the "
+                    "oldest backup goes.");
+    command->callback([arguments, &work] { work = [arguments] { return runBackup(*arguments); }; });
+}

@@ -1,0 +1,186 @@
+#include "tools/qmedit/managed_edit.h"
+
+#include "tools/qmedit/console.h"
+#include "tools/qmedit/revisions.h"
+
+#include "edit/manager/revision_chain.h"
+#include "edit/project/permissions_manager.h"
+#include "platform/services/edit_filenames.h"
+#include "platform/services/files.h"
+
+#include <CLI/CLI.hpp>
+
+namespace {
+
+RevisionChain chain(const cookie& item, RevisionChain::Kind kind) {
+    return {item, kind, edit_manager::backupDepth()};
+}
+
+uint64_t inodeOf(const String& path) {
+    Qx::FileInfo info;
+    return Qx::fileSystem().info(path, info) ? 0 : info.inode;
+}
+
+/// What lies at the names of an edit before it is opened, by which its files are known afterwards.
+class FilesBefore {
+public:
+    explicit FilesBefore(const cookie& item) : m_undo(chain(item, RevisionChain::Undo)) {
+        m_edit = inodeOf(m_undo.file());
+        for (const int number : m_undo.numbers()) {
+            m_backups.emplace_back(number, inodeOf(m_undo.path(number)));
+        }
+    }
+
+    /// The number of the backup that is the edit's file, as it was numbered before; 0 when none is.
+    [[nodiscard]] int restored() const {
+        const uint64_t present = inodeOf(m_undo.file());
+        for (const auto& [number, inode] : m_backups) {
+            if (inode == present && present != 0) {
+                return number;
+            }
+        }
+        return 0;
+    }
+    [[nodiscard]] String corruptName() const { return m_undo.file() + ".CORRUPT"; }
+    [[nodiscard]] bool wasMovedAside() const { return m_edit != 0 && inodeOf(corruptName()) == m_edit; }
+    [[nodiscard]] bool wasMissing() const { return m_edit == 0; }
+    [[nodiscard]] const String& file() const { return m_undo.file(); }
+
+private:
+    RevisionChain m_undo;
+    uint64_t m_edit = 0;
+    std::vector<std::pair<int, uint64_t>> m_backups;
+};
+
+/// Why a file does not read, for the end of a sentence.
+String faultOf(const String& path) {
+    EditPtr edit(new Edit);
+    return edit->readFile(Qx::widen(path), eOpenExisting) == Edit::kReadOk ? String() : edit->lastFileError();
+}
+
+void reportRestored(const FilesBefore& before, int number) {
+    const String backup = String::format("undo backup %d was opened in its place", number);
+    if (before.wasMovedAside()) {
+        reportWarning(before.file() + " could not be read and was moved aside to " + before.corruptName() +
+                      "; " + backup + ". 'qmedit salvage " + before.corruptName() +
+                      " --into DIR' saves what is sound of the damaged file");
+    } else {
+        reportWarning(before.file() + " was missing; " + backup);
+    }
+}
+
+void reportNotOpened(const cookie& item, const FilesBefore& before) {
+    if (before.wasMovedAside()) {
+        reportError(before.file() + " could not be read and was moved aside to " + before.corruptName() +
+                    "; no undo backup of it can be read. 'qmedit recover " + item.asString() +
+                    "' looks for milestones, 'qmedit salvage " + before.corruptName() +
+                    " --into DIR' saves what is sound of the file");
+        return;
+    }
+    const String fault = faultOf(before.file());
+    reportError(fault.empty() ? String(before.file() + " could not be opened") : fault);
+}
+
+String quotedChange(const String& change) {
+    return change.empty() ? String("changes without a description") : "'" + change + "'";
+}
+
+} // namespace
+
+void addEditArguments(CLI::App& command, EditArguments& arguments) {
+    command.add_option("COOKIE", arguments.item, "The edit, as 'qmedit list' names it")
+        ->required()
+        ->type_name("");
+    addProjectOption(command, arguments.project);
+}
+
+ManagedEdit::ManagedEdit(const EditArguments& arguments)
+    : m_arguments(arguments), m_session(arguments.project) {}
+
+int ManagedEdit::prepare(bool mayBeGone) {
+    if (!readCookie(m_arguments.item, m_item)) {
+        return kWrongUsage;
+    }
+    if (const Qx::Status opened = m_session.openExisting(); !opened) {
+        return failed(opened);
+    }
+    if (const Qx::Status locked = m_session.lockForWriting(); !locked) {
+        return failed(locked);
+    }
+    m_session.manage();
+    if (!mayBeGone && edit_manager::getEditFiles(m_item).empty()) {
+        EditPtr none;
+        return failed(m_session.readEdit(m_item, none));
+    }
+    if (PermissionsManager::getReadOnly(m_item)) {
+        return failed(Qx::Status::failure(m_item.asString() +
+                                          " is marked read-only, so nothing was changed; have its owner take "
+                                          "the mark off in the editor"));
+    }
+    return kDone;
+}
+
+bool ManagedEdit::open(EditPtr& edit) {
+    const FilesBefore before(m_item);
+    const EditPtr opened = edit_manager::openEdit(m_item, eOpenExisting);
+    if (!opened.valid()) {
+        reportNotOpened(m_item, before);
+        return false;
+    }
+    if (const int number = before.restored(); number != 0) {
+        m_wasRestored = true;
+        reportRestored(before, number);
+    }
+    edit = opened;
+    return true;
+}
+
+size_t ManagedEdit::numUndo() const {
+    return chain(m_item, RevisionChain::Undo).numbers().size();
+}
+
+size_t ManagedEdit::numRedo() const {
+    return chain(m_item, RevisionChain::Redo).numbers().size();
+}
+
+int stepRevision(const EditArguments& arguments, bool redo) {
+    const char* const verb = redo ? "redo" : "undo";
+    const char* const done = redo ? "redid" : "undid";
+    ManagedEdit managed(arguments);
+    if (const int code = managed.prepare(); code != kDone) {
+        return code;
+    }
+    const cookie& item = managed.item();
+    EditPtr edit;
+    if (!managed.open(edit)) {
+        return kFailed;
+    }
+    if (managed.wasRestored()) {
+        return failed(Qx::Status::failure(String("nothing was ") + (redo ? "redone" : "undone") +
+                                          ": look at the backup first ('qmedit show " + item.asString() +
+                                          "'), then " + verb + " again"));
+    }
+    const int number = chain(item, redo ? RevisionChain::Redo : RevisionChain::Undo).newest();
+    if (number == 0) {
+        return failed(Qx::Status::failure(
+            String("there is nothing to ") + verb + ": " + item.asString() + " has no " + verb + " backup; " +
+            (redo ? "an undo makes one" : "'qmedit backup " + item.asString() + "' makes one")));
+    }
+    String change = changeText(edit->getChangeDescription());
+    edit.invalidate();
+    if (!(redo ? edit_manager::redoRequest(item) : edit_manager::undoRequest(item))) {
+        return failed(Qx::Status::failure(item.asString() +
+                                          " is as it was: its files could not be moved; see "
+                                          "whether the project can be written (QMEDIT_LOG=1 tells more)"));
+    }
+    edit = edit_manager::openEdit(item, eOpenExisting);
+    if (redo && edit.valid()) {
+        change = changeText(edit->getChangeDescription());
+    }
+    writeOut(
+        item.asString() + ": " + done + " " + quotedChange(change) +
+        String::format("; the edit is what %s backup %d was, last changed %s; %zu to undo, %zu to redo\n",
+                       verb, number, localTimeText(edit.valid() ? edit->getModificationTime() : 0).c_str(),
+                       managed.numUndo(), managed.numRedo()));
+    return kDone;
+}

@@ -1,0 +1,47 @@
+#pragma once
+
+#include "tools/qmedit/commands.h"
+#include "tools/qmedit/project_session.h"
+
+namespace CLI {
+class App;
+}
+
+/// What the commands on one edit are given.
+struct EditArguments {
+    std::string item;
+    String project;
+};
+
+/// Adds COOKIE and --project to a command.
+void addEditArguments(CLI::App& command, EditArguments& arguments);
+
+/// One edit of a project that a command changes through the edit manager, under the project's writers' lock
+/// from before it is opened until the object goes. What the user must know is told on standard error.
+class ManagedEdit {
+public:
+    explicit ManagedEdit(const EditArguments& arguments);
+
+    /// Reads the cookie, opens the project and takes the lock; the item must not be marked read-only, and
+    /// must have a file or a backup unless it `mayBeGone`. An `ExitCode`; what is wrong is reported.
+    int prepare(bool mayBeGone = false);
+    /// Opens the edit. Where its file was missing or unreadable the manager takes a backup in its place,
+    /// which is reported and makes `wasRestored` true. A failure is reported and leaves `edit` null.
+    bool open(EditPtr& edit);
+    [[nodiscard]] bool wasRestored() const { return m_wasRestored; }
+
+    [[nodiscard]] const cookie& item() const { return m_item; }
+    [[nodiscard]] ProjectSession& session() { return m_session; }
+    /// How many undo and redo backups there are.
+    [[nodiscard]] size_t numUndo() const;
+    [[nodiscard]] size_t numRedo() const;
+
+private:
+    const EditArguments& m_arguments;
+    ProjectSession m_session;
+    cookie m_item;
+    bool m_wasRestored = false;
+};
+
+/// Steps an edit one revision back, or with `redo` forward, and prints what happened. An `ExitCode`.
+int stepRevision(const EditArguments& arguments, bool redo);
