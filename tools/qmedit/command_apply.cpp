@@ -31,15 +31,6 @@ struct Side {
     EditModule module;
 };
 
-/// Keeps a manager while a command changes edits of the session's project.
-class ManagerScope {
-public:
-    ManagerScope() { edit_manager::theEditManager(new edit_manager); }
-    ~ManagerScope() { edit_manager::theEditManager(nullptr); }
-    ManagerScope(const ManagerScope&) = delete;
-    ManagerScope& operator=(const ManagerScope&) = delete;
-};
-
 /// Marks a module as its place says. Only without any time it has a current time, its start: a region is
 /// never measured from a time that nobody named.
 Qx::Status markModule(Side& side) {
@@ -165,7 +156,9 @@ int runApply(const ApplyOptions& options) {
         return applyOperation(session, options, op, to, from);
     if (const Qx::Status created = session.create(); !created)
         return failed(created);
-    const ManagerScope manager;
+    if (const Qx::Status locked = session.lockForWriting(); !locked)
+        return failed(locked);
+    session.manage();
     const int code = applyOperation(session, options, op, to, from);
     // The edits are let go before the manager closes them.
     to = {};

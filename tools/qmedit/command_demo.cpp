@@ -5,17 +5,19 @@
 
 #include <CLI/CLI.hpp>
 
+#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <memory>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
 #include <vector>
 
 namespace {
 
-constexpr const char* kExample = "market_day.edl";
-
-/// The example, where the program is installed or else where it was built.
-Qx::Status findExample(String& path) {
+/// An example, where the program is installed or else where it was built.
+Qx::Status findExample(const char* name, String& path) {
     std::error_code code;
     const std::filesystem::path program = std::filesystem::read_symlink("/proc/self/exe", code);
     std::vector<std::filesystem::path> folders;
@@ -24,13 +26,12 @@ Qx::Status findExample(String& path) {
     }
     folders.emplace_back(QMEDIT_EXAMPLES_IN_TREE);
     for (const std::filesystem::path& folder : folders) {
-        path = (folder / kExample).string();
+        path = (folder / name).string();
         if (Qx::fileExists(path)) {
             return {};
         }
     }
-    return Qx::Status::failure("the example " + String(kExample) + " is neither in " +
-                               folders.front().string() +
+    return Qx::Status::failure("the example " + String(name) + " is neither in " + folders.front().string() +
                                " nor in the source tree; install qmedit again with its share folder");
 }
 
@@ -47,38 +48,82 @@ Qx::Status makeFolder(String& folder) {
     return {};
 }
 
-int runDemo(String project) {
+/// Runs this program once more, as a user would, with the command written above what it says.
+int runStep(const std::vector<String>& arguments) {
+    String shown = "\n$ qmedit";
+    std::vector<char*> words;
+    String program = "qmedit";
+    words.push_back(program.data());
+    std::vector<String> kept = arguments;
+    for (String& argument : kept) {
+        shown += " " + argument;
+        words.push_back(argument.data());
+    }
+    words.push_back(nullptr);
+    writeOut(shown + "\n");
+    std::fflush(stdout);
+    pid_t child = 0;
+    int status = 0;
+    if (::posix_spawn(&child, "/proc/self/exe", nullptr, nullptr, words.data(), environ) != 0 ||
+        ::waitpid(child, &status, 0) != child) {
+        return failed(Qx::Status::failure("the program could not be started for the next step of the demo"));
+    }
+    return WIFEXITED(status) ? WEXITSTATUS(status) : static_cast<int>(kFailed);
+}
+
+/// Imports one of the examples and says so.
+int importExample(const char* name, const String& project, cookie& item) {
     ImportOptions importing;
-    if (const Qx::Status found = findExample(importing.file); !found) {
+    importing.project = project;
+    if (const Qx::Status found = findExample(name, importing.file); !found) {
         return failed(found);
     }
+    reportProgress("Importing " + importing.file);
+    const int code = importFile(importing, item);
+    if (code == kDone) {
+        reportProgress("Saved as edit " + item.asString() + " in " + project);
+    }
+    return code;
+}
+
+/// The typical request: material of one edit replaces a span of another, which is kept, taken back and
+/// brought again, and goes out to other tools.
+int runDemo(String project) {
     if (project.empty()) {
         if (const Qx::Status made = makeFolder(project); !made) {
             return failed(made);
         }
     }
-    importing.project = project;
-
-    reportProgress("Importing " + importing.file);
-    ShowOptions showing;
-    if (const int code = importFile(importing, showing.item); code != kDone) {
+    cookie day;
+    cookie evening;
+    int code = importExample("market_day.edl", project, day);
+    if (code == kDone) {
+        code = importExample("market_evening.edl", project, evening);
+    }
+    ::setenv("QMEDIT_PROJECT", project.c_str(), 1);
+    const String list = Qx::joinPath(project, "market_day_recut.edl");
+    const std::vector<std::vector<String>> steps = {
+        {"show", day.asString()},
+        {"show", evening.asString()},
+        {"apply", "replace", "--from", evening.asString() + "@5s-9s", "--to", day.asString() + "@01:00:42:00",
+         "--channels", "V"},
+        {"flush"},
+        {"undo", day.asString()},
+        {"redo", day.asString()},
+        {"history", day.asString()},
+        {"export", day.asString(), list},
+    };
+    for (const std::vector<String>& step : steps) {
+        if (code == kDone) {
+            code = runStep(step);
+        }
+    }
+    if (code != kDone) {
         return code;
     }
-    showing.project = project;
-    reportProgress("Saved as edit " + showing.item.asString() + " in " + project + "; read back from there:");
-    if (const int code = showEdit(showing); code != kDone) {
-        return code;
-    }
-    writeOut("The project is kept in " + project +
-             ". To look further:\n"
-             "  qmedit list --project " +
-             project +
-             "\n"
-             "  qmedit show " +
-             showing.item.asString() + " --events --project " + project +
-             "\n"
-             "  qmedit show " +
-             showing.item.asString() + " --json --project " + project + "\n");
+    writeOut("\nThe project is kept in " + project + ". To look further:\n" +
+             "  export QMEDIT_PROJECT=" + project + "\n  qmedit list\n  qmedit show " + day.asString() +
+             " --events\n  qmedit show " + day.asString() + " --json\n");
     return kDone;
 }
 
@@ -86,7 +131,8 @@ int runDemo(String project) {
 
 void addDemoCommand(CLI::App& app, CommandWork& work) {
     const auto project = std::make_shared<String>();
-    CLI::App* command = app.add_subcommand("demo", "Import an example, save it, read it back and show it");
+    CLI::App* command =
+        app.add_subcommand("demo", "Import two examples, cut one into the other, undo, redo, export");
     addProjectOption(*command, *project);
     command->footer(
         "Example:\n  qmedit demo\n\n"
