@@ -98,6 +98,7 @@ public:
     AccessScope(MultipleAccessQueue<Key>& queue, const Key& key) : m_queue(queue), m_key(key) {
         m_queue.beginAccess(m_key);
     }
+    // NOLINTNEXTLINE(bugprone-exception-escape): only a key that nobody holds makes endAccess throw
     ~AccessScope() { m_queue.endAccess(m_key); }
     AccessScope(const AccessScope&) = delete;
     AccessScope& operator=(const AccessScope&) = delete;

@@ -1,5 +1,6 @@
 #include "edit/model/aud_levels_cel.h"
 
+#include "platform/base/ole_splat.h"
 #include "platform/media/frame_rate.h"
 
 #include <cmath>
@@ -77,6 +78,10 @@ const AudLevelsCel::Store& AudLevelsCel::getNodeStore() const {
 }
 
 AudLevelsCel::Store& AudLevelsCel::changeNodeStore() {
+    if (!valid()) {
+        ole_splat("AudLevelsCel::changeNodeStore() : levels that are invalid have no nodes to change");
+        m_contents = std::make_shared<Contents>();
+    }
     m_contents->changed = true;
     return m_contents->nodes;
 }

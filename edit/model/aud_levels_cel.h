@@ -26,7 +26,8 @@ public:
 
     /// The nodes. An invalid one has none.
     [[nodiscard]] const Store& getNodeStore() const;
-    /// The nodes, to be changed; counts as a change. Must be valid.
+    /// The nodes, to be changed; counts as a change. For an invalid one it is a programming error, which is
+    /// reported; the object then becomes valid, with no node.
     Store& changeNodeStore();
     /// False for an invalid one.
     bool insertNode(double time, float level);

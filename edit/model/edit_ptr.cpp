@@ -30,6 +30,7 @@ EditPtr& EditPtr::open(const cookie& item, eEditOpenBehaviour behaviour) {
     return *this;
 }
 
+// NOLINTNEXTLINE(bugprone-unhandled-self-assignment): the assignment of the pointer handles it
 EditPtr& EditPtr::operator=(const EditPtr& other) {
     return *this = other.m_edit;
 }

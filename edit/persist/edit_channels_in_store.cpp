@@ -63,7 +63,7 @@ static Qx::Status loadCel(TagBag& store, const configb& header, int number, Edit
 Qx::Status EditFile::loadCels(Edit& edit, std::vector<LoadedCel>& cels, Salvaging* salvaging) {
     const int last = salvaging == nullptr ? -1 : salvaging->lastCel();
     for (int n = 0; n <= last || edit.m_store.contains(EditKeys::numbered(EditKeys::kCelid, n)); ++n) {
-        if (!edit.m_store.contains(EditKeys::numbered(EditKeys::kCelid, n))) {
+        if (salvaging != nullptr && !edit.m_store.contains(EditKeys::numbered(EditKeys::kCelid, n))) {
             salvaging->celMissing(n);
             continue;
         }

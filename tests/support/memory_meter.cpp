@@ -9,17 +9,25 @@ namespace {
 
 std::atomic<size_t> held{0};
 std::atomic<size_t> most{0};
-std::atomic<size_t> allocations{0};
+thread_local size_t allocations = 0;
 
-void* take(size_t size) {
+void* take(size_t size) noexcept {
     void* const memory = std::malloc(size == 0 ? 1 : size);
     if (memory == nullptr) {
-        throw std::bad_alloc();
+        return nullptr;
     }
     ++allocations;
     const size_t now = held += malloc_usable_size(memory);
     size_t before = most;
     while (before < now && !most.compare_exchange_weak(before, now)) {
+    }
+    return memory;
+}
+
+void* takeOrThrow(size_t size) {
+    void* const memory = take(size);
+    if (memory == nullptr) {
+        throw std::bad_alloc();
     }
     return memory;
 }
@@ -34,15 +42,27 @@ void giveBack(void* memory) noexcept {
 } // namespace
 
 void* operator new(size_t size) {
-    return take(size);
+    return takeOrThrow(size);
 }
 void* operator new[](size_t size) {
+    return takeOrThrow(size);
+}
+void* operator new(size_t size, const std::nothrow_t&) noexcept {
+    return take(size);
+}
+void* operator new[](size_t size, const std::nothrow_t&) noexcept {
     return take(size);
 }
 void operator delete(void* memory) noexcept {
     giveBack(memory);
 }
 void operator delete[](void* memory) noexcept {
+    giveBack(memory);
+}
+void operator delete(void* memory, const std::nothrow_t&) noexcept {
+    giveBack(memory);
+}
+void operator delete[](void* memory, const std::nothrow_t&) noexcept {
     giveBack(memory);
 }
 void operator delete(void* memory, size_t) noexcept {

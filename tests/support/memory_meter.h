@@ -4,15 +4,15 @@
 
 namespace test {
 
-/// Measures what is taken from the heap through `operator new` in this process, all threads together. A
-/// program that uses it lists support/memory_meter.cpp among its sources.
+/// Measures what is taken from the heap through `operator new`. A program that uses it lists
+/// support/memory_meter.cpp among its sources.
 class MemoryMeter {
 public:
     /// Measures from here.
     MemoryMeter();
-    /// The most that was held at once since then, in bytes beyond what was held before.
+    /// The most that all threads held at once since then, in bytes beyond what was held before.
     [[nodiscard]] size_t peak() const;
-    /// How often memory was asked for since then.
+    /// How often this thread has asked for memory since then.
     [[nodiscard]] size_t numAllocations() const;
 
 private:

@@ -105,6 +105,16 @@ TEST_F(QmeditRevisions, UndoAndRedoStepThroughTheChanges) {
     EXPECT_EQ(bytesOf(fileOf(item)), third);
 }
 
+TEST_F(QmeditRevisions, UndoTellsWhichOperationItTookBack) {
+    const String item = imported(kShortList);
+    const auto before = shown(item).at("channels");
+    done({"apply", "remove", "--to", item + "@1s-2s"});
+    EXPECT_NE(shown(item).at("channels"), before);
+    EXPECT_TRUE(has(done({"undo", item}), "undid 'remove'"));
+    EXPECT_EQ(shown(item).at("channels"), before);
+    EXPECT_TRUE(has(done({"redo", item}), "redid 'remove'"));
+}
+
 TEST_F(QmeditRevisions, ABackupLeavesTheEditInItsPlace) {
     const String item = imported(kShortList);
     renamed(item, "Second");
@@ -285,8 +295,10 @@ TEST_F(QmeditRevisions, AHolderOfTheLockIsNamedAndADeadOneDoesNotBlock) {
     char taken = 0;
     ASSERT_EQ(::read(ready[0], &taken, 1), 1);
     ASSERT_EQ(taken, 'y');
-    for (const std::string command : {"backup", "delete", "recover"}) {
-        const String error = refused({command, item});
+    const std::vector<std::vector<std::string>> writers = {
+        {"backup", item}, {"delete", item}, {"recover", item}, {"apply", "remove", "--to", item + "@1s-2s"}};
+    for (const std::vector<std::string>& writer : writers) {
+        const String error = refused(writer);
         EXPECT_TRUE(has(error, "process " + std::to_string(holder)) && has(error, "try again")) << error;
     }
     EXPECT_TRUE(has(done({"list"}), item)) << "reading needs no lock";

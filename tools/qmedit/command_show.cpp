@@ -58,6 +58,11 @@ int showEdit(const ShowOptions& options) {
     return kDone;
 }
 
+void drawEdit(const EditReport& report) {
+    const Console console = Console::forStandardOutput();
+    writeOut("\n" + editSummary(report, console) + "\n" + trackPicture(report, console) + "\n");
+}
+
 void addShowCommand(CLI::App& app, CommandWork& work) {
     struct Arguments {
         std::string item;

@@ -6,6 +6,8 @@
 
 #include <functional>
 
+struct EditReport;
+
 namespace CLI {
 class App;
 }
@@ -23,6 +25,8 @@ void addImportCommand(CLI::App& app, CommandWork& work);
 void addExportCommand(CLI::App& app, CommandWork& work);
 void addListCommand(CLI::App& app, CommandWork& work);
 void addShowCommand(CLI::App& app, CommandWork& work);
+void addApplyCommand(CLI::App& app, CommandWork& work);
+void addDiffCommand(CLI::App& app, CommandWork& work);
 void addHeaderCommand(CLI::App& app, CommandWork& work);
 void addVerifyCommand(CLI::App& app, CommandWork& work);
 void addSalvageCommand(CLI::App& app, CommandWork& work);
@@ -53,6 +57,8 @@ struct ShowOptions {
     bool allEvents = false;
 };
 int showEdit(const ShowOptions& options);
+/// Draws an edit on standard output, without its table of events.
+void drawEdit(const EditReport& report);
 /// Imports a file as `qmedit import` does and sets `item` to the edit that was made. The cookie is not
 /// printed.
 struct ImportOptions {

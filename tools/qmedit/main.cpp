@@ -45,6 +45,8 @@ int runCommandLine(int count, char** arguments) {
     addListCommand(app, work);
     addShowCommand(app, work);
     addHeaderCommand(app, work);
+    addApplyCommand(app, work);
+    addDiffCommand(app, work);
     addVerifyCommand(app, work);
     addSalvageCommand(app, work);
     addHistoryCommand(app, work);

@@ -4,7 +4,7 @@
 #include "platform/services/crash_flag.h"
 #include "platform/services/local_service.h"
 #include "platform/services/timed_task.h"
-#include "tests/edit/manager/allocations.h"
+#include "support/memory_meter.h"
 #include "tests/edit/manager/managed_project.h"
 #include "tests/support/child_process.h"
 #include "tests/support/faulty_file_system.h"
@@ -28,9 +28,9 @@ TEST(Cache, AnOpenThatIsCachedCostsNoFileAndNoMemory) {
     test::FaultyFileSystem system;
     const uint64_t timed = Qx::TimedTask::named("editman").section("open").calls();
     for (const cookie& item : {kEdit, missing}) {
-        const size_t before = test::allocations();
+        const test::MemoryMeter meter;
         const EditPtr edit = edit_manager::openEdit(item, eOpenOrCreate);
-        EXPECT_EQ(test::allocations(), before);
+        EXPECT_EQ(meter.numAllocations(), 0U);
         EXPECT_EQ(edit.valid(), item == kEdit);
     }
     EXPECT_EQ(system.numOperations(), 0U);

@@ -1,0 +1,125 @@
+#pragma once
+
+#include "edit/editing/editor.h"
+
+#include <vector>
+
+/// A channel of the destination that takes part in an operation.
+struct Editor::Target {
+    Edit::ChanType type;
+    IdStamp chan;   ///< null until the channel is added
+    IdStamp source; ///< what is laid comes from this channel; null for none
+    IdStamp levels; ///< the levels channel of an audio channel; null for none
+    bool needsLevels = false;
+    double movesFrom = Qx::kNoTime; ///< what lies at or behind this time moves, by `shift`
+    double shift = 0;
+    bool moves = false; ///< something that is not black does
+};
+
+/// One change of one channel, ready to be made.
+struct Editor::Step {
+    edit_operation core = edit_operation::NoOperation; ///< `kCoreReplace` and its like
+    size_t target = 0;
+    double at = 0;                   ///< where it begins in the destination
+    double length = 0;               ///< of what is laid or removed
+    std::shared_ptr<const cel> part; ///< what is laid, from 0 to `length`
+    AudLevelsCel levels;             ///< its levels; an invalid one for none
+    cel::Range levelsRange;
+    bool withLevels = true;
+    [[nodiscard]] double end() const { return at + length; }
+};
+
+/// All that an operation will do to the channels of its destination: typed values, worked out and checked
+/// before anything is changed.
+struct Editor::Plan {
+    std::vector<Target> targets;
+    std::vector<Step> steps;
+    double at = 0; ///< the span in the destination that the operation is about
+    double length = 0;
+    double current = Qx::kNoTime; ///< `Result::curTime`
+};
+
+/// Works out the plan of one operation. Changes nothing.
+class Editor::Planner {
+public:
+    Planner(const EditModule& source, const EditModule& destination, edit_operation op, unsigned flags);
+
+    /// Null with `reason()` set when the operation is refused.
+    [[nodiscard]] std::unique_ptr<Plan> plan();
+    [[nodiscard]] const String& reason() const { return m_reason; }
+
+private:
+    using Range = cel::Range;
+
+    /// The place of a source's region in the destination, for one channel.
+    struct Lay {
+        Range region;    ///< in the source
+        double at = 0;   ///< of the region's start in the destination
+        double open = 0; ///< where an insert opens the channel
+    };
+
+    bool refuse(String reason);
+    // edit_planner.cpp
+    bool checkOperation();
+    bool planWithSource();
+    bool planPass(const EditModule& destination, bool otherEyes);
+    bool pairChannels(const EditModule& destination, Edit::ChanType type, std::vector<Target>& pairs);
+    bool findSourceSpan();
+    bool findLay(const Target& target, const EditModule& destination, Lay& lay);
+    bool checkSourceRegion(const Range& region);
+    bool addSourceSteps(Target target, const EditModule& destination);
+    void addInsert(size_t target, const Lay& lay);
+    void addFillBlack(size_t target, const Lay& lay);
+    // edit_planner_within.cpp
+    bool planWithin();
+    bool planRemoveOrLift();
+    bool planInterTrack();
+    bool addSwap(const Vector<IdStamp>& chans);
+    bool addCopies(const Vector<IdStamp>& chans);
+    // edit_planner_steps.cpp
+    size_t addTarget(Target target);
+    void addStep(edit_operation core, size_t target, double at, double length,
+                 std::shared_ptr<const cel> part = nullptr);
+    void addCopyStep(size_t target, double at, const Edit& from, const IdStamp& chan, const Range& region);
+    void addBlackStep(edit_operation core, size_t target, double at, double length);
+    bool destinationRegion(const EditModule& destination, const IdStamp& chan, Range& region);
+    bool checkSteps();
+    bool checkStep(const Step& step);
+    void findShifts();
+    [[nodiscard]] double inMark(const EditModule& module, const IdStamp& chan) const;
+    [[nodiscard]] double outMark(const EditModule& module, const IdStamp& chan) const;
+    [[nodiscard]] double rounded(double time) const;
+    [[nodiscard]] String nameOf(const Target& target) const;
+
+    const EditModule& m_source;
+    const EditModule& m_destination;
+    edit_operation m_op;
+    edit_operation m_core;
+    unsigned m_flags;
+    EditModule::Mode m_mode;
+    Range m_span;              ///< the module's source region
+    double m_markedLength = 0; ///< of the destination's region, for the operations that fill it
+    std::unique_ptr<Plan> m_plan;
+    String m_reason;
+};
+
+namespace editing_detail {
+
+/// A cel of the content of `source` from `region.start()` on, `region.length()` long and beginning at 0, with
+/// black where nothing lies if `fillGaps`. A null source gives a black or empty one.
+[[nodiscard]] std::shared_ptr<cel> makePart(const cel* source, const cel::Range& region, bool fillGaps);
+/// True for the channels whose gaps are filled with black: video and audio.
+[[nodiscard]] inline bool isContinuous(const Edit::ChanType& type) {
+    return type.subtype == Edit_Chan_SubType::NONE && (type.type == VideoChan || type.type == AudioChan);
+}
+/// The levels channel that belongs to an audio channel; an invalid one if there is none.
+[[nodiscard]] AudLevelsCel levelsOf(const Edit& edit, const IdStamp& audio);
+/// Gives an audio channel without levels a levels channel that says what its clips' own levels say. The null
+/// stamp if that is not possible.
+IdStamp addLevels(Edit& edit, const IdStamp& audio);
+/// True if an edit may be changed by the current user.
+[[nodiscard]] bool isWritable(const Edit& edit);
+/// A plain time for messages: seconds with up to three decimals.
+[[nodiscard]] String secondsText(double seconds);
+
+} // namespace editing_detail

@@ -1,0 +1,90 @@
+#include "edit/editing/detail/cue_follower.h"
+#include "edit/editing/detail/edit_op_performer.h"
+#include "platform/base/ole_splat.h"
+#include "platform/services/log.h"
+
+#include <algorithm>
+
+using Op = edit_operation;
+
+namespace {
+
+/// Binds copies of the objects that `from` has for some events to the events that were made of them.
+void copyObjects(TagBag& from, TagBag& to, const cel::IdMap& stamps) {
+    if (from.numObjects() == 0) {
+        return;
+    }
+    for (const auto& [old, made] : stamps) {
+        const String name = old.asString();
+        const Streamable* const object = from.contains(name) ? from.openObject(name) : nullptr;
+        if (object != nullptr) {
+            to.storeObject(made.asString(), object->clone());
+        }
+    }
+}
+
+} // namespace
+
+bool Editor::EditOpPerformer::doEdit(cel& its, const Step& step, cel::IdMap& copied,
+                                     cel::IdMap& splits) const {
+    const cel::Range all(0, step.length);
+    switch (step.core) {
+    case kCoreReplace:
+        return its.replace(step.part.get(), all, step.at, copied, m_op == Op::ReplaceMaterial, &splits);
+    case kCoreInsert:
+        return its.insert(step.part.get(), all, step.at, copied, &splits);
+    case kCoreRemove:
+        return its.remove({step.at, step.end()}, &splits);
+    default:
+        herc_printf("EditOpPerformer::doEdit() : Unhandled EditOperation\n");
+        return false;
+    }
+}
+
+void Editor::EditOpPerformer::doLevels(AudLevelsCel& its, const Step& step) {
+    if (!its.valid() || !step.withLevels) {
+        return;
+    }
+    if (step.core == kCoreReplace) {
+        its.replace(step.levels, step.levelsRange, step.at);
+    } else if (step.core == kCoreInsert) {
+        its.insert(step.levels, step.levelsRange, step.at);
+    } else if (step.core == kCoreRemove) {
+        its.remove({step.at, step.end()});
+    }
+}
+
+/// Makes the plan's changes, in order, and sees to what hangs on the events.
+void Editor::makeChanges(edit_operation op, CueFollower& cues) {
+    const EditOpPerformer performer(op, {m_plan->at, m_plan->at + m_plan->length});
+    const Edit& edit = *m_destination.getEdit();
+    for (const Step& step : m_plan->steps) {
+        const Target& target = m_plan->targets[step.target];
+        cel* const its = celOf(target.chan);
+        if (its == nullptr) {
+            continue; // a channel that could not be added; `autoAddTracks` has reported it
+        }
+        if (step.core != kCoreRemove && editing_detail::isContinuous(target.type)) {
+            its->fillToTime(step.at);
+        }
+        cel::IdMap copied;
+        cel::IdMap splits;
+        if (!performer.doEdit(*its, step, copied, splits)) {
+            ole_splat("Editor: a step of %s that was checked failed\n", editOperationName(op).data());
+            continue;
+        }
+        AudLevelsCel levels = edit.getLevelsCel(target.levels);
+        EditOpPerformer::doLevels(levels, step);
+        bindEffects(copied, splits);
+        cues.noteCopies(target.chan, copied);
+        if (std::find(m_touched.begin(), m_touched.end(), target.chan) == m_touched.end()) {
+            m_touched.push_back(target.chan);
+        }
+    }
+}
+
+void Editor::bindEffects(const cel::IdMap& copied, const cel::IdMap& splits) {
+    TagBag& store = m_destination.getEdit()->objectStore();
+    copyObjects(m_source->objectStore(), store, copied);
+    copyObjects(store, store, splits);
+}

@@ -1,0 +1,196 @@
+#include "tests/edit/editing/editing_fixture.h"
+
+#include <algorithm>
+
+using namespace test;
+using Op = edit_operation;
+
+namespace {
+
+/// One operation on one channel: what is laid comes from `source`, the destination's channel is `before`.
+struct Case {
+    const char* name;
+    Op op;
+    Marks source;
+    const char* before;
+    Marks destination;
+    const char* after;
+    const char* sourceRow = "ddee";
+};
+
+constexpr Marks kDe{1, 3};
+constexpr double kNone = Qx::kNoTime;
+
+Marks in(double time) {
+    return {time};
+}
+Marks out(double time) {
+    return {kNone, time};
+}
+Marks at(double time) {
+    return {kNone, kNone, time};
+}
+Marks span(double from, double to) {
+    return {from, to};
+}
+
+const Case kCases[] = {
+    {"ReplaceInside", Op::Replace, kDe, "AAAABBB", in(1), "AdeABBB"},
+    {"ReplaceUpToACut", Op::Replace, kDe, "AAAABBB", in(2), "AAdeBBB"},
+    {"ReplaceAtTheStart", Op::Replace, kDe, "AAAABBB", in(0), "deAABBB"},
+    {"ReplaceAtACut", Op::Replace, kDe, "AAAABBB", in(4), "AAAAdeB"},
+    {"ReplaceAcrossSeveral", Op::Replace, kDe, "ABCDE", in(1), "AdeDE"},
+    {"ReplacePastTheEnd", Op::Replace, kDe, "AAAABBB", in(6), "AAAABBde"},
+    {"ReplaceBeyondTheEnd", Op::Replace, kDe, "AAAABBB", in(9), "AAAABBB..de"},
+    {"ReplaceAtTheCurrentTime", Op::Replace, kDe, "AAAABBB", at(5), "AAAABde"},
+    {"ReplaceTheInMarkWins", Op::Replace, kDe, "AAAABBB", {2, kNone, 5}, "AAdeBBB"},
+    {"ReplaceFromShortSource", Op::Replace, span(2, 6), "AAAABBB", in(1), "Aee..BB"},
+    {"ReplaceFromUnmarkedSource", Op::Replace, {}, "AAAABBB", in(1), "AddeeBB"},
+    {"ReplaceFromEqualMarks", Op::Replace, {1, 1, 3}, "AAAABBB", in(1), "AdeABBB"},
+    {"ReplaceInAnEmptyChannel", Op::Replace, kDe, "", in(1), ".de"},
+    {"ReplaceFillsTheSourcesGaps", Op::Replace, span(0, 4), "AAAABBB", in(1), "Ad..dBB", "d  d"},
+    {"ReplaceMergesBlack", Op::Replace, span(0, 2), "A..BBBB", in(3), "A....BB", "..dd"},
+    {"ReplaceMarked", Op::ReplaceMarked, kDe, "AAAABBB", span(2, 5), "AAdeeBB"},
+    {"ReplaceMarkedAcrossTheEnd", Op::ReplaceMarked, kDe, "AAAABBB", span(5, 9), "AAAABdee."},
+    {"ReplaceMarkedEqualMarks", Op::ReplaceMarked, kDe, "AAAABBB", {2, 2, 4}, "AAdeBBB"},
+    {"ReplaceMarkedFromCurrentTime", Op::ReplaceMarked, at(2), "AAAABBB", span(2, 4), "AAeeBBB"},
+    {"InsertInside", Op::Insert, kDe, "AAAABBB", in(2), "AAdeAABBB"},
+    {"InsertAtACut", Op::Insert, kDe, "AAAABBB", in(4), "AAAAdeBBB"},
+    {"InsertAtTheStart", Op::Insert, kDe, "AAAABBB", in(0), "deAAAABBB"},
+    {"InsertAtTheEnd", Op::Insert, kDe, "AAAABBB", in(7), "AAAABBBde"},
+    {"InsertBeyondTheEnd", Op::Insert, kDe, "AAAABBB", in(9), "AAAABBB..de"},
+    {"InsertFromShortSource", Op::Insert, span(3, 6), "AAAABBB", at(1), "Ae..AAABBB"},
+    {"RemoveInside", Op::Remove, {}, "AAAABBB", span(1, 2), "A|AABBB"},
+    {"RemoveAcrossACut", Op::Remove, {}, "AAAABBB", span(2, 5), "AABB"},
+    {"RemoveFromTheStart", Op::Remove, {}, "AAAABBB", span(0, 2), "AABBB"},
+    {"RemoveAcrossTheEnd", Op::Remove, {}, "AAAABBB", span(5, 9), "AAAAB"},
+    {"RemoveSeveral", Op::Remove, {}, "ABCDE", span(1, 4), "AE"},
+    {"RemoveAll", Op::Remove, {}, "AAAABBB", span(0, 7), ""},
+    {"RemoveMergesBlack", Op::Remove, {}, "A.BB.C", span(2, 4), "A..C"},
+    {"InsertMarked", Op::InsertMarked, kDe, "AAAABBB", span(2, 5), "AAdeeAABBB"},
+    {"InsertMarkedBeyondTheEnd", Op::InsertMarked, kDe, "AAAABBB", span(8, 10), "AAAABBB.de"},
+    {"ReplaceToEnd", Op::ReplaceToEnd, kDe, "AAAABBB", in(2), "AAde"},
+    {"ReplaceToEndPastTheEnd", Op::ReplaceToEnd, kDe, "AAAABBB", in(6), "AAAABBde"},
+    {"Lift", Op::Lift, {}, "AAAABBB", span(2, 5), "AA...BB"},
+    {"LiftMergesBlack", Op::Lift, {}, "AA.BB.", span(3, 5), "AA...."},
+    {"LiftStopsAtTheEnd", Op::Lift, {}, "AAAABBB", span(5, 9), "AAAAB.."},
+    {"BackReplace", Op::BackReplace, kDe, "AAAABBB", out(5), "AAAdeBB"},
+    {"BackReplaceAtTheStart", Op::BackReplace, kDe, "AAAABBB", at(2), "deAABBB"},
+    {"BackReplaceMarked", Op::BackReplaceMarked, kDe, "AAAABBB", span(2, 5), "AAddeBB"},
+    {"FillBlack", Op::FillBlack, kDe, "AAA.BBB", in(2), "AAAeBBB"},
+    {"FillBlackBothEnds", Op::FillBlack, {}, ".AA.BBB", in(0), "dAAeBBB"},
+    {"FillBlackPastTheEnd", Op::FillBlack, kDe, "AAA", in(2), "AAAe"},
+    {"FillBlackWithinMarks", Op::FillBlack, {}, ".....BB", span(1, 3), ".dd..BB"},
+    {"BackInsert", Op::BackInsert, kDe, "AAAABBB", out(3), "AdeAAABBB"},
+    {"BackInsertMarked", Op::BackInsertMarked, kDe, "AAAABBB", span(2, 5), "AAddeAABBB"},
+    {"ReplaceMaterial", Op::ReplaceMaterial, kDe, "AAAABBB", in(2), "AAdeBBB"},
+    {"ReplaceMaterialAcrossACut", Op::ReplaceMaterial, span(0, 2), "AAAABBB", in(3), "AAAd|dBB"},
+    {"MarksAreRoundedToFrames", Op::Remove, {}, "AAAABBB", span(2.013, 4.991), "AABB"},
+};
+
+Rows rowsOf(const std::vector<char>& kinds, const char* row) {
+    Rows rows;
+    for (const char kind : kinds) {
+        rows.push_back(std::string(1, kind) + " " + row);
+    }
+    return rows;
+}
+
+class EditorTable : public EditingTest {
+protected:
+    /// Operate, undo, redo, with all of the edit checked after each.
+    void run(const Rows& before, const EditModule& source, const Marks& marks, Op op, const Rows& after) {
+        EditPtr edit = make(before);
+        const cookie item = edit->get_cookie();
+        const String stateBefore = contentState(*edit);
+        const Editor::Result result = Editor::apply(source, moduleOf(edit, marks), op);
+        ASSERT_TRUE(result.valid()) << result.reason();
+        EXPECT_EQ(result.notificationType(), editModificationOf(op));
+        EXPECT_FALSE(result.syncLoss());
+        EXPECT_EQ(drawRows(*edit), after);
+        for (int i = 0; i < edit->getNumChans(); ++i) {
+            EXPECT_NE(edit->get_edit_cel_p(i)->is_good_cel(), 0);
+        }
+        EXPECT_EQ(Editor::wasClipboardUsed(edit), editOpRequiresClipboard(op));
+        const String stateAfter = contentState(*edit);
+        edit.invalidate();
+
+        ASSERT_TRUE(edit_manager::undoRequest(item));
+        EXPECT_STREQ(contentState(*edit_manager::openEdit(item, eOpenExisting)).c_str(), stateBefore.c_str());
+        ASSERT_TRUE(edit_manager::redoRequest(item));
+        EXPECT_STREQ(contentState(*edit_manager::openEdit(item, eOpenExisting)).c_str(), stateAfter.c_str());
+    }
+};
+
+TEST_F(EditorTable, OperationsOnOneChannelAndOnMany) {
+    for (const std::vector<char>& kinds :
+         {std::vector<char>{'V'}, std::vector<char>{'V', 'V', 'A', 'A', 'A'}}) {
+        for (const Case& its : kCases) {
+            SCOPED_TRACE(String(its.name) + " on " + std::to_string(kinds.size()));
+            const EditPtr from = editOf(rowsOf(kinds, its.sourceRow));
+            run(rowsOf(kinds, its.before), moduleOf(from, its.source), its.destination, its.op,
+                rowsOf(kinds, its.after));
+        }
+    }
+}
+
+TEST_F(EditorTable, OperationsBetweenChannels) {
+    struct BetweenCase {
+        const char* name;
+        Op op;
+        Rows before;
+        Marks marks;
+        Rows after;
+    };
+    const BetweenCase cases[] = {
+        {"Swap", Op::SwapTracks, {"V AAAABBB", "V CCCCDDD"}, span(2, 5), {"V AACCDBB", "V CCAABDD"}},
+        {"SwapEachKind",
+         Op::SwapTracks,
+         {"V AAA", "V BBB", "A CCC", "A DDD"},
+         span(1, 2),
+         {"V ABA", "V BAB", "A CDC", "A DCD"}},
+        {"SwapWithAnEmptyChannel", Op::SwapTracks, {"V AAAABBB", "V "}, span(2, 5), {"V AA...BB", "V ..AAB"}},
+        {"Copy",
+         Op::CopyTrack,
+         {"A AAAABBB", "A CCCCDDD", "A EEEEEEE"},
+         span(2, 5),
+         {"A AAAABBB", "A CCAABDD", "A EEAABEE"}},
+        {"CopyAcrossTheEnd", Op::CopyTrack, {"V AAAABBB", "V CCC"}, span(5, 9), {"V AAAABBB", "V CCC..BB"}},
+        {"Move", Op::MoveTrack, {"V AAAABBB", "V CCCCDDD"}, span(2, 5), {"V AA...BB", "V CCAABDD"}},
+    };
+    for (const BetweenCase& its : cases) {
+        SCOPED_TRACE(its.name);
+        run(its.before, EditModule(), its.marks, its.op, its.after);
+    }
+}
+
+TEST_F(EditorTable, EffectsChannelsKeepTheirGapsAndLengths) {
+    const EditPtr from = editOf({"E  dd", "V ffff"});
+    const EditModule source = moduleOf(from, span(0, 3));
+    const Rows before{"E EE", "V AAAABBB"};
+    run(before, source, in(1), Op::Insert, {"E E ddE", "V AfffAAABBB"});
+    run(before, source, in(1), Op::Replace, {"E E dd", "V AfffBBB"});
+    run(before, source, in(4), Op::Replace, {"E EE   dd", "V AAAAfff"});
+    run(before, source, span(0, 1), Op::Lift, {"E  E", "V .AAABBB"});
+    run(before, source, span(1, 3), Op::Remove, {"E E", "V A|ABBB"});
+}
+
+TEST_F(EditorTable, WhatIsLaidPlaysTheMarkedPartOfTheSource) {
+    const EditPtr from = editOf({"V dddddddd"});
+    const EditPtr edit = make({"V AAAAAAAAA"});
+    struct StripCase {
+        Op op;
+        Marks marks;
+        const char* strips;
+    };
+    for (const StripCase& its : {StripCase{Op::Replace, in(1), "034567678"}, // source seconds 3 to 7 at 1
+                                 StripCase{Op::InsertMarked, span(2, 4), "01342345678"}}) {
+        const EditPtr copy = edit->copy();
+        ASSERT_TRUE(Editor::apply(moduleOf(from, span(3, its.op == Op::Replace ? 8 : 7)),
+                                  moduleOf(copy, its.marks), its.op)
+                        .valid());
+        EXPECT_EQ(layout::drawStrips(*copy->get_edit_cel_p(0)), its.strips);
+    }
+}
+
+} // namespace

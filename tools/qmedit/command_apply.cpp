@@ -1,0 +1,195 @@
+#include "tools/qmedit/commands.h"
+#include "tools/qmedit/console.h"
+#include "tools/qmedit/edit_diff.h"
+#include "tools/qmedit/edit_place.h"
+#include "tools/qmedit/project_session.h"
+
+#include "edit/editing/editor.h"
+#include "edit/manager/edit_manager.h"
+#include "edit/model/channel_mask.h"
+
+#include <CLI/CLI.hpp>
+
+#include <cmath>
+#include <memory>
+
+namespace {
+
+struct ApplyOptions {
+    std::string operation;
+    std::string to;
+    std::string from;
+    std::string channels;
+    String project;
+    bool dryRun = false;
+};
+
+/// One side of the operation.
+struct Side {
+    EditPlace place;
+    EditPtr edit;
+    EditModule module;
+};
+
+/// Marks a module as its place says. Only without any time it has a current time, its start: a region is
+/// never measured from a time that nobody named.
+Qx::Status markModule(Side& side) {
+    const EditReport report = reportOf(*side.edit, {});
+    side.module = EditModule(side.edit);
+    side.module.setCurTime(side.place.in.empty() && side.place.out.empty() ? 0 : Qx::kNoTime);
+    for (const auto& [text, type] : {std::pair(side.place.in, Qx::MarkTypes::InMark),
+                                     std::pair(side.place.out, Qx::MarkTypes::OutMark)}) {
+        double seconds = 0;
+        if (text.empty())
+            continue;
+        if (const Qx::Status read = parseEditTime(text, report, seconds); !read)
+            return read;
+        side.module.markAllAt(seconds, type);
+    }
+    return {};
+}
+
+/// Leaves selected what a set of channels names: bit 0 the picture, with its effects, bit n sound channel n.
+void selectChannels(EditModule& module, const channel_mask& mask) {
+    Vector<IdStamp> chans;
+    module.getEdit()->getChans(chans, AudioChan);
+    module.selectChans(mask.has_video(), VideoChan, Edit_Chan_SubType::ANY);
+    for (size_t i = 0; i < chans.size(); ++i)
+        module.selectChan(chans[i], mask.get(static_cast<int>(i) + 1));
+}
+
+void reportResult(const Edit& edit, const EditReport& before, const EditReport& after, edit_operation op,
+                  const Editor::Result& result) {
+    const EditDiff diff = diffOf(before, after);
+    writeOut(String(editOperationName(op)) + (diff.same() ? ": nothing looks different\n" : ":\n"));
+    writeOut(diffText(diff, after));
+    if (!result.syncLoss())
+        return;
+    for (int i = 0; i < edit.getNumChans(); ++i) {
+        const double loss = edit.getSyncLoss(edit.getId(i));
+        if (loss != 0)
+            writeOut(edit.getChanDisplayName(edit.getId(i)) + "  is " + after.lengthText(std::abs(loss)) +
+                     (loss > 0 ? " later" : " earlier") + " than the picture\n");
+    }
+}
+
+Qx::Status readSides(const ProjectSession& session, bool managed, bool hasSource, Side& to, Side& from) {
+    for (Side* side : {&to, &from}) {
+        if (side == &from && !hasSource)
+            continue;
+        // The file is looked at first, so that one that does not read stays as it is.
+        if (const Qx::Status read = session.readEdit(side->place.item, side->edit); !read)
+            return read;
+        if (managed)
+            side->edit = edit_manager::openEdit(side->place.item, eOpenExisting);
+        else if (side == &from && to.place.item == from.place.item)
+            side->edit = to.edit;
+        if (!side->edit.valid())
+            return Qx::Status::failure("the edit " + side->place.item.asString() + " does not open");
+        if (const Qx::Status marked = markModule(*side); !marked)
+            return marked;
+    }
+    return {};
+}
+
+int applyOperation(ProjectSession& session, const ApplyOptions& options, edit_operation op, Side& to,
+                   Side& from) {
+    if (const Qx::Status read = readSides(session, !options.dryRun, !options.from.empty(), to, from); !read)
+        return failed(read);
+    if (!options.channels.empty()) {
+        const channel_mask mask(options.channels.c_str());
+        selectChannels(to.module, mask);
+        if (from.edit.valid())
+            selectChannels(from.module, mask);
+    }
+    const EditReport before = reportOf(*to.edit, session.sourceNamer());
+    const unsigned flags = options.dryRun ? Editor::NoBackup : 0u;
+    const Editor::Result result = Editor::apply(from.module, to.module, op, flags);
+    if (!result.valid())
+        return failed(Qx::Status::failure(result.reason()));
+    const EditReport after = reportOf(*to.edit, session.sourceNamer());
+    reportResult(*to.edit, before, after, op, result);
+    drawEdit(after);
+    if (options.dryRun) {
+        writeOut("Nothing was changed: this was a trial.\n");
+        return kDone;
+    }
+    if (!edit_manager::flush_changes())
+        return failed(
+            Qx::Status::failure("the edit " + to.place.item.asString() +
+                                " could not be written; its state before is its newest undo backup"));
+    return kDone;
+}
+
+int runApply(const ApplyOptions& options) {
+    edit_operation op = edit_operation::NoOperation;
+    Side to;
+    Side from;
+    if (!editOperationFromText(options.operation, op) || op == edit_operation::NoOperation) {
+        String names;
+        for (int i = 1; i < kNumEditOperations; ++i)
+            names += (i > 1 ? ", " : "") + String(editOperationName(static_cast<edit_operation>(i)));
+        reportError("'" + options.operation + "' is no operation; the operations are " + names);
+        return kWrongUsage;
+    }
+    for (const auto& [text, side] : {std::pair(&options.to, &to), std::pair(&options.from, &from)}) {
+        const Qx::Status read = text->empty() ? Qx::Status() : parsePlace(*text, side->place);
+        if (!read) {
+            reportError(read.reason());
+            return kWrongUsage;
+        }
+    }
+    if (!options.channels.empty() && channel_mask(options.channels.c_str()).num_set() == 0) {
+        reportError("'" + options.channels +
+                    "' names no channel; write V for the picture and A with a number "
+                    "for a sound channel, as in VA1A2");
+        return kWrongUsage;
+    }
+    if (editOpRequiresSourceAndDest(op) && options.from.empty()) {
+        reportError(String(editOperationName(op)) + " needs a source; name it with --from COOKIE");
+        return kWrongUsage;
+    }
+    ProjectSession session(options.project);
+    if (const Qx::Status opened = session.openExisting(); !opened)
+        return failed(opened);
+    if (options.dryRun)
+        return applyOperation(session, options, op, to, from);
+    if (const Qx::Status created = session.create(); !created)
+        return failed(created);
+    // Held until the edits are written: what another program does meanwhile comes before or after.
+    if (const Qx::Status locked = session.lockForWriting(); !locked)
+        return failed(locked);
+    session.manage();
+    const int code = applyOperation(session, options, op, to, from);
+    // The edits are let go before the manager closes them.
+    to = {};
+    from = {};
+    return code;
+}
+
+} // namespace
+
+void addApplyCommand(CLI::App& app, CommandWork& work) {
+    const auto options = std::make_shared<ApplyOptions>();
+    CLI::App* command = app.add_subcommand("apply", "Perform an editing operation on an edit");
+    command
+        ->add_option("OPERATION", options->operation,
+                     "Its name or number: replace, insert, remove, lift, ...")
+        ->required()
+        ->type_name("");
+    command->add_option("--to", options->to, "The edit that is changed, with its marks")
+        ->required()
+        ->type_name("COOKIE[@IN[-OUT]]");
+    command->add_option("--from", options->from, "The source, with its marks; all of it without")
+        ->type_name("COOKIE[@IN-OUT]");
+    command
+        ->add_option("--channels", options->channels, "The channels of both edits that take part, else all")
+        ->type_name("VA1A2");
+    addProjectOption(*command, options->project);
+    command->add_flag("--dry-run", options->dryRun, "Show what would come of it and change nothing");
+    command->footer(
+        "Example:\n  qmedit apply insert --from E0002000@5s-8s --to E0001000@10:00:05:00\n\n"
+        "A time is record timecode, frames (125f) or seconds (5s) from the edit's beginning. The edit "
+        "is backed up before.");
+    command->callback([options, &work] { work = [options] { return runApply(*options); }; });
+}

@@ -1,0 +1,39 @@
+#pragma once
+
+#include "tools/qmedit/edit_report.h"
+
+#include <vector>
+
+class Console;
+
+/// What differs between two edits, taken from their reports. Channels correspond by kind and by their place
+/// among those of the kind: V2 is compared with V2, whatever they are called.
+
+/// How one channel differs.
+struct ChannelDiff {
+    enum Kind { Changed, Added, Removed };
+    struct Span {
+        double from = 0;
+        double to = 0;
+    };
+    String name; ///< kind letter and place: "V1"
+    Kind kind = Changed;
+    std::vector<Span> spans; ///< edit times at which the two play something else, in order; of a changed one
+    double endBefore = 0;    ///< seconds at which the last pair ends
+    double endAfter = 0;
+};
+
+struct EditDiff {
+    std::vector<ChannelDiff> channels; ///< those that differ, in the order of the channel index
+    size_t cuesBefore = 0;
+    size_t cuesAfter = 0;
+    bool cuesDiffer = false;
+    [[nodiscard]] bool same() const { return channels.empty() && !cuesDiffer; }
+};
+
+[[nodiscard]] EditDiff diffOf(const EditReport& before, const EditReport& after);
+
+/// A line for each thing that differs, with record timecodes of the second edit.
+[[nodiscard]] String diffText(const EditDiff& diff, const EditReport& after);
+/// One JSON object and a line end, as docs/qmedit.md describes it.
+[[nodiscard]] String diffJson(const EditDiff& diff, const EditReport& before, const EditReport& after);

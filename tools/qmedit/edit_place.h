@@ -1,0 +1,18 @@
+#pragma once
+
+#include "platform/base/status.h"
+#include "tools/qmedit/edit_report.h"
+
+/// A place in an edit as users write it: "COOKIE", "COOKIE@IN" or "COOKIE@IN-OUT".
+struct EditPlace {
+    cookie item;
+    String in;  ///< a time as it was written; empty for none
+    String out; ///< likewise
+};
+
+/// Takes the text apart. The times are not read yet. A failure says what is wrong with the text.
+Qx::Status parsePlace(const String& text, EditPlace& place);
+
+/// Reads a time of an edit: record timecode ("10:00:05:00", with ';' drop frame), frames ("125f") or seconds
+/// ("5s", "2.5s") from the edit's time 0, in a shot from its beginning. Gives seconds of edit time.
+Qx::Status parseEditTime(const String& text, const EditReport& report, double& seconds);
