@@ -58,10 +58,10 @@ public:
     /// Reads an edit. A failure names the file and says what to do.
     Qx::Status readEdit(const cookie& item, EditPtr& edit) const;
     /// What there is to say of every edit file, in order of their cookies; an edit of which only backups
-    /// or damaged files that were set aside are there counts as damaged. `others` gets the names of files with the edits' extension that are no
-    /// cookie's. Where the project has a record ("Project.db") only the files that it does not tell of are
-    /// read, and it learns of them; without one every file is. What comes out is the same. Fails only when
-    /// the folder cannot be read.
+    /// or damaged files that were set aside are there counts as damaged. `others` gets the names of files
+    /// with the edits' extension that are no cookie's. Where the project has a record ("Project.db") only the
+    /// files that it does not tell of are read, and it learns of them; without one every file is. What comes
+    /// out is the same. Fails only when the folder cannot be read.
     Qx::Status list(std::vector<ListedEdit>& edits, std::vector<String>& others);
     /// How many files the last listing had to read.
     [[nodiscard]] size_t numRead() const { return m_numRead; }
