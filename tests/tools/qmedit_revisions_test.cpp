@@ -105,6 +105,16 @@ TEST_F(QmeditRevisions, UndoAndRedoStepThroughTheChanges) {
     EXPECT_EQ(bytesOf(fileOf(item)), third);
 }
 
+TEST_F(QmeditRevisions, UndoTellsWhichOperationItTookBack) {
+    const String item = imported(kShortList);
+    const auto before = shown(item).at("channels");
+    done({"apply", "remove", "--to", item + "@1s-2s"});
+    EXPECT_NE(shown(item).at("channels"), before);
+    EXPECT_TRUE(has(done({"undo", item}), "undid 'remove'"));
+    EXPECT_EQ(shown(item).at("channels"), before);
+    EXPECT_TRUE(has(done({"redo", item}), "redid 'remove'"));
+}
+
 TEST_F(QmeditRevisions, ABackupLeavesTheEditInItsPlace) {
     const String item = imported(kShortList);
     renamed(item, "Second");
@@ -255,17 +265,20 @@ TEST_F(QmeditRevisions, TheRecordOfTheProjectChangesNoListing) {
 
 TEST_F(QmeditRevisions, TwoProcessesLoseNothingOfEachOther) {
     const String item = imported(kShortList);
-    const auto backups = [&] {
+    const int64_t length = shown(item).at("duration");
+    // Each takes a frame out of the edit, four times over.
+    const auto shortened = [&] {
         int made = 0;
         for (int i = 0; i < 4; ++i) {
-            made += run({"backup", item}).code == 0 ? 1 : 0;
+            made += run({"apply", "remove", "--to", item + "@5f-6f"}).code == 0 ? 1 : 0;
         }
         return made;
     };
-    auto other = std::async(std::launch::async, backups);
-    const int made = backups() + other.get();
+    auto other = std::async(std::launch::async, shortened);
+    const int made = shortened() + other.get();
     EXPECT_GT(made, 0);
-    EXPECT_EQ(history(item).size(), static_cast<size_t>(made) + 1) << "each backup that was told of is there";
+    EXPECT_EQ(shown(item).at("duration"), length - made) << "each change that was told of is there";
+    EXPECT_EQ(history(item).size(), static_cast<size_t>(made) + 1) << "and the state before each";
     EXPECT_EQ(run({"verify"}).code, 0);
 }
 
@@ -285,8 +298,10 @@ TEST_F(QmeditRevisions, AHolderOfTheLockIsNamedAndADeadOneDoesNotBlock) {
     char taken = 0;
     ASSERT_EQ(::read(ready[0], &taken, 1), 1);
     ASSERT_EQ(taken, 'y');
-    for (const std::string command : {"backup", "delete", "recover"}) {
-        const String error = refused({command, item});
+    const std::vector<std::vector<std::string>> writers = {
+        {"backup", item}, {"delete", item}, {"recover", item}, {"apply", "remove", "--to", item + "@1s-2s"}};
+    for (const std::vector<std::string>& writer : writers) {
+        const String error = refused(writer);
         EXPECT_TRUE(has(error, "process " + std::to_string(holder)) && has(error, "try again")) << error;
     }
     EXPECT_TRUE(has(done({"list"}), item)) << "reading needs no lock";

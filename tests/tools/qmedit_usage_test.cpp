@@ -62,8 +62,8 @@ TEST_F(Qmedit, AnswersEveryUsageWithItsExitCodeAndStream) {
 
 TEST_F(Qmedit, HelpOfEachCommandHasAnExampleOfIt) {
     for (const std::string command :
-         {"import", "export", "list", "show", "header", "verify", "salvage", "history", "backup", "undo",
-          "redo", "recover", "delete", "flush", "demo", "completion"}) {
+         {"import", "export", "list", "show", "header", "apply", "diff", "verify", "salvage", "history",
+          "backup", "undo", "redo", "recover", "delete", "flush", "demo", "completion"}) {
         const String help = run({command, "--help"}).out;
         const size_t example = help.find("Example:");
         ASSERT_NE(example, String::npos) << command;

@@ -156,6 +156,7 @@ int runApply(const ApplyOptions& options) {
         return applyOperation(session, options, op, to, from);
     if (const Qx::Status created = session.create(); !created)
         return failed(created);
+    // Held until the edits are written: what another program does meanwhile comes before or after.
     if (const Qx::Status locked = session.lockForWriting(); !locked)
         return failed(locked);
     session.manage();

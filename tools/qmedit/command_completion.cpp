@@ -53,7 +53,7 @@ _qmedit() {
     COMPREPLY=()
     for ((i = 1; i < COMP_CWORD; i++)); do
         case ${COMP_WORDS[i]} in
-        --project | --into | --rate | --type | --from) ((i++)) ;;
+        --project | --into | --rate | --type | --from | --to | --channels) ((i++)) ;;
         -*) ;;
         *) command=${COMP_WORDS[i]}; break ;;
         esac
@@ -65,8 +65,10 @@ _qmedit() {
         return ;;
     --rate) mapfile -t COMPREPLY < <(compgen -W '23.976 24 25 29.97 30 47.952 48 50 59.94 60' -- "$current"); return ;;
     --from)
-        mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_states)" -- "${current^^}")
+        [[ $command == recover ]] && options=$(_qmedit_states) || options=$(_qmedit_cookies)
+        mapfile -t COMPREPLY < <(compgen -W "$options" -- "${current^^}")
         return ;;
+    --to) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}"); return ;;
     --type) mapfile -t COMPREPLY < <(compgen -W 'edit shot ghost magic reel FXT' -- "$current"); return ;;
     esac
     case $command in
@@ -80,7 +82,7 @@ _qmedit() {
     import | salvage)
         mapfile -t COMPREPLY < <(compgen -f -- "$current")
         compopt -o filenames 2>/dev/null ;;
-    show | header | export | verify | history | backup | undo | redo | recover | delete) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;;
+    show | header | export | verify | diff | history | backup | undo | redo | recover | delete) mapfile -t COMPREPLY < <(compgen -W "$(_qmedit_cookies)" -- "${current^^}") ;;
     completion) mapfile -t COMPREPLY < <(compgen -W bash -- "$current") ;;
     esac
 }
