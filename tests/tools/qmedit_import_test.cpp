@@ -116,8 +116,11 @@ TEST_F(Qmedit, DemoMakesAProjectThatStaysAndNamesIt) {
     const size_t at = result.out.find("show E");
     ASSERT_NE(at, String::npos);
     const String kept = folder.path() + "/quillmarch-demo-";
-    const size_t named = result.out.find(kept);
+    const size_t named = result.out.find(kept, result.out.find("The project is kept in "));
     ASSERT_NE(named, String::npos) << result.out;
+    for (const char* said : {"apply replace", "undid 'replace'", "redid 'replace'", "1 to undo, 0 to redo"}) {
+        EXPECT_NE(result.out.find(said), String::npos) << said;
+    }
     const String made = result.out.substr(named, result.out.find_first_of(" .\n", named) - named);
     const auto edit =
         nlohmann::json::parse(run({"show", result.out.substr(at + 5, 8), "--json", "--project", made}).out);
@@ -125,7 +128,10 @@ TEST_F(Qmedit, DemoMakesAProjectThatStaysAndNamesIt) {
     EXPECT_EQ(edit.at("name"), "MARKET DAY");
     EXPECT_EQ(edit.at("duration"), 52 * 25);
     EXPECT_EQ(edit.at("cues").size(), 3u);
-    EXPECT_EQ(edit.at("channels").at(0).at("pairs").size(), 14u);
+    const auto& picture = edit.at("channels").at(0).at("pairs");
+    ASSERT_EQ(picture.size(), 15u);
+    EXPECT_EQ(picture.at(12).at("name"), "last customers");
+    EXPECT_TRUE(std::filesystem::exists((made + "/market_day_recut.edl").c_str()));
 }
 
 } // namespace
