@@ -40,10 +40,12 @@ Qx::Status markModule(Side& side) {
     for (const auto& [text, type] : {std::pair(side.place.in, Qx::MarkTypes::InMark),
                                      std::pair(side.place.out, Qx::MarkTypes::OutMark)}) {
         double seconds = 0;
-        if (text.empty())
+        if (text.empty()) {
             continue;
-        if (const Qx::Status read = parseEditTime(text, report, seconds); !read)
+        }
+        if (const Qx::Status read = parseEditTime(text, report, seconds); !read) {
             return read;
+        }
         side.module.markAllAt(seconds, type);
     }
     return {};
@@ -54,8 +56,9 @@ void selectChannels(EditModule& module, const channel_mask& mask) {
     Vector<IdStamp> chans;
     module.getEdit()->getChans(chans, AudioChan);
     module.selectChans(mask.has_video(), VideoChan, Edit_Chan_SubType::ANY);
-    for (size_t i = 0; i < chans.size(); ++i)
+    for (size_t i = 0; i < chans.size(); ++i) {
         module.selectChan(chans[i], mask.get(static_cast<int>(i) + 1));
+    }
 }
 
 void reportResult(const Edit& edit, const EditReport& before, const EditReport& after, edit_operation op,
@@ -63,50 +66,60 @@ void reportResult(const Edit& edit, const EditReport& before, const EditReport& 
     const EditDiff diff = diffOf(before, after);
     writeOut(String(editOperationName(op)) + (diff.same() ? ": nothing looks different\n" : ":\n"));
     writeOut(diffText(diff, after));
-    if (!result.syncLoss())
+    if (!result.syncLoss()) {
         return;
+    }
     for (int i = 0; i < edit.getNumChans(); ++i) {
         const double loss = edit.getSyncLoss(edit.getId(i));
-        if (loss != 0)
+        if (loss != 0) {
             writeOut(edit.getChanDisplayName(edit.getId(i)) + "  is " + after.lengthText(std::abs(loss)) +
                      (loss > 0 ? " later" : " earlier") + " than the picture\n");
+        }
     }
 }
 
 Qx::Status readSides(const ProjectSession& session, bool managed, bool hasSource, Side& to, Side& from) {
     for (Side* side : {&to, &from}) {
-        if (side == &from && !hasSource)
+        if (side == &from && !hasSource) {
             continue;
+        }
         // The file is looked at first, so that one that does not read stays as it is.
-        if (const Qx::Status read = session.readEdit(side->place.item, side->edit); !read)
+        if (const Qx::Status read = session.readEdit(side->place.item, side->edit); !read) {
             return read;
-        if (managed)
+        }
+        if (managed) {
             side->edit = edit_manager::openEdit(side->place.item, eOpenExisting);
-        else if (side == &from && to.place.item == from.place.item)
+        } else if (side == &from && to.place.item == from.place.item) {
             side->edit = to.edit;
-        if (!side->edit.valid())
+        }
+        if (!side->edit.valid()) {
             return Qx::Status::failure("the edit " + side->place.item.asString() + " does not open");
-        if (const Qx::Status marked = markModule(*side); !marked)
+        }
+        if (const Qx::Status marked = markModule(*side); !marked) {
             return marked;
+        }
     }
     return {};
 }
 
 int applyOperation(ProjectSession& session, const ApplyOptions& options, edit_operation op, Side& to,
                    Side& from) {
-    if (const Qx::Status read = readSides(session, !options.dryRun, !options.from.empty(), to, from); !read)
+    if (const Qx::Status read = readSides(session, !options.dryRun, !options.from.empty(), to, from); !read) {
         return failed(read);
+    }
     if (!options.channels.empty()) {
         const channel_mask mask(options.channels.c_str());
         selectChannels(to.module, mask);
-        if (from.edit.valid())
+        if (from.edit.valid()) {
             selectChannels(from.module, mask);
+        }
     }
     const EditReport before = reportOf(*to.edit, session.sourceNamer());
     const unsigned flags = options.dryRun ? Editor::NoBackup : 0u;
     const Editor::Result result = Editor::apply(from.module, to.module, op, flags);
-    if (!result.valid())
+    if (!result.valid()) {
         return failed(Qx::Status::failure(result.reason()));
+    }
     const EditReport after = reportOf(*to.edit, session.sourceNamer());
     reportResult(*to.edit, before, after, op, result);
     drawEdit(after);
@@ -114,10 +127,11 @@ int applyOperation(ProjectSession& session, const ApplyOptions& options, edit_op
         writeOut("Nothing was changed: this was a trial.\n");
         return kDone;
     }
-    if (!edit_manager::flush_changes())
+    if (!edit_manager::flush_changes()) {
         return failed(
             Qx::Status::failure("the edit " + to.place.item.asString() +
                                 " could not be written; its state before is its newest undo backup"));
+    }
     return kDone;
 }
 
@@ -127,8 +141,9 @@ int runApply(const ApplyOptions& options) {
     Side from;
     if (!editOperationFromText(options.operation, op) || op == edit_operation::NoOperation) {
         String names;
-        for (int i = 1; i < kNumEditOperations; ++i)
+        for (int i = 1; i < kNumEditOperations; ++i) {
             names += (i > 1 ? ", " : "") + String(editOperationName(static_cast<edit_operation>(i)));
+        }
         reportError("'" + options.operation + "' is no operation; the operations are " + names);
         return kWrongUsage;
     }
@@ -150,15 +165,19 @@ int runApply(const ApplyOptions& options) {
         return kWrongUsage;
     }
     ProjectSession session(options.project);
-    if (const Qx::Status opened = session.openExisting(); !opened)
+    if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
-    if (options.dryRun)
+    }
+    if (options.dryRun) {
         return applyOperation(session, options, op, to, from);
-    if (const Qx::Status created = session.create(); !created)
+    }
+    if (const Qx::Status created = session.create(); !created) {
         return failed(created);
+    }
     // Held until the edits are written: what another program does meanwhile comes before or after.
-    if (const Qx::Status locked = session.lockForWriting(); !locked)
+    if (const Qx::Status locked = session.lockForWriting(); !locked) {
         return failed(locked);
+    }
     session.manage();
     const int code = applyOperation(session, options, op, to, from);
     // The edits are let go before the manager closes them.

@@ -21,20 +21,24 @@ struct DiffOptions {
 /// Reads an edit by its cookie from the project, else a file by its path.
 Qx::Status readItem(const ProjectSession& session, const String& name, bool hasProject, EditPtr& edit) {
     const cookie item(name, true);
-    if (item.isStorable() && hasProject)
+    if (item.isStorable() && hasProject) {
         return session.readEdit(item, edit);
-    if (!Qx::fileExists(name))
+    }
+    if (!Qx::fileExists(name)) {
         return Qx::Status::failure("'" + name + "' is neither a cookie of the project nor a file");
+    }
     const WString path = Qx::widen(name);
     EditPtr read(new Edit);
     const QxEditFileType type = getEditFileTypeFromFileName(path);
     const bool named = cookie(Qx::withoutExtension(Qx::fileNameOf(name)), true).isStorable();
-    if (type == kUnknownFile || (type != kLegacyTextFile && !named))
+    if (type == kUnknownFile || (type != kLegacyTextFile && !named)) {
         return Qx::Status::failure("'" + name +
                                    "' is not named as an edit file is: a cookie and .qme, .ED3 or .ED2");
+    }
     if (!(type == kLegacyTextFile ? read->readFromLegacyFile(path)
-                                  : read->readFile(path, eOpenExisting) == Edit::kReadOk))
+                                  : read->readFile(path, eOpenExisting) == Edit::kReadOk)) {
         return Qx::Status::failure(read->lastFileError());
+    }
     edit = read;
     return {};
 }
@@ -43,22 +47,25 @@ int runDiff(const DiffOptions& options) {
     ProjectSession session(options.project);
     const bool hasProject = session.exists();
     if (hasProject) {
-        if (const Qx::Status opened = session.openExisting(); !opened)
+        if (const Qx::Status opened = session.openExisting(); !opened) {
             return failed(opened);
+        }
     }
     EditPtr edits[2];
     const String names[2] = {options.before, options.after};
     EditReport reports[2];
     for (size_t i = 0; i < 2; ++i) {
-        if (const Qx::Status read = readItem(session, names[i], hasProject, edits[i]); !read)
+        if (const Qx::Status read = readItem(session, names[i], hasProject, edits[i]); !read) {
             return failed(read);
+        }
         reports[i] = reportOf(*edits[i], {});
     }
     const EditDiff diff = diffOf(reports[0], reports[1]);
-    if (options.json)
+    if (options.json) {
         writeOut(diffJson(diff, reports[0], reports[1]));
-    else
+    } else {
         writeOut(diff.same() ? String("the same\n") : diffText(diff, reports[1]));
+    }
     return kDone;
 }
 

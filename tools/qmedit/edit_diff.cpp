@@ -21,12 +21,15 @@ const PairReport* playing(const std::vector<PairReport>& pairs, double time) {
 
 bool playsTheSame(const EditReport& before, const PairReport* a, const EditReport& after, const PairReport* b,
                   double time) {
-    if (a == nullptr || b == nullptr)
+    if (a == nullptr || b == nullptr) {
         return a == b;
-    if (before.sources[a->source].strip != after.sources[b->source].strip)
+    }
+    if (before.sources[a->source].strip != after.sources[b->source].strip) {
         return false;
-    if (after.sources[b->source].kind == SourceKind::Black)
+    }
+    if (after.sources[b->source].kind == SourceKind::Black) {
         return true;
+    }
     const auto strip = [time](const PairReport& pair) {
         return pair.stripIn + (time - pair.in) * pair.velocity;
     };
@@ -53,12 +56,14 @@ std::vector<ChannelDiff::Span> spansOf(const EditReport& before, const ChannelRe
         const double to = cuts[i + 1];
         const double middle = from + (to - from) / 2;
         if (to - from <= kTimeTolerance ||
-            playsTheSame(before, playing(a.pairs, middle), after, playing(b.pairs, middle), middle))
+            playsTheSame(before, playing(a.pairs, middle), after, playing(b.pairs, middle), middle)) {
             continue;
-        if (!spans.empty() && from - spans.back().to <= kTimeTolerance)
+        }
+        if (!spans.empty() && from - spans.back().to <= kTimeTolerance) {
             spans.back().to = to;
-        else
+        } else {
             spans.push_back({from, to});
+        }
     }
     return spans;
 }
@@ -68,8 +73,9 @@ std::vector<std::pair<String, const ChannelReport*>> placesOf(const EditReport& 
     std::map<std::string, int> count;
     std::vector<std::pair<String, const ChannelReport*>> places;
     for (const ChannelReport& channel : report.channels) {
-        if (channel.isLevels())
+        if (channel.isLevels()) {
             continue;
+        }
         const bool effects = channel.subtype == Edit_Chan_SubType::ALIAS;
         const String kind = effects ? String("FX") : String(std::string(1, channel.letter()));
         places.emplace_back(kind + std::to_string(++count[kind]), &channel);
@@ -79,9 +85,11 @@ std::vector<std::pair<String, const ChannelReport*>> placesOf(const EditReport& 
 
 const ChannelReport* find(const std::vector<std::pair<String, const ChannelReport*>>& places,
                           const String& name) {
-    for (const auto& [place, channel] : places)
-        if (place == name)
+    for (const auto& [place, channel] : places) {
+        if (place == name) {
             return channel;
+        }
+    }
     return nullptr;
 }
 
@@ -111,12 +119,15 @@ EditDiff diffOf(const EditReport& before, const EditReport& after) {
             its.spans = spansOf(before, *was, after, *channel);
             its.endBefore = endOf(*was);
         }
-        if (was == nullptr || !its.spans.empty())
+        if (was == nullptr || !its.spans.empty()) {
             diff.channels.push_back(std::move(its));
+        }
     }
-    for (const auto& [name, channel] : old)
-        if (find(now, name) == nullptr)
+    for (const auto& [name, channel] : old) {
+        if (find(now, name) == nullptr) {
             diff.channels.push_back({name, ChannelDiff::Removed, {}, endOf(*channel), 0});
+        }
+    }
     diff.cuesBefore = before.cues.size();
     diff.cuesAfter = after.cues.size();
     diff.cuesDiffer = !sameCues(before, after);
@@ -127,18 +138,21 @@ String diffText(const EditDiff& diff, const EditReport& after) {
     String text;
     for (const ChannelDiff& channel : diff.channels) {
         text += channel.name + "  " + kindText(channel.kind);
-        for (const ChannelDiff::Span& span : channel.spans)
+        for (const ChannelDiff::Span& span : channel.spans) {
             text += "  " + after.recordTimecode(span.from) + "-" + after.recordTimecode(span.to);
-        if (channel.kind == ChannelDiff::Added)
+        }
+        if (channel.kind == ChannelDiff::Added) {
             text += ", " + after.lengthText(channel.endAfter) + " long";
-        else if (channel.kind == ChannelDiff::Changed &&
-                 std::abs(channel.endAfter - channel.endBefore) > kTimeTolerance)
+        } else if (channel.kind == ChannelDiff::Changed &&
+                   std::abs(channel.endAfter - channel.endBefore) > kTimeTolerance) {
             text += "; " + after.lengthText(channel.endBefore) + " long before, " +
                     after.lengthText(channel.endAfter) + " after";
+        }
         text += "\n";
     }
-    if (diff.cuesDiffer)
+    if (diff.cuesDiffer) {
         text += String::format("cues  changed; %zu before, %zu after\n", diff.cuesBefore, diff.cuesAfter);
+    }
     return text;
 }
 
@@ -157,11 +171,12 @@ String diffJson(const EditDiff& diff, const EditReport& before, const EditReport
         its["end_after"] = after.frames(channel.endAfter);
         its["end_after_s"] = channel.endAfter;
         its["spans"] = Json::array();
-        for (const ChannelDiff::Span& span : channel.spans)
+        for (const ChannelDiff::Span& span : channel.spans) {
             its["spans"].push_back({{"from", after.frames(span.from)},
                                     {"to", after.frames(span.to)},
                                     {"from_s", span.from},
                                     {"to_s", span.to}});
+        }
         json["channels"].push_back(std::move(its));
     }
     json["cues"] = {{"changed", diff.cuesDiffer}, {"before", diff.cuesBefore}, {"after", diff.cuesAfter}};

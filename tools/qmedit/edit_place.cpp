@@ -22,19 +22,22 @@ Qx::Status parsePlace(const String& text, EditPlace& place) {
     const String name = text.substr(0, at);
     place = {};
     place.item = cookie(name, true);
-    if (!place.item.isStorable())
+    if (!place.item.isStorable()) {
         return Qx::Status::failure("'" + name +
                                    "' is no cookie; write COOKIE, COOKIE@IN or COOKIE@IN-OUT, for example "
                                    "E0001000@10:00:05:00-10:00:07:12");
-    if (at == String::npos)
+    }
+    if (at == String::npos) {
         return {};
+    }
     const String times = text.substr(at + 1);
     const size_t dash = times.find('-');
     place.in = times.substr(0, dash);
     place.out = dash == String::npos ? String() : String(times.substr(dash + 1));
-    if ((place.in.empty() && place.out.empty()) || (dash != String::npos && place.out.empty()))
+    if ((place.in.empty() && place.out.empty()) || (dash != String::npos && place.out.empty())) {
         return Qx::Status::failure("'" + text +
                                    "' lacks a time; write COOKIE@IN, COOKIE@IN-OUT or COOKIE@-OUT");
+    }
     return {};
 }
 
@@ -49,14 +52,16 @@ Qx::Status parseEditTime(const String& text, const EditReport& report, double& s
         seconds = begin + number;
     } else {
         Qx::TimecodeFields fields;
-        if (const Qx::Status read = Qx::parseTimecode(text, report.rate, fields); !read)
+        if (const Qx::Status read = Qx::parseTimecode(text, report.rate, fields); !read) {
             return Qx::Status::failure("'" + text + "' is no time (" + read.reason() +
                                        "); write timecode (10:00:05:00), frames (125f) or seconds (5s)");
+        }
         const int64_t frames = Qx::timecodeFrames(fields, report.rate, report.dropFrame);
         seconds = report.rate.toSeconds(frames - report.frames(report.origin));
-        if (seconds < 0)
+        if (seconds < 0) {
             return Qx::Status::failure("'" + text + "' lies before the edit's start, " +
                                        report.recordTimecode(0));
+        }
     }
     return std::isfinite(seconds) && seconds <= kGreatest
                ? Qx::Status()
