@@ -77,6 +77,29 @@ TEST_F(QmeditApply, LostSyncIsToldAndDiffTellsWhere) {
     EXPECT_EQ(json["channels"][1]["spans"][0]["from"], 250);
 }
 
+TEST_F(QmeditApply, DiffTellsPairByPairWhatBecameOfAState) {
+    ASSERT_EQ(run({"apply", "lift", "--to", m_edit + "@1s-2s", "--channels", "V"}).code, 0);
+    const test::ProgramResult text = run({"diff", m_edit + ".U1", m_edit});
+    ASSERT_EQ(text.code, 0) << text.err;
+    EXPECT_NE(text.out.find("\n  - "), String::npos) << text.out;
+    EXPECT_NE(text.out.find("  black\n"), String::npos) << text.out;
+    const nlohmann::json json = nlohmann::json::parse(run({"diff", m_edit, m_edit + ".u1", "--json"}).out);
+    ASSERT_EQ(json["channels"].size(), 1u);
+    const nlohmann::json& picture = json["channels"][0];
+    EXPECT_EQ(picture["channel"], "V1");
+    EXPECT_EQ(json["before"], json["after"]);
+    // Lifting made black of a second; going back takes it away.
+    size_t black = 0;
+    for (const nlohmann::json& pair : picture["removed"]) {
+        black += pair["kind"] == "black" ? 1 : 0;
+    }
+    EXPECT_EQ(black, 1u);
+    EXPECT_EQ(picture["spans"].size(), 1u);
+    EXPECT_EQ(picture["spans"][0]["from_s"], 1.0);
+    EXPECT_EQ(picture["spans"][0]["to_s"], 2.0);
+    EXPECT_GE(picture["added"].size(), 1u);
+}
+
 TEST_F(QmeditApply, WhatIsWrongIsNamedAndChangesNothing) {
     const auto before = snapshot();
     struct Case {
@@ -97,7 +120,7 @@ TEST_F(QmeditApply, WhatIsWrongIsNamedAndChangesNothing) {
         {{"apply", "lift", "--dry-run", "--to", m_edit + "@3s"}, 1, "two different marks"},
         {{"apply", "lift", "--dry-run", "--to", m_edit + "@3s-3s"}, 1, "two different marks"},
         {{"apply", "lift", "--dry-run", "--to", m_edit}, 1, "no marked region"},
-        {{"diff", m_edit, "nothing.qme"}, 1, "neither a cookie of the project nor a file"},
+        {{"diff", m_edit, "nothing.qme"}, 1, "neither a cookie of the project"},
     };
     for (const Case& its : cases) {
         const test::ProgramResult result = run(its.arguments);

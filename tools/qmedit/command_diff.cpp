@@ -3,6 +3,8 @@
 #include "tools/qmedit/edit_diff.h"
 #include "tools/qmedit/project_session.h"
 
+#include "edit/persist/edit_salvage.h"
+#include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 
 #include <CLI/CLI.hpp>
@@ -18,27 +20,42 @@ struct DiffOptions {
     bool json = false;
 };
 
-/// Reads an edit by its cookie from the project, else a file by its path.
+/// Reads an edit by its cookie from the project, one of its states as "COOKIE.U1", else a file by its path,
+/// whatever its name: backups, milestones and copies are edit files too.
 Qx::Status readItem(const ProjectSession& session, const String& name, bool hasProject, EditPtr& edit) {
     const cookie item(name, true);
     if (item.isStorable() && hasProject) {
         return session.readEdit(item, edit);
     }
-    if (!Qx::fileExists(name)) {
-        return Qx::Status::failure("'" + name + "' is neither a cookie of the project nor a file");
+    String path = name;
+    const cookie stated(std::string_view(name).substr(0, name.find('.')), true);
+    if (!Qx::fileExists(name) && hasProject && stated.isStorable()) {
+        path = getFilenameForCookie(stated) + String(name.substr(name.find('.'))).upper();
     }
-    const WString path = Qx::widen(name);
-    EditPtr read(new Edit);
-    const QxEditFileType type = getEditFileTypeFromFileName(path);
-    const bool named = cookie(Qx::withoutExtension(Qx::fileNameOf(name)), true).isStorable();
-    if (type == kUnknownFile || (type != kLegacyTextFile && !named)) {
+    if (!Qx::fileExists(path)) {
         return Qx::Status::failure("'" + name +
-                                   "' is not named as an edit file is: a cookie and .qme, .ED3 or .ED2");
+                                   "' is neither a cookie of the project, nor a state of one such as "
+                                   "E0001000.U1, nor a file");
     }
-    if (!(type == kLegacyTextFile ? read->readFromLegacyFile(path)
-                                  : read->readFile(path, eOpenExisting) == Edit::kReadOk)) {
-        return Qx::Status::failure(read->lastFileError());
+    if (getEditFileTypeFromFileName(Qx::widen(path)) == kLegacyTextFile) {
+        EditPtr read(new Edit);
+        if (!read->readFromLegacyFile(Qx::widen(path))) {
+            return Qx::Status::failure(read->lastFileError());
+        }
+        edit = read;
+        return {};
     }
+    EditPtr read;
+    std::vector<String> lost;
+    if (const Qx::Status status = salvageEdit(path, read, lost); !status) {
+        return status;
+    }
+    if (!lost.empty()) {
+        return Qx::Status::failure(path + " is damaged: " + lost.front() +
+                                   "; 'qmedit salvage' saves what is sound of it");
+    }
+    const String file = Qx::fileNameOf(path);
+    read->set_cookie(cookie(std::string_view(file).substr(0, file.find('.')), true));
     edit = read;
     return {};
 }
@@ -58,13 +75,14 @@ int runDiff(const DiffOptions& options) {
         if (const Qx::Status read = readItem(session, names[i], hasProject, edits[i]); !read) {
             return failed(read);
         }
-        reports[i] = reportOf(*edits[i], {});
+        reports[i] = reportOf(*edits[i], hasProject ? session.sourceNamer() : SourceNamer());
     }
     const EditDiff diff = diffOf(reports[0], reports[1]);
     if (options.json) {
         writeOut(diffJson(diff, reports[0], reports[1]));
     } else {
-        writeOut(diff.same() ? String("the same\n") : diffText(diff, reports[1]));
+        writeOut(diff.same() ? String("the same\n")
+                             : diffPairsText(diff, reports[0], reports[1], Console::forStandardOutput()));
     }
     return kDone;
 }

@@ -1,6 +1,8 @@
 #include "tools/qmedit/edit_diff.h"
 
 #include "platform/base/num_range.h"
+#include "tools/qmedit/edit_json.h"
+#include "tools/qmedit/track_picture.h"
 
 #include <algorithm>
 #include <cmath>
@@ -68,6 +70,34 @@ std::vector<ChannelDiff::Span> spansOf(const EditReport& before, const ChannelRe
     return spans;
 }
 
+bool isSamePair(const EditReport& before, const PairReport& a, const EditReport& after, const PairReport& b) {
+    const auto near = [](double x, double y) { return std::abs(x - y) <= 1e-5; };
+    return near(a.in, b.in) && near(a.out, b.out) && near(a.stripIn, b.stripIn) && near(a.fadeIn, b.fadeIn) &&
+           near(a.fadeOut, b.fadeOut) && a.velocity == b.velocity &&
+           before.sources[a.source].strip == after.sources[b.source].strip;
+}
+
+/// Fills in which pairs only one of the two channels has, walking both in order of time.
+void comparePairs(const EditReport& before, const ChannelReport* a, const EditReport& after,
+                  const ChannelReport* b, ChannelDiff& diff) {
+    static const std::vector<PairReport> none;
+    const std::vector<PairReport>& was = a != nullptr ? a->pairs : none;
+    const std::vector<PairReport>& now = b != nullptr ? b->pairs : none;
+    size_t i = 0;
+    size_t j = 0;
+    while (i < was.size() || j < now.size()) {
+        const bool both = i < was.size() && j < now.size();
+        if (both && isSamePair(before, was[i], after, now[j])) {
+            ++i;
+            ++j;
+        } else if (j == now.size() || (both && was[i].in <= now[j].in + kTimeTolerance)) {
+            diff.removed.push_back(was[i++]);
+        } else {
+            diff.added.push_back(now[j++]);
+        }
+    }
+}
+
 /// The channels by their letter and place; levels channels, which have no pairs, are left out.
 std::vector<std::pair<String, const ChannelReport*>> placesOf(const EditReport& report) {
     std::map<std::string, int> count;
@@ -113,19 +143,27 @@ EditDiff diffOf(const EditReport& before, const EditReport& after) {
     const auto now = placesOf(after);
     for (const auto& [name, channel] : now) {
         const ChannelReport* const was = find(old, name);
-        ChannelDiff its{
-            name, was != nullptr ? ChannelDiff::Changed : ChannelDiff::Added, {}, 0, endOf(*channel)};
+        ChannelDiff its;
+        its.name = name;
+        its.kind = was != nullptr ? ChannelDiff::Changed : ChannelDiff::Added;
+        its.endAfter = endOf(*channel);
+        comparePairs(before, was, after, channel, its);
         if (was != nullptr) {
             its.spans = spansOf(before, *was, after, *channel);
             its.endBefore = endOf(*was);
         }
-        if (was == nullptr || !its.spans.empty()) {
+        if (was == nullptr || !its.spans.empty() || !its.removed.empty() || !its.added.empty()) {
             diff.channels.push_back(std::move(its));
         }
     }
     for (const auto& [name, channel] : old) {
         if (find(now, name) == nullptr) {
-            diff.channels.push_back({name, ChannelDiff::Removed, {}, endOf(*channel), 0});
+            ChannelDiff its;
+            its.name = name;
+            its.kind = ChannelDiff::Removed;
+            its.endBefore = endOf(*channel);
+            comparePairs(before, channel, after, nullptr, its);
+            diff.channels.push_back(std::move(its));
         }
     }
     diff.cuesBefore = before.cues.size();
@@ -134,26 +172,66 @@ EditDiff diffOf(const EditReport& before, const EditReport& after) {
     return diff;
 }
 
-String diffText(const EditDiff& diff, const EditReport& after) {
-    String text;
-    for (const ChannelDiff& channel : diff.channels) {
-        text += channel.name + "  " + kindText(channel.kind);
-        for (const ChannelDiff::Span& span : channel.spans) {
-            text += "  " + after.recordTimecode(span.from) + "-" + after.recordTimecode(span.to);
+namespace {
+
+String channelText(const ChannelDiff& channel, const EditReport& after) {
+    String text = channel.name + "  " + kindText(channel.kind);
+    for (const ChannelDiff::Span& span : channel.spans) {
+        text += "  " + after.recordTimecode(span.from) + "-" + after.recordTimecode(span.to);
+    }
+    if (channel.kind == ChannelDiff::Added) {
+        text += ", " + after.lengthText(channel.endAfter) + " long";
+    } else if (channel.kind == ChannelDiff::Changed) {
+        if (channel.spans.empty()) {
+            text += "  only in its cuts and fades";
         }
-        if (channel.kind == ChannelDiff::Added) {
-            text += ", " + after.lengthText(channel.endAfter) + " long";
-        } else if (channel.kind == ChannelDiff::Changed &&
-                   std::abs(channel.endAfter - channel.endBefore) > kTimeTolerance) {
+        if (std::abs(channel.endAfter - channel.endBefore) > kTimeTolerance) {
             text += "; " + after.lengthText(channel.endBefore) + " long before, " +
                     after.lengthText(channel.endAfter) + " after";
         }
-        text += "\n";
     }
-    if (diff.cuesDiffer) {
-        text += String::format("cues  changed; %zu before, %zu after\n", diff.cuesBefore, diff.cuesAfter);
+    return text + "\n";
+}
+
+String pairText(char sign, const PairReport& pair, const EditReport& report, const Console& console) {
+    const SourceReport& source = report.sources[pair.source];
+    String text =
+        String("  ") + sign + " " + report.recordTimecode(pair.in) + "-" + report.recordTimecode(pair.out);
+    if (source.kind != SourceKind::Black) {
+        text += "  from " + report.sourceTimecode(source, pair.stripIn);
     }
-    return text;
+    return text + "  " + sourceLabel(source, console) + "\n";
+}
+
+String cuesText(const EditDiff& diff) {
+    return diff.cuesDiffer
+               ? String::format("cues  changed; %zu before, %zu after\n", diff.cuesBefore, diff.cuesAfter)
+               : String();
+}
+
+} // namespace
+
+String diffText(const EditDiff& diff, const EditReport& after) {
+    String text;
+    for (const ChannelDiff& channel : diff.channels) {
+        text += channelText(channel, after);
+    }
+    return text + cuesText(diff);
+}
+
+String diffPairsText(const EditDiff& diff, const EditReport& before, const EditReport& after,
+                     const Console& console) {
+    String text;
+    for (const ChannelDiff& channel : diff.channels) {
+        text += channelText(channel, after);
+        for (const PairReport& pair : channel.removed) {
+            text += pairText('-', pair, before, console);
+        }
+        for (const PairReport& pair : channel.added) {
+            text += pairText('+', pair, after, console);
+        }
+    }
+    return text + cuesText(diff);
 }
 
 String diffJson(const EditDiff& diff, const EditReport& before, const EditReport& after) {
@@ -176,6 +254,14 @@ String diffJson(const EditDiff& diff, const EditReport& before, const EditReport
                                     {"to", after.frames(span.to)},
                                     {"from_s", span.from},
                                     {"to_s", span.to}});
+        }
+        its["removed"] = Json::array();
+        for (const PairReport& pair : channel.removed) {
+            its["removed"].push_back(Json::parse(pairJsonText(before, pair)));
+        }
+        its["added"] = Json::array();
+        for (const PairReport& pair : channel.added) {
+            its["added"].push_back(Json::parse(pairJsonText(after, pair)));
         }
         json["channels"].push_back(std::move(its));
     }

@@ -19,7 +19,9 @@ struct ChannelDiff {
     String name; ///< kind letter and place: "V1"
     Kind kind = Changed;
     std::vector<Span> spans; ///< edit times at which the two play something else, in order; of a changed one
-    double endBefore = 0;    ///< seconds at which the last pair ends
+    std::vector<PairReport> removed; ///< pairs that the first has and the second has not, in order
+    std::vector<PairReport> added;   ///< and the other way round
+    double endBefore = 0;            ///< seconds at which the last pair ends
     double endAfter = 0;
 };
 
@@ -35,5 +37,9 @@ struct EditDiff {
 
 /// A line for each thing that differs, with record timecodes of the second edit.
 [[nodiscard]] String diffText(const EditDiff& diff, const EditReport& after);
+/// The same with a line for each pair below its channel: '-' before one that is gone, '+' before one that
+/// came.
+[[nodiscard]] String diffPairsText(const EditDiff& diff, const EditReport& before, const EditReport& after,
+                                   const Console& console);
 /// One JSON object and a line end, as docs/qmedit.md describes it.
 [[nodiscard]] String diffJson(const EditDiff& diff, const EditReport& before, const EditReport& after);

@@ -189,6 +189,10 @@ String listJson(const std::vector<ListedEdit>& edits) {
     return out + "]\n";
 }
 
+String pairJsonText(const EditReport& report, const PairReport& pair) {
+    return dumped(pairJson(report, pair));
+}
+
 String headerJson(const configb& header, const std::vector<String>& keys) {
     Json json = Json::object();
     for (const String& key : keys) {
