@@ -162,8 +162,10 @@ bool Editor::mayMergeBlack(const cel& its) const {
 void Editor::verifyTracks() {
     for (const IdStamp& chan : m_touched) {
         const cel* const its = celOf(chan);
-        const auto [first, last] =
-            its != nullptr ? pairsAround(*its, m_plan->at, m_plan->at + m_plan->length) : std::pair(0, -1);
+        if (its == nullptr) {
+            continue;
+        }
+        const auto [first, last] = pairsAround(*its, m_plan->at, m_plan->at + m_plan->length);
         for (int pair = first; pair <= last; ++pair) {
             const channel_event& in = *its->getChanEventPtr(2 * pair);
             const channel_event& out = *its->getChanEventPtr(2 * pair + 1);

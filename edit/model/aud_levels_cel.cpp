@@ -74,7 +74,8 @@ AudLevelsCel AudLevelsCel::clone() const {
 
 const AudLevelsCel::Store& AudLevelsCel::getNodeStore() const {
     static const Store none;
-    return valid() ? m_contents->nodes : none;
+    const Contents* const contents = m_contents.get();
+    return contents != nullptr ? contents->nodes : none;
 }
 
 AudLevelsCel::Store& AudLevelsCel::changeNodeStore() {
