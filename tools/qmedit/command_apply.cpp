@@ -43,7 +43,7 @@ Qx::Status markModule(Side& side) {
         if (text.empty()) {
             continue;
         }
-        if (const Qx::Status read = parseEditTime(text, report, seconds); !read) {
+        if (Qx::Status read = parseEditTime(text, report, seconds); !read) {
             return read;
         }
         side.module.markAllAt(seconds, type);
@@ -84,7 +84,7 @@ Qx::Status readSides(const ProjectSession& session, bool managed, bool hasSource
             continue;
         }
         // The file is looked at first, so that one that does not read stays as it is.
-        if (const Qx::Status read = session.readEdit(side->place.item, side->edit); !read) {
+        if (Qx::Status read = session.readEdit(side->place.item, side->edit); !read) {
             return read;
         }
         if (managed) {
@@ -95,7 +95,7 @@ Qx::Status readSides(const ProjectSession& session, bool managed, bool hasSource
         if (!side->edit.valid()) {
             return Qx::Status::failure("the edit " + side->place.item.asString() + " does not open");
         }
-        if (const Qx::Status marked = markModule(*side); !marked) {
+        if (Qx::Status marked = markModule(*side); !marked) {
             return marked;
         }
     }
@@ -104,7 +104,7 @@ Qx::Status readSides(const ProjectSession& session, bool managed, bool hasSource
 
 int applyOperation(ProjectSession& session, const ApplyOptions& options, edit_operation op, Side& to,
                    Side& from) {
-    if (const Qx::Status read = readSides(session, !options.dryRun, !options.from.empty(), to, from); !read) {
+    if (Qx::Status read = readSides(session, !options.dryRun, !options.from.empty(), to, from); !read) {
         return failed(read);
     }
     if (!options.channels.empty()) {

@@ -47,7 +47,7 @@ Qx::Status readItem(const ProjectSession& session, const String& name, bool hasP
     }
     EditPtr read;
     std::vector<String> lost;
-    if (const Qx::Status status = salvageEdit(path, read, lost); !status) {
+    if (Qx::Status status = salvageEdit(path, read, lost); !status) {
         return status;
     }
     if (!lost.empty()) {
@@ -72,7 +72,7 @@ int runDiff(const DiffOptions& options) {
     const String names[2] = {options.before, options.after};
     EditReport reports[2];
     for (size_t i = 0; i < 2; ++i) {
-        if (const Qx::Status read = readItem(session, names[i], hasProject, edits[i]); !read) {
+        if (Qx::Status read = readItem(session, names[i], hasProject, edits[i]); !read) {
             return failed(read);
         }
         reports[i] = reportOf(*edits[i], hasProject ? session.sourceNamer() : SourceNamer());
