@@ -1,6 +1,7 @@
 #include "interchange/edl_reader.h"
 
 #include "interchange/detail/edl_reading.h"
+#include "platform/base/text_lines.h"
 #include "platform/media/timecode.h"
 #include "platform/services/files.h"
 
@@ -58,19 +59,6 @@ namespace detail {
 
 namespace {
 
-// The next line, whether it ends with LF, CRLF or CR; `rest` is left with what follows.
-std::string_view takeLine(std::string_view& rest) {
-    const size_t end = rest.find_first_of("\r\n");
-    const std::string_view line = rest.substr(0, end);
-    if (end == std::string_view::npos) {
-        rest = {};
-    } else {
-        const bool both = rest[end] == '\r' && end + 1 < rest.size() && rest[end + 1] == '\n';
-        rest.remove_prefix(end + (both ? 2 : 1));
-    }
-    return line;
-}
-
 bool beginsNoCase(std::string_view text, std::string_view prefix) {
     return text.size() >= prefix.size() && String::equalNoCase(text.substr(0, prefix.size()), prefix);
 }
@@ -117,7 +105,7 @@ Qx::Status EdlReading::read(std::string_view text) {
     }
     while (!text.empty()) {
         ++m_line;
-        if (Qx::Status status = readLine(takeLine(text)); !status) {
+        if (Qx::Status status = readLine(Qx::takeLine(text)); !status) {
             return status;
         }
     }

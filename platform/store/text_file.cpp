@@ -1,5 +1,6 @@
 #include "platform/store/text_file.h"
 
+#include "platform/base/text_lines.h"
 #include "platform/services/atomic_file.h"
 #include "platform/services/files.h"
 
@@ -12,19 +13,6 @@ constexpr std::string_view kUtf8Mark = "\xEF\xBB\xBF";
 /// A file of more lines than this is no text of ours; each line takes memory of its own.
 constexpr size_t kMaxLines = size_t{1} << 24;
 
-/// Takes the next line off the front of `rest`, without its end.
-std::string_view takeLine(std::string_view& rest) {
-    const size_t end = rest.find_first_of("\r\n");
-    const std::string_view line = rest.substr(0, end);
-    if (end == std::string_view::npos) {
-        rest = {};
-    } else {
-        const bool pair = rest[end] == '\r' && end + 1 < rest.size() && rest[end + 1] == '\n';
-        rest.remove_prefix(end + (pair ? 2 : 1));
-    }
-    return line;
-}
-
 std::string_view withoutMark(std::string_view text) {
     return text.starts_with(kUtf8Mark) ? text.substr(kUtf8Mark.size()) : text;
 }
@@ -32,7 +20,7 @@ std::string_view withoutMark(std::string_view text) {
 size_t countLines(std::string_view text, size_t limit) {
     size_t count = 0;
     while (!text.empty() && count <= limit) {
-        takeLine(text);
+        Qx::takeLine(text);
         ++count;
     }
     return count;
@@ -42,7 +30,7 @@ std::vector<String> linesOf(std::string_view text) {
     std::vector<String> lines;
     lines.reserve(countLines(text, std::numeric_limits<unsigned>::max()));
     while (!text.empty()) {
-        lines.emplace_back(takeLine(text));
+        lines.emplace_back(Qx::takeLine(text));
     }
     return lines;
 }
