@@ -2,9 +2,9 @@
 
 #include "bench/fixed_sequence.h"
 #include "bench/measuring.h"
+#include "bench/unsynced_files.h"
 #include "bench/work_folder.h"
 #include "platform/services/files.h"
-#include "bench/unsynced_files.h"
 
 #include <malloc.h>
 

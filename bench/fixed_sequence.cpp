@@ -38,7 +38,8 @@ FixedSequence::FixedSequence(size_t n) : m_n(n), m_channels(kNumChannels), m_len
             m_lengths[channel] += clip.length;
         }
     }
-    m_shortest = static_cast<size_t>(std::min_element(m_lengths.begin(), m_lengths.end()) - m_lengths.begin());
+    m_shortest =
+        static_cast<size_t>(std::min_element(m_lengths.begin(), m_lengths.end()) - m_lengths.begin());
     Generator questions(kQuerySeed);
     m_queries.resize(kNumQueries);
     for (Query& query : m_queries) {

@@ -41,7 +41,9 @@ private:
     class File : public Qx::OpenFile {
     public:
         explicit File(std::unique_ptr<Qx::OpenFile> real) : m_real(std::move(real)) {}
-        Qx::FileError read(void* to, size_t size, size_t& got) override { return m_real->read(to, size, got); }
+        Qx::FileError read(void* to, size_t size, size_t& got) override {
+            return m_real->read(to, size, got);
+        }
         Qx::FileError write(const void* from, size_t size, size_t& put) override {
             return m_real->write(from, size, put);
         }
