@@ -7,12 +7,18 @@
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size);
 
-extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-    PStream stream(std::as_bytes(std::span(data, size)));
+namespace {
+
+void read(std::span<const std::byte> bytes, uint8_t revision) {
+    PStream stream(bytes);
     cel its;
+    its.revisionMajor(revision);
     its.unpack(stream);
     if (!stream.good()) {
-        return its.numEvents() == 0 ? 0 : (std::abort(), 0);
+        if (its.numEvents() != 0) {
+            std::abort();
+        }
+        return;
     }
     PStream packed;
     its.pack(packed);
@@ -30,6 +36,14 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     static_cast<void>(its.replace(&second, {middle - 3, middle + 3}, middle - 1, ids, true));
     if (its.is_good_cel() == 0) {
         std::abort();
+    }
+}
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+    for (const uint8_t revision : {uint8_t{1}, uint8_t{2}}) {
+        read(std::as_bytes(std::span(data, size)), revision);
     }
     return 0;
 }

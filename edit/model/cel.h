@@ -335,10 +335,11 @@ public:
     [[nodiscard]] uint8_t revisionMinor() const override { return m_minor; }
     void revisionMajor(uint8_t major) override { m_major = major; }
     void revisionMinor(uint8_t minor) override { m_minor = minor; }
-    /// Packed: the channel information, the resolution, the number of events, the events as they lie in
-    /// memory. A last in point without an out point is not packed.
+    /// Packed: the channel information, the resolution, the number of events, filling (`setAlignment`, 8; not
+    /// in revision 1), the events as they lie in memory. A last in point without an out point is not packed.
     void pack(PStream& stream) const override;
-    /// Checks all that is read before it changes anything; `changed()` is false afterwards.
+    /// Checks all that is read before it changes anything; `changed()` is false afterwards. Many events stay
+    /// where they lie if the stream's bytes are kept (`PStream::keeper`), until the cel is changed.
     void unpack(PStream& stream) override;
     [[nodiscard]] std::unique_ptr<Streamable> clone(BuilderType type = BuilderType::Copy) const override;
 
@@ -366,7 +367,7 @@ private:
     String m_subType;
     String m_materialInfo;
     double m_resolution = 0;
-    uint8_t m_major = 1;
+    uint8_t m_major = 2;
     uint8_t m_minor = 0;
     bool m_changed = false;
     uint64_t m_changeCount = 0;

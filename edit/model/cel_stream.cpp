@@ -14,13 +14,39 @@ static_assert(std::is_trivially_copyable_v<channel_event>);
 namespace {
 
 constexpr const char* kLayerName = "cel";
-constexpr uint8_t kMajor = 1;
+constexpr uint8_t kMajor = 2;
+/// Fewer events are copied: what keeps them would cost more than they do.
+constexpr size_t kLeastBorrowed = 1024;
 
 [[maybe_unused]] const bool registered = [] {
     Streamable::registerBuilder(kLayerName,
                                 [] { return std::unique_ptr<Streamable>(std::make_unique<cel>()); });
     return true;
 }();
+
+/// The events that some bytes hold, where they lie or as a copy. False if no cel may hold them.
+bool takeEvents(std::span<const std::byte> bytes, const std::shared_ptr<const void>& keeper,
+                EventArray& events) {
+    const size_t count = bytes.size() / sizeof(channel_event);
+    if (keeper != nullptr && count >= kLeastBorrowed &&
+        reinterpret_cast<uintptr_t>(bytes.data()) % alignof(channel_event) == 0) {
+        const std::span<const channel_event> lying(reinterpret_cast<const channel_event*>(bytes.data()),
+                                                   count);
+        if (isGood(lying)) {
+            events.borrow(keeper, lying);
+            return true;
+        }
+    }
+    Events copied(count);
+    if (count > 0) {
+        std::memcpy(static_cast<void*>(copied.data()), bytes.data(), bytes.size());
+    }
+    if (!checkAndSettle(copied)) {
+        return false;
+    }
+    events.assign(std::move(copied));
+    return true;
+}
 
 } // namespace
 
@@ -46,6 +72,7 @@ void cel::pack(PStream& stream) const {
     stream.setString(m_materialInfo);
     stream.setDouble(m_resolution);
     stream.setUnsignedLong(static_cast<uint32_t>(count));
+    stream.setAlignment(alignof(channel_event));
     stream.setRaw(m_events.data(), count * sizeof(channel_event));
 }
 
@@ -61,20 +88,17 @@ void cel::unpack(PStream& stream) {
     String materialInfo = stream.getString();
     const double resolution = stream.getDouble();
     const size_t count = stream.getCount(sizeof(channel_event));
+    if (m_major > 1) {
+        stream.passAlignment();
+    }
     const std::span<const std::byte> bytes = stream.getSpan(count * sizeof(channel_event));
-    if (!stream.good() || !std::isfinite(resolution) || resolution < 0) {
+    EventArray events;
+    if (!stream.good() || !std::isfinite(resolution) || resolution < 0 ||
+        !takeEvents(bytes, stream.keeper(), events)) {
         stream.fail();
         return;
     }
-    Events events(count);
-    if (count > 0) {
-        std::memcpy(static_cast<void*>(events.data()), bytes.data(), bytes.size());
-    }
-    if (!checkAndSettle(events)) {
-        stream.fail();
-        return;
-    }
-    m_events.assign(std::move(events));
+    m_events.swap(events);
     m_name = std::move(name);
     m_id = id;
     m_subType = std::move(subType);

@@ -16,6 +16,8 @@ constexpr std::string_view kTemporaryEnd = ".tmp";
 constexpr size_t kRandomDigits = 16;
 /// What is kept of a file's name in its temporary name, so that the latter is at most 255 bytes long.
 constexpr size_t kNameKept = 200;
+/// So many bytes are written before the disk is put to work on them, while the rest is made and written.
+constexpr uint64_t kSyncAhead = uint64_t{2} << 20;
 /// How many temporary names are tried before giving up.
 constexpr int kTries = 100;
 
@@ -111,6 +113,10 @@ FileError AtomicFile::write(const void* from, size_t size) {
         return fail(error);
     }
     m_size += size;
+    if (m_size - m_begun >= kSyncAhead) {
+        m_file->beginSync();
+        m_begun = m_size;
+    }
     return {};
 }
 

@@ -54,6 +54,7 @@ private:
     String m_temporary;
     std::unique_ptr<OpenFile> m_file;
     uint64_t m_size = 0;
+    uint64_t m_begun = 0; ///< how many bytes the system was asked to begin to make durable
     bool m_replaced = false;
     bool m_done = false; ///< committed: renamed, or handed to a batch
     FileError m_failed;  ///< the first failure; later calls repeat it

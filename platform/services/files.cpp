@@ -106,6 +106,8 @@ FileError readWhole(const String& path, Bytes& bytes, uint64_t limit) {
 } // namespace
 
 OpenFile::~OpenFile() = default;
+
+void OpenFile::beginSync() {}
 FileSystem::~FileSystem() = default;
 
 String FileError::text() const {

@@ -60,6 +60,9 @@ public:
     virtual FileError seek(uint64_t offset) = 0;
     /// Makes the file's bytes durable.
     virtual FileError sync() = 0;
+    /// Asks the system to begin with that for what was written so far, without waiting for it: a sync that
+    /// follows finds less to do. A hint; it cannot fail, and a file system without it does nothing.
+    virtual void beginSync();
     virtual FileError info(FileInfo& info) = 0;
     /// Sets the permission bits.
     virtual FileError setPermissions(uint32_t permissions) = 0;

@@ -70,6 +70,12 @@ public:
 
     FileError sync() override { return ::fsync(m_descriptor) != 0 ? failed("sync", m_path) : FileError(); }
 
+    void beginSync() override {
+#ifdef SYNC_FILE_RANGE_WRITE
+        static_cast<void>(::sync_file_range(m_descriptor, 0, 0, SYNC_FILE_RANGE_WRITE));
+#endif
+    }
+
     FileError info(FileInfo& info) override {
         struct stat status {};
         if (::fstat(m_descriptor, &status) != 0) {

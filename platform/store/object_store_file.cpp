@@ -298,6 +298,18 @@ FileError readFully(OpenFile& file, std::span<std::byte> to, size_t& got) {
     return {};
 }
 
+void StoreImage::allocate(size_t size) {
+    m_size = size;
+    m_pages = size < PageMemory::kLeastSize ? nullptr : PageMemory::make(size);
+    if (m_pages != nullptr) {
+        m_bytes = m_pages->bytes().data();
+        return;
+    }
+    // Not zeroed: every byte is overwritten from the file.
+    m_heap = std::make_unique_for_overwrite<std::byte[]>(size);
+    m_bytes = m_heap.get();
+}
+
 FileError StoreImage::read(const String& path, bool headerMustHold, StoreVerdict& judged) {
     drop();
     m_identity = {};
@@ -312,10 +324,8 @@ FileError StoreImage::read(const String& path, bool headerMustHold, StoreVerdict
     if (info.size > kMaxStoreSize) {
         return {EFBIG, "read", path};
     }
-    // Not zeroed: every byte is overwritten from the file.
-    m_size = info.size;
-    m_bytes = std::make_unique_for_overwrite<std::byte[]>(m_size);
-    const std::span<std::byte> whole(m_bytes.get(), m_size);
+    allocate(info.size);
+    const std::span<std::byte> whole(m_bytes, m_size);
     const size_t headerSize = std::min<size_t>(m_size, kStoreHeaderSize);
     size_t got = 0;
     if (FileError error = readFully(*file, whole.first(headerSize), got)) {
@@ -338,7 +348,7 @@ FileError StoreImage::read(const String& path, bool headerMustHold, StoreVerdict
     m_identity.info = info;
     m_identity.known = m_size >= kStoreHeaderSize;
     m_identity.infoKnown = true;
-    std::memcpy(m_identity.header.data(), m_bytes.get(), headerSize);
+    std::memcpy(m_identity.header.data(), m_bytes, headerSize);
     return {};
 }
 

@@ -27,6 +27,7 @@ Status StoreWriter::write(std::span<const std::byte> bytes) {
 Status StoreWriter::writeBuffer() {
     Status status = write(m_buffer.bytes());
     m_buffer.clear();
+    m_buffer.setPlace(m_file.size());
     return status;
 }
 
@@ -59,6 +60,7 @@ Status StoreWriter::add(const StoredLabel& label, std::span<const std::byte> byt
         if (Status status = write(bytes); !status) {
             return status;
         }
+        m_buffer.setPlace(m_file.size());
     } else {
         m_buffer.setRaw(bytes.data(), bytes.size());
     }

@@ -82,6 +82,15 @@ void PStream::setRaw(const void* from, size_t size) {
     }
 }
 
+void PStream::setAlignment(unsigned boundary) {
+    const uint64_t next = m_place + m_output.size() + 1;
+    const auto filling = static_cast<uint8_t>((boundary - next % boundary) % boundary);
+    setCookedChar(filling);
+    for (unsigned i = 0; i < filling; ++i) {
+        setCookedChar(0);
+    }
+}
+
 void PStream::reserve(size_t size) {
     const size_t needed = m_output.size() + size;
     if (needed > m_output.capacity()) {
@@ -155,6 +164,13 @@ std::span<const std::byte> PStream::getSpan(size_t size) {
     const std::span<const std::byte> bytes = m_input.subspan(m_position, size);
     m_position += size;
     return bytes;
+}
+
+void PStream::passAlignment() {
+    const std::span<const std::byte> filling = getSpan(getCookedChar());
+    if (std::any_of(filling.begin(), filling.end(), [](std::byte value) { return value != std::byte{0}; })) {
+        fail();
+    }
 }
 
 uint32_t PStream::getCount(size_t leastSize) {

@@ -5,6 +5,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <span>
 #include <vector>
 
@@ -24,6 +25,10 @@ public:
     PStream() = default;
     /// For reading `bytes`, which must outlive the stream.
     explicit PStream(std::span<const std::byte> bytes) : m_input(bytes), m_reading(true) {}
+    /// The same for bytes that whoever holds a copy of `keeper` may go on using after the stream. They never
+    /// change.
+    PStream(std::span<const std::byte> bytes, std::shared_ptr<const void> keeper)
+        : m_input(bytes), m_keeper(std::move(keeper)), m_reading(true) {}
 
     /// \name Writing
     /// @{
@@ -37,6 +42,11 @@ public:
     void setString(std::string_view text);
     /// Bytes as they are, without a length.
     void setRaw(const void* from, size_t size);
+    /// Tells where the stream's first byte will lie; 0 at first. Only `setAlignment` asks for it.
+    void setPlace(uint64_t place) { m_place = place; }
+    /// Fills up to a place that is a multiple of `boundary` (2 to 128): a byte that tells how many zero bytes
+    /// follow it, and those. Read by `passAlignment`.
+    void setAlignment(unsigned boundary);
     /// Room for `size` more bytes is made ahead. The buffer at least doubles when it must grow, so that
     /// calls for small amounts stay cheap.
     void reserve(size_t size);
@@ -64,6 +74,10 @@ public:
     /// A view of the next `size` bytes, which are passed over; empty with the error state set if fewer are
     /// left.
     std::span<const std::byte> getSpan(size_t size);
+    /// Passes over what `setAlignment` wrote; the error state is set if it is not that.
+    void passAlignment();
+    /// What keeps the stream's bytes, for who goes on using them where they lie; null if nothing does.
+    [[nodiscard]] const std::shared_ptr<const void>& keeper() const { return m_keeper; }
     /// A count of items that each take at least `leastSize` bytes: a count that what is left cannot hold
     /// sets the error state and gives 0, before anybody reserves memory for it.
     uint32_t getCount(size_t leastSize);
@@ -76,6 +90,8 @@ public:
 private:
     std::vector<std::byte> m_output;
     std::span<const std::byte> m_input;
+    std::shared_ptr<const void> m_keeper;
+    uint64_t m_place = 0;
     size_t m_position = 0;
     bool m_reading = false;
     bool m_failed = false;

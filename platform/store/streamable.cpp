@@ -140,7 +140,7 @@ bool Streamable::STRM_hierarchyUnpack(PStream& stream) {
     const Revision before{revisionMajor(), revisionMinor()};
     revisionMajor(layer->revision.major);
     revisionMinor(layer->revision.minor);
-    PStream own(layer->bytes);
+    PStream own(layer->bytes, stream.keeper());
     unpack(own);
     // A newer minor revision may have added to the end of the layer; any other leaves nothing over.
     const bool newerMinor = layer->revision.major == current.major && layer->revision.minor > current.minor;

@@ -49,7 +49,7 @@ void TagBag::Contents::erase(std::string_view name) {
     const auto found = m_index.find(name);
     if (found != m_index.end()) {
         const Entries::iterator entry = found->second;
-        if (entry->inMemory && entry->copied.empty()) {
+        if (entry->isInImage()) {
             m_imageBytesInUse -= entry->memory.size();
         }
         m_index.erase(found);
@@ -73,7 +73,11 @@ void TagBag::Contents::takeImage(std::span<const StoredObject> objects, std::spa
         entry.memory = image.bytes().subspan(object.offset, object.length);
         entry.inMemory = true;
         entry.onFile = onFile;
-        m_imageBytesInUse += entry.memory.size();
+        entry.keeper = image.keep(entry.memory);
+        m_imageBytesInUse += entry.isInImage() ? entry.memory.size() : 0;
+    }
+    if (m_imageBytesInUse == 0) {
+        image.drop();
     }
 }
 
@@ -95,7 +99,7 @@ bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
         }
         bytes = reread;
     }
-    PStream stream(bytes);
+    PStream stream(bytes, entry.inMemory ? entry.keeper : nullptr);
     if (object.STRM_hierarchyUnpack(stream) && stream.remaining() == 0) {
         return true;
     }
@@ -130,13 +134,14 @@ void TagBag::Contents::dropMemory(Entry& entry) {
 }
 
 void TagBag::Contents::forgetBytes(Entry& entry) {
-    if (entry.inMemory && entry.copied.empty()) {
+    if (entry.isInImage()) {
         m_imageBytesInUse -= entry.memory.size();
     }
     entry.inMemory = false;
     entry.onFile = false;
     entry.memory = {};
     entry.copied = {};
+    entry.keeper.reset();
 }
 
 void TagBag::Contents::thinImage() {
@@ -144,7 +149,7 @@ void TagBag::Contents::thinImage() {
         return;
     }
     for (Entry& other : entries) {
-        if (other.inMemory && other.copied.empty()) {
+        if (other.isInImage()) {
             other.copied.assign(other.memory.begin(), other.memory.end());
             other.memory = other.copied;
         }

@@ -2,6 +2,7 @@
 
 #include "platform/base/qx_string.h"
 #include "platform/services/files.h"
+#include "platform/services/page_memory.h"
 
 #include <array>
 #include <cstddef>
@@ -103,15 +104,26 @@ public:
     /// Reads a file, up to the first failure. `judged` is the verdict on its header; when that is not sound
     /// and `headerMustHold`, nothing but the header was read.
     FileError read(const String& path, bool headerMustHold, StoreVerdict& judged);
-    [[nodiscard]] std::span<const std::byte> bytes() const { return {m_bytes.get(), m_size}; }
+    [[nodiscard]] std::span<const std::byte> bytes() const { return {m_bytes, m_size}; }
+    /// Something that keeps a part of the bytes whatever becomes of the image, for a large image; null for a
+    /// small one, whose bytes go with it.
+    [[nodiscard]] std::shared_ptr<const void> keep(std::span<const std::byte> part) const {
+        return m_pages == nullptr ? nullptr : m_pages->lend(part);
+    }
     [[nodiscard]] const StoreIdentity& identity() const { return m_identity; }
     void drop() {
-        m_bytes.reset();
+        m_pages.reset();
+        m_heap.reset();
+        m_bytes = nullptr;
         m_size = 0;
     }
 
 private:
-    std::unique_ptr<std::byte[]> m_bytes;
+    void allocate(size_t size);
+
+    std::shared_ptr<PageMemory> m_pages; ///< of a large image
+    std::unique_ptr<std::byte[]> m_heap; ///< of a small one
+    std::byte* m_bytes = nullptr;
     size_t m_size = 0;
     StoreIdentity m_identity;
 };

@@ -10,7 +10,7 @@
 ///
 /// An object's bytes are in memory (in the image of the file that was read, or copied out of it), or known to
 /// lie in the file `source`, or both, or nowhere. They are dropped from memory as soon as a live object was
-/// made from them and the file has them too.
+/// made from them and the file has them too; an object made from a large image may go on using them there.
 class TagBag::Contents {
 public:
     struct Entry {
@@ -27,8 +27,11 @@ public:
         Qx::detail::StoredPlace place;
         std::span<const std::byte> memory;
         std::vector<std::byte> copied; ///< backs `memory` once the image was dropped
+        /// Keeps `memory`, with the image or without, if the image is a large one.
+        std::shared_ptr<const void> keeper;
 
         [[nodiscard]] bool hasBytes() const { return inMemory || onFile; }
+        [[nodiscard]] bool isInImage() const { return inMemory && copied.empty() && keeper == nullptr; }
         [[nodiscard]] const Streamable* live() const { return lent != nullptr ? lent : owned.get(); }
         [[nodiscard]] bool mustBePacked() const { return live() != nullptr && (changed || !hasBytes()); }
         [[nodiscard]] Qx::detail::StoredLabel label() const { return {name, layer, major, minor}; }

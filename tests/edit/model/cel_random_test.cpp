@@ -157,6 +157,10 @@ void run(unsigned seed, int steps) {
         const cel::Range range(random.near(from), random.near(to));
         cel::IdMap ids;
         bool done = true;
+        // A copy shares the events until one of the two is changed: every other step has one to disturb.
+        const bool copied = random.below(2) == 0;
+        const cel before(copied ? its : cel());
+        const Model modelBefore = copied ? model : Model();
         switch (operation) {
         case 0:
             done = its.insert(source, range, random.near(at), ids);
@@ -195,6 +199,7 @@ void run(unsigned seed, int steps) {
             model.pop_back();
         }
         ASSERT_TRUE(same(its, model)) << "operation " << operation << " in step " << step;
+        ASSERT_TRUE(same(before, modelBefore)) << "the copy, operation " << operation << " in step " << step;
         ASSERT_TRUE(sound(its)) << "operation " << operation << " in step " << step;
         for (const auto& [old, fresh] : ids) {
             ASSERT_NE(its.findId(fresh).valid(), 0) << "operation " << operation << " in step " << step;

@@ -65,7 +65,8 @@ TEST(CelStream, AnyCutStreamIsRefusedAndLeavesTheCel) {
 TEST(CelStream, ACountThatTheStreamCannotHoldTakesNoMemory) {
     Bytes bytes = packed(cel());
     const uint32_t count = 4000000000u;
-    std::memcpy(bytes.data() + bytes.size() - 4, &count, 4);
+    constexpr size_t kCountAt = 4 + 12 + 4 + 4 + 8; // behind the texts, the stamp and the resolution
+    std::memcpy(bytes.data() + kCountAt, &count, 4);
     cel its;
     EXPECT_FALSE(reads(bytes, its));
 }
@@ -100,12 +101,58 @@ TEST(CelStream, ALaterRevisionIsRefused) {
     makeNamed().STRM_hierarchyPack(stream);
     Bytes bytes = stream.bytes();
     constexpr size_t kMajorAt = 4 + 4 + 3; // behind the number of layers and the name
-    ASSERT_EQ(bytes[kMajorAt], std::byte{1});
-    bytes[kMajorAt] = std::byte{2};
+    ASSERT_EQ(bytes[kMajorAt], std::byte{2});
+    bytes[kMajorAt] = std::byte{3};
     PStream input{std::span<const std::byte>(bytes)};
     cel again;
     EXPECT_FALSE(again.STRM_hierarchyUnpack(input));
     EXPECT_EQ(again.numEvents(), 0);
+}
+
+TEST(CelStream, TheFirstRevisionHadNoFilling) {
+    const cel its = makeNamed();
+    Bytes bytes = packed(its);
+    const std::ptrdiff_t events = static_cast<std::ptrdiff_t>(kEventSize) * its.numEvents();
+    auto filling = bytes.end() - events - 1;
+    while (*filling == std::byte{0} && bytes.end() - events - 1 - filling < 7) {
+        --filling;
+    }
+    bytes.erase(filling, bytes.end() - events);
+    cel again;
+    EXPECT_FALSE(reads(bytes, again)) << "it is not of the present revision";
+    again.revisionMajor(1);
+    ASSERT_TRUE(reads(bytes, again));
+    EXPECT_EQ(packed(again), packed(its));
+}
+
+TEST(CelStream, ManyEventsMayStayWhereTheyLie) {
+    cel its;
+    for (int i = 0; i < 3000; ++i) {
+        its.appendEventPair(cookie("E0001000"), 0, 2.0 * i, 1);
+    }
+    const auto kept = std::make_shared<const Bytes>(packed(its));
+    const Bytes before = *kept;
+    PStream stream(std::span<const std::byte>(*kept), kept);
+    cel lying;
+    lying.unpack(stream);
+    ASSERT_TRUE(stream.good());
+    const auto inBytes = [&](const cel& which) {
+        const auto* const first = reinterpret_cast<const std::byte*>(which.getChanEventPtr(0));
+        return first >= kept->data() && first < kept->data() + kept->size();
+    };
+    EXPECT_TRUE(inBytes(lying));
+    EXPECT_GT(kept.use_count(), 1 + 1) << "the stream holds one, the cel another";
+    const auto changed = lying.copy();
+    EXPECT_TRUE(inBytes(*changed));
+    ASSERT_TRUE(changed->remove({100, 102}));
+    changed->get_start_ceh().set_dmod_code(7);
+    EXPECT_FALSE(inBytes(*changed));
+    EXPECT_EQ(changed->numPairs(), 2999);
+    EXPECT_EQ(changed->find_ceh(100.5, CE_IN_POINT).get_edit_time(), 100);
+    EXPECT_EQ(packed(lying), before);
+    lying.get_start_ceh().set_edit_time(0.5);
+    EXPECT_EQ(lying.find_ceh(0.4, CE_IN_POINT).valid(), 0);
+    EXPECT_EQ(*kept, before) << "what is kept never changes";
 }
 
 TEST(CelStream, RandomDamageNeverMakesABadCel) {

@@ -64,6 +64,49 @@ TEST_F(EditFileTest, TypesFollowTheNameWhateverItsCase) {
     }
 }
 
+TEST_F(EditFileTest, ALargeEditUsesItsEventsWhereTheFileWasRead) {
+    {
+        Edit made;
+        made.set_cookie(cookie(kItem));
+        for (int channel = 0; channel < 3; ++channel) {
+            cel* const content = made.get_edit_cel_p(made.addChan(VideoChan));
+            for (int i = 0; i < 10'000; ++i) {
+                content->appendEventPair(cookie("V0001000"), i, 2.0 * i, 1 + channel * 0.25);
+            }
+        }
+        save(made);
+    }
+    const std::string before = bytes("E0001000.qme");
+    EditPtr edit(new Edit(path(), eOpenExisting));
+    ASSERT_FALSE(edit->isBad()) << edit->lastFileError();
+    const EditPtr copied = edit->copy();
+    ASSERT_TRUE(copied->get_edit_cel_p(1)->remove({100, 200}));
+    // The image goes with the edit; what the copy uses of it stays.
+    edit.invalidate();
+    for (int channel = 0; channel < 3; ++channel) {
+        const cel& content = *copied->get_edit_cel_p(channel);
+        ASSERT_NE(content.is_good_cel(), 0);
+        EXPECT_EQ(content.numPairs(), channel == 1 ? 9950 : 10'000);
+        EXPECT_EQ(content.get_strip_time(1000.5), channel == 1 ? 550.5 : 500.5);
+    }
+    copied->set_cookie(cookie(kItem));
+    save(*copied);
+    EXPECT_LT(bytes("E0001000.qme").size(), before.size());
+    const EditPtr again(new Edit(path(), eOpenExisting));
+    ASSERT_FALSE(again->isBad());
+    // A save of what lies in the image of its own file, half of it changed.
+    ASSERT_TRUE(again->get_edit_cel_p(0)->remove({100, 200}));
+    save(*again);
+    const Edit last(path(), eOpenExisting);
+    for (int channel = 0; channel < 3; ++channel) {
+        const cel& content = *last.get_edit_cel_p(channel);
+        EXPECT_EQ(content.numPairs(), channel == 2 ? 10'000 : 9950);
+        for (int i = 0; i < content.numEvents(); ++i) {
+            ASSERT_EQ(content.get_event(i), again->get_edit_cel_p(channel)->get_event(i));
+        }
+    }
+}
+
 TEST_F(EditFileTest, RandomEditsComeBackExactly) {
     for (unsigned seed = 1; seed <= 60; ++seed) {
         SCOPED_TRACE(seed);

@@ -120,6 +120,26 @@ TEST(PStream, CountsAndLengthsAreCheckedBeforeTheyAreTrusted) {
     EXPECT_STREQ(to, "unchanged");
 }
 
+TEST(PStream, AlignmentFollowsThePlaceAndIsPassedOver) {
+    for (unsigned place = 0; place < 20; ++place) {
+        PStream stream;
+        stream.setPlace(place);
+        stream.setAlignment(8);
+        EXPECT_EQ((place + stream.size()) % 8, 0U);
+        EXPECT_LE(stream.size(), 8U);
+        stream.setCookedChar(77);
+        PStream reading{std::span<const std::byte>(stream.bytes())};
+        reading.passAlignment();
+        EXPECT_EQ(reading.getCookedChar(), 77) << place;
+    }
+    for (const std::string_view bad :
+         {std::string_view("\x02\0", 2), std::string_view("\x02\0\1", 3), std::string_view()}) {
+        PStream reading(bytesOf(bad));
+        reading.passAlignment();
+        EXPECT_FALSE(reading.good());
+    }
+}
+
 TEST(PStream, MisuseIsAnErrorState) {
     PStream reading(bytesOf("abcd"));
     reading.setUnsignedLong(1);
