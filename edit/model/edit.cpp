@@ -81,14 +81,6 @@ EditPtr Edit::copy() const {
     return twin;
 }
 
-int32_t Edit::incRefCount() {
-    return m_refCount.fetch_add(1, std::memory_order_relaxed) + 1;
-}
-
-int32_t Edit::decRefCount() {
-    return m_refCount.fetch_sub(1, std::memory_order_acq_rel) - 1;
-}
-
 Edit_Chan_Type Edit::edit_chan_type_from_cookie_type(Cookie_Type kind) {
     switch (kind) {
     case Cookie_Type::Control:

@@ -82,8 +82,8 @@ public:
     /// \name Handles (used by `EditPtr` alone)
     /// @{
     /// Both return the new count.
-    int32_t incRefCount();
-    int32_t decRefCount();
+    int32_t incRefCount() { return m_refCount.fetch_add(1, std::memory_order_relaxed) + 1; }
+    int32_t decRefCount() { return m_refCount.fetch_sub(1, std::memory_order_acq_rel) - 1; }
     [[nodiscard]] int32_t refCount() const { return m_refCount.load(); }
     /// @}
 

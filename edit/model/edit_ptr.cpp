@@ -14,7 +14,10 @@ EditPtr::EditPtr(const EditPtr& other) {
 }
 
 EditPtr::EditPtr(const cookie& item, eEditOpenBehaviour behaviour) {
-    open(item, behaviour);
+    if (EditRegistry* registry = EditRegistry::current()) {
+        EditPtr opened = registry->open(item, behaviour);
+        std::swap(m_edit, opened.m_edit);
+    }
 }
 
 EditPtr::~EditPtr() {
