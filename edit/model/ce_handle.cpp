@@ -4,8 +4,13 @@
 
 using namespace cel_detail;
 
-channel_event* ce_handle::event() const {
-    return const_cast<channel_event*>(get_chan_evnt_ptr());
+const channel_event* ce_handle::event() const {
+    return get_chan_evnt_ptr();
+}
+
+/// The event of a valid handle, for a change of anything but its edit time.
+channel_event& ce_handle::changing() const {
+    return m_cel->m_events.change(static_cast<size_t>(m_index));
 }
 
 const channel_event* ce_handle::get_chan_evnt_ptr() const {
@@ -112,10 +117,11 @@ void ce_handle::set_strip_velocity(double velocity) {
     if (valid() == 0 || !isGoodEvent(first)) {
         return;
     }
-    *in.event() = first;
+    in.changing() = first;
     if (out.valid() != 0) {
-        out.event()->velocity = velocity;
-        out.event()->stripTime = stripAt(first, out.get_edit_time());
+        channel_event& second = out.changing();
+        second.velocity = velocity;
+        second.stripTime = stripAt(first, second.editTime);
     }
     m_cel->changedNow();
 }
@@ -169,14 +175,14 @@ void ce_handle::set_audioRamp_CurveType(Aud::GainCurve::eCurveType type) {
 
 template <typename Change>
 void ce_handle::change(Change&& apply) {
-    channel_event* its = event();
+    const channel_event* its = event();
     if (its == nullptr) {
         return;
     }
     channel_event changed = *its;
     apply(changed);
     if (changed != *its && isGoodEvent(changed)) {
-        *its = changed;
+        changing() = changed;
         m_cel->changedNow();
     }
 }

@@ -78,7 +78,8 @@ public:
     void set_audioRamp_CurveType(Aud::GainCurve::eCurveType type);
 
 private:
-    [[nodiscard]] channel_event* event() const;
+    [[nodiscard]] const channel_event* event() const;
+    [[nodiscard]] channel_event& changing() const;
     template <typename Change>
     void change(Change&& apply);
 

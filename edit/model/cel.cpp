@@ -19,7 +19,7 @@ bool cel::close() {
         out.id = channel_event::newId();
         out.rampQFrames = 0;
         out.rampCurve = 0;
-        m_events.push_back(out);
+        m_events.append(out);
         changedNow();
     }
     if (!isGood(m_events)) {
@@ -52,7 +52,7 @@ bool cel::add_event(const channel_event& event) {
         }
         added.editTime = std::max(added.editTime, last);
     }
-    m_events.push_back(added);
+    m_events.append(added);
     changedNow();
     return true;
 }
@@ -87,7 +87,13 @@ ce_handle cel::insertEventPair(int pair, const cookie& strip, double stripTime, 
     if (!isGoodEvent(added.in) || !isGoodEvent(added.out)) {
         return {};
     }
-    m_events.insert(m_events.begin() + static_cast<std::ptrdiff_t>(at), {added.in, added.out});
+    if (at == m_events.size()) {
+        m_events.append(added.in);
+        m_events.append(added.out);
+    } else {
+        const channel_event both[] = {added.in, added.out};
+        m_events.splice(at, at, both);
+    }
     changedNow();
     return {this, static_cast<int>(at)};
 }
@@ -108,7 +114,8 @@ bool cel::setEvent(int index, const channel_event& event) {
     if (!fits) {
         return false;
     }
-    m_events[at] = event;
+    m_events.change(at) = event;
+    m_events.setTime(at, event.editTime);
     changedNow();
     return true;
 }
@@ -157,7 +164,7 @@ bool isInPlace(const channel_event& event, size_t index, double last) {
 
 } // namespace
 
-bool isGood(const Events& events) {
+bool isGood(std::span<const channel_event> events) {
     double last = -cel::kGreatestTime;
     for (size_t i = 0; i < events.size(); ++i) {
         if (!isInPlace(events[i], i, last)) {

@@ -3,13 +3,13 @@
 #include "edit/model/ce_handle.h"
 #include "edit/model/channel_event.h"
 #include "edit/model/editable.h"
+#include "edit/model/event_array.h"
 #include "platform/base/status.h"
 #include "platform/media/tv_standard.h"
 #include "platform/store/streamable.h"
 #include "platform/store/text_file.h"
 
 #include <map>
-#include <vector>
 
 /// How `chequerboard` treats a fade at a cut.
 enum class SoftCuts {
@@ -23,10 +23,11 @@ enum class SoftCuts {
 /// Owns its events, its channel information and its "changed since written" mark. It knows nothing of the
 /// edit that it belongs to, of undo or of notification.
 ///
-/// Representation: one contiguous array; the in point of pair k lies at 2k, its out point at 2k + 1. Pairs
-/// are in order of time and do not overlap; gaps are allowed; black is a pair whose strip is the black
-/// cookie. Nothing keeps a pointer into the array across a change. Finding a time is a binary search; an
-/// operation on a region is a search and one block move. Not thread-safe.
+/// Representation: one contiguous array (`EventArray`); the in point of pair k lies at 2k, its out point at
+/// 2k + 1. Pairs are in order of time and do not overlap; gaps are allowed; black is a pair whose strip is
+/// the black cookie. Nothing keeps a pointer into the array across a change. Finding a time is a binary
+/// search over the packed times of the in points; an operation on a region is a search and one block move. A
+/// copy shares the array until one of the two is changed. Not thread-safe.
 ///
 /// What plays at a time is read from the in point: its strip time there, plus the time since then multiplied
 /// by its velocity. Every operation keeps the out point's strip time in agreement with that; the setters of
@@ -50,7 +51,7 @@ public:
     cel(const cel& other);
     cel& operator=(const cel& other) = delete;
 
-    /// A deep copy, stamps included.
+    /// A deep copy, stamps included. The events are copied when either is changed, not before.
     [[nodiscard]] std::unique_ptr<cel> copy() const;
     /// Finishes a cel after loading: a last in point without an out point gets one at its own time, and all
     /// is checked. False, and the cel is empty, if the events are not consistent.
@@ -84,7 +85,7 @@ public:
     [[nodiscard]] channel_event get_event(int index) const;
     /// In place; null for an index out of range. Lasts until the next change.
     [[nodiscard]] const channel_event* getChanEventPtr(int index) const {
-        return index >= 0 && index < numEvents() ? &m_events[static_cast<size_t>(index)] : nullptr;
+        return index >= 0 && index < numEvents() ? m_events.data() + index : nullptr;
     }
     /// Overwrites one event in place, that one alone. False if the result would not be consistent.
     bool setEvent(int index, const channel_event& event);
@@ -359,7 +360,7 @@ private:
         ++m_changeCount;
     }
 
-    std::vector<channel_event> m_events;
+    EventArray m_events;
     String m_name;
     IdStamp m_id;
     String m_subType;

@@ -13,24 +13,23 @@ ce_handle cel::get_end_ceh() const {
 }
 
 ce_handle cel::find_ceh(double time, ce_info kind) const {
-    // One step past the tolerance, so that "before" below stands for "at or before".
-    const double within = std::nextafter(time + kTolerance, Qx::kNoTime);
+    const double within = time + kTolerance;
     const bool ins = (kind & CE_IN_POINT) != 0;
     const bool outs = (kind & CE_OUT_POINT) != 0;
     if (std::isnan(time) || (!ins && !outs)) {
         return {this, -1};
     }
     if (ins) {
-        const int pair = static_cast<int>(countBefore(m_events, 0, within)) - 1;
+        const int pair = static_cast<int>(m_events.numStartingUpTo(within)) - 1;
         const int index = 2 * pair;
         if (!outs || pair < 0) {
             return {this, pair < 0 ? -1 : index};
         }
         const bool ended =
-            index + 1 < numEvents() && m_events[static_cast<size_t>(index) + 1].editTime < within;
+            index + 1 < numEvents() && m_events[static_cast<size_t>(index) + 1].editTime <= within;
         return {this, ended ? index + 1 : index};
     }
-    const size_t pair = countBefore(m_events, 1, time - kTolerance);
+    const size_t pair = m_events.numEndingBefore(time - kTolerance);
     return {this, 2 * pair + 1 < m_events.size() ? static_cast<int>(2 * pair) + 1 : -1};
 }
 
@@ -82,7 +81,7 @@ bool cel::set_edit_time(const ce_handle& handle, double time, bool force) {
     if (!force && (time < least - kTolerance || time > most + kTolerance)) {
         return false;
     }
-    m_events[at].editTime = std::clamp(time, least, most);
+    m_events.setTime(at, std::clamp(time, least, most));
     changedNow();
     return true;
 }
@@ -94,8 +93,8 @@ double cel::get_strip_time(const ce_handle& handle, double editTime) const {
 namespace {
 
 /// The in point of the pair that plays at a time; null where none does.
-const channel_event* playingAt(const Events& events, double time) {
-    const size_t pairs = countBefore(events, 0, std::nextafter(time + kTolerance, Qx::kNoTime));
+const channel_event* playingAt(const EventArray& events, double time) {
+    const size_t pairs = events.numStartingUpTo(time + kTolerance);
     if (pairs == 0 || 2 * pairs > events.size()) {
         return nullptr;
     }
@@ -112,7 +111,7 @@ double cel::get_strip_time(double editTime) const {
 
 void cel::set_strip_time(const ce_handle& handle, double time) {
     if (check_ceh(handle) != 0 && std::abs(time) <= kGreatestStripTime) {
-        m_events[static_cast<size_t>(handle.index())].stripTime = time;
+        m_events.change(static_cast<size_t>(handle.index())).stripTime = time;
         changedNow();
     }
 }
@@ -146,7 +145,7 @@ cel::Range cel::getExtents(Editable::ExtentType type, bool fromZero) const {
 }
 
 bool cel::isEmpty(const Range& range) const {
-    for (size_t pair = countBefore(m_events, 1, range.start() + kTolerance); 2 * pair + 1 < m_events.size();
+    for (size_t pair = m_events.numEndingBefore(range.start() + kTolerance); 2 * pair + 1 < m_events.size();
          ++pair) {
         const channel_event& in = m_events[2 * pair];
         if (in.editTime >= range.end() - kTolerance) {

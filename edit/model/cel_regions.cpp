@@ -15,7 +15,7 @@ struct Region {
     Cut from;
     Cut to;
 
-    Region(const Events& events, double start, double end)
+    Region(const EventArray& events, double start, double end)
         : from(cutAt(events, start)), to(cutAt(events, end)) {}
     [[nodiscard]] double length() const { return to.time - from.time; }
     /// Number of pairs that reach into it.
@@ -41,7 +41,7 @@ void noteSplit(cel::IdMap* splits, const IdStamp& old, const IdStamp& fresh) {
 
 /// Appends what is left of the pair before a cut. With `split` the rest of the pair survives elsewhere, so
 /// the new out point has a stamp of its own.
-void appendLeft(Events& block, const Events& events, const Cut& cut, bool split) {
+void appendLeft(Events& block, const EventArray& events, const Cut& cut, bool split) {
     const channel_event& in = events[2 * cut.pair];
     channel_event out = cutOut(in, events[2 * cut.pair + 1], cut.time);
     if (split) {
@@ -53,7 +53,7 @@ void appendLeft(Events& block, const Events& events, const Cut& cut, bool split)
 
 /// Appends what is left of the pair after a cut, so that it begins at `at`; its end moves by `shift` as all
 /// that follows does.
-void appendRight(Events& block, const Events& events, const Cut& cut, bool split, double at, double shift,
+void appendRight(Events& block, const EventArray& events, const Cut& cut, bool split, double at, double shift,
                  cel::IdMap* splits) {
     channel_event in = cutIn(events[2 * cut.pair], events[2 * cut.pair + 1], cut.time);
     channel_event out = events[2 * cut.pair + 1];
@@ -68,30 +68,13 @@ void appendRight(Events& block, const Events& events, const Cut& cut, bool split
     block.push_back(out);
 }
 
-/// Puts `block` in the place of the events [first, last) and moves all that follow by `shift`: one pass over
-/// what follows. What then counts as one with `joint`, the end of the block's span, lies at it exactly.
-void splice(Events& events, size_t first, size_t last, const Events& block, double shift, double joint) {
-    const size_t size = events.size();
-    const size_t kept = last - first;
-    if (block.size() > kept) {
-        const size_t more = block.size() - kept;
-        events.resize(size + more);
-        for (size_t i = size; i > last; --i) {
-            events[i - 1 + more] = events[i - 1];
-            events[i - 1 + more].editTime += shift;
-        }
-    } else if (block.size() < kept || shift != 0) {
-        const size_t fewer = kept - block.size();
-        for (size_t i = last; i < size; ++i) {
-            events[i - fewer] = events[i];
-            events[i - fewer].editTime += shift;
-        }
-        events.resize(size - fewer);
-    }
-    std::copy(block.begin(), block.end(), events.begin() + static_cast<std::ptrdiff_t>(first));
+/// Puts `block` in the place of the events [first, last) and moves all that follow by `shift`. What then
+/// counts as one with `joint`, the end of the block's span, lies at it exactly.
+void splice(EventArray& events, size_t first, size_t last, const Events& block, double shift, double joint) {
+    events.splice(first, last, block, shift);
     for (size_t i = first + block.size(); i < events.size() && events[i].editTime <= joint + kTolerance;
          ++i) {
-        events[i].editTime = joint;
+        events.setTime(i, joint);
     }
 }
 
@@ -176,7 +159,7 @@ private:
 };
 
 /// The events of a region of `events` with the material of `laid` under them.
-void layMaterial(Events& block, const Events& events, const Region& region, const Events& laid,
+void layMaterial(Events& block, const EventArray& events, const Region& region, const Events& laid,
                  cel::IdMap& ids, cel::IdMap* splits) {
     MaterialLayer layer(block, laid, ids, splits);
     double now = region.from.time;
@@ -197,7 +180,7 @@ void layMaterial(Events& block, const Events& events, const Region& region, cons
 
 namespace cel_detail {
 
-void appendPart(Events& part, const Events& source, const Cut& first, const Cut& last, double from,
+void appendPart(Events& part, const EventArray& source, const Cut& first, const Cut& last, double from,
                 double to) {
     const auto moved = [&](double time) {
         if (time <= first.time) {
@@ -226,8 +209,10 @@ std::unique_ptr<cel> cel::extract(double from, double to, unsigned flags) const 
     const double start = (flags & KeepTimes) != 0 ? region.from.time : 0;
     auto part = std::make_unique<cel>();
     part->m_resolution = m_resolution;
-    part->m_events.reserve(2 * region.numPairs());
-    appendPart(part->m_events, m_events, region.from, region.to, start, start + region.length());
+    Events events;
+    events.reserve(2 * region.numPairs());
+    appendPart(events, m_events, region.from, region.to, start, start + region.length());
+    part->m_events.assign(std::move(events));
     part->changedNow();
     return part;
 }
@@ -348,7 +333,7 @@ bool cel::weld(const cel* other, double at) {
         if (std::binary_search(taken.begin(), taken.end(), event.id)) {
             event.id = channel_event::newId();
         }
-        m_events.push_back(event);
+        m_events.append(event);
     }
     if (count > 0) {
         changedNow();

@@ -74,7 +74,7 @@ void cel::unpack(PStream& stream) {
         stream.fail();
         return;
     }
-    m_events = std::move(events);
+    m_events.assign(std::move(events));
     m_name = std::move(name);
     m_id = id;
     m_subType = std::move(subType);

@@ -69,7 +69,7 @@ struct Mapping {
 };
 
 /// A freeze: the pair that plays at one moment, all over the span.
-void freeze(Events& to, const Events& from, const Mapping& map) {
+void freeze(Events& to, const EventArray& from, const Mapping& map) {
     const Cut cut = cutAt(from, map.stripIn);
     const size_t first = 2 * cut.pair;
     if (first >= from.size() || from[first].editTime > map.stripIn + kTolerance) {
@@ -123,20 +123,17 @@ std::unique_ptr<cel> cel::add_black_to_ends(int seconds, char ends) const {
     if (seconds == 0) {
         return padded;
     }
-    Events& events = padded->m_events;
     if (start) {
-        for (channel_event& event : events) {
-            event.editTime += added;
-        }
         const double from = get_start_time();
         const FreshPair black(black_cookie, 0, from, from + added);
-        events.insert(events.begin(), {black.in, black.out});
+        const channel_event both[] = {black.in, black.out};
+        padded->m_events.splice(0, 0, both, added);
     }
     if (end) {
         const double from = padded->get_end_time();
         const FreshPair black(black_cookie, 0, from, from + added);
-        events.push_back(black.in);
-        events.push_back(black.out);
+        padded->m_events.append(black.in);
+        padded->m_events.append(black.out);
     }
     padded->changedNow();
     return padded;
@@ -144,7 +141,7 @@ std::unique_ptr<cel> cel::add_black_to_ends(int seconds, char ends) const {
 
 std::unique_ptr<cel> cel::quantise() const {
     auto rounded = copy();
-    quantiseEvents(rounded->m_events, m_resolution);
+    quantiseEvents(EventArray::Rewriting(rounded->m_events).events(), m_resolution);
     rounded->changedNow();
     return rounded;
 }
@@ -158,8 +155,7 @@ std::unique_ptr<cel> cel::rescale(double editIn, double editOut, double stripIn,
         return nullptr;
     }
     auto scaled = std::make_unique<cel>(*this);
-    Events& events = scaled->m_events;
-    events.clear();
+    Events events;
     const Mapping map{editIn, editOut, stripIn, (stripOut - stripIn) / (editOut - editIn), levelIn, levelOut};
     if (std::abs(stripOut - stripIn) <= kTolerance) {
         freeze(events, m_events, map);
@@ -183,8 +179,12 @@ std::unique_ptr<cel> cel::rescale(double editIn, double editOut, double stripIn,
     if (quantiseResult != 0) {
         quantiseEvents(events, m_resolution);
     }
+    if (!isGood(events)) {
+        return nullptr;
+    }
+    scaled->m_events.assign(std::move(events));
     scaled->changedNow();
-    return isGood(events) ? std::move(scaled) : nullptr;
+    return scaled;
 }
 
 int cel::chequerboard(cel** parts, int& numParts, int maxParts, double overlap, int flags,
@@ -216,7 +216,7 @@ int cel::chequerboard(cel** parts, int& numParts, int maxParts, double overlap, 
             made.back()->m_resolution = m_resolution;
             reached.push_back(-kGreatestTime);
         }
-        Events& events = made[part]->m_events;
+        EventArray& events = made[part]->m_events;
         if (widen) {
             const double least = events.empty() ? std::max(-kGreatestTime, std::min(0.0, in.editTime))
                                                 : events.back().editTime;
@@ -230,8 +230,8 @@ int cel::chequerboard(cel** parts, int& numParts, int maxParts, double overlap, 
         if ((flags & ChequerFill) != 0) {
             made[part]->fillToTime(in.editTime);
         }
-        events.push_back(in);
-        events.push_back(out);
+        events.append(in);
+        events.append(out);
         reached[part] = reach.end();
     }
     for (auto& part : made) {
@@ -250,41 +250,48 @@ bool cel::fillToTime(double time) {
         return false;
     }
     const FreshPair black(black_cookie, 0, end, time);
-    m_events.push_back(black.in);
-    m_events.push_back(black.out);
+    m_events.append(black.in);
+    m_events.append(black.out);
     changedNow();
     return true;
 }
 
 bool cel::simplify(Simplification::Type type) {
-    if (m_events.size() < 4 || m_events.size() % 2 != 0) {
+    if (m_events.size() % 2 != 0) {
         return false;
     }
-    size_t last = 0;
-    for (size_t i = 2; i < m_events.size(); i += 2) {
-        const channel_event& next = m_events[i];
-        channel_event& in = m_events[last];
-        channel_event& out = m_events[last + 1];
-        const bool touches = next.editTime - out.editTime <= kTolerance;
+    const auto merge = [type](const channel_event* pair, const channel_event* next) {
         const bool black =
-            (type & Simplification::MergeBlack) != 0 && in.strip.isBlack() && next.strip.isBlack();
+            (type & Simplification::MergeBlack) != 0 && pair->strip.isBlack() && next->strip.isBlack();
         const bool through =
-            (type & Simplification::MergeThrough) != 0 && playsThrough(in, out, next, m_events[i + 1]);
-        if (touches && (black || through)) {
-            const double stripTime = stripAt(in, m_events[i + 1].editTime);
-            out = m_events[i + 1];
-            out.stripTime = stripTime;
-            out.velocity = in.velocity;
+            (type & Simplification::MergeThrough) != 0 && playsThrough(pair[0], pair[1], next[0], next[1]);
+        return next->editTime - pair[1].editTime <= kTolerance && (black || through);
+    };
+    // Nothing is touched up to the first pair that goes, and nothing at all without one.
+    size_t first = 2;
+    while (first < m_events.size() && !merge(m_events.data() + first - 2, m_events.data() + first)) {
+        first += 2;
+    }
+    if (first >= m_events.size()) {
+        return false;
+    }
+    EventArray::Rewriting rewriting(m_events);
+    Events& events = rewriting.events();
+    size_t last = first - 2;
+    for (size_t i = first; i < events.size(); i += 2) {
+        channel_event* const pair = &events[last];
+        if (merge(pair, &events[i])) {
+            const double stripTime = stripAt(pair[0], events[i + 1].editTime);
+            pair[1] = events[i + 1];
+            pair[1].stripTime = stripTime;
+            pair[1].velocity = pair[0].velocity;
         } else {
             last += 2;
-            m_events[last] = next;
-            m_events[last + 1] = m_events[i + 1];
+            events[last] = events[i];
+            events[last + 1] = events[i + 1];
         }
     }
-    if (last + 2 == m_events.size()) {
-        return false;
-    }
-    m_events.resize(last + 2);
+    events.resize(last + 2);
     changedNow();
     return true;
 }

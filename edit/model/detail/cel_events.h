@@ -10,7 +10,7 @@
 /// array is that of a cel: pair k at 2k and 2k + 1, times in order.
 namespace cel_detail {
 
-using Events = std::vector<channel_event>;
+using Events = EventArray::Events;
 
 constexpr double kTolerance = Qx::kTimeTolerance;
 
@@ -53,20 +53,6 @@ constexpr double kTolerance = Qx::kTimeTolerance;
     return static_cast<float>(from + (double{out.level} - from) * part);
 }
 
-/// Number of pairs whose in point (`which` 0) or out point (1) lies before `limit`.
-[[nodiscard]] inline size_t countBefore(const Events& events, size_t which, double limit) {
-    const channel_event* base = events.data() + which;
-    size_t left = events.size() / 2;
-    size_t first = 0;
-    while (left > 0) {
-        const size_t half = (left + 1) / 2;
-        const bool before = base[2 * (first + half - 1)].editTime < limit;
-        first += before ? half : 0;
-        left = before ? left - half : half - 1;
-    }
-    return first;
-}
-
 /// Where a time falls: inside pair number `pair`, beyond the tolerance from either end, or before it and
 /// after the one before. `time` is the time of the edge that it counts as one with, if there is such.
 struct Cut {
@@ -75,8 +61,8 @@ struct Cut {
     double time = 0;
 };
 
-[[nodiscard]] inline Cut cutAt(const Events& events, double time) {
-    const size_t pair = countBefore(events, 0, time - kTolerance);
+[[nodiscard]] inline Cut cutAt(const EventArray& events, double time) {
+    const size_t pair = events.numStartingBefore(time - kTolerance);
     const double before = pair > 0 ? events[2 * pair - 1].editTime : -Qx::kNoTime;
     if (before > time + kTolerance) {
         return {pair - 1, true, time};
@@ -121,13 +107,13 @@ struct FreshPair {
 
 /// Appends the part of `source` between two cuts, its times moved so that the first cut lies at `from` and
 /// the second at `to`. Pieces keep the stamps of their pairs.
-void appendPart(Events& part, const Events& source, const Cut& first, const Cut& last, double from,
+void appendPart(Events& part, const EventArray& source, const Cut& first, const Cut& last, double from,
                 double to);
 
 /// Checks every event and the order of all; a time that lies before the one ahead of it by no more than the
 /// tolerance becomes equal to it. One pass.
 [[nodiscard]] bool checkAndSettle(Events& events);
-[[nodiscard]] bool isGood(const Events& events);
+[[nodiscard]] bool isGood(std::span<const channel_event> events);
 
 /// Length of a fade in seconds at the current project's rate.
 [[nodiscard]] double secondsOfFade(const channel_event& event);

@@ -1,0 +1,40 @@
+#include "bench/work_folder.h"
+
+#include "platform/services/files.h"
+
+#include <filesystem>
+
+namespace bench {
+
+namespace {
+
+class Folder {
+public:
+    Folder() : m_path((std::filesystem::current_path() / "bench-work").string()) {
+        std::filesystem::remove_all(m_path.c_str());
+        std::filesystem::create_directories(m_path.c_str());
+    }
+    ~Folder() {
+        std::error_code ignored;
+        std::filesystem::remove_all(m_path.c_str(), ignored);
+    }
+    Folder(const Folder&) = delete;
+    Folder& operator=(const Folder&) = delete;
+    [[nodiscard]] const String& path() const { return m_path; }
+
+private:
+    String m_path;
+};
+
+} // namespace
+
+const String& workFolder() {
+    static const Folder folder;
+    return folder.path();
+}
+
+String workPath(const String& name) {
+    return Qx::joinPath(workFolder(), name);
+}
+
+} // namespace bench

@@ -1,0 +1,13 @@
+#pragma once
+
+#include "platform/base/qx_string.h"
+
+namespace bench {
+
+/// The folder that all files of the measures go to: "bench-work" in the current folder, on whatever disk that
+/// is. It is emptied when it is first asked for and when the program ends.
+const String& workFolder();
+/// A path in it.
+String workPath(const String& name);
+
+} // namespace bench

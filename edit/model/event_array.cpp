@@ -1,0 +1,215 @@
+#include "edit/model/event_array.h"
+
+#include <algorithm>
+#include <cstring>
+#include <type_traits>
+#include <utility>
+
+static_assert(std::is_trivially_copyable_v<channel_event>, "events are moved as bytes");
+
+namespace {
+
+/// The room that an array gets which must move anyway: some beyond what it needs, so that a row of insertions
+/// does not move it each time, but not the double.
+size_t withSlack(size_t size) {
+    return size + size / 16 + 16;
+}
+
+void addTo(channel_event& event, double shift) {
+    event.editTime += shift;
+}
+
+void addTo(double& time, double shift) {
+    time += shift;
+}
+
+/// Moves items within an array and adds `shift` to their times: block by block, so that each block is still
+/// in the cache nearest to the processor when its times are changed.
+template <typename Item>
+void moveShifted(Item* from, Item* to, size_t count, double shift) {
+    constexpr size_t kBlock = 4096 / sizeof(Item);
+    const auto moveBlock = [&](size_t first, size_t size) {
+        std::memmove(static_cast<void*>(to + first), from + first, size * sizeof(Item));
+        for (size_t i = first; i < first + size; ++i) {
+            addTo(to[i], shift);
+        }
+    };
+    if (to > from) {
+        for (size_t left = count; left > 0;) {
+            const size_t size = std::min(left, kBlock);
+            left -= size;
+            moveBlock(left, size);
+        }
+    } else {
+        for (size_t done = 0; done < count; done += kBlock) {
+            moveBlock(done, std::min(count - done, kBlock));
+        }
+    }
+}
+
+/// Moves the items from `last` on so that they begin at `to`, adding `shift` to their times. There is room.
+template <typename Item>
+void moveTail(std::vector<Item>& items, size_t last, size_t to, double shift) {
+    const size_t tail = items.size() - last;
+    if (to > last) {
+        items.resize(to + tail);
+    }
+    Item* const all = items.data();
+    if (shift != 0) {
+        moveShifted(all + last, all + to, tail, shift);
+    } else if (to != last) {
+        std::memmove(static_cast<void*>(all + to), all + last, tail * sizeof(Item));
+    }
+    if (to < last) {
+        items.resize(to + tail);
+    }
+}
+
+} // namespace
+
+/// What arrays share. The events lie in `events`, or, with a lender, in its memory.
+struct EventArray::Body {
+    std::atomic<size_t> users{1};
+    Events events;
+    std::vector<double> starts;
+    std::shared_ptr<const void> lender;
+};
+
+void EventArray::swap(EventArray& other) noexcept {
+    std::swap(m_body, other.m_body);
+    std::swap(m_events, other.m_events);
+    std::swap(m_starts, other.m_starts);
+    std::swap(m_size, other.m_size);
+}
+
+void EventArray::share() const noexcept {
+    if (m_body != nullptr) {
+        m_body->users.fetch_add(1, std::memory_order_relaxed);
+    }
+}
+
+void EventArray::release() noexcept {
+    if (m_body != nullptr && m_body->users.fetch_sub(1, std::memory_order_acq_rel) == 1) {
+        delete m_body;
+    }
+}
+
+void EventArray::adopt(Body* body) noexcept {
+    release();
+    m_body = body;
+}
+
+/// Points at what the body holds.
+void EventArray::refer() noexcept {
+    m_events = m_body->events.data();
+    m_starts = m_body->starts.data();
+    m_size = m_body->events.size();
+}
+
+bool EventArray::isOwn() const noexcept {
+    // What the last other user read is read before anything is changed here.
+    return m_body != nullptr && m_body->users.load(std::memory_order_acquire) == 1 &&
+           m_body->lender == nullptr;
+}
+
+EventArray::Events& EventArray::own(size_t more) {
+    if (!isOwn()) {
+        auto body = std::make_unique<Body>();
+        const size_t room = more == 0 ? m_size : withSlack(m_size + more);
+        body->events.reserve(room);
+        body->events.assign(begin(), end());
+        body->starts.reserve((room + 1) / 2);
+        body->starts.assign(m_starts, m_starts + (m_size + 1) / 2);
+        adopt(body.release());
+        refer();
+    }
+    return m_body->events;
+}
+
+void EventArray::settle() {
+    const Events& events = m_body->events;
+    std::vector<double>& starts = m_body->starts;
+    starts.resize((events.size() + 1) / 2);
+    for (size_t pair = 0; pair < starts.size(); ++pair) {
+        starts[pair] = events[2 * pair].editTime;
+    }
+    refer();
+}
+
+void EventArray::reserve(size_t events) {
+    own().reserve(events);
+    m_body->starts.reserve((events + 1) / 2);
+    refer();
+}
+
+void EventArray::clear() {
+    *this = EventArray();
+}
+
+void EventArray::append(const channel_event& event) {
+    const channel_event added = event; // it may lie in the memory that moves
+    Events& events = own(1);
+    if (events.size() % 2 == 0) {
+        m_body->starts.push_back(added.editTime);
+    }
+    events.push_back(added);
+    refer();
+}
+
+void EventArray::assign(Events&& events) {
+    auto body = std::make_unique<Body>();
+    body->events = std::move(events);
+    adopt(body.release());
+    settle();
+}
+
+void EventArray::borrow(std::shared_ptr<const void> lender, std::span<const channel_event> events) {
+    auto body = std::make_unique<Body>();
+    body->lender = std::move(lender);
+    body->starts.resize((events.size() + 1) / 2);
+    for (size_t pair = 0; pair < body->starts.size(); ++pair) {
+        body->starts[pair] = events[2 * pair].editTime;
+    }
+    adopt(body.release());
+    m_events = events.data();
+    m_starts = m_body->starts.data();
+    m_size = events.size();
+}
+
+void EventArray::splice(size_t first, size_t last, std::span<const channel_event> block, double shift) {
+    if (!isOwn() || m_body->events.capacity() < m_size - (last - first) + block.size()) {
+        spliceAnew(first, last, block, shift);
+        return;
+    }
+    moveTail(m_body->events, last, first + block.size(), shift);
+    moveTail(m_body->starts, last / 2, (first + block.size()) / 2, shift);
+    std::copy(block.begin(), block.end(), m_body->events.begin() + static_cast<std::ptrdiff_t>(first));
+    for (size_t i = 0; i < block.size(); i += 2) {
+        m_body->starts[(first + i) / 2] = block[i].editTime;
+    }
+    refer();
+}
+
+/// The same into fresh memory: nothing is copied that does not stay.
+void EventArray::spliceAnew(size_t first, size_t last, std::span<const channel_event> block, double shift) {
+    auto body = std::make_unique<Body>();
+    Events& events = body->events;
+    events.reserve(withSlack(m_size - (last - first) + block.size()));
+    events.assign(begin(), begin() + first);
+    events.insert(events.end(), block.begin(), block.end());
+    const size_t tail = events.size();
+    events.insert(events.end(), begin() + last, end());
+    for (size_t i = tail; i < events.size(); ++i) {
+        events[i].editTime += shift;
+    }
+    body->starts.reserve(events.capacity() / 2);
+    adopt(body.release());
+    settle();
+}
+
+void EventArray::setTime(size_t index, double time) {
+    own()[index].editTime = time;
+    if (index % 2 == 0) {
+        m_body->starts[index / 2] = time;
+    }
+}
