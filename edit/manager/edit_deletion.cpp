@@ -16,6 +16,27 @@ EditPtr presentEdit(const cookie& item) {
     return found == nullptr ? EditPtr() : found->edit;
 }
 
+constexpr RevisionChain::Kind kChains[] = {RevisionChain::Undo, RevisionChain::Redo};
+
+RevisionChain chainOf(const String& file, RevisionChain::Kind kind) {
+    return {file, kind, edit_manager::backupDepth()};
+}
+
+/// The file and the backups of it that are there, the file first. `names` are those of its folder.
+Vector<String> editFiles(const String& file, const std::vector<String>& names) {
+    Vector<String> files;
+    if (Qx::fileExists(file)) {
+        files.push_back(file);
+    }
+    for (const RevisionChain::Kind kind : kChains) {
+        const RevisionChain chain = chainOf(file, kind);
+        for (const int number : chain.numbers(names)) {
+            files.push_back(chain.path(number));
+        }
+    }
+    return files;
+}
+
 /// Removes the file, then the backups from the oldest on. False, with nothing changed, when the file cannot
 /// be removed, and with some backups left when one of them cannot.
 bool removeFiles(const Vector<String>& files, const String& file) {
@@ -38,89 +59,100 @@ bool removeFiles(const Vector<String>& files, const String& file) {
     return allRemoved;
 }
 
-/// Deletes an item's files and drops it from the cache. `ownHandles` counts the references that the caller
-/// has.
-bool deleteFiles(const cookie& item, bool force, int ownHandles) {
-    ManagerState& state = managerState();
+/// Asked before anybody is told.
+bool mayBeDeleted(const cookie& item, bool force) {
     const String file = getFilenameForCookie(item);
-    std::unique_ptr<ManagerState::CachedEdit> dropped;
-    const Qx::AccessScope<cookie> turn(state.queue, item);
-    EditManagerLock writers;
-    if (!takeWritersLock(writers)) {
-        return false;
-    }
-    const ManagerState::Hold hold(state.lock);
-    const ManagerState::CachedEdit* const entry = state.findCacheEntry(item);
-    const bool isPresent = entry != nullptr && entry->edit.valid();
-    if (!force && isPresent && entry->edit->refCount() > 1 + ownHandles) {
-        herc_printf("edit_manager: %s is in use and was not deleted\n", item.asString().c_str());
-        return false;
-    }
-    const Vector<String> files = edit_manager::getEditFiles(item);
-    if ((files.empty() && !isPresent) || !removeFiles(files, file)) {
-        return false;
-    }
-    static_cast<void>(RevisionChain(file, RevisionChain::Undo, 1).makeDurable());
-    dropped = state.removeCacheEntry(item);
-    return true;
-}
-
-} // namespace
-
-bool edit_manager::delete_edit_file_and_backups(const cookie& item, bool force) {
-    ManagerState& state = managerState();
-    if (getFilenameForCookie(item).empty()) {
+    if (file.empty()) {
         return false;
     }
     if (!force && PermissionsManager::getReadOnly(item)) {
         herc_printf("edit_manager: %s is read-only and was not deleted\n", item.asString().c_str());
         return false;
     }
-    {
-        // Asked before anybody is told.
-        const EditPtr edit = presentEdit(item);
-        if (!force && edit.valid() && edit->refCount() > 2) {
-            herc_printf("edit_manager: %s is in use and was not deleted\n", item.asString().c_str());
-            return false;
-        }
-        if (!edit.valid() && getEditFiles(item).empty()) {
-            return false;
-        }
-    }
-    issuePreDeletionNotifications(item);
-    if (!deleteFiles(item, force, 0)) {
+    const EditPtr edit = presentEdit(item);
+    if (!force && edit.valid() && edit->refCount() > 2) {
+        herc_printf("edit_manager: %s is in use and was not deleted\n", item.asString().c_str());
         return false;
     }
-    state.records.remove(item);
-    storeRecords();
-    Qx::Network::send({Qx::Network::EditDeleted, item, PermissionsManager::getCurrentUser()});
+    return edit.valid() || Qx::fileExists(file) || !edit_manager::getEditFiles(item).empty();
+}
+
+/// Deletes an item's files and drops it from the cache. `names` are those of its folder, listed under the
+/// writers' lock, which is held.
+bool deleteFiles(const cookie& item, bool force, const std::vector<String>& names) {
+    ManagerState& state = managerState();
+    const String file = getFilenameForCookie(item);
+    std::unique_ptr<ManagerState::CachedEdit> dropped;
+    const Qx::AccessScope<cookie> turn(state.queue, item);
+    const ManagerState::Hold hold(state.lock);
+    const ManagerState::CachedEdit* const entry = state.findCacheEntry(item);
+    const bool isPresent = entry != nullptr && entry->edit.valid();
+    if (!force && isPresent && entry->edit->refCount() > 1) {
+        herc_printf("edit_manager: %s is in use and was not deleted\n", item.asString().c_str());
+        return false;
+    }
+    const Vector<String> files = editFiles(file, names);
+    if ((files.empty() && !isPresent) || !removeFiles(files, file)) {
+        return false;
+    }
+    // Another thread may have made a backup since the folder was listed; it has a number in the depth.
+    for (const RevisionChain::Kind kind : kChains) {
+        if (!chainOf(file, kind).deleteTail(0)) {
+            return false;
+        }
+    }
+    dropped = state.removeCacheEntry(item);
     return true;
 }
 
-bool edit_manager::deleteEditFilesAndBackups(const CookieVec& items, bool force) {
-    bool allDeleted = true;
-    for (const cookie& item : items) {
-        allDeleted = delete_edit_file_and_backups(item, force) && allDeleted;
+/// Deletes what can be deleted, with one listing and one sync of the folder for all. Returns the items that
+/// are gone.
+CookieVec deleteAllFiles(const CookieVec& items, bool force) {
+    CookieVec gone;
+    EditManagerLock writers;
+    if (items.empty() || !takeWritersLock(writers)) {
+        return gone;
     }
-    return allDeleted;
+    const RevisionChain any = chainOf(getFilenameForCookie(items.front()), RevisionChain::Undo);
+    const std::vector<String> names = any.namesInFolder();
+    for (const cookie& item : items) {
+        if (deleteFiles(item, force, names)) {
+            gone.push_back(item);
+        }
+    }
+    static_cast<void>(any.makeDurable());
+    return gone;
+}
+
+} // namespace
+
+bool edit_manager::delete_edit_file_and_backups(const cookie& item, bool force) {
+    return deleteEditFilesAndBackups({item}, force);
+}
+
+bool edit_manager::deleteEditFilesAndBackups(const CookieVec& items, bool force) {
+    CookieVec going;
+    for (const cookie& item : items) {
+        if (mayBeDeleted(item, force)) {
+            issuePreDeletionNotifications(item);
+            going.push_back(item);
+        }
+    }
+    const CookieVec gone = deleteAllFiles(going, force);
+    for (const cookie& item : gone) {
+        managerState().records.remove(item);
+    }
+    storeRecords();
+    for (const cookie& item : gone) {
+        Qx::Network::send({Qx::Network::EditDeleted, item, PermissionsManager::getCurrentUser()});
+    }
+    return gone.size() == items.size();
 }
 
 Vector<String> edit_manager::getEditFiles(const cookie& item) {
-    Vector<String> files;
     const String file = getFilenameForCookie(item);
-    if (file.empty()) {
-        return files;
-    }
-    if (Qx::fileExists(file)) {
-        files.push_back(file);
-    }
-    for (const RevisionChain::Kind kind : {RevisionChain::Undo, RevisionChain::Redo}) {
-        const RevisionChain chain(file, kind, backupDepth());
-        for (const int number : chain.numbers()) {
-            files.push_back(chain.path(number));
-        }
-    }
-    return files;
+    return file.empty() ? Vector<String>()
+                        : editFiles(file, chainOf(file, RevisionChain::Undo).namesInFolder());
 }
 
 void edit_manager::issuePreDeletionNotifications(const cookie& item) {

@@ -83,6 +83,8 @@ bool edit_manager::flush_changes() {
         if (!items.empty()) {
             static_cast<void>(writers.take(true).isOk());
         }
+        // One by one, not as an `AtomicBatch`: that would wait for all that the file system has not written
+        // yet, media too, and nobody else may touch the edits meanwhile.
         for (const cookie& item : items) {
             const EditPtr edit = cachedEdit(item);
             if (!edit.valid()) {

@@ -137,6 +137,8 @@ public:
     /// use by others than the cache, unless `force`, whose files could not be removed, and for one that has
     /// none. Other seats are told. Milestones stay, and what was set aside as ".CORRUPT".
     static bool delete_edit_file_and_backups(const cookie& item, bool force);
+    /// The same for many, of which those that can be deleted are: all notices come first, then the folder is
+    /// gone through once. True if all were deleted.
     static bool deleteEditFilesAndBackups(const CookieVec& items, bool force);
     /// The paths of an edit's file and all its backups that are there, the file first, then undo, then redo.
     [[nodiscard]] static Vector<String> getEditFiles(const cookie& item);

@@ -128,7 +128,9 @@ int Opening::restoreNewest() {
 }
 
 bool Opening::restoreMissing() {
-    if (!m_undo.exists() || !takeWritersLock(m_writers)) {
+    // What lies beyond the depth is not brought back, so the folder need not be listed for it: a sequence may
+    // play very many shots that are not there.
+    if (m_undo.newest() == 0 || !takeWritersLock(m_writers)) {
         return false;
     }
     // Another process may have put the file back meanwhile.

@@ -36,21 +36,33 @@ bool RevisionChain::has(int number) const {
 }
 
 bool RevisionChain::exists() const {
-    return !numbers().empty();
+    return newest() != 0 || !numbers().empty();
 }
 
-std::vector<int> RevisionChain::numbers() const {
+std::vector<String> RevisionChain::namesInFolder() const {
     std::vector<String> names;
     if (m_file.empty() || Qx::fileSystem().list(Qx::folderOf(m_file), names)) {
         return {};
     }
+    return names;
+}
+
+std::vector<int> RevisionChain::numbers() const {
+    return numbers(namesInFolder());
+}
+
+std::vector<int> RevisionChain::numbers(const std::vector<String>& names) const {
+    if (m_file.empty()) {
+        return {};
+    }
     const String start = Qx::fileNameOf(m_file) + "." + marker(m_kind);
     std::vector<int> found;
-    for (const String& name : names) {
+    for (auto name = std::lower_bound(names.begin(), names.end(), start);
+         name != names.end() && name->starts_with(start); ++name) {
         int number = 0;
         // A number with a leading zero or a sign is not a name of this chain.
-        if (name.rfind(start, 0) == 0 && Qx::textToInt(std::string_view(name).substr(start.size()), number) &&
-            number > 0 && name == start + std::to_string(number) && has(number)) {
+        if (Qx::textToInt(std::string_view(*name).substr(start.size()), number) && number > 0 &&
+            *name == start + std::to_string(number) && has(number)) {
             found.push_back(number);
         }
     }

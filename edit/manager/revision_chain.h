@@ -34,10 +34,16 @@ public:
 
     /// True if backup `number` is there.
     [[nodiscard]] bool has(int number) const;
-    /// True if any backup is there, in the depth or beyond it.
+    /// True if any backup is there, in the depth or beyond it. The folder is listed only when the depth holds
+    /// none.
     [[nodiscard]] bool exists() const;
-    /// The numbers that are there, newest first.
+    /// The numbers that are there, newest first. Lists the folder, which takes the longer the more edits are
+    /// in it: who asks for many chains of one folder lists it once and hands in its names, in order of their
+    /// bytes.
     [[nodiscard]] std::vector<int> numbers() const;
+    [[nodiscard]] std::vector<int> numbers(const std::vector<String>& names) const;
+    /// The names in the chain's folder, in order of their bytes; none when it cannot be listed.
+    [[nodiscard]] std::vector<String> namesInFolder() const;
     /// The number of the newest backup in the depth; 0 if there is none.
     [[nodiscard]] int newest() const;
 

@@ -7,6 +7,7 @@
 #include <functional>
 #include <map>
 #include <mutex>
+#include <optional>
 #include <set>
 
 using namespace Qx::detail;
@@ -37,12 +38,18 @@ bool livesInFile(const cookie& item) {
     return item.isStorable() && item.type() != Cookie_Type::Transient;
 }
 
+/// True if both tell of one and the same unchanged file.
+bool isSameFile(const Qx::FileInfo& a, const Qx::FileInfo& b) {
+    return a.device == b.device && a.inode == b.inode && a.size == b.size && a.modifiedNs == b.modifiedNs;
+}
+
 /// The records of the current project.
 struct Records {
     std::mutex mutex;
     bool wereRead = false;
     String folder;                      ///< whose records these are
     configb stored = emptyRecords();    ///< as in the file
+    std::optional<Qx::FileInfo> file;   ///< what that file was; none if it is to be read again
     configb transient = emptyRecords(); ///< of items that are never stored, or without a project folder
     std::map<cookie, String> noted;     ///< owners that items name themselves
     std::set<int> rights;
@@ -64,10 +71,26 @@ struct Records {
         if (folder.empty()) {
             return;
         }
+        // Asked before: a file that is replaced while it is read is another one.
+        file = fileNow();
         bool found = false;
         if (auto status = readStore(permissionsPath(folder), stored, found); !status) {
             herc_printf("PermissionsManager::read: %s\n", status.reason().c_str());
+            file.reset();
         }
+    }
+
+    /// The file at this moment; none if it is not there or does not open. It is opened for it, as a network
+    /// file system may answer the question about a name from memory.
+    [[nodiscard]] std::optional<Qx::FileInfo> fileNow() const {
+        const String path = permissionsPath(folder);
+        std::unique_ptr<Qx::OpenFile> opened;
+        Qx::FileInfo info;
+        if (Qx::retryInterrupted([&] { return Qx::fileSystem().open(path, Qx::OpenMode::Read, opened); }) ||
+            Qx::retryInterrupted([&] { return opened->info(info); })) {
+            return std::nullopt;
+        }
+        return info;
     }
 
     [[nodiscard]] String ownerOf(const cookie& item) {
@@ -88,23 +111,31 @@ struct Records {
             alter(transient);
             return {};
         }
-        if (configb copy = stored; !alter(copy)) {
+        configb fresh = stored;
+        if (!alter(fresh)) {
             return {};
         }
         Qx::FileLock lock(lockPath(folder));
         if (auto status = lock.take(); !status) {
             return status;
         }
-        configb fresh = emptyRecords();
-        bool found = false;
-        if (auto status = readStore(permissionsPath(folder), fresh, found); !status) {
-            return status;
+        const std::optional<Qx::FileInfo> before = fileNow();
+        bool differs = true;
+        // A large project has a record an item: what nobody else replaced is not read again.
+        if (!file || !before || !isSameFile(*file, *before)) {
+            fresh = emptyRecords();
+            bool found = false;
+            if (auto status = readStore(permissionsPath(folder), fresh, found); !status) {
+                return status;
+            }
+            differs = alter(fresh);
         }
-        if (alter(fresh)) {
+        if (differs) {
             if (auto status = writeStore(permissionsPath(folder), fresh); !status) {
                 return status;
             }
         }
+        file = differs ? fileNow() : before;
         stored = fresh;
         return {};
     }

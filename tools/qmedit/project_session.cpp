@@ -226,16 +226,26 @@ Qx::Status ProjectSession::create() {
     return {};
 }
 
-Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
-    const String path = getFilenameForCookie(item);
-    if (kindOf(path) == Qx::FileKind::Missing) {
+/// True if the folder has a file of the item, or what is left of one. It is gone through once: a sequence may
+/// play very many shots that are not there.
+bool ProjectSession::isListed(const cookie& item) const {
+    if (!m_listed) {
         std::vector<String> names;
         std::vector<String> others;
         static_cast<void>(Qx::fileSystem().list(folder(), names).code);
+        m_listed.emplace();
         for (const ItemFile& file : itemFiles(names, others)) {
-            if (file.item == item) {
-                return Qx::Status::failure(path + ": " + missingText(item));
-            }
+            m_listed->insert(file.item);
+        }
+    }
+    return m_listed->contains(item);
+}
+
+Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
+    const String path = getFilenameForCookie(item);
+    if (kindOf(path) == Qx::FileKind::Missing) {
+        if (isListed(item)) {
+            return Qx::Status::failure(path + ": " + missingText(item));
         }
         return Qx::Status::failure("there is no edit " + item.asString() + " in the project " + m_root +
                                    "; 'qmedit list' shows those there are");

@@ -8,7 +8,9 @@
 #include "tools/qmedit/edit_report.h"
 
 #include <memory>
+#include <optional>
 #include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 /// What a listing says of one edit file.
@@ -83,11 +85,13 @@ private:
     [[nodiscard]] projdb* openRecords();
     [[nodiscard]] projdb::Record recordOf(const cookie& item, const Records& known, Records& fresh);
     [[nodiscard]] Known look(const cookie& item) const;
+    [[nodiscard]] bool isListed(const cookie& item) const;
 
     String m_root;
     cookie m_project;
     Qx::FrameRate m_rateOfFresh;
     std::unordered_map<cookie, Known> m_known;
+    mutable std::optional<std::unordered_set<cookie>> m_listed; ///< when an item was first missing
     size_t m_numRead = 0;
     std::unique_ptr<EditManagerLock> m_writers;
     std::unique_ptr<edit_manager> m_manager; ///< goes first: what it writes at its end is written locked

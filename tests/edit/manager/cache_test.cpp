@@ -1,5 +1,6 @@
 #include "edit/manager/edit_manager_lock.h"
 #include "edit/project/permissions_manager.h"
+#include "edit/project/projdb.h"
 #include "platform/services/config_int.h"
 #include "platform/services/crash_flag.h"
 #include "platform/services/local_service.h"
@@ -24,8 +25,10 @@ TEST(Cache, AnOpenThatIsCachedCostsNoFileAndNoMemory) {
     const ManagedProject project;
     ManagedProject::save("a");
     const cookie missing("E0009000");
-    EXPECT_FALSE(EditPtr(missing, eOpenExisting).valid());
     test::FaultyFileSystem system;
+    EXPECT_FALSE(EditPtr(missing, eOpenExisting).valid());
+    EXPECT_EQ(system.count("list"), 0U) << "a long folder is not gone through for each shot that is missing";
+    system.reset();
     const uint64_t timed = Qx::TimedTask::named("editman").section("open").calls();
     for (const cookie& item : {kEdit, missing}) {
         const test::MemoryMeter meter;
@@ -272,6 +275,49 @@ TEST(Deleting, TakesTheFileWithItsBackupsUnlessTheEditIsInUse) {
     heard.clear();
     EXPECT_TRUE(edit_manager::delete_edit_file_and_backups(kEdit, false));
     EXPECT_TRUE(heard.empty()) << "nobody is told of a hidden one";
+}
+
+TEST(Deleting, OfManyListsTheFolderOnceAndLeavesWhatMustStay) {
+    const ManagedProject project;
+    const CookieVec items{kEdit, kOther, cookie("E0003000"), cookie("E0004000")};
+    for (const cookie& item : items) {
+        ManagedProject::save("a", item);
+    }
+    for (const char* const backup : {"E0001000.qme.U2", "E0001000.qme.U12", "E0004000.qme.R1"}) {
+        project.write(backup, "x");
+    }
+    size_t told = 0;
+    {
+        /// Another thread makes a backup as soon as the folder was listed.
+        struct Listed : test::FaultyFileSystem {
+            const ManagedProject* project = nullptr;
+            Qx::FileError list(const String& path, std::vector<String>& names) override {
+                auto error = FaultyFileSystem::list(path, names);
+                project->write("E0004000.qme.U1", "x");
+                return error;
+            }
+        } system;
+        system.project = &project;
+        const auto guard =
+            edit_manager::registerNotification(edit_manager::editDeletedMsgType(), [&](const NotifyMsg&) {
+                EXPECT_TRUE(project.has("E0001000.qme")) << "told before the files go";
+                ++told;
+            });
+        const EditPtr held(kOther, eOpenExisting);
+        system.failWhere("remove E0003000.qme", EACCES);
+        EXPECT_FALSE(edit_manager::deleteEditFilesAndBackups(items, false));
+        EXPECT_EQ(system.count("list"), 1U);
+        EXPECT_EQ(system.count("sync folder"), 1U);
+    }
+    EXPECT_EQ(told, 3U);
+    for (const cookie& item : items) {
+        const bool stays = item == kOther || item == cookie("E0003000");
+        EXPECT_EQ(edit_manager::getEditFiles(item).size(), stays ? 1U : 0U) << item.asString();
+        EXPECT_EQ(edit_manager::get_present(item), stays);
+        projdb::Record record;
+        EXPECT_EQ(edit_manager::get_projdb()->find(item, record), stays);
+    }
+    EXPECT_TRUE(edit_manager::deleteEditFilesAndBackups({kOther, cookie("E0003000")}, false));
 }
 
 TEST(Network, SeatsHearWhatTheOthersDo) {

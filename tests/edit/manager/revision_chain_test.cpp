@@ -93,6 +93,11 @@ TEST(RevisionChain, NamesOnlyItsOwnFiles) {
     files.folder().write("E0001000.qme.U12", "x");
     EXPECT_TRUE(files.chain().exists()) << "beyond the depth";
     EXPECT_EQ(files.chain().newest(), 0);
+    EXPECT_EQ(files.chain().numbers(), std::vector<int>{12});
+    files.folder().write("E0001000.qme.U2", "x");
+    test::FaultyFileSystem system;
+    EXPECT_TRUE(files.chain().exists());
+    EXPECT_EQ(system.count("list"), 0U) << "one in the depth is found by its name";
 }
 
 TEST(RevisionChain, RandomStepsMatchAModelAlsoWithFailures) {

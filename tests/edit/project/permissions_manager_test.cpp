@@ -80,6 +80,12 @@ TEST_F(PermissionsManagerTest, AnotherSeatsRecordsStay) {
     ASSERT_EQ(test::runInChild([] { return bool(PermissionsManager::setOwner(kOther, "ben", false)); }),
               test::ChildEnd::Succeeded);
     ASSERT_TRUE(PermissionsManager::setReadOnly(kEdit, true));
+    {
+        test::FaultyFileSystem disk;
+        ASSERT_TRUE(PermissionsManager::setOwner(kEdit, "cleo", false));
+        EXPECT_EQ(disk.count("read Permissions.txt"), 0u) << "nobody has replaced the file since";
+        EXPECT_EQ(disk.count("rename"), 1u);
+    }
     PermissionsManager::reload();
     EXPECT_EQ(PermissionsManager::getOwner(kOther), "ben");
     EXPECT_TRUE(PermissionsManager::getReadOnly(kEdit));
