@@ -11,11 +11,13 @@ void edit_manager::limitEditCache(int limit) {
         return;
     }
     for (const auto& [item, entry] : state.cache) {
-        // An edit that is never written and holds changes stays.
-        if (entry->edit.valid() && state.writeUnreferenced(*entry) == ManagerState::Unreferenced::Written &&
-            !entry->edit->isDirty(true)) {
-            evicted = state.removeCacheEntry(entry->item);
-            return;
+        // An edit that is never written and holds changes stays, and one that was opened meanwhile.
+        if (entry->edit.valid() &&
+            state.writeUnreferenced(*entry, true) == ManagerState::Unreferenced::Written) {
+            evicted = state.removeUnreferenced(item);
+            if (evicted != nullptr) {
+                return;
+            }
         }
     }
 }

@@ -85,24 +85,27 @@ bool deleteFiles(const cookie& item, bool force, const std::vector<String>& name
     std::unique_ptr<ManagerState::CachedEdit> dropped;
     const Qx::AccessScope<cookie> turn(state.queue, item);
     const ManagerState::Hold hold(state.lock);
-    const ManagerState::CachedEdit* const entry = state.findCacheEntry(item);
-    const bool isPresent = entry != nullptr && entry->edit.valid();
-    if (!force && isPresent && entry->edit->refCount() > 1) {
+    // Nobody may open it from here on: who asks for it waits for the end of this.
+    dropped = force ? state.removeCacheEntry(item) : state.removeUnreferenced(item);
+    if (dropped == nullptr && state.findCacheEntry(item) != nullptr) {
         herc_printf("edit_manager: %s is in use and was not deleted\n", item.asString().c_str());
         return false;
     }
+    const bool isPresent = dropped != nullptr && dropped->edit.valid();
     const Vector<String> files = editFiles(file, names);
     if ((files.empty() && !isPresent) || !removeFiles(files, file)) {
+        state.putBack(std::move(dropped));
         return false;
     }
     // Another thread may have made a backup since the folder was listed; it has a number in the depth.
+    bool allGone = true;
     for (const RevisionChain::Kind kind : kChains) {
-        if (!chainOf(file, kind).deleteTail(0)) {
-            return false;
-        }
+        allGone = chainOf(file, kind).deleteTail(0) && allGone;
     }
-    dropped = state.removeCacheEntry(item);
-    return true;
+    if (!allGone) {
+        state.putBack(std::move(dropped));
+    }
+    return allGone;
 }
 
 /// Deletes what can be deleted, with one listing and one sync of the folder for all. Returns the items that

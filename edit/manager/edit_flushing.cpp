@@ -128,20 +128,18 @@ void closeUnreferenced(Vector<cookie>& held) {
     ManagerState& state = managerState();
     const ManagerState::Hold hold(state.lock);
     for (auto place = state.cache.begin(); place != state.cache.end();) {
-        ManagerState::CachedEdit& entry = *place->second;
+        const cookie item = place->first;
+        ManagerState::CachedEdit& entry = *place++->second;
+        ManagerState::Unreferenced outcome = ManagerState::Unreferenced::Written;
         if (entry.edit.valid()) {
-            const ManagerState::Unreferenced outcome = state.writeUnreferenced(entry);
-            if (outcome == ManagerState::Unreferenced::InUse) {
-                held.push_back(entry.item);
-                ++place;
-                continue;
-            }
-            if (outcome == ManagerState::Unreferenced::NotWritten) {
-                reportLost(entry.item);
-            }
+            outcome = state.writeUnreferenced(entry);
         }
-        state.removeFromDirtyList(entry.item);
-        place = state.cache.erase(place);
+        // It may have been opened meanwhile.
+        if (outcome == ManagerState::Unreferenced::InUse || state.removeUnreferenced(item) == nullptr) {
+            held.push_back(item);
+        } else if (outcome == ManagerState::Unreferenced::NotWritten) {
+            reportLost(item);
+        }
     }
 }
 

@@ -34,11 +34,12 @@ edit_manager::edit_manager() {
         const ManagerState::Hold hold(state.lock);
         state.newProject = cookie("P0001000");
         state.backupDepth = std::max(config_int("backup_depth", 10), 1);
-        state.cacheLimit.reset();
-        state.lastOpened = invalid_cookie;
+        state.cacheLimit = ManagerState::kLimitNotRead;
         state.cachedAtLastOpen = 0;
         state.projectGeneration = 0;
         state.instance = this;
+        const std::lock_guard holdLookup(state.lookup);
+        state.lastOpened = invalid_cookie;
     }
     EditRegistry::install(this);
     static_cast<void>(check_current_project(eOpenOrCreate));
@@ -104,6 +105,7 @@ void edit_exit() {
         {
             const ManagerState::Hold hold(state.lock);
             numCached = state.cachedAtLastOpen;
+            const std::lock_guard holdLookup(state.lookup);
             last = state.lastOpened;
         }
         LogBoth("edit_manager : Num cached edits  - %d\n", static_cast<int>(numCached));

@@ -34,7 +34,8 @@ struct EditCacheEntry {
 /// `EditRegistry` and hears messages of other seats. Without an instance opening yields a null handle.
 ///
 /// Threads: any thread may call anything. One recursive lock guards the cache, the project edit and every
-/// write of an edit file made here; it is never held while an edit file is read. Openings of one item take
+/// write of an edit file made here; it is never held while an edit file is read, and finding an edit in the
+/// cache takes a lock of its own for a few instructions. Openings of one item take
 /// turns. An edit itself is not locked: who changes it while another thread flushes must hold its section, as
 /// the flush does. Under an edit's section every operation may be called but those that write many edits
 /// (`flush_changes`, `close_all_edits`, undo and redo, which flush, and leaving a project): they take the
@@ -63,8 +64,8 @@ public:
     static void theEditManager(edit_manager* manager);
 
     /// \name Opening and the cache
-    /// A cached edit, or a failure that is remembered, costs one lookup under the lock, no file and no
-    /// memory.
+    /// A cached edit, or a failure that is remembered, costs one lookup, no file and no memory, and waits for
+    /// nobody who writes.
     /// @{
     [[nodiscard]] EditPtr open(const cookie& item, eEditOpenBehaviour behaviour) override;
     /// The same without an instance at hand.

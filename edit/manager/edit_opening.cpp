@@ -245,14 +245,16 @@ EditPtr edit_manager::openEdit(const cookie& item, eEditOpenBehaviour behaviour)
     if (state.projectGeneration.load() != Qx::currentProjectGeneration()) {
         static_cast<void>(check_current_project(behaviour));
     }
+    int limit = state.cacheLimit.load(std::memory_order_relaxed);
+    if (limit != -1) {
+        if (limit == ManagerState::kLimitNotRead) {
+            limit = std::max(config_int("edit_cache_size", -1), -1);
+            state.cacheLimit = limit;
+        }
+        limitEditCache(limit);
+    }
     {
-        const ManagerState::Hold hold(state.lock);
-        if (!state.cacheLimit) {
-            state.cacheLimit = config_int("edit_cache_size", -1);
-        }
-        if (*state.cacheLimit != -1) {
-            limitEditCache(*state.cacheLimit);
-        }
+        const std::lock_guard hold(state.lookup);
         state.lastOpened = item;
         const ManagerState::CachedEdit* const found = state.findCacheEntry(item);
         if (found != nullptr && (found->edit.valid() || behaviour != eOpenNew)) {

@@ -61,27 +61,59 @@ namespace {
 [[maybe_unused]] const ManagerMessages& internedAtLoad = managerMessages();
 } // namespace
 
-ManagerState::CachedEdit& ManagerState::put(const cookie& item, EditPtr edit, String path,
-                                            const Qx::FileInfo& file) {
+void ManagerState::put(const cookie& item, EditPtr edit, String path, const Qx::FileInfo& file) {
     auto entry = std::make_unique<CachedEdit>();
     entry->item = item;
     entry->edit = std::move(edit);
     entry->path = std::move(path);
     entry->file = file;
-    std::unique_ptr<CachedEdit>& place = cache[item];
-    place = std::move(entry);
-    return *place;
+    put(std::move(entry));
+}
+
+void ManagerState::put(std::unique_ptr<CachedEdit> entry) {
+    // Memory is asked for before the lookup is locked, and what was in the place goes after it.
+    Cache made;
+    const cookie item = entry->item;
+    made.emplace(item, std::move(entry));
+    Cache::insert_return_type placed;
+    {
+        const std::lock_guard hold(lookup);
+        placed = cache.insert(made.extract(made.begin()));
+        if (!placed.inserted) {
+            placed.position->second.swap(placed.node.mapped());
+        }
+    }
+}
+
+void ManagerState::putBack(std::unique_ptr<CachedEdit> entry) {
+    if (entry != nullptr) {
+        // Whether it is dirty its holders may be changing; a flush finds out under its section.
+        addToDirtyList(entry->item);
+        put(std::move(entry));
+    }
 }
 
 std::unique_ptr<ManagerState::CachedEdit> ManagerState::removeCacheEntry(const cookie& item) {
-    const auto place = cache.find(item);
-    if (place == cache.end()) {
-        return nullptr;
+    return takeOut(item, false);
+}
+
+std::unique_ptr<ManagerState::CachedEdit> ManagerState::removeUnreferenced(const cookie& item) {
+    return takeOut(item, true);
+}
+
+std::unique_ptr<ManagerState::CachedEdit> ManagerState::takeOut(const cookie& item, bool unreferenced) {
+    Cache::node_type taken;
+    {
+        const std::lock_guard hold(lookup);
+        const auto place = cache.find(item);
+        if (place == cache.end() ||
+            (unreferenced && place->second->edit.valid() && place->second->edit->refCount() > 1)) {
+            return nullptr;
+        }
+        taken = cache.extract(place);
     }
-    std::unique_ptr<CachedEdit> entry = std::move(place->second);
-    cache.erase(place);
     removeFromDirtyList(item);
-    return entry;
+    return std::move(taken.mapped());
 }
 
 void ManagerState::noteFile(CachedEdit& entry) {
@@ -112,7 +144,7 @@ bool ManagerState::write(CachedEdit& entry) {
     return true;
 }
 
-ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry) {
+ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry, bool mustBeClean) {
     if (entry.edit->refCount() > 1) {
         return Unreferenced::InUse;
     }
@@ -120,7 +152,8 @@ ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry) {
     if (!section.owns_lock()) {
         return Unreferenced::InUse;
     }
-    return write(entry) ? Unreferenced::Written : Unreferenced::NotWritten;
+    const bool written = write(entry) && !(mustBeClean && entry.edit->isDirty(true));
+    return written ? Unreferenced::Written : Unreferenced::NotWritten;
 }
 
 void ManagerState::addToDirtyList(const cookie& item) {

@@ -6,6 +6,7 @@
 #include "edit/manager/milestone_ring.h"
 #include "edit/manager/multiple_access_queue.h"
 #include "platform/base/critical_section.h"
+#include "platform/base/spin_lock.h"
 #include "platform/services/files.h"
 
 #include <atomic>
@@ -23,11 +24,15 @@
 ///   2. access to its item on `queue`
 ///   3. the writers' lock of the project, against other processes (`EditManagerLock`)
 ///   4. `lock`, the "edit manager lock": guards everything here but what is said to guard itself
-///   5. `dirtyMutex`, and those of `records`
+///   5. `dirtyMutex`, those of `records`, and `lookup`, under which nothing else is taken
+///
+/// The places of the cache change under both 4 and `lookup`, so either is enough to find one. Opening what is
+/// cached takes `lookup` alone: it waits for nobody who writes a file under 4.
 ///
 /// Who changes an edit holds 1 and may call the manager; so nothing waits for a section while it holds one of
-/// the others. An edit to which the cache has the only reference, seen under 4, is nobody's to change: its
-/// section is free and is tried for. No observer is told under 2 to 5.
+/// the others. An edit to which the cache has the only reference is nobody's to change, so its section is
+/// tried for, and gets it, under 4; that it is nobody's still is seen when it is taken out of the cache. No
+/// observer is told under 2 to 5.
 struct ManagerState {
     /// A cached edit with what is known of its file: another program that replaced the file since is noticed.
     struct CachedEdit : EditCacheEntry {
@@ -39,10 +44,11 @@ struct ManagerState {
     };
 
     criticalSection lock;
-    std::map<cookie, std::unique_ptr<CachedEdit>> cache;
-    cookie lastOpened;
+    SpinLock lookup;
+    using Cache = std::map<cookie, std::unique_ptr<CachedEdit>>;
+    Cache cache;
+    cookie lastOpened; ///< guarded by `lookup`
     size_t cachedAtLastOpen = 0;
-    std::optional<int> cacheLimit; ///< read on the first opening
     cookie newProject;
     cookie project; ///< the one whose edits are in the cache; invalid when there is none
     EditPtr projectEdit;
@@ -64,19 +70,27 @@ struct ManagerState {
     ValServer<bool> mixerBypass;
     std::atomic<edit_manager*> instance{nullptr};
     std::atomic<unsigned> projectGeneration{0}; ///< of the current project that `project` was taken from
+    static constexpr int kLimitNotRead = -2;
+    std::atomic<int> cacheLimit{kLimitNotRead}; ///< read on the first opening; -1 for none
     /// @}
 
     using Hold = std::lock_guard<criticalSection>;
 
-    /// The entry of an item; null if there is none. Under the lock.
+    /// The entry of an item; null if there is none. Under the lock, or `lookup`.
     [[nodiscard]] CachedEdit* findCacheEntry(const cookie& item) {
         const auto place = cache.find(item);
         return place == cache.end() ? nullptr : place->second.get();
     }
     /// Puts an edit (or, with a null one, a remembered failure) in an item's place. Under the lock.
-    CachedEdit& put(const cookie& item, EditPtr edit, String path, const Qx::FileInfo& file);
+    void put(const cookie& item, EditPtr edit, String path, const Qx::FileInfo& file);
     /// Takes an entry out, unwritten, and returns it. Under the lock; the entry is to be destroyed after it.
     [[nodiscard]] std::unique_ptr<CachedEdit> removeCacheEntry(const cookie& item);
+    /// The same if nobody but the cache has the edit; null if somebody has, or there is none.
+    [[nodiscard]] std::unique_ptr<CachedEdit> removeUnreferenced(const cookie& item);
+    /// Puts an entry in its item's place. Under the lock.
+    void put(std::unique_ptr<CachedEdit> entry);
+    /// Puts an entry that was taken out in its place again; null is ignored. Under the lock ever since.
+    void putBack(std::unique_ptr<CachedEdit> entry);
 
     /// Writes an edit if it needs it. What another program put in its file's place since it was read is kept
     /// as an undo backup first. False if it could not be written; the edit is then still dirty. Under the
@@ -84,8 +98,9 @@ struct ManagerState {
     bool write(CachedEdit& entry);
     /// What became of an edit that nobody but the cache should have.
     enum class Unreferenced { Written, NotWritten, InUse };
-    /// Writes such an edit. Under the lock.
-    Unreferenced writeUnreferenced(CachedEdit& entry);
+    /// Writes such an edit. One that is never written and holds changes counts as not written with
+    /// `mustBeClean`. Under the lock.
+    Unreferenced writeUnreferenced(CachedEdit& entry, bool mustBeClean = false);
     /// What the edit's file is at this moment is taken as known.
     static void noteFile(CachedEdit& entry);
 
@@ -95,6 +110,10 @@ struct ManagerState {
     void tell(const NotifyMsgType& type, const cookie& item) {
         notifier.notify(NotifyMsg(type, item.asString()));
     }
+
+private:
+    /// Takes an entry out, or, if asked for, only one that nobody but the cache has.
+    std::unique_ptr<CachedEdit> takeOut(const cookie& item, bool unreferenced);
 };
 
 /// The state of the process.

@@ -1,4 +1,5 @@
 #include "edit/manager/edit_info.h"
+#include "support/faulty_file_system.h"
 #include "tests/edit/manager/managed_project.h"
 
 #include <gtest/gtest.h>
@@ -6,6 +7,7 @@
 #include <atomic>
 #include <chrono>
 #include <cstdlib>
+#include <future>
 #include <random>
 #include <thread>
 
@@ -118,6 +120,60 @@ TEST(Concurrency, ThirtyTwoThreadsLoseNothing) {
         EXPECT_EQ(entry.path().string().find("CORRUPT"), std::string::npos) << entry.path();
     }
     EXPECT_FALSE(project.log.contains("could not be")) << project.log.log();
+}
+
+/// A disk whose sync of a folder ends when it is let go.
+class StuckDisk : public test::FaultyFileSystem {
+public:
+    Qx::FileError syncFolder(const String& path) override {
+        if (!m_wasStuck.exchange(true)) {
+            m_stuck.set_value();
+            m_go.get_future().wait();
+        }
+        return FaultyFileSystem::syncFolder(path);
+    }
+    void waitUntilStuck() { m_stuck.get_future().wait(); }
+    void letGo() { m_go.set_value(); }
+
+private:
+    std::atomic<bool> m_wasStuck{false};
+    std::promise<void> m_stuck;
+    std::promise<void> m_go;
+};
+
+TEST(Concurrency, OpeningWhatIsCachedWaitsForNoWriter) {
+    const ManagedProject project;
+    ManagedProject::save("before", itemAt(0));
+    ManagedProject::save("other", itemAt(1));
+    ManagedProject::change("written", itemAt(0));
+    StuckDisk disk;
+    std::thread writer([] { EXPECT_TRUE(edit_manager::flush_edit(itemAt(0))); });
+    disk.waitUntilStuck();
+    // In a thread of its own: what waited for the writer would wait for ever.
+    std::future<bool> opened = std::async(std::launch::async, [] {
+        const EditPtr written(itemAt(0), eOpenExisting);
+        const EditPtr other(itemAt(1), eOpenExisting);
+        return written.valid() && other.valid();
+    });
+    EXPECT_EQ(opened.wait_for(std::chrono::seconds(60)), std::future_status::ready);
+    disk.letGo();
+    EXPECT_TRUE(opened.get());
+    writer.join();
+    EXPECT_EQ(ManagedProject::nameOf(itemAt(0)), "written");
+}
+
+TEST(Concurrency, WhatIsOpenedWhileItIsBeingDroppedStays) {
+    const ManagedProject project;
+    ManagedProject::save("before", itemAt(0));
+    ManagedProject::change("written", itemAt(0));
+    StuckDisk disk;
+    std::thread dropper([] { edit_manager::limitEditCache(0); });
+    disk.waitUntilStuck();
+    const EditPtr opened(itemAt(0), eOpenExisting);
+    disk.letGo();
+    dropper.join();
+    ASSERT_TRUE(edit_manager::get_present(itemAt(0)));
+    EXPECT_EQ(EditPtr(itemAt(0), eOpenExisting), opened);
 }
 
 } // namespace
