@@ -1,5 +1,7 @@
 #include "edit/model/cel.h"
 
+#include <algorithm>
+#include <array>
 #include <charconv>
 #include <cmath>
 #include <optional>
@@ -19,12 +21,7 @@ constexpr std::string_view kResolution = "CEL_RESOLUTION ";
 constexpr std::string_view kMaterialInfo = "CEL_MATERIAL_INFO ";
 constexpr std::string_view kEvents = "CEL_EVENTS ";
 constexpr size_t kWordsOfAnEvent = 17;
-
-String floatToText(float value) {
-    char text[64];
-    const auto result = std::to_chars(text, text + sizeof text, value);
-    return {text, result.ptr};
-}
+constexpr size_t kUsualLineSize = 128;
 
 template <typename Number>
 bool textToNumber(std::string_view text, Number& value) {
@@ -33,28 +30,41 @@ bool textToNumber(std::string_view text, Number& value) {
     return error == std::errc() && stop == end;
 }
 
-// A cookie's text, or its words for one whose text would not hold all of it.
-String cookieToText(const cookie& item) {
-    if (item.isStorable() || item == invalid_cookie) {
-        return item.asString();
-    }
-    return String::format("%u.%u.%u", item.word(0), item.word(1), item.word(2));
+// Appends the shortest text that reads back as the same number.
+template <typename Number>
+void appendNumber(String& line, Number value) {
+    char text[64];
+    const auto result = std::to_chars(text, text + sizeof text, value);
+    line.append(text, result.ptr);
 }
 
-bool textToCookie(const String& text, cookie& item) {
-    const std::vector<String> words = text.split('.');
-    if (words.size() == 3) {
-        uint32_t word[3];
-        for (size_t i = 0; i < 3; ++i) {
-            if (!textToNumber(words[i], word[i])) {
-                return false;
-            }
-        }
-        item = cookie::fromWords(word[0], word[1], word[2]);
-        return item.word(0) == word[0] && item.word(1) == word[1] && item.word(2) == word[2];
+// Appends a cookie's text, or its words for one whose text would not hold all of it.
+void appendCookie(String& line, const cookie& item) {
+    if (item.isStorable() || item == invalid_cookie) {
+        line += cookie_string(item).c_str();
+        return;
     }
-    item = cookie(std::string_view(text));
-    return item.asString() == text;
+    for (int i = 0; i < 3; ++i) {
+        line += i == 0 ? "" : ".";
+        appendNumber(line, item.word(i));
+    }
+}
+
+bool textToCookie(std::string_view text, cookie& item) {
+    if (text.find('.') == std::string_view::npos) {
+        item = cookie(text);
+        return cookie_string(item).c_str() == text;
+    }
+    uint32_t word[3];
+    for (size_t i = 0; i < 3; ++i) {
+        const size_t dot = text.find('.');
+        if ((dot == std::string_view::npos) != (i == 2) || !textToNumber(text.substr(0, dot), word[i])) {
+            return false;
+        }
+        text.remove_prefix(i == 2 ? 0 : dot + 1);
+    }
+    item = cookie::fromWords(word[0], word[1], word[2]);
+    return item.word(0) == word[0] && item.word(1) == word[1] && item.word(2) == word[2];
 }
 
 // Line ends, control characters and backslashes of a text as escapes that configuration texts use too.
@@ -96,19 +106,50 @@ bool unescapeLine(std::string_view text, String& result) {
 }
 
 String eventLine(const channel_event& event) {
-    String line = event.kind == CE_IN_POINT ? "IN " : "OUT ";
-    line += Qx::doubleToText(event.editTime) + " STRIP " + cookieToText(event.strip) + " " +
-            Qx::doubleToText(event.stripTime) + " SPEED " + Qx::doubleToText(event.velocity) + " LEVEL " +
-            floatToText(event.level) + " FADE " + std::to_string(event.rampQFrames) + " CURVE " +
-            std::to_string(event.rampCurve) + " CODE " + std::to_string(event.code) + " ID " +
-            event.id.asString();
+    String line;
+    line.reserve(kUsualLineSize);
+    line += event.kind == CE_IN_POINT ? "IN " : "OUT ";
+    appendNumber(line, event.editTime);
+    line += " STRIP ";
+    appendCookie(line, event.strip);
+    line += ' ';
+    appendNumber(line, event.stripTime);
+    line += " SPEED ";
+    appendNumber(line, event.velocity);
+    line += " LEVEL ";
+    appendNumber(line, event.level);
+    line += " FADE ";
+    appendNumber(line, event.rampQFrames);
+    line += " CURVE ";
+    appendNumber(line, unsigned{event.rampCurve});
+    line += " CODE ";
+    appendNumber(line, event.code);
+    line += " ID ";
+    line += event.id.asString();
     return line;
 }
 
+// The words of an event's line; false if they are not so many.
+bool wordsOf(std::string_view line, std::array<std::string_view, kWordsOfAnEvent>& words) {
+    size_t count = 0;
+    while (!line.empty()) {
+        const std::string_view word = line.substr(0, line.find(' '));
+        line.remove_prefix(std::min(word.size() + 1, line.size()));
+        if (word.empty()) {
+            continue;
+        }
+        if (count == words.size()) {
+            return false;
+        }
+        words[count++] = word;
+    }
+    return count == words.size();
+}
+
 // What is wrong with the line of an event; null if nothing is.
-const char* readEvent(const String& line, channel_event& event) {
-    const std::vector<String> word = line.split(' ', true);
-    if (word.size() != kWordsOfAnEvent) {
+const char* readEvent(std::string_view line, channel_event& event) {
+    std::array<std::string_view, kWordsOfAnEvent> word;
+    if (!wordsOf(line, word)) {
         return "an event has 17 words";
     }
     static constexpr std::pair<size_t, std::string_view> kNames[] = {
@@ -122,7 +163,7 @@ const char* readEvent(const String& line, channel_event& event) {
         return "an event begins with IN or OUT";
     }
     event.kind = word[0] == "IN" ? CE_IN_POINT : CE_OUT_POINT;
-    event.id = IdStamp(std::string_view(word[16]));
+    event.id = IdStamp(word[16]);
     if (!Qx::textToDouble(word[1], event.editTime) || !Qx::textToDouble(word[4], event.stripTime) ||
         !Qx::textToDouble(word[6], event.velocity) || !textToNumber(word[8], event.level)) {
         return "a number of the event is none";

@@ -39,6 +39,16 @@ struct Generator {
 
 thread_local Generator generator;
 
+/// Three words of eight digits and what separates them.
+constexpr size_t kTextSize = 26;
+
+void writeHex(char* to, uint32_t word) {
+    for (int i = 7; i >= 0; --i) {
+        to[i] = "0123456789abcdef"[word & 0xF];
+        word >>= 4;
+    }
+}
+
 bool readHex(std::string_view digits, uint32_t& word) {
     word = 0;
     for (const char c : digits) {
@@ -60,7 +70,7 @@ bool readHex(std::string_view digits, uint32_t& word) {
 } // namespace
 
 IdStamp::IdStamp(std::string_view text) {
-    if (text.size() != 26 || text[8] != '-' || text[17] != '-') {
+    if (text.size() != kTextSize || text[8] != '-' || text[17] != '-') {
         return;
     }
     std::array<uint32_t, 3> words{};
@@ -77,5 +87,11 @@ IdStamp IdStamp::fresh(IdStampMagic::MagicType type) {
 }
 
 String IdStamp::asString() const {
-    return String::format("%08x-%08x-%08x", m_words[0], m_words[1], m_words[2]);
+    char text[kTextSize];
+    writeHex(text, m_words[0]);
+    text[8] = '-';
+    writeHex(text + 9, m_words[1]);
+    text[17] = '-';
+    writeHex(text + 18, m_words[2]);
+    return {text, kTextSize};
 }

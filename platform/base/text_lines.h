@@ -7,9 +7,12 @@ namespace Qx {
 /// Takes the next line off the front of `rest`, without its end: LF, CRLF or a lone CR. A last line needs no
 /// end.
 inline std::string_view takeLine(std::string_view& rest) {
-    const size_t end = rest.find_first_of("\r\n");
+    size_t end = 0;
+    while (end < rest.size() && rest[end] != '\n' && rest[end] != '\r') {
+        ++end;
+    }
     const std::string_view line = rest.substr(0, end);
-    if (end == std::string_view::npos) {
+    if (end == rest.size()) {
         rest = {};
     } else {
         const bool both = rest[end] == '\r' && end + 1 < rest.size() && rest[end + 1] == '\n';

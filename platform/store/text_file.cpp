@@ -4,8 +4,6 @@
 #include "platform/services/atomic_file.h"
 #include "platform/services/files.h"
 
-#include <limits>
-
 namespace {
 
 constexpr std::string_view kUtf8Mark = "\xEF\xBB\xBF";
@@ -13,22 +11,26 @@ constexpr std::string_view kUtf8Mark = "\xEF\xBB\xBF";
 /// A file of more lines than this is no text of ours; each line takes memory of its own.
 constexpr size_t kMaxLines = size_t{1} << 24;
 
+/// So much text is gathered before it goes to the file.
+constexpr size_t kWriteSize = size_t{1} << 20;
+
 std::string_view withoutMark(std::string_view text) {
     return text.starts_with(kUtf8Mark) ? text.substr(kUtf8Mark.size()) : text;
 }
 
-size_t countLines(std::string_view text, size_t limit) {
-    size_t count = 0;
-    while (!text.empty() && count <= limit) {
-        Qx::takeLine(text);
-        ++count;
+/// Exactly as many as `Qx::takeLine` finds.
+size_t countLines(std::string_view text) {
+    size_t ends = 0;
+    for (size_t i = 0; i + 1 < text.size(); ++i) {
+        ends += text[i] == '\n' || (text[i] == '\r' && text[i + 1] != '\n') ? 1 : 0;
     }
-    return count;
+    // The last line needs no end, and none follows the last end.
+    return text.empty() ? 0 : ends + 1;
 }
 
-std::vector<String> linesOf(std::string_view text) {
+std::vector<String> linesOf(std::string_view text, size_t count) {
     std::vector<String> lines;
-    lines.reserve(countLines(text, std::numeric_limits<unsigned>::max()));
+    lines.reserve(count);
     while (!text.empty()) {
         lines.emplace_back(Qx::takeLine(text));
     }
@@ -42,17 +44,19 @@ Qx::Status TextFile::load(const String& path, uint64_t limit) {
     if (const Qx::FileError error = Qx::readWholeFile(path, text, limit)) {
         return Qx::Status::failure(error.text());
     }
-    if (countLines(withoutMark(text), kMaxLines) > kMaxLines) {
+    const std::string_view content = withoutMark(text);
+    const size_t count = countLines(content);
+    if (count > kMaxLines) {
         return Qx::Status::failure(path + " has more than " + std::to_string(kMaxLines) +
                                    " lines; it is no text file of this program");
     }
-    m_lines = linesOf(withoutMark(text));
+    m_lines = linesOf(content, count);
     m_path = path;
     return {};
 }
 
 void TextFile::setText(std::string_view text) {
-    m_lines = linesOf(withoutMark(text));
+    m_lines = linesOf(withoutMark(text), countLines(withoutMark(text)));
 }
 
 String TextFile::text() const {
@@ -71,13 +75,20 @@ String TextFile::text() const {
 
 Qx::Status TextFile::save(const String& path) const {
     Qx::AtomicFile file(path);
-    if (const Qx::FileError error = file.write(text())) {
-        return Qx::Status::failure(error.text());
+    String piece;
+    Qx::FileError error;
+    for (size_t i = 0; i < m_lines.size() && !error; ++i) {
+        piece += m_lines[i];
+        piece += '\n';
+        if (piece.size() >= kWriteSize || i + 1 == m_lines.size()) {
+            error = file.write(piece);
+            piece.clear();
+        }
     }
-    if (const Qx::FileError error = file.commit()) {
-        return Qx::Status::failure(error.text());
+    if (!error) {
+        error = file.commit();
     }
-    return {};
+    return error ? Qx::Status::failure(error.text()) : Qx::Status();
 }
 
 const String& TextFile::operator[](unsigned line) const {
