@@ -83,6 +83,21 @@ void deepCopy(benchmark::State& state) {
 }
 BENCHMARK(deepCopy)->Name("deep_copy")->Apply(allSizesTimed);
 
+/// The whole price of a copy, which puts off most of its work: copied, and then a change to every channel.
+void copyAndChange(benchmark::State& state) {
+    const EditPtr& edit = builtEdit(state.range(0));
+    for (auto _ : state) {
+        EditPtr copied;
+        state.SetIterationTime(secondsOf([&] {
+            copied = edit->copy();
+            for (size_t channel = 0; channel < FixedSequence::kNumChannels; ++channel) {
+                celOf(copied, channel).get_start_ceh().set_dmod_code(1);
+            }
+        }));
+    }
+}
+BENCHMARK(copyAndChange)->Name("copy_and_change")->Apply(allSizesTimed);
+
 enum class Change { Replace, Insert, Remove };
 
 void apply(Change change, cel& content, const cel& laid, double at) {

@@ -38,6 +38,7 @@ const EditPtr& savedEdit(int64_t n) {
 void save(benchmark::State& state) {
     const EditPtr& edit = savedEdit(state.range(0));
     const WString path = Qx::widen(fileOf(state.range(0)));
+    settleDisk();
     for (auto _ : state) {
         for (size_t channel = 0; channel < FixedSequence::kNumChannels; ++channel) {
             celOf(edit, channel).setChanged(true);
@@ -104,6 +105,7 @@ void legacyExport(benchmark::State& state) {
     const EditPtr& edit = savedEdit(state.range(0));
     const WString path = Qx::widen(workPath(itemOf(state.range(0)).asString() + ".ed2"));
     const UnsyncedFiles unsynced;
+    settleDisk();
     for (auto _ : state) {
         if (failed(state, !edit->writeToLegacyFile(path), edit->lastFileError())) {
             break;

@@ -134,6 +134,7 @@ void write(benchmark::State& state) {
     const Bytes bytes = bytesOf(state.range(0));
     const String path = workPath("limit-write");
     bool done = true;
+    settleDisk();
     for (auto _ : state) {
         done = writeBytes(path, bytes, false) && done;
     }
@@ -145,6 +146,7 @@ void writeDurably(benchmark::State& state) {
     const Bytes bytes = bytesOf(state.range(0));
     const String path = workPath("limit-durable");
     bool done = true;
+    settleDisk();
     for (auto _ : state) {
         done = writeBytes(path + ".new", bytes, true) &&
                ::rename((path + ".new").c_str(), path.c_str()) == 0 && done;
@@ -157,6 +159,7 @@ void readAndWrite(benchmark::State& state) {
     Bytes bytes = bytesOf(state.range(0));
     const String path = workPath("limit-undo");
     bool done = writeBytes(path, bytes, true);
+    settleDisk();
     for (auto _ : state) {
         done = readBytes(path, bytes) && writeBytes(path + ".new", bytes, true) && done;
     }

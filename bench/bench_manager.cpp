@@ -3,35 +3,18 @@
 #include "bench/fixed_sequence.h"
 #include "bench/measuring.h"
 #include "bench/open_items.h"
+#include "bench/projects.h"
 #include "bench/work_folder.h"
 #include "edit/editing/editor.h"
 #include "edit/manager/edit_manager.h"
-#include "platform/services/current_project.h"
-
-#include <filesystem>
 
 using namespace bench;
 
 namespace {
 
-/// The project that these measures work in, current from the first use on.
-void enterProject() {
-    static const bool entered = [] {
-        Qx::CurrentProject project;
-        project.rootFolder = workFolder();
-        project.user = "bench";
-        project.name = "Measures";
-        std::filesystem::create_directories(std::filesystem::path(project.folder().c_str()));
-        Qx::setCurrentProject(project);
-        edit_manager::theEditManager(new edit_manager);
-        return true;
-    }();
-    static_cast<void>(entered);
-}
-
 /// An edit of the sequence that the manager has, its file written and its backups gone.
 EditPtr freshEdit(int64_t n) {
-    enterProject();
+    enterProject(Project::Few);
     const cookie item(Cookie_Type::Edit, static_cast<int>(n), 2);
     edit_manager::delete_edit_file_and_backups(item, true);
     EditPtr edit(item, eOpenOrCreate);
@@ -46,14 +29,13 @@ EditPtr freshEdit(int64_t n) {
 }
 
 void cachedOpen(benchmark::State& state) {
-    static const bool opened = [] {
-        enterProject();
+    // The threads wait for each other before the first round.
+    if (state.thread_index() == 0) {
+        enterProject(Project::Few);
         for (int i = 0; i < kNumOpenEdits; ++i) {
             const EditPtr edit(openItem(i), eOpenOrCreate);
         }
-        return true;
-    }();
-    static_cast<void>(opened);
+    }
     int next = state.thread_index();
     for (auto _ : state) {
         const EditPtr edit(openItem(next++ % kNumOpenEdits), eOpenExisting);
@@ -74,6 +56,7 @@ void touchChannels(const EditPtr& edit) {
 
 void backup(benchmark::State& state) {
     EditPtr edit = freshEdit(state.range(0));
+    settleDisk();
     for (auto _ : state) {
         touchChannels(edit);
         bool done = false;
@@ -89,6 +72,7 @@ BENCHMARK(backup)->Apply(allSizesTimed);
 void step(benchmark::State& state, bool redo) {
     EditPtr edit = freshEdit(state.range(0));
     const cookie item = edit->get_cookie();
+    settleDisk();
     for (auto _ : state) {
         bool done = edit_manager::backup_edit(item);
         touchChannels(edit);
@@ -116,6 +100,7 @@ void applied(benchmark::State& state, edit_operation op, unsigned flags) {
     const size_t rounds = state.range(0) <= 100 ? 10 : 64;
     EditPtr edit;
     size_t k = 0;
+    settleDisk();
     for (auto _ : state) {
         if (k % rounds == 0) {
             edit = freshEdit(state.range(0));

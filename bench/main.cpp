@@ -1,6 +1,8 @@
 // Runs the measures and the limits beside them and writes the figures as JSON. Takes the options of Google
 // Benchmark (--benchmark_filter, --benchmark_repetitions, ...); --benchmark_out names the JSON file.
 
+#include "platform/services/log.h"
+
 #include <benchmark/benchmark.h>
 
 #include <cstdio>
@@ -56,6 +58,8 @@ int main(int argc, char** argv) {
     }
     // An application has threads, and in a process that never had one locks cost next to nothing.
     std::thread([] {}).join();
+    // What the library logs is not what is measured, and would hide the progress.
+    Qx::setLogSink([](std::string_view) {});
     Progress progress;
     benchmark::RunSpecifiedBenchmarks(&progress);
     benchmark::Shutdown();

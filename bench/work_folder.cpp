@@ -37,4 +37,9 @@ String workPath(const String& name) {
     return Qx::joinPath(workFolder(), name);
 }
 
+void settleDisk() {
+    // Where that is refused the figures vary more.
+    static_cast<void>(Qx::machineFileSystem().syncAll(workFolder()).code);
+}
+
 } // namespace bench

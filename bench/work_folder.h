@@ -10,4 +10,7 @@ const String& workFolder();
 /// A path in it.
 String workPath(const String& name);
 
+/// Waits until the disk has written all that it was given, so that no measure pays for the one before.
+void settleDisk();
+
 } // namespace bench

@@ -1,4 +1,4 @@
-# Sourced by ./run and ./test: installs what is missing, configures and builds with a line of progress.
+# Sourced by ./run, ./test and scripts/bench.sh: installs what is missing, configures and builds with a line of progress.
 # Needs Debian 12 or a system with its packages; everything it makes lies under build/.
 
 say() { printf '%s\n' "$*" >&2; }
@@ -33,6 +33,7 @@ need() {
 }
 
 BUILD_PACKAGES="g++ cmake ninja-build libxxhash-dev libsqlite3-dev nlohmann-json3-dev libcli11-dev"
+BENCH_PACKAGES="libbenchmark-dev"
 TEST_PACKAGES="libgtest-dev pkg-config clang-format-14 locales"
 
 # follow LOG LABEL PID: a line of progress for a running build, from the "[3/120]" that ninja writes.
@@ -55,12 +56,13 @@ follow() {
     return 0
 }
 
-# build PRESET LABEL TESTS [TARGET...]: configures, with the tests or without (ON, OFF), and builds. On failure the
-# compiler's words are shown.
+# build PRESET LABEL OPTIONS [TARGET...]: configures with CMake's options (-DNAME=VALUE, one word each) and builds. On
+# failure the compiler's words are shown.
 build() {
-    local preset=$1 label=$2 tests=$3 log status; shift 3
+    local preset=$1 label=$2 options=$3 log status; shift 3
     mkdir -p build; log=build/$preset.log
-    if ! cmake --preset "$preset" -DQUILLMARCH_TESTS="$tests" >"$log" 2>&1; then
+    # shellcheck disable=SC2086
+    if ! cmake --preset "$preset" $options >"$log" 2>&1; then
         tail -n 30 "$log" >&2
         fail "Configuring failed; the lines above and $log say why."
     fi
