@@ -64,8 +64,6 @@ std::unique_ptr<Streamable> cel::clone(BuilderType) const {
 
 void cel::pack(PStream& stream) const {
     const size_t count = m_events.size() / 2 * 2;
-    stream.reserve(count * sizeof(channel_event) + m_name.size() + m_subType.size() + m_materialInfo.size() +
-                   64);
     stream.setString(m_name);
     m_id.pack(stream);
     stream.setString(m_subType);
@@ -73,7 +71,7 @@ void cel::pack(PStream& stream) const {
     stream.setDouble(m_resolution);
     stream.setUnsignedLong(static_cast<uint32_t>(count));
     stream.setAlignment(alignof(channel_event));
-    stream.setRaw(m_events.data(), count * sizeof(channel_event));
+    stream.setLasting(m_events.data(), count * sizeof(channel_event));
 }
 
 void cel::unpack(PStream& stream) {

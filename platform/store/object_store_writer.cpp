@@ -25,7 +25,13 @@ Status StoreWriter::write(std::span<const std::byte> bytes) {
 }
 
 Status StoreWriter::writeBuffer() {
-    Status status = write(m_buffer.bytes());
+    Status status;
+    for (const std::span<const std::byte> piece : m_buffer.pieces()) {
+        status = write(piece);
+        if (!status) {
+            break;
+        }
+    }
     m_buffer.clear();
     m_buffer.setPlace(m_file.size());
     return status;
@@ -33,6 +39,7 @@ Status StoreWriter::writeBuffer() {
 
 Status StoreWriter::begin() {
     // The header is known only at the end; until then its place holds zeros, which no reader takes for one.
+    m_buffer.gather();
     const StoreHeaderBytes none{};
     m_buffer.setRaw(none.data(), none.size());
     return {};
@@ -46,8 +53,11 @@ Status StoreWriter::add(const StoredLabel& label, const Streamable& object, Stor
         return Status::failure("object " + quoted(label.name) + " of " + m_path +
                                " cannot be packed: a text or layer of it is larger than 4 GiB");
     }
-    const uint64_t sum = checksum(std::span(m_buffer.bytes()).subspan(from));
-    return endObject(label, start, sum, place);
+    RunningChecksum sum;
+    for (const std::span<const std::byte> piece : m_buffer.pieces(from)) {
+        sum.add(piece);
+    }
+    return endObject(label, start, sum.value(), place);
 }
 
 Status StoreWriter::add(const StoredLabel& label, std::span<const std::byte> bytes, uint64_t sum,

@@ -8,6 +8,9 @@
 
 namespace {
 
+/// Fewer bytes are copied also where they last.
+constexpr size_t kLeastReferred = size_t{64} << 10;
+
 /// The little-endian bytes of a number, or the number of such bytes.
 template <typename Number>
 Number inFileOrder(Number value) {
@@ -82,8 +85,38 @@ void PStream::setRaw(const void* from, size_t size) {
     }
 }
 
+void PStream::setLasting(const void* from, size_t size) {
+    if (!m_gathers || m_reading || size < kLeastReferred) {
+        setRaw(from, size);
+        return;
+    }
+    m_referred.push_back({m_output.size(), {static_cast<const std::byte*>(from), size}});
+    m_numReferred += size;
+}
+
+std::vector<std::span<const std::byte>> PStream::pieces(size_t from) const {
+    std::vector<std::span<const std::byte>> found;
+    size_t position = 0;
+    const auto add = [&](std::span<const std::byte> piece) {
+        const size_t skipped = std::min(piece.size(), from > position ? from - position : 0);
+        position += piece.size();
+        if (skipped < piece.size()) {
+            found.push_back(piece.subspan(skipped));
+        }
+    };
+    const std::span<const std::byte> own(m_output);
+    size_t done = 0;
+    for (const Referred& other : m_referred) {
+        add(own.subspan(done, other.behind - done));
+        add(other.bytes);
+        done = other.behind;
+    }
+    add(own.subspan(done));
+    return found;
+}
+
 void PStream::setAlignment(unsigned boundary) {
-    const uint64_t next = m_place + m_output.size() + 1;
+    const uint64_t next = m_place + size() + 1;
     const auto filling = static_cast<uint8_t>((boundary - next % boundary) % boundary);
     setCookedChar(filling);
     for (unsigned i = 0; i < filling; ++i) {
@@ -99,6 +132,20 @@ void PStream::reserve(size_t size) {
 }
 
 void PStream::patchUnsignedLong(size_t at, uint32_t value) {
+    // Where the four bytes lie among those that were copied.
+    size_t before = 0;
+    for (const Referred& other : m_referred) {
+        const size_t start = other.behind + before;
+        if (at < start && start - at >= sizeof value) {
+            break;
+        }
+        if (at < start + other.bytes.size()) {
+            fail();
+            return;
+        }
+        before += other.bytes.size();
+    }
+    at -= before;
     if (m_output.size() < sizeof value || at > m_output.size() - sizeof value) {
         fail();
         return;

@@ -42,6 +42,11 @@ public:
     void setString(std::string_view text);
     /// Bytes as they are, without a length.
     void setRaw(const void* from, size_t size);
+    /// The same for bytes that stay where they are, unchanged, until the stream is cleared or gone: a stream
+    /// that gathers refers to them, if they are many, instead of copying them.
+    void setLasting(const void* from, size_t size);
+    /// Makes an empty stream gather. What it holds is then read by `pieces`, not by `bytes`.
+    void gather() { m_gathers = true; }
     /// Tells where the stream's first byte will lie; 0 at first. Only `setAlignment` asks for it.
     void setPlace(uint64_t place) { m_place = place; }
     /// Fills up to a place that is a multiple of `boundary` (2 to 128): a byte that tells how many zero bytes
@@ -54,9 +59,15 @@ public:
     /// nothing written, when they do not lie within what was written.
     void patchUnsignedLong(size_t at, uint32_t value);
     [[nodiscard]] const std::vector<std::byte>& bytes() const { return m_output; }
-    [[nodiscard]] size_t size() const { return m_output.size(); }
+    /// What was written from a position on, piece after piece; good until the next change.
+    [[nodiscard]] std::vector<std::span<const std::byte>> pieces(size_t from = 0) const;
+    [[nodiscard]] size_t size() const { return m_output.size() + m_numReferred; }
     /// Empties the buffer and keeps its memory.
-    void clear() { m_output.clear(); }
+    void clear() {
+        m_output.clear();
+        m_referred.clear();
+        m_numReferred = 0;
+    }
     /// @}
 
     /// \name Reading
@@ -88,7 +99,16 @@ public:
     /// @}
 
 private:
+    /// Bytes that lie elsewhere, and how many of those in `m_output` come before them.
+    struct Referred {
+        size_t behind;
+        std::span<const std::byte> bytes;
+    };
+
     std::vector<std::byte> m_output;
+    std::vector<Referred> m_referred;
+    size_t m_numReferred = 0; ///< bytes
+    bool m_gathers = false;
     std::span<const std::byte> m_input;
     std::shared_ptr<const void> m_keeper;
     uint64_t m_place = 0;

@@ -29,7 +29,8 @@ public:
     virtual void revisionMajor(uint8_t major) = 0;
     virtual void revisionMinor(uint8_t minor) = 0;
 
-    /// Writes the object's own layer.
+    /// Writes the object's own layer. It may refer to bytes of the object (`PStream::setLasting`), which is
+    /// not changed before the stream is done with.
     virtual void pack(PStream& stream) const = 0;
     /// Reads the object's own layer, written with the revision that was set before the call. On a bad stream
     /// the stream is in its error state and the object is as it was made or as it was before, never half

@@ -140,6 +140,49 @@ TEST(PStream, AlignmentFollowsThePlaceAndIsPassedOver) {
     }
 }
 
+TEST(PStream, GatheringGivesTheSameBytesInPieces) {
+    const std::vector<std::byte> large(100'000, std::byte{'L'});
+    const std::vector<std::byte> small(10, std::byte{'s'});
+    const auto fill = [&](PStream& stream) {
+        for (int i = 0; i < 3; ++i) {
+            stream.setUnsignedLong(0);
+            const size_t at = stream.size() - 4;
+            stream.setString("before");
+            stream.setLasting(large.data(), large.size());
+            stream.setLasting(large.data() + 1, large.size() - 1);
+            stream.setLasting(small.data(), small.size());
+            stream.setAlignment(8);
+            stream.patchUnsignedLong(at, 7 + static_cast<uint32_t>(i));
+        }
+    };
+    PStream plain;
+    PStream gathering;
+    gathering.gather();
+    fill(plain);
+    fill(gathering);
+    ASSERT_TRUE(gathering.good());
+    ASSERT_EQ(gathering.size(), plain.size());
+    EXPECT_LT(gathering.bytes().size(), 200U) << "what is large is not copied";
+    for (size_t from = 0; from < plain.size(); from += from < 40 ? 1 : 4999) {
+        std::vector<std::byte> joined;
+        for (const std::span<const std::byte> piece : gathering.pieces(from)) {
+            EXPECT_FALSE(piece.empty());
+            joined.insert(joined.end(), piece.begin(), piece.end());
+        }
+        const std::vector<std::byte> expected(plain.bytes().begin() + static_cast<std::ptrdiff_t>(from),
+                                              plain.bytes().end());
+        ASSERT_EQ(joined, expected) << from;
+    }
+    EXPECT_TRUE(gathering.pieces(gathering.size()).empty());
+    for (const size_t bad : {size_t{12}, size_t{14}, size_t{100'000}, gathering.size() - 2}) {
+        PStream refused = gathering;
+        refused.patchUnsignedLong(bad, 1);
+        EXPECT_FALSE(refused.good()) << "four bytes that are referred to, or are not there: " << bad;
+    }
+    gathering.clear();
+    EXPECT_EQ(gathering.size(), 0U);
+}
+
 TEST(PStream, MisuseIsAnErrorState) {
     PStream reading(bytesOf("abcd"));
     reading.setUnsignedLong(1);
