@@ -105,6 +105,9 @@ private:
         size_t left = m_size / 2;
         while (left > 1) {
             const size_t half = left / 2;
+            // Both places that may be asked next are on their way while this one is compared.
+            __builtin_prefetch(first + half / 2);
+            __builtin_prefetch(first + half + half / 2);
             first += half & (size_t{0} - static_cast<size_t>(before(first[half - 1])));
             left -= half;
         }
