@@ -1,6 +1,7 @@
 #include "edit/model/event_array.h"
 
 #include <algorithm>
+#include <atomic>
 #include <cstring>
 #include <type_traits>
 #include <utility>

@@ -2,7 +2,6 @@
 
 #include "edit/model/channel_event.h"
 
-#include <atomic>
 #include <memory>
 #include <span>
 #include <vector>
