@@ -3,6 +3,7 @@
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/project_session.h"
 #include "tools/qmedit/safe_text.h"
+#include "tools/qmedit/value_text.h"
 
 #include <CLI/CLI.hpp>
 
@@ -17,25 +18,6 @@ struct HeaderOptions {
     String project;
     bool json = false;
 };
-
-String valueText(const configb::Value& value, const Console& console) {
-    return std::visit(
-        [&](const auto& content) -> String {
-            using Type = std::decay_t<decltype(content)>;
-            if constexpr (std::is_same_v<Type, String>) {
-                return console.safe(content);
-            } else if constexpr (std::is_same_v<Type, cookie>) {
-                return content.asString();
-            } else if constexpr (std::is_same_v<Type, double>) {
-                return Qx::doubleToText(content);
-            } else if constexpr (std::is_same_v<Type, bool>) {
-                return content ? "true" : "false";
-            } else {
-                return String(std::to_string(content));
-            }
-        },
-        value);
-}
 
 String headerTable(const configb& header, const std::vector<String>& keys, const Console& console) {
     int width = 0;

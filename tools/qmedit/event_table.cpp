@@ -91,17 +91,7 @@ void Table::addEvent(const ChannelReport& channel, size_t index, const String& l
     m_text += "  " + (sourceTimes ? m_report.sourceTimecode(source, pair.stripIn) : none);
     m_text += "  " + (sourceTimes ? m_report.sourceTimecode(source, pair.stripOut) : none);
     m_text += "  " + safe_text::padded(length, m_lengthColumns, "", true) + "  ";
-    String notes;
-    if (pair.velocity != 1) {
-        notes += " (" + speedText(pair.velocity) + ")";
-    }
-    if (pair.fadeIn > 0) {
-        notes += " (fade in " + shortLength(m_report, pair.fadeIn) + ")";
-    }
-    if (pair.fadeOut > 0) {
-        notes += " (fade out " + shortLength(m_report, pair.fadeOut) + ")";
-    }
-    addName(m_labels[pair.source], notes,
+    addName(m_labels[pair.source], pairNotes(m_report, pair),
             1 + m_numberColumns + 4 * (kTimecodeColumns + 2) + m_lengthColumns + 4, inkOf(source));
 }
 
@@ -170,6 +160,20 @@ void Table::addCues() {
 }
 
 } // namespace
+
+String pairNotes(const EditReport& report, const PairReport& pair) {
+    String notes;
+    if (pair.velocity != 1) {
+        notes += " (" + speedText(pair.velocity) + ")";
+    }
+    if (pair.fadeIn > 0) {
+        notes += " (fade in " + shortLength(report, pair.fadeIn) + ")";
+    }
+    if (pair.fadeOut > 0) {
+        notes += " (fade out " + shortLength(report, pair.fadeOut) + ")";
+    }
+    return notes;
+}
 
 String eventTable(const EditReport& report, const Console& console, const EventTableOptions& options) {
     return Table(report, console, options).text();

@@ -13,3 +13,6 @@ struct EventTableOptions {
 /// where it is not 1, name; a line for each gap; then the markers.
 [[nodiscard]] String eventTable(const EditReport& report, const Console& console,
                                 const EventTableOptions& options);
+
+/// What is special about a pair: " (200%) (fade in 0:12)"; empty for most.
+[[nodiscard]] String pairNotes(const EditReport& report, const PairReport& pair);
