@@ -1,6 +1,7 @@
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
-#include "tools/qmedit/edit_diff.h"
+#include "tools/qmedit/content_diff.h"
+#include "tools/qmedit/edit_diff_json.h"
 #include "tools/qmedit/project_session.h"
 
 #include "edit/persist/edit_salvage.h"
@@ -21,10 +22,13 @@ struct DiffOptions {
 };
 
 /// Reads an edit by its cookie from the project, one of its states as "COOKIE.U1", else a file by its path,
-/// whatever its name: backups, milestones and copies are edit files too.
-Qx::Status readItem(const ProjectSession& session, const String& name, bool hasProject, EditPtr& edit) {
+/// whatever its name: backups, milestones and copies are edit files too. `store` becomes its file, and empty
+/// where that is legacy text.
+Qx::Status readItem(const ProjectSession& session, const String& name, bool hasProject, EditPtr& edit,
+                    String& store) {
     const cookie item(name, true);
     if (item.isStorable() && hasProject) {
+        store = getFilenameForCookie(item);
         return session.readEdit(item, edit);
     }
     String path = name;
@@ -57,6 +61,7 @@ Qx::Status readItem(const ProjectSession& session, const String& name, bool hasP
     const String file = Qx::fileNameOf(path);
     read->set_cookie(cookie(std::string_view(file).substr(0, file.find('.')), true));
     edit = read;
+    store = path;
     return {};
 }
 
@@ -71,18 +76,29 @@ int runDiff(const DiffOptions& options) {
     EditPtr edits[2];
     const String names[2] = {options.before, options.after};
     EditReport reports[2];
+    EditContent contents[2];
     for (size_t i = 0; i < 2; ++i) {
-        if (Qx::Status read = readItem(session, names[i], hasProject, edits[i]); !read) {
+        String store;
+        if (Qx::Status read = readItem(session, names[i], hasProject, edits[i], store); !read) {
             return failed(read);
         }
         reports[i] = reportOf(*edits[i], hasProject ? session.sourceNamer() : SourceNamer());
+        contents[i] = contentOf(*edits[i], reports[i]);
+        const Qx::Status added = store.empty() ? Qx::Status() : addObjects(contents[i], reports[i], store);
+        if (!added) {
+            return failed(added);
+        }
     }
     const EditDiff diff = diffOf(reports[0], reports[1]);
+    const ContentDiff content = contentDiffOf(contents[0], contents[1]);
+    const Console console = Console::forStandardOutput();
     if (options.json) {
-        writeOut(diffJson(diff, reports[0], reports[1]));
+        writeOut(diffJson(diff, content, reports[0], reports[1]));
+    } else if (diff.same() && content.same()) {
+        writeOut("the same\n");
     } else {
-        writeOut(diff.same() ? String("the same\n")
-                             : diffPairsText(diff, reports[0], reports[1], Console::forStandardOutput()));
+        writeOut(diffPairsText(diff, reports[0], reports[1], console) +
+                 contentDiffText(content, reports[0], reports[1], console));
     }
     return kDone;
 }
@@ -102,7 +118,8 @@ void addDiffCommand(CLI::App& app, CommandWork& work) {
     command->add_flag("--json", options->json, "Write JSON");
     command->footer(
         "Example:\n  qmedit diff E0001000 /backup/E0001000.qme\n\n"
-        "Channels are compared by kind and place: V2 with V2. The exit code is 0 whether they differ or "
+        "Channels are compared by kind and place: V2 with V2. Header properties that every save changes are "
+        "left out. The exit code is 0 whether they differ or "
         "not; the output is 'the same' when they do not.");
     command->callback([options, &work] { work = [options] { return runDiff(*options); }; });
 }

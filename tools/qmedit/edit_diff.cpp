@@ -1,17 +1,13 @@
 #include "tools/qmedit/edit_diff.h"
 
 #include "platform/base/num_range.h"
-#include "tools/qmedit/edit_json.h"
-#include "tools/qmedit/track_picture.h"
+#include "tools/qmedit/diff_walk.h"
 
 #include <algorithm>
 #include <cmath>
-#include <map>
-#include <nlohmann/json.hpp>
 
 namespace {
 
-using Json = nlohmann::ordered_json;
 using Qx::kTimeTolerance;
 
 /// The pair that plays at a time that is no cut; null where none does.
@@ -21,12 +17,16 @@ const PairReport* playing(const std::vector<PairReport>& pairs, double time) {
     return next != pairs.begin() && time < std::prev(next)->out ? &*std::prev(next) : nullptr;
 }
 
+bool isSameSource(const SourceReport& a, const SourceReport& b) {
+    return a.strip == b.strip && a.kind == b.kind && a.place == b.place;
+}
+
 bool playsTheSame(const EditReport& before, const PairReport* a, const EditReport& after, const PairReport* b,
                   double time) {
     if (a == nullptr || b == nullptr) {
         return a == b;
     }
-    if (before.sources[a->source].strip != after.sources[b->source].strip) {
+    if (!isSameSource(before.sources[a->source], after.sources[b->source])) {
         return false;
     }
     if (after.sources[b->source].kind == SourceKind::Black) {
@@ -72,43 +72,29 @@ std::vector<ChannelDiff::Span> spansOf(const EditReport& before, const ChannelRe
 
 bool isSamePair(const EditReport& before, const PairReport& a, const EditReport& after, const PairReport& b) {
     const auto near = [](double x, double y) { return std::abs(x - y) <= 1e-5; };
-    return near(a.in, b.in) && near(a.out, b.out) && near(a.stripIn, b.stripIn) && near(a.fadeIn, b.fadeIn) &&
-           near(a.fadeOut, b.fadeOut) && a.velocity == b.velocity &&
-           before.sources[a.source].strip == after.sources[b.source].strip;
+    return near(a.in, b.in) && near(a.out, b.out) && near(a.stripIn, b.stripIn) &&
+           near(a.stripOut, b.stripOut) && near(a.fadeIn, b.fadeIn) && near(a.fadeOut, b.fadeOut) &&
+           a.velocity == b.velocity && a.begin == b.begin && a.end == b.end &&
+           isSameSource(before.sources[a.source], after.sources[b.source]);
 }
 
-/// Fills in which pairs only one of the two channels has, walking both in order of time.
+/// Fills in which pairs only one of the two channels has.
 void comparePairs(const EditReport& before, const ChannelReport* a, const EditReport& after,
                   const ChannelReport* b, ChannelDiff& diff) {
     static const std::vector<PairReport> none;
-    const std::vector<PairReport>& was = a != nullptr ? a->pairs : none;
-    const std::vector<PairReport>& now = b != nullptr ? b->pairs : none;
-    size_t i = 0;
-    size_t j = 0;
-    while (i < was.size() || j < now.size()) {
-        const bool both = i < was.size() && j < now.size();
-        if (both && isSamePair(before, was[i], after, now[j])) {
-            ++i;
-            ++j;
-        } else if (j == now.size() || (both && was[i].in <= now[j].in + kTimeTolerance)) {
-            diff.removed.push_back(was[i++]);
-        } else {
-            diff.added.push_back(now[j++]);
-        }
-    }
+    walkDifference(
+        a != nullptr ? a->pairs : none, b != nullptr ? b->pairs : none,
+        [&](const PairReport& was, const PairReport& now) { return isSamePair(before, was, after, now); },
+        [](const PairReport& pair) { return pair.in; }, diff.removed, diff.added);
 }
 
-/// The channels by their letter and place; levels channels, which have no pairs, are left out.
+/// The channels by their places; levels channels, which have no pairs, are left out.
 std::vector<std::pair<String, const ChannelReport*>> placesOf(const EditReport& report) {
-    std::map<std::string, int> count;
     std::vector<std::pair<String, const ChannelReport*>> places;
     for (const ChannelReport& channel : report.channels) {
-        if (channel.isLevels()) {
-            continue;
+        if (!channel.isLevels()) {
+            places.emplace_back(channel.place, &channel);
         }
-        const bool effects = channel.subtype == Edit_Chan_SubType::ALIAS;
-        const String kind = effects ? String("FX") : String(std::string(1, channel.letter()));
-        places.emplace_back(kind + std::to_string(++count[kind]), &channel);
     }
     return places;
 }
@@ -123,16 +109,19 @@ const ChannelReport* find(const std::vector<std::pair<String, const ChannelRepor
     return nullptr;
 }
 
-bool sameCues(const EditReport& before, const EditReport& after) {
-    return std::equal(before.cues.begin(), before.cues.end(), after.cues.begin(), after.cues.end(),
-                      [](const CueReport& a, const CueReport& b) {
-                          return std::abs(a.time - b.time) <= kTimeTolerance && a.text == b.text &&
-                                 a.code == b.code && a.channel == b.channel;
-                      });
+String placeOf(const EditReport& report, int channel) {
+    const auto index = static_cast<size_t>(channel);
+    return channel >= 0 && index < report.channels.size() ? report.channels[index].place : String();
 }
 
-const char* kindText(ChannelDiff::Kind kind) {
-    return kind == ChannelDiff::Added ? "added" : kind == ChannelDiff::Removed ? "removed" : "changed";
+bool sameCues(const EditReport& before, const EditReport& after) {
+    return std::equal(before.cues.begin(), before.cues.end(), after.cues.begin(), after.cues.end(),
+                      [&](const CueReport& a, const CueReport& b) {
+                          return std::abs(a.time - b.time) <= kTimeTolerance &&
+                                 std::abs(a.length - b.length) <= kTimeTolerance && a.text == b.text &&
+                                 a.code == b.code && a.attached == b.attached &&
+                                 placeOf(before, a.channel) == placeOf(after, b.channel);
+                      });
 }
 
 } // namespace
@@ -145,7 +134,7 @@ EditDiff diffOf(const EditReport& before, const EditReport& after) {
         const ChannelReport* const was = find(old, name);
         ChannelDiff its;
         its.name = name;
-        its.kind = was != nullptr ? ChannelDiff::Changed : ChannelDiff::Added;
+        its.kind = diffKind(was != nullptr, true);
         its.endAfter = endOf(*channel);
         comparePairs(before, was, after, channel, its);
         if (was != nullptr) {
@@ -160,7 +149,7 @@ EditDiff diffOf(const EditReport& before, const EditReport& after) {
         if (find(now, name) == nullptr) {
             ChannelDiff its;
             its.name = name;
-            its.kind = ChannelDiff::Removed;
+            its.kind = DiffKind::Removed;
             its.endBefore = endOf(*channel);
             comparePairs(before, channel, after, nullptr, its);
             diff.channels.push_back(std::move(its));
@@ -170,101 +159,4 @@ EditDiff diffOf(const EditReport& before, const EditReport& after) {
     diff.cuesAfter = after.cues.size();
     diff.cuesDiffer = !sameCues(before, after);
     return diff;
-}
-
-namespace {
-
-String channelText(const ChannelDiff& channel, const EditReport& after) {
-    String text = channel.name + "  " + kindText(channel.kind);
-    for (const ChannelDiff::Span& span : channel.spans) {
-        text += "  " + after.recordTimecode(span.from) + "-" + after.recordTimecode(span.to);
-    }
-    if (channel.kind == ChannelDiff::Added) {
-        text += ", " + after.lengthText(channel.endAfter) + " long";
-    } else if (channel.kind == ChannelDiff::Changed) {
-        if (channel.spans.empty()) {
-            text += "  only in its cuts and fades";
-        }
-        if (std::abs(channel.endAfter - channel.endBefore) > kTimeTolerance) {
-            text += "; " + after.lengthText(channel.endBefore) + " long before, " +
-                    after.lengthText(channel.endAfter) + " after";
-        }
-    }
-    return text + "\n";
-}
-
-String pairText(char sign, const PairReport& pair, const EditReport& report, const Console& console) {
-    const SourceReport& source = report.sources[pair.source];
-    String text =
-        String("  ") + sign + " " + report.recordTimecode(pair.in) + "-" + report.recordTimecode(pair.out);
-    if (source.kind != SourceKind::Black) {
-        text += "  from " + report.sourceTimecode(source, pair.stripIn);
-    }
-    return text + "  " + sourceLabel(source, console) + "\n";
-}
-
-String cuesText(const EditDiff& diff) {
-    return diff.cuesDiffer
-               ? String::format("cues  changed; %zu before, %zu after\n", diff.cuesBefore, diff.cuesAfter)
-               : String();
-}
-
-} // namespace
-
-String diffText(const EditDiff& diff, const EditReport& after) {
-    String text;
-    for (const ChannelDiff& channel : diff.channels) {
-        text += channelText(channel, after);
-    }
-    return text + cuesText(diff);
-}
-
-String diffPairsText(const EditDiff& diff, const EditReport& before, const EditReport& after,
-                     const Console& console) {
-    String text;
-    for (const ChannelDiff& channel : diff.channels) {
-        text += channelText(channel, after);
-        for (const PairReport& pair : channel.removed) {
-            text += pairText('-', pair, before, console);
-        }
-        for (const PairReport& pair : channel.added) {
-            text += pairText('+', pair, after, console);
-        }
-    }
-    return text + cuesText(diff);
-}
-
-String diffJson(const EditDiff& diff, const EditReport& before, const EditReport& after) {
-    Json json;
-    json["same"] = diff.same();
-    json["before"] = before.item.asString();
-    json["after"] = after.item.asString();
-    json["channels"] = Json::array();
-    for (const ChannelDiff& channel : diff.channels) {
-        Json its;
-        its["channel"] = static_cast<const std::string&>(channel.name);
-        its["change"] = kindText(channel.kind);
-        its["end_before"] = before.frames(channel.endBefore);
-        its["end_before_s"] = channel.endBefore;
-        its["end_after"] = after.frames(channel.endAfter);
-        its["end_after_s"] = channel.endAfter;
-        its["spans"] = Json::array();
-        for (const ChannelDiff::Span& span : channel.spans) {
-            its["spans"].push_back({{"from", after.frames(span.from)},
-                                    {"to", after.frames(span.to)},
-                                    {"from_s", span.from},
-                                    {"to_s", span.to}});
-        }
-        its["removed"] = Json::array();
-        for (const PairReport& pair : channel.removed) {
-            its["removed"].push_back(Json::parse(pairJsonText(before, pair)));
-        }
-        its["added"] = Json::array();
-        for (const PairReport& pair : channel.added) {
-            its["added"].push_back(Json::parse(pairJsonText(after, pair)));
-        }
-        json["channels"].push_back(std::move(its));
-    }
-    json["cues"] = {{"changed", diff.cuesDiffer}, {"before", diff.cuesBefore}, {"after", diff.cuesAfter}};
-    return json.dump(1, ' ', false, Json::error_handler_t::replace) + "\n";
 }

@@ -9,15 +9,21 @@ class Console;
 /// What differs between two edits, taken from their reports. Channels correspond by kind and by their place
 /// among those of the kind: V2 is compared with V2, whatever they are called.
 
+enum class DiffKind { Changed, Added, Removed };
+
+/// For a thing that at least one of the two edits has.
+[[nodiscard]] DiffKind diffKind(bool wasThere, bool isThere);
+/// "changed", "added", "removed".
+[[nodiscard]] const char* diffKindText(DiffKind kind);
+
 /// How one channel differs.
 struct ChannelDiff {
-    enum Kind { Changed, Added, Removed };
     struct Span {
         double from = 0;
         double to = 0;
     };
     String name; ///< kind letter and place: "V1"
-    Kind kind = Changed;
+    DiffKind kind = DiffKind::Changed;
     std::vector<Span> spans; ///< edit times at which the two play something else, in order; of a changed one
     std::vector<PairReport> removed; ///< pairs that the first has and the second has not, in order
     std::vector<PairReport> added;   ///< and the other way round
@@ -41,5 +47,5 @@ struct EditDiff {
 /// came.
 [[nodiscard]] String diffPairsText(const EditDiff& diff, const EditReport& before, const EditReport& after,
                                    const Console& console);
-/// One JSON object and a line end, as docs/qmedit.md describes it.
-[[nodiscard]] String diffJson(const EditDiff& diff, const EditReport& before, const EditReport& after);
+/// The shortest decimal text of a level that reads back as the same.
+[[nodiscard]] String levelText(float level);

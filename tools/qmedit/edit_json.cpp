@@ -193,6 +193,10 @@ String pairJsonText(const EditReport& report, const PairReport& pair) {
     return dumped(pairJson(report, pair));
 }
 
+String valueJsonText(const configb::Value& value) {
+    return dumped(headerValue(value));
+}
+
 String headerJson(const configb& header, const std::vector<String>& keys) {
     Json json = Json::object();
     for (const String& key : keys) {

@@ -19,6 +19,9 @@
 /// Header values by key, in order: an object.
 [[nodiscard]] String headerJson(const configb& header, const std::vector<String>& keys);
 
+/// One header value: a JSON value, without a line end.
+[[nodiscard]] String valueJsonText(const configb::Value& value);
+
 /// One pair of an edit: the object that `show --json` gives for it, without a line end.
 [[nodiscard]] String pairJsonText(const EditReport& report, const PairReport& pair);
 

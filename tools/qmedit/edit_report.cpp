@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <map>
 #include <unordered_map>
 
 namespace {
@@ -30,8 +31,10 @@ SourceKind kindOf(const cookie& strip) {
 /// Numbers the sources of one edit in the order in which they are met.
 class SourceTable {
 public:
-    SourceTable(const Edit& edit, EditReport& report, const SourceNamer& namer)
-        : m_edit(edit), m_sources(report.sources), m_namer(namer), m_dropFrame(report.dropFrame) {}
+    SourceTable(const Edit& edit, EditReport& report, const std::vector<String>& places,
+                const SourceNamer& namer)
+        : m_edit(edit), m_sources(report.sources), m_places(places), m_namer(namer),
+          m_dropFrame(report.dropFrame) {}
 
     size_t indexOf(const channel_event& event) {
         // An event whose stamp is a channel's shows that channel.
@@ -43,7 +46,7 @@ public:
         }
         const auto [place, added] = m_strips.try_emplace(event.strip, m_sources.size());
         if (added) {
-            m_sources.push_back({event.strip, kindOf(event.strip), {}, {}, m_dropFrame});
+            m_sources.push_back({event.strip, kindOf(event.strip), {}, {}, m_dropFrame, {}});
             if (m_namer && m_sources.back().kind == SourceKind::Shot) {
                 m_namer(m_sources.back());
             }
@@ -58,14 +61,20 @@ private:
     size_t indexOfAlias(const channel_event& event) {
         const auto [place, added] = m_channels.try_emplace(event.id, m_sources.size());
         if (added) {
-            m_sources.push_back(
-                {event.strip, SourceKind::Alias, m_edit.getChanDisplayName(event.id), {}, m_dropFrame});
+            const int index = m_edit.getIdx(event.id);
+            m_sources.push_back({event.strip,
+                                 SourceKind::Alias,
+                                 m_edit.getChanDisplayName(event.id),
+                                 {},
+                                 m_dropFrame,
+                                 index != NO_CHAN ? m_places[static_cast<size_t>(index)] : String()});
         }
         return place->second;
     }
 
     const Edit& m_edit;
     std::vector<SourceReport>& m_sources;
+    const std::vector<String>& m_places;
     const SourceNamer& m_namer;
     bool m_dropFrame;
     std::unordered_map<cookie, size_t> m_strips;
@@ -83,10 +92,45 @@ void takePairs(const cel& content, double quarterFrame, SourceTable& table, std:
         if (in == nullptr || out == nullptr) {
             return;
         }
-        pairs.push_back({in->editTime, out->editTime, in->stripTime, out->stripTime, in->velocity,
-                         in->rampQFrames * quarterFrame, out->rampQFrames * quarterFrame,
-                         table.indexOf(*in)});
+        pairs.push_back({in->editTime,
+                         out->editTime,
+                         in->stripTime,
+                         out->stripTime,
+                         in->velocity,
+                         in->rampQFrames * quarterFrame,
+                         out->rampQFrames * quarterFrame,
+                         table.indexOf(*in),
+                         {in->level, in->code, in->rampCurve},
+                         {out->level, out->code, out->rampCurve}});
     }
+}
+
+/// `ChannelReport::place` of every channel, by index.
+std::vector<String> placesOf(const Edit& edit) {
+    std::vector<String> places(static_cast<size_t>(edit.getNumChans()));
+    std::map<String, int> count;
+    for (int i = 0; i < edit.getNumChans(); ++i) {
+        const Edit_Chan_Type type = edit.getChanType(i);
+        if (type == NoChan) {
+            continue;
+        }
+        const Edit_Chan_SubType subtype = edit.getChanSubtype(i);
+        const auto letter = static_cast<char>(Edit::edit_chan_letter_from_type(type, subtype));
+        const String kind = subtype == Edit_Chan_SubType::ALIAS ? String("FX") : String(1, letter);
+        String& place = places[static_cast<size_t>(i)];
+        place = kind + std::to_string(++count[kind]);
+        const int levels = type == AudioChan ? edit.getIdx(edit.getAudCel(edit.getId(i)).getLevelsChanID())
+                                             : static_cast<int>(NO_CHAN);
+        if (levels != NO_CHAN) {
+            places[static_cast<size_t>(levels)] = place + " levels";
+        }
+    }
+    for (String& place : places) {
+        if (place.empty()) {
+            place = "levels " + std::to_string(++count["levels"]); // of no audio channel
+        }
+    }
+    return places;
 }
 
 /// The timecode of edit time 0: what an import found, else the elapsed time's origin.
@@ -155,13 +199,15 @@ EditReport reportOf(const Edit& edit, const SourceNamer& namer) {
     report.modified = edit.getModificationTime();
 
     const double quarterFrame = report.rate.frameDuration() / 4;
-    SourceTable table(edit, report, namer);
+    const std::vector<String> places = placesOf(edit);
+    SourceTable table(edit, report, places, namer);
     const int count = edit.getNumChans();
     report.channels.reserve(static_cast<size_t>(count));
     for (int i = 0; i < count; ++i) {
         ChannelReport channel;
         channel.id = edit.getId(i);
         channel.name = edit.getChanDisplayName(channel.id);
+        channel.place = places[static_cast<size_t>(i)];
         channel.type = edit.getChanType(i);
         channel.subtype = edit.getChanSubtype(i);
         if (const cel* content = edit.get_edit_cel_p(i); content != nullptr) {

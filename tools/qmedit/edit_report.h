@@ -27,6 +27,7 @@ struct SourceReport {
     String name;            ///< the item's own name, any bytes; empty for what has none
     String problem;         ///< why the name could not be read; empty if it could
     bool dropFrame = false; ///< its timecode is counted in drop frame
+    String place;           ///< of an alias: `ChannelReport::place` of the channel it shows
 };
 
 /// One pair of a channel.
@@ -39,11 +40,22 @@ struct PairReport {
     double fadeIn = 0;  ///< length of the fade at the in point
     double fadeOut = 0; ///< and at the out point
     size_t source = 0;  ///< index into `EditReport::sources`
+
+    /// What else an event keeps.
+    struct End {
+        float level = 1; ///< gain or opacity
+        int code = 0;
+        int curve = 0; ///< of the fade
+        bool operator==(const End&) const = default;
+    };
+    End begin;
+    End end;
 };
 
 struct ChannelReport {
     IdStamp id;
-    String name; ///< any bytes
+    String name;  ///< any bytes
+    String place; ///< kind and place among those of the kind: "V1", "FX1"; "A2 levels" for A2's levels
     Edit_Chan_Type type = NoChan;
     Edit_Chan_SubType subtype = Edit_Chan_SubType::INVALID;
     std::vector<PairReport> pairs;

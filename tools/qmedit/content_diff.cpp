@@ -1,0 +1,180 @@
+#include "tools/qmedit/content_diff.h"
+
+#include "platform/base/num_range.h"
+#include "tools/qmedit/diff_walk.h"
+
+#include <algorithm>
+#include <bit>
+#include <cmath>
+#include <cstdint>
+#include <map>
+#include <set>
+#include <string_view>
+
+namespace {
+
+using Aud::DynamicLevelControl::Node;
+
+/// The header keys that are no content of their own; docs/qmedit.md lists them.
+bool isBookkeeping(const String& key) {
+    static constexpr const char* kKeys[] = {
+        // Every save or change writes them.
+        "MODIFICATION_TIME", "MODIFICATION_PROGRAM", "MOD_TIME_V3", "MOD_COUNT", "CHANGE_DESCRIPTION",
+        // Which of its states an edit is, and what belongs to those.
+        "MILESTONE", "CLIPBOARD_USED", "IS_BACKUP", "UNDO_COOKIE", "REDO_COOKIE",
+        // Of the channels, which are compared themselves.
+        "NUM_CHANS"};
+    // The same, followed by a number.
+    static constexpr std::string_view kNumbered[] = {"CelKind",           "Levels",     "LevelsName",
+                                                     "SyncLoss",          "SYNC_ERROR", "SOUND_OUTPUT_FLAG",
+                                                     "SOUND_OUTPUT_XFADE"};
+    const size_t number = key.find_last_not_of("0123456789") + 1;
+    return std::any_of(std::begin(kKeys), std::end(kKeys),
+                       [&](const char* name) { return String::equalNoCase(key, name); }) ||
+           (number < key.size() &&
+            std::any_of(std::begin(kNumbered), std::end(kNumbered), [&](std::string_view name) {
+                return String::equalNoCase(key.substr(0, number), name);
+            }));
+}
+
+/// By bits, so that a value which is no number equals itself.
+bool sameValue(const configb::Value& a, const configb::Value& b) {
+    const auto* const x = std::get_if<double>(&a);
+    const auto* const y = std::get_if<double>(&b);
+    return x != nullptr && y != nullptr ? std::bit_cast<uint64_t>(*x) == std::bit_cast<uint64_t>(*y) : a == b;
+}
+
+std::optional<configb::Value> valueOf(const configb& values, const String& key) {
+    const configb::Value* const value = values.find(key);
+    return value != nullptr ? std::optional(*value) : std::nullopt;
+}
+
+std::vector<ValueDiff> valuesDiff(const configb& before, const configb& after) {
+    std::vector<ValueDiff> diffs;
+    for (const String& key : before.keys()) {
+        const configb::Value* const now = after.find(key);
+        if (!isBookkeeping(key) && (now == nullptr || !sameValue(*before.find(key), *now))) {
+            diffs.push_back({key, valueOf(before, key), valueOf(after, key)});
+        }
+    }
+    for (const String& key : after.keys()) {
+        if (!isBookkeeping(key) && !before.contains(key)) {
+            diffs.push_back({key, std::nullopt, valueOf(after, key)});
+        }
+    }
+    return diffs;
+}
+
+/// Hands each thing of the two, with what corresponds to it by `nameOf` or null, to `compare`: those of the
+/// second in their order, then those that only the first has.
+template <class Content, class NameOf, class Compare>
+void forEachPair(const std::vector<Content>& before, const std::vector<Content>& after, const NameOf& nameOf,
+                 const Compare& compare) {
+    std::map<std::string_view, const Content*> old;
+    for (const Content& content : before) {
+        old.emplace(nameOf(content), &content);
+    }
+    for (const Content& content : after) {
+        const auto was = old.find(nameOf(content));
+        compare(was != old.end() ? was->second : nullptr, &content);
+        if (was != old.end()) {
+            old.erase(was);
+        }
+    }
+    for (const Content& content : before) {
+        if (old.count(nameOf(content)) != 0) {
+            compare(&content, nullptr);
+        }
+    }
+}
+
+constexpr auto kPlaceOf = [](const auto& content) { return std::string_view(content.place); };
+
+std::vector<PropertiesDiff> propertiesDiff(const EditContent& before, const EditContent& after) {
+    std::vector<PropertiesDiff> diffs;
+    const configb none;
+    const auto compare = [&](const ChannelContent* was, const ChannelContent* now) {
+        std::vector<ValueDiff> values =
+            valuesDiff(was != nullptr ? was->properties : none, now != nullptr ? now->properties : none);
+        if (!values.empty()) {
+            diffs.push_back({now != nullptr ? now->place : was->place, std::move(values)});
+        }
+    };
+    forEachPair(before.channels, after.channels, kPlaceOf, compare);
+    return diffs;
+}
+
+bool sameNode(const Node& a, const Node& b) {
+    return std::abs(a.time - b.time) <= Qx::kTimeTolerance && a.level == b.level;
+}
+
+std::vector<LevelsDiff> levelsDiff(const EditContent& before, const EditContent& after) {
+    std::vector<LevelsDiff> diffs;
+    const std::vector<Node> none;
+    const auto compare = [&](const LevelsContent* was, const LevelsContent* now) {
+        const std::vector<Node>& old = was != nullptr ? was->nodes : none;
+        const std::vector<Node>& young = now != nullptr ? now->nodes : none;
+        LevelsDiff its{now != nullptr ? now->place : was->place,
+                       diffKind(was != nullptr, now != nullptr),
+                       old.size(),
+                       young.size(),
+                       {},
+                       {}};
+        walkDifference(
+            old, young, sameNode, [](const Node& node) { return node.time; }, its.removed, its.added);
+        if (its.kind != DiffKind::Changed || !its.removed.empty() || !its.added.empty()) {
+            diffs.push_back(std::move(its));
+        }
+    };
+    forEachPair(before.levels, after.levels, kPlaceOf, compare);
+    return diffs;
+}
+
+/// What of `these` is not among `those`; of equal ones each counts.
+std::vector<GroupContent> without(const std::vector<GroupContent>& these,
+                                  const std::vector<GroupContent>& those) {
+    std::multiset<GroupContent> left(those.begin(), those.end());
+    std::vector<GroupContent> rest;
+    for (const GroupContent& group : these) {
+        if (const auto found = left.find(group); found != left.end()) {
+            left.erase(found);
+        } else {
+            rest.push_back(group);
+        }
+    }
+    return rest;
+}
+
+GroupsDiff groupsDiff(const std::vector<GroupContent>& before, const std::vector<GroupContent>& after) {
+    return {before != after, before.size(), after.size(), without(before, after), without(after, before)};
+}
+
+std::vector<ObjectDiff> objectsDiff(const EditContent& before, const EditContent& after) {
+    std::vector<ObjectDiff> diffs;
+    const auto compare = [&](const ObjectContent* was, const ObjectContent* now) {
+        if (was == nullptr || now == nullptr || !(*was == *now)) {
+            diffs.push_back(
+                {now != nullptr ? now->name : was->name, diffKind(was != nullptr, now != nullptr)});
+        }
+    };
+    forEachPair(
+        before.objects, after.objects, [](const ObjectContent& its) { return std::string_view(its.name); },
+        compare);
+    return diffs;
+}
+
+} // namespace
+
+bool ContentDiff::same() const {
+    return header.empty() && properties.empty() && levels.empty() && !groups.changed &&
+           !defaultGroups.changed && objects.empty();
+}
+
+ContentDiff contentDiffOf(const EditContent& before, const EditContent& after) {
+    return {valuesDiff(before.header, after.header),
+            propertiesDiff(before, after),
+            levelsDiff(before, after),
+            groupsDiff(before.groups, after.groups),
+            groupsDiff(before.defaultGroups, after.defaultGroups),
+            objectsDiff(before, after)};
+}

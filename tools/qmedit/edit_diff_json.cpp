@@ -1,0 +1,124 @@
+#include "tools/qmedit/edit_diff_json.h"
+
+#include "tools/qmedit/edit_json.h"
+
+#include <nlohmann/json.hpp>
+
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+/// The level as people write it: 0.7, not the nearest float's digits as a double.
+Json levelJson(float level) {
+    double value = 0;
+    return Qx::textToDouble(levelText(level), value) ? Json(value) : Json();
+}
+
+Json pairJson(const EditReport& report, const PairReport& pair) {
+    Json json = Json::parse(pairJsonText(report, pair));
+    json["level_in"] = levelJson(pair.begin.level);
+    json["level_out"] = levelJson(pair.end.level);
+    json["curve_in"] = pair.begin.curve;
+    json["curve_out"] = pair.end.curve;
+    json["code_in"] = pair.begin.code;
+    json["code_out"] = pair.end.code;
+    return json;
+}
+
+template <class Range, class ToJson>
+Json listJson(const Range& range, const ToJson& toJson) {
+    Json list = Json::array();
+    for (const auto& element : range) {
+        list.push_back(toJson(element));
+    }
+    return list;
+}
+
+Json channelJson(const ChannelDiff& channel, const EditReport& before, const EditReport& after) {
+    Json its;
+    its["channel"] = static_cast<const std::string&>(channel.name);
+    its["change"] = diffKindText(channel.kind);
+    its["end_before"] = before.frames(channel.endBefore);
+    its["end_before_s"] = channel.endBefore;
+    its["end_after"] = after.frames(channel.endAfter);
+    its["end_after_s"] = channel.endAfter;
+    its["spans"] = listJson(channel.spans, [&](const ChannelDiff::Span& span) {
+        return Json{{"from", after.frames(span.from)},
+                    {"to", after.frames(span.to)},
+                    {"from_s", span.from},
+                    {"to_s", span.to}};
+    });
+    its["removed"] =
+        listJson(channel.removed, [&](const PairReport& pair) { return pairJson(before, pair); });
+    its["added"] = listJson(channel.added, [&](const PairReport& pair) { return pairJson(after, pair); });
+    return its;
+}
+
+Json valueJson(const std::optional<configb::Value>& value) {
+    return value ? Json::parse(valueJsonText(*value)) : Json();
+}
+
+Json valuesJson(const std::vector<ValueDiff>& values, const char* key) {
+    return listJson(values, [&](const ValueDiff& value) {
+        Json its;
+        its[key] = value.key;
+        its["change"] = diffKindText(diffKind(value.before.has_value(), value.after.has_value()));
+        its["before"] = valueJson(value.before);
+        its["after"] = valueJson(value.after);
+        return its;
+    });
+}
+
+Json levelsJson(const LevelsDiff& levels, const EditReport& before, const EditReport& after) {
+    const auto nodeJson = [](const EditReport& report) {
+        return [&](const Aud::DynamicLevelControl::Node& node) {
+            return Json{
+                {"time", report.frames(node.time)}, {"time_s", node.time}, {"level", levelJson(node.level)}};
+        };
+    };
+    Json its;
+    its["channel"] = levels.place;
+    its["change"] = diffKindText(levels.kind);
+    its["nodes_before"] = levels.nodesBefore;
+    its["nodes_after"] = levels.nodesAfter;
+    its["removed"] = listJson(levels.removed, nodeJson(before));
+    its["added"] = listJson(levels.added, nodeJson(after));
+    return its;
+}
+
+Json groupsJson(const GroupsDiff& groups) {
+    const auto groupJson = [](const GroupContent& group) {
+        return Json{{"type", group.type},
+                    {"channels", listJson(group.channels, [](const String& place) { return Json(place); })}};
+    };
+    return {{"changed", groups.changed},
+            {"before", groups.before},
+            {"after", groups.after},
+            {"removed", listJson(groups.removed, groupJson)},
+            {"added", listJson(groups.added, groupJson)}};
+}
+
+} // namespace
+
+String diffJson(const EditDiff& diff, const ContentDiff& content, const EditReport& before,
+                const EditReport& after) {
+    Json json;
+    json["same"] = diff.same() && content.same();
+    json["before"] = before.item.asString();
+    json["after"] = after.item.asString();
+    json["channels"] = listJson(
+        diff.channels, [&](const ChannelDiff& channel) { return channelJson(channel, before, after); });
+    json["cues"] = {{"changed", diff.cuesDiffer}, {"before", diff.cuesBefore}, {"after", diff.cuesAfter}};
+    json["levels"] =
+        listJson(content.levels, [&](const LevelsDiff& levels) { return levelsJson(levels, before, after); });
+    json["properties"] = listJson(content.properties, [](const PropertiesDiff& properties) {
+        return Json{{"channel", properties.place}, {"values", valuesJson(properties.values, "property")}};
+    });
+    json["groups"] = groupsJson(content.groups);
+    json["default_groups"] = groupsJson(content.defaultGroups);
+    json["header"] = valuesJson(content.header, "key");
+    json["objects"] = listJson(content.objects, [](const ObjectDiff& object) {
+        return Json{{"object", object.name}, {"change", diffKindText(object.kind)}};
+    });
+    return json.dump(1, ' ', false, Json::error_handler_t::replace) + "\n";
+}

@@ -1,0 +1,8 @@
+#pragma once
+
+#include "tools/qmedit/content_diff.h"
+#include "tools/qmedit/edit_diff.h"
+
+/// One JSON object and a line end, as docs/qmedit.md describes it.
+[[nodiscard]] String diffJson(const EditDiff& diff, const ContentDiff& content, const EditReport& before,
+                              const EditReport& after);
