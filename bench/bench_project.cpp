@@ -55,13 +55,13 @@ BENCHMARK(showOne)->Name("show_one")->UseManualTime();
 
 /// The first opening of an edit after a start.
 void openFirst(benchmark::State& state) {
-    enterProject(Project::Many);
+    const std::vector<cookie>& items = manyItems();
     for (auto _ : state) {
         edit_manager::theEditManager(nullptr);
         bool opened = false;
         state.SetIterationTime(secondsOf([&] {
             edit_manager::theEditManager(new edit_manager);
-            opened = EditPtr(manyItems().back(), eOpenExisting).valid();
+            opened = EditPtr(items.back(), eOpenExisting).valid();
         }));
         if (failed(state, !opened, "the edit did not open")) {
             break;
@@ -72,13 +72,13 @@ BENCHMARK(openFirst)->Name("open_first")->UseManualTime();
 
 /// Edits that are opened for the first time, as a sequence of many shots opens them.
 void openMany(benchmark::State& state) {
-    enterProject(Project::Many);
+    const std::vector<cookie>& items = manyItems();
     for (auto _ : state) {
         edit_manager::close_all_edits();
         size_t opened = 0;
         state.SetIterationTime(secondsOf([&] {
             for (size_t i = 0; i < kNumOpened; ++i) {
-                opened += EditPtr(manyItems()[i], eOpenExisting).valid() ? 1U : 0U;
+                opened += EditPtr(items[i], eOpenExisting).valid() ? 1U : 0U;
             }
         }));
         if (failed(state, opened != kNumOpened, "an edit did not open")) {
@@ -89,11 +89,11 @@ void openMany(benchmark::State& state) {
 BENCHMARK(openMany)->Name("open_many")->UseManualTime();
 
 void flushMany(benchmark::State& state) {
-    enterProject(Project::Many);
+    const std::vector<cookie>& items = manyItems();
     settleDisk();
     for (auto _ : state) {
         for (size_t i = 0; i < kNumFlushed; ++i) {
-            const EditPtr edit(manyItems()[i], eOpenExisting);
+            const EditPtr edit(items[i], eOpenExisting);
             edit->setName(edit->getName() == "one" ? "another" : "one");
         }
         bool flushed = false;
@@ -150,12 +150,12 @@ BENCHMARK(listAndExamine)->Name("limit/list_and_stat");
 
 /// Reads and checksums as many small files.
 void readSmall(benchmark::State& state, size_t count) {
-    enterProject(Project::Many);
+    const std::vector<cookie>& items = manyItems();
     std::vector<std::byte> bytes(size_t{1} << 16);
     bool done = true;
     for (auto _ : state) {
         for (size_t i = 0; i < count; ++i) {
-            const int file = ::open(fileOf(manyItems()[i]).c_str(), O_RDONLY);
+            const int file = ::open(fileOf(items[i]).c_str(), O_RDONLY);
             const ssize_t size = ::read(file, bytes.data(), bytes.size());
             done = ::close(file) == 0 && size > 0 && done;
             benchmark::DoNotOptimize(XXH3_64bits(bytes.data(), size > 0 ? static_cast<size_t>(size) : 0));

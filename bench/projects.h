@@ -15,7 +15,7 @@ enum class Project {
 
 /// Makes a project the current one, with a manager; nothing if it is that already.
 void enterProject(Project project);
-/// The edits of `Project::Many`, one clip each.
+/// The edits of `Project::Many`, one clip each, in which it enters.
 const std::vector<cookie>& manyItems();
 /// The base folder that both lie in, and the folder of one of them.
 String projectsFolder();

@@ -2,6 +2,7 @@
 
 #include "platform/base/ole_splat.h"
 #include "platform/media/frame_rate.h"
+#include "platform/store/streamable_layer.h"
 
 #include <cmath>
 
@@ -14,17 +15,12 @@ using Store = Aud::DynamicLevelControl::Store;
 } // namespace
 
 /// The shared part: what is kept in the object store.
-class AudLevelsCel::Contents : public Streamable {
+class AudLevelsCel::Contents : public StreamableLayer {
 public:
-    const char* layerName() const override { return kLayerName; }
-    const char* shortLayerName() const override { return kLayerName; }
-    uint8_t revisionMajor() const override { return m_major; }
-    uint8_t revisionMinor() const override { return m_minor; }
-    void revisionMajor(uint8_t major) override { m_major = major; }
-    void revisionMinor(uint8_t minor) override { m_minor = minor; }
+    Contents() : StreamableLayer(kForm) {}
     void pack(PStream& stream) const override { nodes.pack(stream); }
     void unpack(PStream& stream) override {
-        if (m_major > kMajor) {
+        if (isFromTheFuture()) {
             stream.fail();
             return;
         }
@@ -40,9 +36,7 @@ public:
 
 private:
     static const bool registered;
-
-    uint8_t m_major = kMajor;
-    uint8_t m_minor = 0;
+    static constexpr Form kForm{kLayerName, kLayerName, kMajor};
 };
 
 const bool AudLevelsCel::Contents::registered = [] {

@@ -4,7 +4,7 @@
 
 using namespace cel_detail;
 
-cel::cel() = default;
+cel::cel() : StreamableLayer(kForm) {}
 cel::~cel() = default;
 cel::cel(const cel& other) = default;
 

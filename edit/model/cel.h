@@ -6,7 +6,7 @@
 #include "edit/model/event_array.h"
 #include "platform/base/status.h"
 #include "platform/media/tv_standard.h"
-#include "platform/store/streamable.h"
+#include "platform/store/streamable_layer.h"
 #include "platform/store/text_file.h"
 
 #include <map>
@@ -34,7 +34,7 @@ enum class SoftCuts {
 /// single fields change one field of one event, so whoever uses them does.
 ///
 /// An operation that answers false or null has changed nothing.
-class QM_API cel : public Streamable {
+class QM_API cel : public StreamableLayer {
 public:
     using IdMap = std::map<IdStamp, IdStamp>;
     using Range = NumRange<double, Ordered>;
@@ -329,12 +329,6 @@ public:
 
     /// \name Forms
     /// @{
-    [[nodiscard]] const char* layerName() const override;
-    [[nodiscard]] const char* shortLayerName() const override;
-    [[nodiscard]] uint8_t revisionMajor() const override { return m_major; }
-    [[nodiscard]] uint8_t revisionMinor() const override { return m_minor; }
-    void revisionMajor(uint8_t major) override { m_major = major; }
-    void revisionMinor(uint8_t minor) override { m_minor = minor; }
     /// Packed: the channel information, the resolution, the number of events, filling (`setAlignment`, 8; not
     /// in revision 1), the events as they lie in memory. A last in point without an out point is not packed.
     void pack(PStream& stream) const override;
@@ -355,6 +349,7 @@ public:
 
 private:
     friend class ce_handle;
+    static const Form kForm;
 
     void changedNow() {
         m_changed = true;
@@ -367,8 +362,6 @@ private:
     String m_subType;
     String m_materialInfo;
     double m_resolution = 0;
-    uint8_t m_major = 2;
-    uint8_t m_minor = 0;
     bool m_changed = false;
     uint64_t m_changeCount = 0;
 };

@@ -14,7 +14,6 @@ static_assert(std::is_trivially_copyable_v<channel_event>);
 namespace {
 
 constexpr const char* kLayerName = "cel";
-constexpr uint8_t kMajor = 2;
 /// Fewer events are copied: what keeps them would cost more than they do.
 constexpr size_t kLeastBorrowed = 1024;
 
@@ -50,13 +49,7 @@ bool takeEvents(std::span<const std::byte> bytes, const std::shared_ptr<const vo
 
 } // namespace
 
-const char* cel::layerName() const {
-    return kLayerName;
-}
-
-const char* cel::shortLayerName() const {
-    return kLayerName;
-}
+constinit const StreamableLayer::Form cel::kForm{kLayerName, kLayerName, 2};
 
 std::unique_ptr<Streamable> cel::clone(BuilderType) const {
     return copy();
@@ -75,7 +68,7 @@ void cel::pack(PStream& stream) const {
 }
 
 void cel::unpack(PStream& stream) {
-    if (m_major > kMajor) {
+    if (isFromTheFuture()) {
         stream.fail();
         return;
     }
@@ -86,7 +79,7 @@ void cel::unpack(PStream& stream) {
     String materialInfo = stream.getString();
     const double resolution = stream.getDouble();
     const size_t count = stream.getCount(sizeof(channel_event));
-    if (m_major > 1) {
+    if (revisionMajor() > 1) {
         stream.passAlignment();
     }
     const std::span<const std::byte> bytes = stream.getSpan(count * sizeof(channel_event));

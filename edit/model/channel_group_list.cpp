@@ -71,9 +71,8 @@ ChannelGroupList::~ChannelGroupList() = default;
 
 ChannelGroupList& ChannelGroupList::operator=(const ChannelGroupList& other) {
     if (this != &other) {
+        StreamableLayer::operator=(other);
         m_groups = other.m_groups;
-        m_major = other.m_major;
-        m_minor = other.m_minor;
         m_changed = true;
     }
     return *this;
@@ -149,12 +148,7 @@ bool ChannelGroupList::replaceMember(const IdStamp& from, const IdStamp& to) {
     return true;
 }
 
-const char* ChannelGroupList::layerName() const {
-    return Id;
-}
-const char* ChannelGroupList::shortLayerName() const {
-    return "groups";
-}
+constinit const StreamableLayer::Form ChannelGroupList::kForm{Id, "groups"};
 
 void ChannelGroupList::pack(PStream& stream) const {
     stream.setUnsignedLong(size());
@@ -165,7 +159,7 @@ void ChannelGroupList::pack(PStream& stream) const {
 }
 
 void ChannelGroupList::unpack(PStream& stream) {
-    if (m_major > kCurrentMajor) {
+    if (isFromTheFuture()) {
         stream.fail();
         return;
     }
@@ -183,8 +177,7 @@ void ChannelGroupList::unpack(PStream& stream) {
         return;
     }
     m_groups = std::move(groups);
-    m_major = kCurrentMajor;
-    m_minor = kCurrentMinor;
+    setCurrentRevision();
     m_changed = false;
 }
 

@@ -1,7 +1,7 @@
 #pragma once
 
 #include "edit/model/channel_group.h"
-#include "platform/store/streamable.h"
+#include "platform/store/streamable_layer.h"
 
 #include <vector>
 
@@ -11,13 +11,13 @@
 /// A group has at least two members and no member twice; what would leave one with fewer removes it. That a
 /// channel is in at most one group is up to `Edit::groupChannels`, through which groups are made.
 /// Not thread-safe.
-class QM_API ChannelGroupList : public Streamable {
+class QM_API ChannelGroupList : public StreamableLayer {
 public:
     /// The names in the object store. They live in files: do not change them.
     static constexpr const char* Id = "ChannelGroupList";
     static constexpr const char* IdForDefaultGrouping = "DefaultChannelGroupList";
 
-    ChannelGroupList() = default;
+    ChannelGroupList() : StreamableLayer(kForm) {}
     ChannelGroupList(const ChannelGroupList&) = default;
     ChannelGroupList& operator=(const ChannelGroupList& other);
     ~ChannelGroupList() override;
@@ -49,12 +49,6 @@ public:
     [[nodiscard]] bool changed() const { return m_changed; }
     void setChanged(bool changed) { m_changed = changed; }
 
-    [[nodiscard]] const char* layerName() const override;
-    [[nodiscard]] const char* shortLayerName() const override;
-    [[nodiscard]] uint8_t revisionMajor() const override { return m_major; }
-    [[nodiscard]] uint8_t revisionMinor() const override { return m_minor; }
-    void revisionMajor(uint8_t major) override { m_major = major; }
-    void revisionMinor(uint8_t minor) override { m_minor = minor; }
     /// Packed: a count, then per group a revision byte (2), the number of members, per member a revision byte
     /// (2) and the stamp, and the type.
     void pack(PStream& stream) const override;
@@ -67,12 +61,9 @@ public:
     /// The same groups in the same order; revisions do not count.
     bool operator==(const ChannelGroupList& other) const { return m_groups == other.m_groups; }
 
-    static constexpr uint8_t kCurrentMajor = 1;
-    static constexpr uint8_t kCurrentMinor = 0;
+    static const Form kForm;
 
 private:
     std::vector<ChannelGroup> m_groups;
-    uint8_t m_major = kCurrentMajor;
-    uint8_t m_minor = kCurrentMinor;
     bool m_changed = false;
 };

@@ -1,7 +1,7 @@
 #pragma once
 
 #include "edit/model/cue_point.h"
-#include "platform/store/streamable.h"
+#include "platform/store/streamable_layer.h"
 
 #include <vector>
 
@@ -14,9 +14,9 @@
 ///
 /// Attached cues point into cels that the list does not own, and so do those of a copy: see `cue_point`.
 /// Channel arguments: a negative channel or `kAnyCueChan` matches every channel. Not thread-safe.
-class QM_API cue_list : public Streamable {
+class QM_API cue_list : public StreamableLayer {
 public:
-    cue_list() = default;
+    cue_list() : StreamableLayer(kForm) {}
     cue_list(const cue_list&) = default;
     cue_list& operator=(const cue_list&) = default;
     ~cue_list() override;
@@ -94,12 +94,6 @@ public:
 
     /// \name Forms
     /// @{
-    [[nodiscard]] const char* layerName() const override;
-    [[nodiscard]] const char* shortLayerName() const override;
-    [[nodiscard]] uint8_t revisionMajor() const override { return m_major; }
-    [[nodiscard]] uint8_t revisionMinor() const override { return m_minor; }
-    void revisionMajor(uint8_t major) override { m_major = major; }
-    void revisionMinor(uint8_t minor) override { m_minor = minor; }
     /// Packed: a count, per cue a revision byte (1) and the cue, and a signed 32-bit 0 as terminator.
     void pack(PStream& stream) const override;
     /// A wrong count, a revision from the future, a time that is not finite or a missing terminator put the
@@ -108,11 +102,8 @@ public:
     [[nodiscard]] std::unique_ptr<Streamable> clone(BuilderType type = BuilderType::Copy) const override;
     /// @}
 
-    static constexpr uint8_t kCurrentMajor = 1;
-    static constexpr uint8_t kCurrentMinor = 0;
+    static const Form kForm;
 
 private:
     std::vector<cue_point> m_cues;
-    uint8_t m_major = kCurrentMajor;
-    uint8_t m_minor = kCurrentMinor;
 };

@@ -53,12 +53,7 @@ void cue_point::unpack(PStream& stream, unsigned revision) {
     }
 }
 
-const char* cue_list::layerName() const {
-    return kLayerName;
-}
-const char* cue_list::shortLayerName() const {
-    return "cues";
-}
+constinit const StreamableLayer::Form cue_list::kForm{kLayerName, "cues"};
 
 void cue_list::pack(PStream& stream) const {
     stream.setUnsignedLong(static_cast<uint32_t>(m_cues.size()));
@@ -70,7 +65,7 @@ void cue_list::pack(PStream& stream) const {
 }
 
 void cue_list::unpack(PStream& stream) {
-    if (m_major > kCurrentMajor) {
+    if (isFromTheFuture()) {
         stream.fail();
         return;
     }
@@ -85,8 +80,7 @@ void cue_list::unpack(PStream& stream) {
         return;
     }
     m_cues = std::move(cues);
-    m_major = kCurrentMajor;
-    m_minor = kCurrentMinor;
+    setCurrentRevision();
 }
 
 std::unique_ptr<Streamable> cue_list::clone(BuilderType) const {

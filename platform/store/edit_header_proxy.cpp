@@ -2,9 +2,7 @@
 
 namespace {
 
-// These names live in files: do not change them.
 constexpr const char* kLayerName = "EditHeaderProxy";
-constexpr const char* kShortLayerName = "H";
 
 [[maybe_unused]] const bool registered = [] {
     Streamable::registerBuilder(
@@ -14,19 +12,13 @@ constexpr const char* kShortLayerName = "H";
 
 } // namespace
 
-EditHeaderProxy::EditHeaderProxy() : m_own("EDIT", "END_EDIT_HEADER") {}
+constinit const StreamableLayer::Form EditHeaderProxy::kForm{kLayerName, "H"};
 
-EditHeaderProxy::EditHeaderProxy(const configb& header) : m_refers(&header) {}
+EditHeaderProxy::EditHeaderProxy() : StreamableLayer(kForm), m_own("EDIT", "END_EDIT_HEADER") {}
+
+EditHeaderProxy::EditHeaderProxy(const configb& header) : StreamableLayer(kForm), m_refers(&header) {}
 
 EditHeaderProxy::~EditHeaderProxy() = default;
-
-const char* EditHeaderProxy::layerName() const {
-    return kLayerName;
-}
-
-const char* EditHeaderProxy::shortLayerName() const {
-    return kShortLayerName;
-}
 
 void EditHeaderProxy::pack(PStream& stream) const {
     header().pack(stream);
@@ -49,7 +41,7 @@ std::unique_ptr<Streamable> EditHeaderProxy::clone(BuilderType type) const {
         copy = std::make_unique<EditHeaderProxy>();
         copy->m_own = header();
     }
-    copy->m_major = m_major;
-    copy->m_minor = m_minor;
+    copy->revisionMajor(revisionMajor());
+    copy->revisionMinor(revisionMinor());
     return copy;
 }

@@ -8,6 +8,7 @@
 
 #include <random>
 #include <set>
+#include <thread>
 
 namespace {
 
@@ -214,6 +215,35 @@ TEST(CelRandom, AgreesWithASecondBySecondModel) {
             return;
         }
     }
+}
+
+TEST(CelRandom, CopiesAreChangedOnThreadsOfTheirOwn) {
+    cel its;
+    for (int i = 0; i < 2000; ++i) {
+        its.appendEventPair(layout::sourceOf('A'), i, i, 1);
+    }
+    const auto work = [](std::unique_ptr<cel> copied, int number) {
+        for (int step = 0; step < 50; ++step) {
+            const auto next = copied->copy();
+            ASSERT_TRUE(copied->remove({static_cast<double>(number), number + 1.0}));
+            copied->get_start_ceh().set_dmod_code(number);
+            ASSERT_EQ(next->numPairs(), 2000 - step);
+            ASSERT_EQ(copied->numPairs(), 1999 - step);
+        }
+    };
+    std::vector<std::thread> threads;
+    for (int number = 1; number <= 4; ++number) {
+        threads.emplace_back(work, its.copy(), number);
+    }
+    for (int i = 0; i < 1000; ++i) {
+        ASSERT_EQ(its.find_ceh(i + 0.5, CE_IN_POINT).index(), 2 * i);
+    }
+    its.get_start_ceh().set_dmod_code(9);
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+    EXPECT_EQ(its.numPairs(), 2000);
+    EXPECT_EQ(its.get_start_ceh().get_dmod_code(), 9);
 }
 
 } // namespace
