@@ -134,9 +134,12 @@ void listAndExamine(benchmark::State& state) {
     enterProject(Project::Many);
     const String folder = folderOf(Project::Many);
     for (auto _ : state) {
-        uint64_t bytes = 0;
         DIR* const listing = ::opendir(folder.c_str());
-        while (const dirent* const entry = listing != nullptr ? ::readdir(listing) : nullptr) {
+        if (failed(state, listing == nullptr, "the folder could not be listed: " + folder)) {
+            break;
+        }
+        uint64_t bytes = 0;
+        while (const dirent* const entry = ::readdir(listing)) {
             struct stat status {};
             if (::fstatat(::dirfd(listing), entry->d_name, &status, AT_SYMLINK_NOFOLLOW) == 0) {
                 bytes += static_cast<uint64_t>(status.st_size);
