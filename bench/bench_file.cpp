@@ -51,17 +51,18 @@ void save(benchmark::State& state) {
         }
     }
 }
-BENCHMARK(save)->Name("save_durable")->Apply(allSizesTimed);
+BENCHMARK(save)->Name("save_durable")->Apply(allSizesOften);
 
 void saveFast(benchmark::State& state) {
     const UnsyncedFiles unsynced;
     save(state);
 }
-BENCHMARK(saveFast)->Name("save_fast")->Apply(allSizesTimed);
+BENCHMARK(saveFast)->Name("save_fast")->Apply(allSizesOften);
 
 void load(benchmark::State& state) {
     static_cast<void>(savedEdit(state.range(0)));
     const WString path = Qx::widen(fileOf(state.range(0)));
+    settleDisk();
     for (auto _ : state) {
         EditPtr edit;
         state.SetIterationTime(secondsOf([&] { edit = EditPtr(new Edit(path, eOpenExisting)); }));
@@ -70,7 +71,7 @@ void load(benchmark::State& state) {
         }
     }
 }
-BENCHMARK(load)->Apply(allSizesTimed);
+BENCHMARK(load)->Apply(allSizesOften);
 
 /// Bytes of memory that the program has in use, as the system counts them in pages. What the heap could give
 /// back is given back first, so that none of it is taken for new.

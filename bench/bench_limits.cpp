@@ -123,6 +123,7 @@ void readCached(benchmark::State& state) {
     Bytes bytes = bytesOf(state.range(0));
     const String path = workPath("limit-read");
     bool done = writeBytes(path, bytes, true);
+    settleDisk();
     for (auto _ : state) {
         done = readBytes(path, bytes) && done;
     }
@@ -140,7 +141,7 @@ void write(benchmark::State& state) {
     }
     failed(state, !done, "the system refused to write " + path);
 }
-BENCHMARK(write)->Name("limit/write")->Apply(allSizes)->UseRealTime();
+BENCHMARK(write)->Name("limit/write")->Apply(allSizes)->UseRealTime()->MinTime(0.2);
 
 void writeDurably(benchmark::State& state) {
     const Bytes bytes = bytesOf(state.range(0));
@@ -153,7 +154,7 @@ void writeDurably(benchmark::State& state) {
     }
     failed(state, !done, "the system refused to write " + path);
 }
-BENCHMARK(writeDurably)->Name("limit/write_fsync_rename")->Apply(allSizes)->UseRealTime();
+BENCHMARK(writeDurably)->Name("limit/write_fsync_rename")->Apply(allSizes)->UseRealTime()->MinTime(0.2);
 
 void readAndWrite(benchmark::State& state) {
     Bytes bytes = bytesOf(state.range(0));
@@ -165,7 +166,7 @@ void readAndWrite(benchmark::State& state) {
     }
     failed(state, !done, "the system refused to write or read " + path);
 }
-BENCHMARK(readAndWrite)->Name("limit/read_write_fsync")->Apply(allSizes)->UseRealTime();
+BENCHMARK(readAndWrite)->Name("limit/read_write_fsync")->Apply(allSizes)->UseRealTime()->MinTime(0.2);
 
 // ---- the lookup of an open edit
 

@@ -66,7 +66,7 @@ void backup(benchmark::State& state) {
         }
     }
 }
-BENCHMARK(backup)->Apply(allSizesTimed);
+BENCHMARK(backup)->Apply(allSizesOften);
 
 /// Undo of a change that is not yet written, or redo of it.
 void step(benchmark::State& state, bool redo) {
@@ -89,7 +89,7 @@ void step(benchmark::State& state, bool redo) {
         }
     }
 }
-BENCHMARK_CAPTURE(step, undo, false)->Name("undo")->Apply(allSizesTimed);
+BENCHMARK_CAPTURE(step, undo, false)->Name("undo")->Apply(allSizesOften);
 BENCHMARK_CAPTURE(step, redo, true)->Name("redo")->Apply(allSizesTimed);
 
 /// An operation on all channels through the editor, marks and plan, clipboard and announcement included.

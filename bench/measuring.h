@@ -25,6 +25,12 @@ inline void allSizesTimed(benchmark::internal::Benchmark* measure) {
     measure->UseManualTime();
 }
 
+/// The same for one whose times vary, with the disk or with the memory that the system has: more rounds.
+inline void allSizesOften(benchmark::internal::Benchmark* measure) {
+    allSizesTimed(measure);
+    measure->MinTime(0.2);
+}
+
 /// Ends a measure whose library call failed, with what it said.
 inline bool failed(benchmark::State& state, bool failure, const std::string& why) {
     if (failure) {
