@@ -73,7 +73,8 @@ public:
 
     /// A deep copy: header, channels with their names, stamps, levels and sync losses, objects, groups, cues
     /// and times. Its cookie is invalid, so that no save of it can meet the original's file; it is clean, not
-    /// temporary, and has no observers. Objects that cannot be read are left out and logged.
+    /// temporary, and has no observers. Objects that cannot be read are left out and logged. The events of a
+    /// channel are copied when either edit changes them; the two may be used on different threads.
     [[nodiscard]] EditPtr copy() const;
 
     /// How many edits were ever constructed in this process.
