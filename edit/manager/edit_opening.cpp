@@ -215,10 +215,9 @@ EditPtr Opening::readBackups() {
 
 EditPtr Opening::succeed(EditPtr edit) {
     ManagerState& state = managerState();
-    if (Qx::fileExists(m_file)) {
-        // The time of last access is a convenience: a file system that refuses it does no harm.
-        static_cast<void>(Qx::fileSystem().touch(m_file, true).code);
-    }
+    // The time of last access is a convenience: a file system that refuses it does no harm, nor does a file
+    // that is not there yet.
+    static_cast<void>(Qx::fileSystem().touch(m_file, true).code);
     if (edit->get_cookie() != m_item) {
         herc_printf("edit_manager::open: funny, handles do not match\n");
     }
@@ -270,13 +269,13 @@ EditPtr edit_manager::open(const cookie& item, eEditOpenBehaviour behaviour) {
 
 bool edit_manager::get_present(const cookie& item) {
     ManagerState& state = managerState();
-    const ManagerState::Hold hold(state.lock);
+    const std::lock_guard hold(state.lookup);
     const ManagerState::CachedEdit* const found = state.findCacheEntry(item);
     return found != nullptr && found->edit.valid();
 }
 
 size_t edit_manager::numCached() {
     ManagerState& state = managerState();
-    const ManagerState::Hold hold(state.lock);
+    const std::lock_guard hold(state.lookup);
     return state.cache.size();
 }
