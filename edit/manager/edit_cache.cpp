@@ -12,9 +12,8 @@ void edit_manager::limitEditCache(int limit) {
     }
     for (const auto& [item, entry] : state.cache) {
         // An edit that is never written and holds changes stays, and one that was opened meanwhile.
-        if (entry->edit.valid() &&
-            state.writeUnreferenced(*entry, true) == ManagerState::Unreferenced::Written) {
-            evicted = state.removeUnreferenced(item);
+        if (entry->edit.valid() && state.writeUnreferenced(*entry) == ManagerState::Unreferenced::Clean) {
+            evicted = state.removeUnreferenced(item, true);
             if (evicted != nullptr) {
                 return;
             }

@@ -86,7 +86,7 @@ bool deleteFiles(const cookie& item, bool force, const std::vector<String>& name
     const Qx::AccessScope<cookie> turn(state.queue, item);
     const ManagerState::Hold hold(state.lock);
     // Nobody may open it from here on: who asks for it waits for the end of this.
-    dropped = force ? state.removeCacheEntry(item) : state.removeUnreferenced(item);
+    dropped = force ? state.removeCacheEntry(item) : state.removeUnreferenced(item, false);
     if (dropped == nullptr && state.findCacheEntry(item) != nullptr) {
         herc_printf("edit_manager: %s is in use and was not deleted\n", item.asString().c_str());
         return false;

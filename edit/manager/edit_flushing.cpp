@@ -122,24 +122,58 @@ void reportLost(const cookie& item) {
             cookie_string(item).c_str());
 }
 
-/// Writes and drops what nobody else holds, and forgets what could not be opened. Appends the items that
-/// others hold.
+/// Writes and drops an edit that nobody else holds, or forgets one that could not be opened. False if
+/// somebody holds it.
+bool closeUnreferenced(const cookie& item, ManagerState::CachedEdit& entry) {
+    ManagerState& state = managerState();
+    while (entry.edit.valid()) {
+        const ManagerState::Unreferenced outcome = state.writeUnreferenced(entry);
+        if (outcome == ManagerState::Unreferenced::InUse) {
+            return false;
+        }
+        const bool clean = outcome == ManagerState::Unreferenced::Clean;
+        if (state.removeUnreferenced(item, clean) != nullptr) {
+            if (outcome == ManagerState::Unreferenced::NotWritten) {
+                reportLost(item);
+            }
+            return true;
+        }
+        // It was opened meanwhile: in use, or changed and let go again.
+    }
+    return state.removeCacheEntry(item) != nullptr;
+}
+
+/// Closes all that nobody else holds. Appends the items that others hold.
 void closeUnreferenced(Vector<cookie>& held) {
     ManagerState& state = managerState();
     const ManagerState::Hold hold(state.lock);
     for (auto place = state.cache.begin(); place != state.cache.end();) {
         const cookie item = place->first;
         ManagerState::CachedEdit& entry = *place++->second;
-        ManagerState::Unreferenced outcome = ManagerState::Unreferenced::Written;
-        if (entry.edit.valid()) {
-            outcome = state.writeUnreferenced(entry);
-        }
-        // It may have been opened meanwhile.
-        if (outcome == ManagerState::Unreferenced::InUse || state.removeUnreferenced(item) == nullptr) {
+        if (!closeUnreferenced(item, entry)) {
             held.push_back(item);
-        } else if (outcome == ManagerState::Unreferenced::NotWritten) {
-            reportLost(item);
         }
+    }
+}
+
+/// Writes an edit that others hold and drops it.
+void closeHeld(const cookie& item, const EditPtr& edit) {
+    ManagerState& state = managerState();
+    std::unique_ptr<ManagerState::CachedEdit> dropped;
+    bool written = true;
+    // Who held it may have changed it and let it go since it was written.
+    constexpr int kTries = 3;
+    for (int tries = 1; dropped == nullptr; ++tries) {
+        written = writeCached(item, edit, nullptr);
+        const ManagerState::Hold hold(state.lock);
+        const ManagerState::CachedEdit* const found = state.findCacheEntry(item);
+        if (found == nullptr || found->edit != edit) {
+            break;
+        }
+        dropped = state.removeHeld(item, written && tries < kTries);
+    }
+    if (!written) {
+        reportLost(item);
     }
 }
 
@@ -165,15 +199,7 @@ void edit_manager::close_all_edits() {
             herc_printf("edit_manager::close_all_edits(): edit %s has %d references\n",
                         cookie_string(item).c_str(), references);
         }
-        if (!writeCached(item, edit, nullptr)) {
-            reportLost(item);
-        }
-        std::unique_ptr<ManagerState::CachedEdit> dropped;
-        const ManagerState::Hold hold(state.lock);
-        if (const ManagerState::CachedEdit* found = state.findCacheEntry(item);
-            found != nullptr && found->edit == edit) {
-            dropped = state.removeCacheEntry(item);
-        }
+        closeHeld(item, edit);
     }
     storeRecords();
 }

@@ -256,7 +256,7 @@ EditPtr edit_manager::openEdit(const cookie& item, eEditOpenBehaviour behaviour)
         const std::lock_guard hold(state.lookup);
         state.lastOpened = item;
         const ManagerState::CachedEdit* const found = state.findCacheEntry(item);
-        if (found != nullptr && (found->edit.valid() || behaviour != eOpenNew)) {
+        if (found != nullptr && !found->leaving && (found->edit.valid() || behaviour != eOpenNew)) {
             return found->edit;
         }
     }

@@ -117,10 +117,16 @@ void RevisionStep::remember() {
 
 bool RevisionStep::moveFiles() {
     const CachedEditScope scope(m_item, m_before);
-    if (scope.entry() == nullptr || !writeWhole(*scope.entry()) || m_from.newest() == 0) {
+    if (scope.entry() == nullptr) {
         return false;
     }
     ManagerState::CachedEdit& entry = *scope.entry();
+    // Who asks for the edit from here on gets the revision that comes: a change to this one would be lost.
+    managerState().setLeaving(entry, true);
+    if (!writeWhole(entry) || m_from.newest() == 0) {
+        managerState().setLeaving(entry, false);
+        return false;
+    }
     Qx::Status status = m_to.push();
     if (status && m_from.restoreNewest() == 0) {
         // The present revision comes back.
@@ -131,6 +137,7 @@ bool RevisionStep::moveFiles() {
         herc_printf("edit_manager: no revision of %s was changed: %s\n", m_item.asString().c_str(),
                     status.reason().c_str());
         managerState().noteFile(entry);
+        managerState().setLeaving(entry, false);
         return false;
     }
     static_cast<void>(m_from.makeDurable());

@@ -93,27 +93,37 @@ void ManagerState::putBack(std::unique_ptr<CachedEdit> entry) {
     }
 }
 
-std::unique_ptr<ManagerState::CachedEdit> ManagerState::removeCacheEntry(const cookie& item) {
-    return takeOut(item, false);
-}
-
-std::unique_ptr<ManagerState::CachedEdit> ManagerState::removeUnreferenced(const cookie& item) {
-    return takeOut(item, true);
-}
-
-std::unique_ptr<ManagerState::CachedEdit> ManagerState::takeOut(const cookie& item, bool unreferenced) {
+template <typename May>
+std::unique_ptr<ManagerState::CachedEdit> ManagerState::takeOut(const cookie& item, May&& may) {
     Cache::node_type taken;
     {
         const std::lock_guard hold(lookup);
         const auto place = cache.find(item);
-        if (place == cache.end() ||
-            (unreferenced && place->second->edit.valid() && place->second->edit->refCount() > 1)) {
+        if (place == cache.end() || !may(place->second->edit)) {
             return nullptr;
         }
         taken = cache.extract(place);
     }
     removeFromDirtyList(item);
     return std::move(taken.mapped());
+}
+
+std::unique_ptr<ManagerState::CachedEdit> ManagerState::removeCacheEntry(const cookie& item) {
+    return takeOut(item, [](const EditPtr&) { return true; });
+}
+
+std::unique_ptr<ManagerState::CachedEdit> ManagerState::removeUnreferenced(const cookie& item,
+                                                                           bool onlyClean) {
+    // Under `lookup` nobody can come to have an edit that nobody has, so it may be looked at.
+    return takeOut(item, [onlyClean](const EditPtr& edit) {
+        return !edit.valid() || (edit->refCount() == 1 && !(onlyClean && edit->isDirty(true)));
+    });
+}
+
+std::unique_ptr<ManagerState::CachedEdit> ManagerState::removeHeld(const cookie& item, bool onlyClean) {
+    return takeOut(item, [onlyClean](const EditPtr& edit) {
+        return !(onlyClean && edit->refCount() == 2 && edit->isDirty(true));
+    });
 }
 
 void ManagerState::noteFile(CachedEdit& entry) {
@@ -144,7 +154,7 @@ bool ManagerState::write(CachedEdit& entry) {
     return true;
 }
 
-ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry, bool mustBeClean) {
+ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry) {
     if (entry.edit->refCount() > 1) {
         return Unreferenced::InUse;
     }
@@ -152,8 +162,10 @@ ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry, bo
     if (!section.owns_lock()) {
         return Unreferenced::InUse;
     }
-    const bool written = write(entry) && !(mustBeClean && entry.edit->isDirty(true));
-    return written ? Unreferenced::Written : Unreferenced::NotWritten;
+    if (!write(entry)) {
+        return Unreferenced::NotWritten;
+    }
+    return entry.edit->isDirty(true) ? Unreferenced::Unwritten : Unreferenced::Clean;
 }
 
 void ManagerState::addToDirtyList(const cookie& item) {

@@ -41,6 +41,9 @@ struct ManagerState {
             file; ///< as this process last read, wrote or moved it; of kind Missing when there is none
         /// What the revision that an undo or redo brought back says of itself, until it is changed.
         std::optional<EditModification> ownDescription;
+        /// It is about to leave the cache: who asks for it waits for what comes in its place. Guarded by
+        /// `lookup`.
+        bool leaving = false;
     };
 
     criticalSection lock;
@@ -85,8 +88,13 @@ struct ManagerState {
     void put(const cookie& item, EditPtr edit, String path, const Qx::FileInfo& file);
     /// Takes an entry out, unwritten, and returns it. Under the lock; the entry is to be destroyed after it.
     [[nodiscard]] std::unique_ptr<CachedEdit> removeCacheEntry(const cookie& item);
-    /// The same if nobody but the cache has the edit; null if somebody has, or there is none.
-    [[nodiscard]] std::unique_ptr<CachedEdit> removeUnreferenced(const cookie& item);
+    /// The same if nobody but the cache has the edit and, with `onlyClean`, it has no changes; null
+    /// otherwise. Who asks for clean ones loses no change of one that was opened, changed and let go since it
+    /// was written.
+    [[nodiscard]] std::unique_ptr<CachedEdit> removeUnreferenced(const cookie& item, bool onlyClean);
+    /// The same for an edit to which the caller has a handle too: with `onlyClean` it stays, and the result
+    /// is null, if nobody else has it and it holds changes.
+    [[nodiscard]] std::unique_ptr<CachedEdit> removeHeld(const cookie& item, bool onlyClean);
     /// Puts an entry in its item's place. Under the lock.
     void put(std::unique_ptr<CachedEdit> entry);
     /// Puts an entry that was taken out in its place again; null is ignored. Under the lock ever since.
@@ -97,10 +105,18 @@ struct ManagerState {
     /// edit's section and the lock.
     bool write(CachedEdit& entry);
     /// What became of an edit that nobody but the cache should have.
-    enum class Unreferenced { Written, NotWritten, InUse };
-    /// Writes such an edit. One that is never written and holds changes counts as not written with
-    /// `mustBeClean`. Under the lock.
-    Unreferenced writeUnreferenced(CachedEdit& entry, bool mustBeClean = false);
+    enum class Unreferenced {
+        Clean,      ///< it holds no changes (any more)
+        Unwritten,  ///< it holds changes and is never written
+        NotWritten, ///< its changes could not be written
+        InUse
+    };
+    /// Writes such an edit. Under the lock.
+    Unreferenced writeUnreferenced(CachedEdit& entry);
+    void setLeaving(CachedEdit& entry, bool leaving) {
+        const std::lock_guard hold(lookup);
+        entry.leaving = leaving;
+    }
     /// What the edit's file is at this moment is taken as known.
     static void noteFile(CachedEdit& entry);
 
@@ -112,8 +128,9 @@ struct ManagerState {
     }
 
 private:
-    /// Takes an entry out, or, if asked for, only one that nobody but the cache has.
-    std::unique_ptr<CachedEdit> takeOut(const cookie& item, bool unreferenced);
+    /// Takes an entry out if `may` allows it, which is asked under `lookup`.
+    template <typename May>
+    std::unique_ptr<CachedEdit> takeOut(const cookie& item, May&& may);
 };
 
 /// The state of the process.
