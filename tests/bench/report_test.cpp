@@ -15,13 +15,13 @@ namespace {
 
 /// A file of entries, each a name, a time in its unit and more members: "find@ 30us; ~find/100 7ns, "c": 4".
 /// "~" makes it a median, "@" stands for "/10000".
-std::string fileOf(const std::string& specification) {
+std::string fileOf(const std::string& shorthand) {
     const std::pair<const char*, const char*> steps[] = {
         {"~([^;]*)", R"($1, "run_type": "aggregate", "aggregate_name": "median")"},
         {"@ ", "/10000 "},
         {" *([^ ;]+) ([^;,]*?)([hmnsu]+)(,[^;]*)?(;|$)",
          R"({"run_name": "$1", "real_time": $2, "time_unit": "$3"$4},)"}};
-    std::string entries = specification;
+    std::string entries = shorthand;
     for (const auto& [form, replacement] : steps) {
         entries = std::regex_replace(entries, std::regex(form), replacement);
     }
@@ -35,10 +35,10 @@ void expectParts(const std::string& text, const std::vector<std::string>& parts)
     }
 }
 
-Results resultsOf(const std::string& specification) {
+Results resultsOf(const std::string& shorthand) {
     Results results;
     std::string why;
-    EXPECT_TRUE(readResults(fileOf(specification), results, why)) << why;
+    EXPECT_TRUE(readResults(fileOf(shorthand), results, why)) << why;
     return results;
 }
 
