@@ -2,6 +2,8 @@
 
 #include "platform/services/files.h"
 
+#include <cstdio>
+#include <cstdlib>
 #include <filesystem>
 
 namespace bench {
@@ -10,9 +12,14 @@ namespace {
 
 class Folder {
 public:
-    Folder() : m_path((std::filesystem::current_path() / "bench-work").string()) {
-        std::filesystem::remove_all(m_path.c_str());
-        std::filesystem::create_directories(m_path.c_str());
+    Folder() {
+        std::string form = (std::filesystem::current_path() / "bench-work.XXXXXX").string();
+        if (::mkdtemp(form.data()) == nullptr) {
+            std::fprintf(stderr, "No folder for the files of the measures can be made in %s\n",
+                         std::filesystem::current_path().c_str());
+            std::exit(1);
+        }
+        m_path = form;
     }
     ~Folder() {
         std::error_code ignored;

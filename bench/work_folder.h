@@ -4,8 +4,8 @@
 
 namespace bench {
 
-/// The folder that all files of the measures go to: "bench-work" in the current folder, on whatever disk that
-/// is. It is emptied when it is first asked for and when the program ends.
+/// The folder that all files of the measures go to: a fresh one in the current folder, on whatever disk that
+/// is. It is removed when the program ends.
 const String& workFolder();
 /// A path in it.
 String workPath(const String& name);

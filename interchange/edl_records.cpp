@@ -1,18 +1,10 @@
 #include "interchange/edl_records.h"
 
+#include "platform/base/text_lines.h"
+
 namespace interchange {
 
 namespace {
-
-// Calls `use` for each line of a text.
-template <typename Use>
-void forEachLine(std::string_view text, Use use) {
-    while (!text.empty()) {
-        const size_t end = text.find('\n');
-        use(text.substr(0, end));
-        text.remove_prefix(end == std::string_view::npos ? text.size() : end + 1);
-    }
-}
 
 void appendLine(String& text, char tag, std::string_view line) {
     text += tag;
@@ -55,14 +47,14 @@ String packEdlRecords(const std::vector<EdlRecord>& records) {
         if (!record.speedDigits.empty()) {
             appendLine(text, 'V', record.speedDigits);
         }
-        forEachLine(record.notes, [&](std::string_view line) { appendLine(text, 'N', line); });
+        Qx::forEachLine(record.notes, [&](std::string_view line) { appendLine(text, 'N', line); });
     }
     return text;
 }
 
 std::vector<EdlRecord> unpackEdlRecords(std::string_view text) {
     std::vector<EdlRecord> records;
-    forEachLine(text, [&](std::string_view line) {
+    Qx::forEachLine(text, [&](std::string_view line) {
         if (line.empty()) {
             return;
         }

@@ -20,6 +20,7 @@ build release "Building the benchmarks" "-DQUILLMARCH_TESTS=OFF -DQUILLMARCH_BEN
 
 programs=$PWD/build/release/bench
 mkdir -p build/bench && cd build/bench || exit 1
+rm -rf bench-work.??????   # of a run that was killed
 say "Measuring; this takes a minute. A quiet machine gives the clearest figures."
 "$programs/quillmarch_bench" --benchmark_out=results.json --benchmark_out_format=json \
     --benchmark_repetitions=$repetitions --benchmark_min_time=$least --benchmark_enable_random_interleaving=true ||

@@ -155,7 +155,7 @@ EditPtr Opening::readExisting() {
         if (moveAside(m_file + ".CORRUPT")) {
             return readBackups();
         }
-        if (isSameFile(m_read, fileInfo(m_file))) {
+        if (Qx::isSameFile(m_read, fileInfo(m_file))) {
             return {};
         }
     }
@@ -169,7 +169,7 @@ bool Opening::moveAside(const String& name) {
         return false;
     }
     Qx::FileError error;
-    if (isSameFile(m_read, fileInfo(m_file))) {
+    if (Qx::isSameFile(m_read, fileInfo(m_file))) {
         error = Qx::fileSystem().rename(m_file, name);
         if (!error) {
             return true;

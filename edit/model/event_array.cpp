@@ -66,6 +66,14 @@ void moveTail(std::vector<Item>& items, size_t last, size_t to, double shift) {
     }
 }
 
+/// The times of the in points among some events.
+void takeStarts(std::span<const channel_event> events, std::vector<double>& starts) {
+    starts.resize((events.size() + 1) / 2);
+    for (size_t pair = 0; pair < starts.size(); ++pair) {
+        starts[pair] = events[2 * pair].editTime;
+    }
+}
+
 } // namespace
 
 /// What arrays share. The events lie in `events`, or, with a lender, in its memory.
@@ -128,12 +136,7 @@ EventArray::Events& EventArray::own(size_t more) {
 }
 
 void EventArray::settle() {
-    const Events& events = m_body->events;
-    std::vector<double>& starts = m_body->starts;
-    starts.resize((events.size() + 1) / 2);
-    for (size_t pair = 0; pair < starts.size(); ++pair) {
-        starts[pair] = events[2 * pair].editTime;
-    }
+    takeStarts(m_body->events, m_body->starts);
     refer();
 }
 
@@ -167,10 +170,7 @@ void EventArray::assign(Events&& events) {
 void EventArray::borrow(std::shared_ptr<const void> lender, std::span<const channel_event> events) {
     auto body = std::make_unique<Body>();
     body->lender = std::move(lender);
-    body->starts.resize((events.size() + 1) / 2);
-    for (size_t pair = 0; pair < body->starts.size(); ++pair) {
-        body->starts[pair] = events[2 * pair].editTime;
-    }
+    takeStarts(events, body->starts);
     adopt(body.release());
     m_events = events.data();
     m_starts = m_body->starts.data();

@@ -38,11 +38,6 @@ bool livesInFile(const cookie& item) {
     return item.isStorable() && item.type() != Cookie_Type::Transient;
 }
 
-/// True if both tell of one and the same unchanged file.
-bool isSameFile(const Qx::FileInfo& a, const Qx::FileInfo& b) {
-    return a.device == b.device && a.inode == b.inode && a.size == b.size && a.modifiedNs == b.modifiedNs;
-}
-
 /// The records of the current project.
 struct Records {
     std::mutex mutex;
@@ -122,7 +117,7 @@ struct Records {
         const std::optional<Qx::FileInfo> before = fileNow();
         bool differs = true;
         // A large project has a record an item: what nobody else replaced is not read again.
-        if (!file || !before || !isSameFile(*file, *before)) {
+        if (!file || !before || !Qx::isSameFile(*file, *before)) {
             fresh = emptyRecords();
             bool found = false;
             if (auto status = readStore(permissionsPath(folder), fresh, found); !status) {

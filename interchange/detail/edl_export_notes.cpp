@@ -3,6 +3,7 @@
 #include "interchange/detail/edl_line.h"
 #include "interchange/detail/edl_note.h"
 #include "interchange/edl_writer.h"
+#include "platform/base/text_lines.h"
 
 #include <algorithm>
 #include <cmath>
@@ -13,15 +14,6 @@ namespace {
 
 // An import cuts names that are longer than 1000 bytes.
 constexpr size_t kLongName = 990;
-
-template <typename Use>
-void forEachLine(std::string_view text, Use use) {
-    while (!text.empty()) {
-        const size_t end = text.find('\n');
-        use(text.substr(0, end));
-        text.remove_prefix(end == std::string_view::npos ? text.size() : end + 1);
-    }
-}
 
 void append(String& notes, std::string_view line) {
     if (!line.empty()) {
@@ -128,7 +120,7 @@ String statedNotes(const std::vector<ExportLine>& lines, Qx::FrameRate rate) {
 
 // The notes in two parts: those that stand above the event, and those on things that its lines do not say.
 void sortNotes(const String& notes, String& above, String& others) {
-    forEachLine(notes, [&](std::string_view line) {
+    Qx::forEachLine(notes, [&](std::string_view line) {
         const NoteKind kind = parseNote(line).kind;
         if (kind == NoteKind::Split) {
             append(above, line);
@@ -154,7 +146,7 @@ bool isWritableNote(std::string_view line) {
 
 String writableNotes(std::string_view lines) {
     String notes;
-    forEachLine(lines, [&](std::string_view line) {
+    Qx::forEachLine(lines, [&](std::string_view line) {
         if (isWritableNote(line)) {
             append(notes, line);
         }

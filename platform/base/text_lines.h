@@ -21,4 +21,14 @@ inline std::string_view takeLine(std::string_view& rest) {
     return line;
 }
 
+/// Calls `use` for each line of a text made here, whose only line end is LF.
+template <typename Use>
+void forEachLine(std::string_view text, Use use) {
+    while (!text.empty()) {
+        const size_t end = text.find('\n');
+        use(text.substr(0, end));
+        text.remove_prefix(end == std::string_view::npos ? text.size() : end + 1);
+    }
+}
+
 } // namespace Qx

@@ -177,6 +177,11 @@ String extensionOf(std::string_view name) {
     return String(name.substr(extensionStart(name)));
 }
 
+bool isSameFile(const FileInfo& a, const FileInfo& b) {
+    return a.kind == b.kind && a.device == b.device && a.inode == b.inode && a.size == b.size &&
+           a.modifiedNs == b.modifiedNs;
+}
+
 bool fileExists(const String& path) {
     FileInfo info;
     const auto error = retryInterrupted([&] { return fileSystem().info(path, info); });

@@ -123,6 +123,9 @@ QM_API String fileNameOf(std::string_view path);
 QM_API String withoutExtension(std::string_view name);
 QM_API String extensionOf(std::string_view name);
 
+/// True if both tell of one and the same file, unchanged, or of none.
+QM_API bool isSameFile(const FileInfo& a, const FileInfo& b);
+
 /// True if the name stands for a regular file.
 QM_API bool fileExists(const String& path);
 

@@ -23,13 +23,14 @@ std::shared_ptr<PageMemory> PageMemory::make(size_t size) {
     if (size == 0 || size > SIZE_MAX - kBigPage) {
         return nullptr;
     }
+    // Made first, so that nothing is mapped that nobody would unmap.
+    std::shared_ptr<PageMemory> memory(new PageMemory);
     const size_t mappedSize = size + kBigPage;
     void* const mapped =
         ::mmap(nullptr, mappedSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
     if (mapped == MAP_FAILED) {
         return nullptr;
     }
-    std::shared_ptr<PageMemory> memory(new PageMemory);
     memory->m_mapped = static_cast<std::byte*>(mapped);
     memory->m_mappedSize = mappedSize;
     memory->m_begin = alignedUp(memory->m_mapped, kBigPage);
@@ -44,7 +45,9 @@ std::shared_ptr<PageMemory> PageMemory::make(size_t size) {
 }
 
 PageMemory::~PageMemory() {
-    ::munmap(m_mapped, m_mappedSize);
+    if (m_mapped != nullptr) {
+        ::munmap(m_mapped, m_mappedSize);
+    }
 }
 
 std::shared_ptr<const void> PageMemory::lend(std::span<const std::byte> part) {

@@ -362,9 +362,7 @@ bool StoreSource::open(const StoreIdentity& identity) {
         identity.known &&
         !retryInterrupted([&] { return fileSystem().open(identity.path, OpenMode::Read, file); }) &&
         !retryInterrupted([&] { return file->info(info); }) && !readFully(*file, header, got);
-    const FileInfo& was = identity.info;
-    const bool unmoved = !identity.infoKnown || (info.device == was.device && info.inode == was.inode &&
-                                                 info.size == was.size && info.modifiedNs == was.modifiedNs);
+    const bool unmoved = !identity.infoKnown || isSameFile(info, identity.info);
     const bool same = opened && unmoved && got == header.size() && header == identity.header &&
                       info.size == decodeStoreHeader(header).fileSize;
     if (same) {

@@ -10,7 +10,7 @@ namespace {
 /// Keeps the file of another program as undo backup 1 if it is not the one this process knows.
 bool keepForeignFile(const ManagerState::CachedEdit& entry, int depth) {
     const Qx::FileInfo present = fileInfo(entry.path);
-    if (present.kind != Qx::FileKind::Regular || isSameFile(entry.file, present)) {
+    if (present.kind != Qx::FileKind::Regular || Qx::isSameFile(entry.file, present)) {
         return true;
     }
     const Qx::Status kept = RevisionChain(entry.path, RevisionChain::Undo, depth).push();
@@ -44,11 +44,6 @@ Qx::FileInfo fileInfo(const String& path) {
         return {};
     }
     return info;
-}
-
-bool isSameFile(const Qx::FileInfo& a, const Qx::FileInfo& b) {
-    return a.kind == b.kind && a.device == b.device && a.inode == b.inode && a.size == b.size &&
-           a.modifiedNs == b.modifiedNs;
 }
 
 const ManagerMessages& managerMessages() {

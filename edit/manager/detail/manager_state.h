@@ -159,8 +159,6 @@ private:
 [[nodiscard]] bool isNoItem(const cookie& item);
 /// Information about a file; of kind Missing also when the system refuses it.
 [[nodiscard]] Qx::FileInfo fileInfo(const String& path);
-/// True if both tell of one and the same unchanged file, or of none.
-[[nodiscard]] bool isSameFile(const Qx::FileInfo& a, const Qx::FileInfo& b);
 /// Takes the writers' lock of the project that a file belongs to, waiting for other processes; a failure is
 /// logged.
 [[nodiscard]] bool takeWritersLock(EditManagerLock& writers);
