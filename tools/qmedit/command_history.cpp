@@ -1,13 +1,12 @@
+#include "tools/qmedit/column_table.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/managed_edit.h"
 #include "tools/qmedit/revisions.h"
-#include "tools/qmedit/safe_text.h"
 
 #include <CLI/CLI.hpp>
 
-#include <algorithm>
 #include <memory>
 
 namespace {
@@ -47,33 +46,13 @@ int runHistory(const HistoryArguments& arguments) {
 
 String revisionTable(const std::vector<Revision>& revisions, const Console& console) {
     constexpr bool rightAligned[] = {false, false, true, true, false};
-    std::vector<std::vector<String>> rows = {{"which", "changed", "bytes", "count", "last change"}};
+    ColumnTable table({"which", "changed", "bytes", "count", "last change"}, rightAligned);
     for (const Revision& revision : revisions) {
-        rows.push_back(cells(revision, console));
+        table.add(cells(revision, console), !revision.isSound()                 ? Console::Ink::Warning
+                                            : revision.kind == Revision::Itself ? Console::Ink::Bold
+                                                                                : Console::Ink::None);
     }
-    std::vector<int> widths(rows.front().size());
-    for (const auto& row : rows) {
-        for (size_t i = 0; i + 1 < row.size(); ++i) {
-            widths[i] = std::max(widths[i], safe_text::columns(row[i]));
-        }
-    }
-    String out;
-    for (size_t r = 0; r < rows.size(); ++r) {
-        String line;
-        for (size_t i = 0; i + 1 < widths.size(); ++i) {
-            line += safe_text::padded(rows[r][i], widths[i], "", rightAligned[i]) + "  ";
-        }
-        line += rows[r].back();
-        const bool damaged = r > 0 && !revisions[r - 1].isSound();
-        const bool itself = r > 0 && revisions[r - 1].kind == Revision::Itself;
-        out += console.inked(r == 0    ? Console::Ink::Dim
-                             : damaged ? Console::Ink::Warning
-                             : itself  ? Console::Ink::Bold
-                                       : Console::Ink::None,
-                             line) +
-               "\n";
-    }
-    return out;
+    return table.text(console, false);
 }
 
 void addHistoryCommand(CLI::App& app, CommandWork& work) {

@@ -1,9 +1,9 @@
+#include "tools/qmedit/column_table.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/project_session.h"
 #include "tools/qmedit/revisions.h"
-#include "tools/qmedit/safe_text.h"
 
 #include "platform/media/timecode.h"
 #include "platform/services/files.h"
@@ -39,39 +39,12 @@ std::vector<String> cells(const ListedEdit& edit, const Console& console) {
 }
 
 String listTable(const std::vector<ListedEdit>& edits, const Console& console) {
-    const std::vector<String> heading = {"cookie", "type", "rate", "duration", "chans", "modified", "name"};
     constexpr bool rightAligned[] = {false, false, true, true, true, false, false};
-    std::vector<std::vector<String>> rows = {heading};
+    ColumnTable table({"cookie", "type", "rate", "duration", "chans", "modified", "name"}, rightAligned);
     for (const ListedEdit& edit : edits) {
-        rows.push_back(cells(edit, console));
+        table.add(cells(edit, console), edit.damage.empty() ? Console::Ink::None : Console::Ink::Warning);
     }
-    std::vector<int> widths(heading.size());
-    for (const auto& row : rows) {
-        for (size_t i = 0; i + 1 < row.size(); ++i) {
-            widths[i] = std::max(widths[i], safe_text::columns(row[i]));
-        }
-    }
-
-    String out;
-    for (size_t r = 0; r < rows.size(); ++r) {
-        String line;
-        int used = 0;
-        for (size_t i = 0; i + 1 < heading.size(); ++i) {
-            line += safe_text::padded(rows[r][i], widths[i], "", rightAligned[i]) + "  ";
-            used += widths[i] + 2;
-        }
-        const String& last = rows[r].back();
-        line += console.terminal()
-                    ? safe_text::fitted(last, std::max(console.width() - used, 12), console.ellipsis())
-                    : last;
-        const bool damaged = r > 0 && !edits[r - 1].damage.empty();
-        out += console.inked(r == 0    ? Console::Ink::Dim
-                             : damaged ? Console::Ink::Warning
-                                       : Console::Ink::None,
-                             line) +
-               "\n";
-    }
-    return out;
+    return table.text(console, true);
 }
 
 int runList(const ListOptions& options) {
