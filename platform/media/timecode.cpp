@@ -133,21 +133,21 @@ Status parseTimecode(std::string_view text, FrameRate rate, TimecodeFields& fiel
     if (Status status = readFields(text, read); !status) {
         return status;
     }
-    const String in = " in timecode " + quoted(text);
+    const auto outOfRange = [text](const String& what) {
+        return Status::failure(what + " in timecode " + quoted(text));
+    };
     if (read.hours > 23) {
-        return Status::failure(String::format("hour %d above 23", read.hours) + in);
+        return outOfRange(String::format("hour %d above 23", read.hours));
     }
     if (read.minutes > 59) {
-        return Status::failure(String::format("minute %d above 59", read.minutes) + in);
+        return outOfRange(String::format("minute %d above 59", read.minutes));
     }
     if (read.seconds > 59) {
-        return Status::failure(String::format("second %d above 59", read.seconds) + in);
+        return outOfRange(String::format("second %d above 59", read.seconds));
     }
     if (read.frames >= rate.nominal()) {
-        return Status::failure(
-            String::format("frame %d at %s frames a second", read.frames,
-                           rate.valid() ? rate.asString().c_str() : "an unknown number of") +
-            in);
+        return outOfRange(String::format("frame %d at %s frames a second", read.frames,
+                                         rate.valid() ? rate.asString().c_str() : "an unknown number of"));
     }
     fields = read;
     return {};
