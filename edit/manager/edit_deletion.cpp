@@ -25,7 +25,7 @@ RevisionChain chainOf(const String& file, RevisionChain::Kind kind) {
 /// The file and the backups of it that are there, the file first. `names` are those of its folder.
 Vector<String> editFiles(const String& file, const std::vector<String>& names) {
     Vector<String> files;
-    if (Qx::fileExists(file)) {
+    if (const Qx::FileAnswer present = Qx::askFile(file); present.isRegular() || present.isUnknown()) {
         files.push_back(file);
     }
     for (const RevisionChain::Kind kind : kChains) {
@@ -40,18 +40,22 @@ Vector<String> editFiles(const String& file, const std::vector<String>& names) {
 /// Removes the file, then the backups from the oldest on. False, with nothing changed, when the file cannot
 /// be removed, and with some backups left when one of them cannot.
 bool removeFiles(const Vector<String>& files, const String& file) {
-    if (Qx::fileExists(file)) {
-        if (const Qx::FileError error = Qx::fileSystem().remove(file)) {
-            herc_printf("edit_manager::delete_edit_file: %s\n", error.text().c_str());
-            return false;
-        }
+    const Qx::FileAnswer present = Qx::askFile(file);
+    Qx::FileError error = present.obstacle("remove");
+    if (present.isRegular()) {
+        error = Qx::fileSystem().remove(file);
+    }
+    if (error) {
+        herc_printf("edit_manager::delete_edit_file: %s\n", error.text().c_str());
+        return false;
     }
     bool allRemoved = true;
     for (auto path = files.rbegin(); path != files.rend(); ++path) {
         if (*path == file) {
             continue;
         }
-        if (const Qx::FileError error = Qx::fileSystem().remove(*path)) {
+        error = Qx::fileSystem().remove(*path);
+        if (error) {
             herc_printf("edit_manager::delete_edit_file: %s\n", error.text().c_str());
             allRemoved = false;
         }
@@ -74,7 +78,7 @@ bool mayBeDeleted(const cookie& item, bool force) {
         herc_printf("edit_manager: %s is in use and was not deleted\n", item.asString().c_str());
         return false;
     }
-    return edit.valid() || Qx::fileExists(file) || !edit_manager::getEditFiles(item).empty();
+    return edit.valid() || !edit_manager::getEditFiles(item).empty();
 }
 
 /// Deletes an item's files and drops it from the cache. `names` are those of its folder, listed under the

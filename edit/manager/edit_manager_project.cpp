@@ -50,7 +50,7 @@ bool readDetails(const cookie& project, ProjectDetails& details) {
     }
     other.project = project;
     // `openOrCreate` would make a project that is not there.
-    return !other.folder().empty() && Qx::fileExists(Qx::joinPath(other.folder(), "Project.txt")) &&
+    return !other.folder().empty() && Qx::askFile(Qx::joinPath(other.folder(), "Project.txt")).isRegular() &&
            ProjectDetails::openOrCreate(other.rootFolder, project, ProjectDetails(), details).isOk();
 }
 
@@ -100,7 +100,14 @@ eStatus edit_manager::set_current_project(const cookie& project, eEditOpenBehavi
         return eStatus::NoProject;
     }
     const bool mayMake = behaviour == eOpenNew || behaviour == eOpenOrCreate;
-    const bool isThere = fileInfo(wanted.folder()).kind == Qx::FileKind::Folder;
+    const Qx::FileAnswer folder = Qx::askFile(wanted.folder());
+    const Qx::FileAnswer settings = Qx::askFile(Qx::joinPath(wanted.folder(), "Project.txt"));
+    if (folder.isUnknown() || settings.isUnknown()) {
+        herc_printf("edit_manager::set_current_project( %s ) : %s\n", cookie_string(project).c_str(),
+                    (folder.isUnknown() ? folder : settings).obstacle().text().c_str());
+        return eStatus::NotFound;
+    }
+    const bool isThere = folder.isFolder();
     if (!isThere && !mayMake) {
         return eStatus::NotFound;
     }
@@ -108,7 +115,7 @@ eStatus edit_manager::set_current_project(const cookie& project, eEditOpenBehavi
     details.frameRateCode = wanted.frameRateCode;
     details.dropFrame = wanted.dropFrame;
     details.defaultEditMedium = wanted.defaultEditMedium;
-    if (mayMake || Qx::fileExists(Qx::joinPath(wanted.folder(), "Project.txt"))) {
+    if (mayMake || settings.isRegular()) {
         const Qx::Status opened = ProjectDetails::openOrCreate(wanted.rootFolder, project, details, details);
         if (!opened) {
             herc_printf("edit_manager::set_current_project( %s ) : %s\n", cookie_string(project).c_str(),

@@ -29,8 +29,11 @@ private:
     [[nodiscard]] EditPtr readExisting();
     [[nodiscard]] EditPtr readBackups();
     [[nodiscard]] bool moveAside(const String& name);
+    /// True if the edit's file is there. What is there and no file, or cannot be asked about, is refused.
+    [[nodiscard]] bool isThere();
     [[nodiscard]] bool restoreMissing();
     int restoreNewest();
+    void refuse(const String& reason);
     [[nodiscard]] String freeCorruptName(int counter) const;
     EditPtr succeed(EditPtr edit);
 
@@ -67,7 +70,7 @@ EditPtr Opening::run() {
     } else if (m_behaviour == eOpenNew) {
         edit = makeNew();
     } else if (m_behaviour == eOpenExisting || m_behaviour == eOpenOrCreate) {
-        if (Qx::fileExists(m_file) || restoreMissing()) {
+        if (isThere() || restoreMissing()) {
             edit = readExisting();
         }
         if (!edit.valid() && m_behaviour == eOpenOrCreate && !m_refused) {
@@ -96,7 +99,7 @@ EditPtr Opening::makeNew() {
 
 EditPtr Opening::read(eEditOpenBehaviour behaviour) {
     m_refused = false;
-    m_read = fileInfo(m_file);
+    m_read = Qx::askFile(m_file).info();
     try {
         EditPtr edit(new Edit);
         if (edit->readFile(Qx::widen(m_file), behaviour) == Edit::kReadOk) {
@@ -120,27 +123,51 @@ EditPtr Opening::read(eEditOpenBehaviour behaviour) {
 }
 
 int Opening::restoreNewest() {
-    const int restored = m_undo.restoreNewest();
-    if (restored != 0) {
+    int restored = 0;
+    const Qx::Status status = m_undo.restoreNewest(restored);
+    if (!status) {
+        refuse(status.reason());
+    } else if (restored != 0) {
         static_cast<void>(m_undo.makeDurable());
     }
     return restored;
 }
 
+void Opening::refuse(const String& reason) {
+    m_refused = true;
+    herc_printf("edit_manager::open( %s ) : %s\n", cookie_string(m_item).c_str(), reason.c_str());
+}
+
+bool Opening::isThere() {
+    const Qx::FileAnswer present = Qx::askFile(m_file);
+    if (const Qx::FileError error = present.obstacle("open")) {
+        refuse(error.text());
+    }
+    return present.isRegular();
+}
+
 bool Opening::restoreMissing() {
     // What lies beyond the depth is not brought back, so the folder need not be listed for it: a sequence may
     // play very many shots that are not there.
-    if (m_undo.newest() == 0 || !takeWritersLock(m_writers)) {
+    int newest = 0;
+    if (const Qx::Status status = m_undo.findNewest(newest); !status) {
+        refuse(status.reason());
+    }
+    if (m_refused || newest == 0) {
+        return false;
+    }
+    if (!takeWritersLock(m_writers)) {
+        m_refused = true;
         return false;
     }
     // Another process may have put the file back meanwhile.
-    if (!Qx::fileExists(m_file)) {
+    if (!isThere() && !m_refused) {
         const int restored = restoreNewest();
         herc_printf("edit_manager::open( %s ) - missing, trying backup %d \n", cookie_string(m_item).c_str(),
                     restored);
     }
     m_writers.release();
-    return Qx::fileExists(m_file);
+    return !m_refused && isThere();
 }
 
 EditPtr Opening::readExisting() {
@@ -155,7 +182,7 @@ EditPtr Opening::readExisting() {
         if (moveAside(m_file + ".CORRUPT")) {
             return readBackups();
         }
-        if (Qx::isSameFile(m_read, fileInfo(m_file))) {
+        if (Qx::isSameFile(m_read, Qx::askFile(m_file).info())) {
             return {};
         }
     }
@@ -169,7 +196,7 @@ bool Opening::moveAside(const String& name) {
         return false;
     }
     Qx::FileError error;
-    if (Qx::isSameFile(m_read, fileInfo(m_file))) {
+    if (Qx::isSameFile(m_read, Qx::askFile(m_file).info())) {
         error = Qx::fileSystem().rename(m_file, name);
         if (!error) {
             return true;
@@ -182,15 +209,21 @@ bool Opening::moveAside(const String& name) {
 
 /// A name beside the edit for a backup that does not read: none that is there is replaced.
 String Opening::freeCorruptName(int counter) const {
-    String name;
-    do {
-        name = m_file + String::format(".CORRUPT.%d", counter++);
-    } while (fileInfo(name).kind != Qx::FileKind::Missing);
-    return name;
+    while (true) {
+        const String name = m_file + String::format(".CORRUPT.%d", counter++);
+        const Qx::FileAnswer found = Qx::askFile(name);
+        if (found.isMissing() || found.isUnknown()) {
+            // Nothing can be moved to no name at all.
+            return found.isMissing() ? name : String();
+        }
+    }
 }
 
 EditPtr Opening::readBackups() {
-    const bool hasBackups = m_undo.exists();
+    bool hasBackups = false;
+    if (const Qx::Status status = m_undo.exists(hasBackups); !status) {
+        refuse(status.reason());
+    }
     for (int counter = 1; hasBackups; ++counter) {
         herc_printf("edit_manager::open( %s ) - edit::read_file() failed, trying backup %d\n",
                     cookie_string(m_item).c_str(), counter);

@@ -68,7 +68,7 @@ bool refreshRecord(projdb& records, const cookie& item, projdb::Record& record) 
         return found || gatherFromMemory(item, record);
     }
     const String path = getFilenameForCookie(item);
-    const Qx::FileInfo info = fileInfo(path);
+    const Qx::FileInfo info = Qx::askFile(path).info();
     if (info.kind != Qx::FileKind::Regular || (found && isRecordOfFile(record, info))) {
         return found;
     }
@@ -181,7 +181,7 @@ bool edit_manager::getProjDBValue(const String& key, String& value, const cookie
     Qx::CurrentProject other = current;
     other.project = project;
     // Asking for a value does not make records where there are none.
-    if (other.folder().empty() || !Qx::fileExists(Qx::joinPath(other.folder(), projdb::kFileName))) {
+    if (other.folder().empty() || !Qx::askFile(Qx::joinPath(other.folder(), projdb::kFileName)).isRegular()) {
         return false;
     }
     projdb records;

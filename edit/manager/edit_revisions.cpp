@@ -22,10 +22,24 @@ RevisionChain chainOf(const cookie& item, RevisionChain::Kind kind) {
 /// Makes the edit's file say what the edit is, also when it went with the last backup and nothing was changed
 /// since. Under the scope of the edit.
 bool writeWhole(ManagerState::CachedEdit& entry) {
-    if (!Qx::fileExists(entry.path)) {
+    const Qx::FileAnswer present = Qx::askFile(entry.path);
+    if (const Qx::FileError error = present.obstacle("replace")) {
+        herc_printf("edit_manager: nothing was written: %s\n", error.text().c_str());
+        return false;
+    }
+    if (present.isMissing()) {
         entry.edit->init_dirty();
     }
-    return managerState().write(entry) && Qx::fileExists(entry.path);
+    return managerState().write(entry) && Qx::askFile(entry.path).isRegular();
+}
+
+/// The number of the newest backup of a chain; 0 also when that could not be told (logged).
+int newestOf(const RevisionChain& chain) {
+    int newest = 0;
+    if (const Qx::Status status = chain.findNewest(newest); !status) {
+        herc_printf("edit_manager: no revision was looked for: %s\n", status.reason().c_str());
+    }
+    return newest;
 }
 
 /// A step of an edit from its present revision to the newest of one chain; the present one goes onto the
@@ -61,7 +75,7 @@ private:
 };
 
 bool RevisionStep::run() {
-    if (m_from.newest() == 0) {
+    if (newestOf(m_from) == 0) {
         return false;
     }
     if (PermissionsManager::getReadOnly(m_item)) {
@@ -123,15 +137,18 @@ bool RevisionStep::moveFiles() {
     ManagerState::CachedEdit& entry = *scope.entry();
     // Who asks for the edit from here on gets the revision that comes: a change to this one would be lost.
     managerState().setLeaving(entry, true);
-    if (!writeWhole(entry) || m_from.newest() == 0) {
+    if (!writeWhole(entry) || newestOf(m_from) == 0) {
         managerState().setLeaving(entry, false);
         return false;
     }
     Qx::Status status = m_to.push();
-    if (status && m_from.restoreNewest() == 0) {
+    int restored = 0;
+    if (status && (status = m_from.restoreNewest(restored)) && restored == 0) {
+        status = Qx::Status::failure("the backup is gone");
+    }
+    if (!status && Qx::askFile(entry.path).isMissing()) {
         // The present revision comes back.
-        status = Qx::Status::failure("the backup could not be moved");
-        m_to.restoreNewest();
+        static_cast<void>(m_to.restoreNewest(restored).isOk());
     }
     if (!status) {
         herc_printf("edit_manager: no revision of %s was changed: %s\n", m_item.asString().c_str(),
@@ -207,12 +224,13 @@ bool edit_manager::backup_edit(const cookie& item) {
 }
 
 bool edit_manager::undoExists(const cookie& item) {
-    return chainOf(item, RevisionChain::Undo).exists();
+    bool found = false;
+    return chainOf(item, RevisionChain::Undo).exists(found) && found;
 }
 
 bool edit_manager::redoExists(const cookie& item) {
     // Backup 1, but for a chain that a crash has left with a hole.
-    return chainOf(item, RevisionChain::Redo).newest() != 0;
+    return newestOf(chainOf(item, RevisionChain::Redo)) != 0;
 }
 
 bool edit_manager::undoRequest(const cookie& item) {

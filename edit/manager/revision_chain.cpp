@@ -1,7 +1,6 @@
 #include "edit/manager/revision_chain.h"
 
 #include "platform/services/edit_filenames.h"
-#include "platform/services/files.h"
 
 #include <algorithm>
 
@@ -31,12 +30,21 @@ String RevisionChain::path(int number) const {
     return m_file + "." + extension(m_kind, number);
 }
 
-bool RevisionChain::has(int number) const {
-    return !m_file.empty() && Qx::fileExists(path(number));
+Qx::FileAnswer RevisionChain::ask(int number) const {
+    return Qx::askFile(m_file.empty() ? String() : path(number));
 }
 
-bool RevisionChain::exists() const {
-    return newest() != 0 || !numbers().empty();
+Qx::Status RevisionChain::exists(bool& found) const {
+    int newest = 0;
+    Qx::Status status = findNewest(newest);
+    found = newest != 0;
+    if (status && !found && !m_file.empty()) {
+        std::vector<String> names;
+        status = asStatus(
+            Qx::retryInterrupted([&] { return Qx::fileSystem().list(Qx::folderOf(m_file), names); }));
+        found = !numbers(names).empty();
+    }
+    return status;
 }
 
 std::vector<String> RevisionChain::namesInFolder() const {
@@ -62,8 +70,11 @@ std::vector<int> RevisionChain::numbers(const std::vector<String>& names) const 
         int number = 0;
         // A number with a leading zero or a sign is not a name of this chain.
         if (Qx::textToInt(std::string_view(*name).substr(start.size()), number) && number > 0 &&
-            *name == start + std::to_string(number) && has(number)) {
-            found.push_back(number);
+            *name == start + std::to_string(number)) {
+            // It was listed, so it is there also when nobody can tell what it is.
+            if (const Qx::FileAnswer answer = ask(number); answer.isRegular() || answer.isUnknown()) {
+                found.push_back(number);
+            }
         }
     }
     std::sort(found.begin(), found.end());
@@ -74,12 +85,25 @@ Qx::Status RevisionChain::move(int from, int to) const {
     return asStatus(Qx::fileSystem().rename(path(from), path(to)));
 }
 
-int RevisionChain::newest() const {
-    int number = 1;
-    while (number <= m_depth && !has(number)) {
-        ++number;
+Qx::Status RevisionChain::findFirst(bool there, int from, int& number) const {
+    for (number = from; number <= m_depth; ++number) {
+        const Qx::FileAnswer answer = ask(number);
+        if (const Qx::FileError error = answer.obstacle()) {
+            return asStatus(error);
+        }
+        if (answer.isRegular() == there) {
+            break;
+        }
     }
-    return number <= m_depth ? number : 0;
+    return {};
+}
+
+Qx::Status RevisionChain::findNewest(int& number) const {
+    const Qx::Status status = findFirst(true, 1, number);
+    if (!status || number > m_depth) {
+        number = 0;
+    }
+    return status;
 }
 
 Qx::Status RevisionChain::rotate() {
@@ -87,8 +111,8 @@ Qx::Status RevisionChain::rotate() {
         return {};
     }
     int firstFree = 1;
-    while (firstFree <= m_depth && has(firstFree)) {
-        ++firstFree;
+    if (Qx::Status status = findFirst(false, 1, firstFree); !status) {
+        return status;
     }
     if (firstFree > m_depth) {
         firstFree = m_depth;
@@ -105,8 +129,15 @@ Qx::Status RevisionChain::rotate() {
 }
 
 Qx::Status RevisionChain::push() {
-    if (!Qx::fileExists(m_file)) {
+    const Qx::FileAnswer present = Qx::askFile(m_file);
+    if (const Qx::FileError error = present.obstacle("keep")) {
+        return asStatus(error);
+    }
+    if (present.isMissing()) {
         return Qx::Status::failure("there is no file " + m_file + " to keep as a backup");
+    }
+    if (const Qx::FileError error = ask(1).obstacle("replace")) {
+        return asStatus(error);
     }
     if (Qx::Status status = rotate(); !status) {
         return status;
@@ -114,22 +145,32 @@ Qx::Status RevisionChain::push() {
     return asStatus(Qx::fileSystem().rename(m_file, path(1)));
 }
 
-int RevisionChain::restoreNewest() {
-    const int restored = newest();
-    if (restored == 0 || Qx::fileSystem().rename(path(restored), m_file)) {
-        return 0;
+Qx::Status RevisionChain::restoreNewest(int& restored) {
+    restored = 0;
+    int newest = 0;
+    if (Qx::Status status = findNewest(newest); !status || newest == 0) {
+        return status;
     }
+    if (const Qx::FileError error = Qx::askFile(m_file).obstacle("replace")) {
+        return asStatus(error);
+    }
+    if (Qx::Status status = asStatus(Qx::fileSystem().rename(path(newest), m_file)); !status) {
+        return status;
+    }
+    restored = newest;
     for (int number = restored + 1; number <= m_depth; ++number) {
-        if (has(number) && !move(number, number - restored)) {
+        const Qx::FileAnswer answer = ask(number);
+        if (answer.obstacle() || (answer.isRegular() && !move(number, number - restored))) {
             break; // what is left keeps its order; a hole is passed over
         }
     }
-    return restored;
+    return {};
 }
 
 bool RevisionChain::deleteTail(int keep) {
     for (int number = m_depth; number > std::max(keep, 0); --number) {
-        if (has(number) && Qx::fileSystem().remove(path(number))) {
+        const Qx::FileAnswer answer = ask(number);
+        if (answer.obstacle() || (answer.isRegular() && Qx::fileSystem().remove(path(number)))) {
             return false;
         }
     }

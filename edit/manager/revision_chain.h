@@ -4,6 +4,7 @@
 #include "platform/base/export.h"
 #include "platform/base/qx_string.h"
 #include "platform/base/status.h"
+#include "platform/services/files.h"
 
 #include <vector>
 
@@ -32,11 +33,11 @@ public:
     [[nodiscard]] const String& file() const { return m_file; }
     [[nodiscard]] int depth() const { return m_depth; }
 
-    /// True if backup `number` is there.
-    [[nodiscard]] bool has(int number) const;
-    /// True if any backup is there, in the depth or beyond it. The folder is listed only when the depth holds
-    /// none.
-    [[nodiscard]] bool exists() const;
+    /// What lies at the name of backup `number`.
+    [[nodiscard]] Qx::FileAnswer ask(int number) const;
+    /// Tells whether any backup is there, in the depth or beyond it. The folder is listed only when the depth
+    /// holds none. A failure when that could not be told.
+    Qx::Status exists(bool& found) const;
     /// The numbers that are there, newest first. Lists the folder, which takes the longer the more edits are
     /// in it: who asks for many chains of one folder lists it once and hands in its names, in order of their
     /// bytes.
@@ -44,28 +45,32 @@ public:
     [[nodiscard]] std::vector<int> numbers(const std::vector<String>& names) const;
     /// The names in the chain's folder, in order of their bytes; none when it cannot be listed.
     [[nodiscard]] std::vector<String> namesInFolder() const;
-    /// The number of the newest backup in the depth; 0 if there is none.
-    [[nodiscard]] int newest() const;
+    /// The number of the newest backup in the depth; 0 if there is none. A failure, and 0, when that could
+    /// not be told, or something else than a file lies at the name of one.
+    Qx::Status findNewest(int& number) const;
 
     /// Makes room for a backup 1: moves each k to k + 1, from the oldest down, after deleting the oldest of a
     /// full chain. What lies behind a hole in the chain stays where it is: the hole takes up the move, and
     /// nothing is deleted while there is one. With depth 1 nothing is done, as the edit file replaces backup
     /// 1. On a failure the moves made so far stay: every revision is still there, some one place further on.
+    /// A name of which nobody can tell whether it is vacant is a failure, with nothing moved.
     Qx::Status rotate();
     /// Rotates, then moves the edit file to backup 1.
     Qx::Status push();
     /// Moves the newest backup that is there over the edit file's name and closes the gap: for k beyond it,
-    /// backup k moves to k - n. Returns its number n; 0 when there is none or it could not be moved, with
-    /// nothing changed.
-    int restoreNewest();
+    /// backup k moves to k - n. `restored` is its number n, or 0 when there is none. A failure when it could
+    /// not be told which is the newest or that could not be moved, with nothing changed.
+    Qx::Status restoreNewest(int& restored);
     /// Deletes the backups from `keep` + 1 to the depth, the oldest first, so that what a crash leaves is a
-    /// chain still; stops at the first that cannot be deleted. True if none is left there.
+    /// chain still; stops at the first that cannot be deleted or asked about. True if none is left there.
     bool deleteTail(int keep);
     /// Makes the names durable. The moves above are not, each by itself: whoever makes them calls this last.
     Qx::Status makeDurable() const;
 
 private:
     [[nodiscard]] Qx::Status move(int from, int to) const;
+    /// The first number from `from` on at whose name a file is (with `there`) or none is, else depth + 1.
+    Qx::Status findFirst(bool there, int from, int& number) const;
 
     String m_file;
     Kind m_kind;

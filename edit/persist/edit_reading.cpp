@@ -56,7 +56,7 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
     }
     m_cookie = item;
     if (getNumChans() > 0 &&
-        (behaviour == eOpenExisting || (behaviour == eOpenOrCreate && Qx::fileExists(file)))) {
+        (behaviour == eOpenExisting || (behaviour == eOpenOrCreate && Qx::askFile(file).isRegular()))) {
         // Before the store is opened, as channels that go leave the groups in it.
         EditFile::reset(*this);
     }

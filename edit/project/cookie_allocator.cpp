@@ -12,10 +12,9 @@ namespace {
 /// number from use, for no edit could be stored there.
 Qx::FileError nameIsTaken(const String& folder, const cookie& edit, bool& taken) {
     const String path = Qx::joinPath(folder, edit.asString() + getEditFilenameExt());
-    Qx::FileInfo info;
-    auto error = Qx::retryInterrupted([&] { return Qx::fileSystem().info(path, info); });
-    taken = info.kind != Qx::FileKind::Missing;
-    return error;
+    const Qx::FileAnswer found = Qx::askFile(path);
+    taken = !found.isMissing();
+    return found.isUnknown() ? found.obstacle() : Qx::FileError();
 }
 
 /// Chooses `count` free numbers from `next` on and moves `next` past them. Numbers whose files exist are

@@ -30,10 +30,13 @@ Qx::Status setAside(const String& path) {
         return Qx::Status::failure(error.text());
     }
     for (const char* const beside : {"-wal", "-shm", "-journal"}) {
-        if (Qx::fileExists(path + beside)) {
-            if (const Qx::FileError error = Qx::fileSystem().remove(path + beside)) {
-                return Qx::Status::failure(error.text());
-            }
+        const Qx::FileAnswer found = Qx::askFile(path + beside);
+        Qx::FileError error = found.obstacle("remove");
+        if (found.isRegular()) {
+            error = Qx::fileSystem().remove(path + beside);
+        }
+        if (error) {
+            return Qx::Status::failure(error.text());
         }
     }
     return {};

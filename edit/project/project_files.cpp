@@ -19,11 +19,11 @@ String lockPath(const String& folder) {
 
 Status readStore(const String& path, configb& store, bool& found) {
     found = false;
-    FileInfo info;
-    if (auto error = retryInterrupted([&] { return fileSystem().info(path, info); })) {
+    const FileAnswer present = askFile(path);
+    if (auto error = present.obstacle("read")) {
         return Status::failure(error.text());
     }
-    if (info.kind == FileKind::Missing) {
+    if (present.isMissing()) {
         return {};
     }
     TextFile file;

@@ -32,25 +32,6 @@ String temporaryFor(const String& path) {
     return path.find('/') == String::npos ? temporary : joinPath(folderOf(path), temporary);
 }
 
-/// Refuses anything but a regular file, or nothing, in the place of the file.
-FileError examineTarget(const String& path, FileInfo& info) {
-    if (auto error = retryInterrupted([&] { return fileSystem().info(path, info); })) {
-        return error;
-    }
-    switch (info.kind) {
-    case FileKind::Missing:
-    case FileKind::Regular:
-        return {};
-    case FileKind::Folder:
-        return {EISDIR, "replace", path};
-    case FileKind::Link:
-        return {ELOOP, "replace", path};
-    case FileKind::Other:
-        break;
-    }
-    return {ENXIO, "replace", path};
-}
-
 bool allOf(std::string_view text, std::string_view set) {
     return !text.empty() && text.find_first_not_of(set) == std::string_view::npos;
 }
@@ -71,8 +52,7 @@ FileError AtomicFile::openTemporary() {
     if (name.empty() || name == "." || name == ".." || m_path.find('\0') != String::npos) {
         return {EINVAL, "write", m_path};
     }
-    FileInfo info;
-    if (auto error = examineTarget(m_path, info)) {
+    if (auto error = askFile(m_path).obstacle("replace")) {
         return error;
     }
     FileError error;
@@ -147,12 +127,12 @@ FileError AtomicFile::finishTemporary(bool sync) {
     if (auto error = openTemporary()) {
         return error;
     }
-    FileInfo old;
-    if (auto error = examineTarget(m_path, old)) {
+    const FileAnswer old = askFile(m_path);
+    if (auto error = old.obstacle("replace")) {
         return error;
     }
-    if (old.kind == FileKind::Regular) {
-        auto error = retryInterrupted([&] { return m_file->setPermissions(old.permissions); });
+    if (old.isRegular()) {
+        auto error = retryInterrupted([&] { return m_file->setPermissions(old.info().permissions); });
         // A file system without permission bits has none to keep.
         if (error && error.code != EPERM && error.code != ENOTSUP && error.code != ENOSYS) {
             return error;
@@ -235,9 +215,8 @@ unsigned removeStaleTemporaries(const String& folder, int64_t age) {
             continue;
         }
         const String path = joinPath(folder, name);
-        FileInfo info;
-        const auto error = retryInterrupted([&] { return system.info(path, info); });
-        if (error || info.kind != FileKind::Regular || info.modifiedNs / 1000000000 > newest) {
+        const FileAnswer found = askFile(path);
+        if (!found.isRegular() || found.info().modifiedNs / 1000000000 > newest) {
             continue;
         }
         if (!retryInterrupted([&] { return system.remove(path); })) {

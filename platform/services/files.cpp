@@ -37,13 +37,23 @@ String reasonFor(int code) {
     return std::generic_category().message(code);
 }
 
-FileError kindError(FileKind kind, const String& path) {
-    const int code = kind == FileKind::Missing  ? ENOENT
-                     : kind == FileKind::Folder ? EISDIR
-                     : kind == FileKind::Link   ? ELOOP
-                     : kind == FileKind::Other  ? ENXIO
-                                                : 0;
-    return {code, "open", path};
+/// Why something of a kind is no regular file.
+int codeFor(FileKind kind) {
+    switch (kind) {
+    case FileKind::Regular:
+        return 0;
+    case FileKind::Missing:
+        return ENOENT;
+    case FileKind::Folder:
+        return EISDIR;
+    case FileKind::Link:
+        return ELOOP;
+    case FileKind::Other:
+        return ENXIO;
+    case FileKind::Unknown:
+        break;
+    }
+    return EIO;
 }
 
 /// Opens a file for reading and learns its size, which is at most `limit`.
@@ -58,7 +68,7 @@ FileError openForReading(const String& path, uint64_t limit, std::unique_ptr<Ope
         return error;
     }
     if (info.kind != FileKind::Regular) {
-        return kindError(info.kind, path);
+        return {codeFor(info.kind), "open", path};
     }
     if (info.size > limit) {
         return {EFBIG, "read", path};
@@ -178,14 +188,30 @@ String extensionOf(std::string_view name) {
 }
 
 bool isSameFile(const FileInfo& a, const FileInfo& b) {
-    return a.kind == b.kind && a.device == b.device && a.inode == b.inode && a.size == b.size &&
-           a.modifiedNs == b.modifiedNs;
+    return a.kind == b.kind && a.kind != FileKind::Unknown && a.device == b.device && a.inode == b.inode &&
+           a.size == b.size && a.modifiedNs == b.modifiedNs;
 }
 
-bool fileExists(const String& path) {
+FileAnswer::FileAnswer(const FileInfo& info, const FileError& error, const String& path)
+    : m_info(info), m_error(error), m_path(path) {
+    if (m_error) {
+        m_info = {};
+        m_info.kind = FileKind::Unknown;
+    }
+}
+
+FileError FileAnswer::obstacle(const char* operation) const {
+    if (m_error || isRegular() || isMissing()) {
+        return m_error;
+    }
+    return {codeFor(kind()), operation, m_path};
+}
+
+FileAnswer askFile(const String& path) {
     FileInfo info;
-    const auto error = retryInterrupted([&] { return fileSystem().info(path, info); });
-    return !error && info.kind == FileKind::Regular;
+    const FileError error =
+        path.empty() ? FileError() : retryInterrupted([&] { return fileSystem().info(path, info); });
+    return {info, error, path};
 }
 
 FileError readAll(OpenFile& file, void* to, size_t size) {

@@ -25,8 +25,9 @@ struct [[nodiscard]] QM_API FileError {
     [[nodiscard]] String text() const;
 };
 
-/// What kind of thing a name stands for. Links are never followed in finding out.
-enum class FileKind { Missing, Regular, Folder, Link, Other };
+/// What kind of thing a name stands for. Links are never followed in finding out. `Unknown` is what the
+/// system could not tell; no file system answers a question with it, it stands where there was no answer.
+enum class FileKind { Missing, Regular, Folder, Link, Other, Unknown };
 
 struct FileInfo {
     FileKind kind = FileKind::Missing;
@@ -123,11 +124,41 @@ QM_API String fileNameOf(std::string_view path);
 QM_API String withoutExtension(std::string_view name);
 QM_API String extensionOf(std::string_view name);
 
-/// True if both tell of one and the same file, unchanged, or of none.
+/// True if both tell of one and the same file, unchanged, or of none. What is unknown is the same as nothing.
 QM_API bool isSameFile(const FileInfo& a, const FileInfo& b);
 
-/// True if the name stands for a regular file.
-QM_API bool fileExists(const String& path);
+/// The answer to the question what a name stands for. Three answers are possible: something of some kind is
+/// there, nothing is, or the system could not tell (a disk or server that fails, a folder that may not be
+/// searched). Nothing turns it into a bool, as the third is neither a yes nor a no: who would rename, replace
+/// or remove anything because a name is vacant asks `isMissing`, and gives up with `obstacle` otherwise.
+class [[nodiscard]] QM_API FileAnswer {
+public:
+    FileAnswer(const FileInfo& info, const FileError& error, const String& path);
+
+    /// A regular file is there for certain.
+    [[nodiscard]] bool isRegular() const { return kind() == FileKind::Regular; }
+    /// A folder is there for certain.
+    [[nodiscard]] bool isFolder() const { return kind() == FileKind::Folder; }
+    /// Nothing is there, for certain.
+    [[nodiscard]] bool isMissing() const { return kind() == FileKind::Missing; }
+    /// The system could not tell.
+    [[nodiscard]] bool isUnknown() const { return kind() == FileKind::Unknown; }
+    [[nodiscard]] FileKind kind() const { return m_info.kind; }
+    /// What is known of it; of kind Missing or Unknown when nothing is.
+    [[nodiscard]] const FileInfo& info() const { return m_info; }
+    /// Why no regular file can be read from or put in the name's place: the system could not tell, or
+    /// something else is there. No error for a regular file and for a vacant name.
+    [[nodiscard]] FileError obstacle(const char* operation = "use") const;
+
+private:
+    FileInfo m_info;
+    FileError m_error;
+    String m_path;
+};
+
+/// Asks the file system in use what a name stands for, again as long as a signal interrupts it. Nothing lies
+/// at an empty path.
+[[nodiscard]] QM_API FileAnswer askFile(const String& path);
 
 /// Calls an operation of the seam again as long as a signal interrupts it.
 template <typename Operation>

@@ -165,6 +165,10 @@ public:
     }
 
     FileError info(const String& path, FileInfo& info) override {
+        // A name with a NUL byte would be answered for another one.
+        if (path.find('\0') != String::npos) {
+            return failed("examine", path.c_str(), EINVAL);
+        }
         struct stat status {};
         FileInfo found;
         if (::lstat(path.c_str(), &status) == 0) {

@@ -141,8 +141,10 @@ Status StoreWriter::commit(StoreIdentity& identity, bool& replaced) {
     if (replaced) {
         identity = {m_path, {}, bytes, true, false};
         // Within a batch the name still holds the old file.
-        identity.infoKnown =
-            m_file.replaced() && !retryInterrupted([&] { return fileSystem().info(m_path, identity.info); });
+        if (m_file.replaced()) {
+            identity.info = askFile(m_path).info();
+            identity.infoKnown = identity.info.kind != FileKind::Unknown;
+        }
     }
     return error ? Status::failure(error.text()) : Status();
 }

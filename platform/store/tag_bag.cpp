@@ -49,17 +49,13 @@ TagBag::OpenResult resultOf(StoreState state) {
 
 /// What a name stands for, as far as it decides the result of opening; Opened for a regular file.
 TagBag::OpenResult lookAt(const String& path, String& complaint) {
-    Qx::FileInfo info;
-    if (const Qx::FileError error = Qx::retryInterrupted([&] { return Qx::fileSystem().info(path, info); })) {
-        complaint = error.text();
-        return TagBag::NotOpened;
-    }
-    if (info.kind == Qx::FileKind::Missing) {
+    const Qx::FileAnswer found = Qx::askFile(path);
+    if (found.isMissing()) {
         complaint = path + " does not exist";
         return TagBag::Missing;
     }
-    if (info.kind != Qx::FileKind::Regular) {
-        complaint = refusal(path, info.kind);
+    if (!found.isRegular()) {
+        complaint = found.isUnknown() ? found.obstacle().text() : refusal(path, found.kind());
         return TagBag::NotOpened;
     }
     return TagBag::Opened;

@@ -29,6 +29,7 @@ public:
         m_plan = {};
         m_operations.clear();
         m_numWrites = 0;
+        m_numQuestions = 0;
     }
     /// Operation `n` fails with an error of the system, without doing anything. EINTR makes an interruption.
     void failAt(size_t n, int code) {
@@ -41,6 +42,11 @@ public:
     /// Every operation whose text holds `part` fails.
     void failWhere(String part, int code) {
         plan([&](Plan& p) { p.failWhere = std::move(part), p.failCode = code; });
+    }
+    /// Question `n` about a name (`info`) fails, counted from 1 among questions: the system cannot tell what
+    /// is there (EIO, ESTALE, EACCES).
+    void failQuestion(size_t n, int code) {
+        plan([&](Plan& p) { p.failQuestion = n, p.failCode = code; });
     }
     /// Each read and write moves at most this many bytes.
     void shortTransfers(size_t bytes) {
@@ -65,6 +71,10 @@ public:
     [[nodiscard]] size_t numWrites() const {
         const std::lock_guard hold(m_mutex);
         return m_numWrites;
+    }
+    [[nodiscard]] size_t numQuestions() const {
+        const std::lock_guard hold(m_mutex);
+        return m_numQuestions;
     }
     /// How many operations so far begin with `start`.
     [[nodiscard]] size_t count(std::string_view start) const {
@@ -128,6 +138,7 @@ private:
     struct Plan {
         size_t failAt = 0;
         size_t failFrom = 0;
+        size_t failQuestion = 0;
         String failWhere;
         int failCode = EIO;
         size_t transfer = SIZE_MAX;
@@ -222,12 +233,15 @@ private:
         const std::lock_guard hold(m_mutex);
         m_operations.push_back(text);
         m_numWrites += writes ? 1 : 0;
+        const bool asks = text.starts_with("info ");
+        m_numQuestions += asks ? 1 : 0;
         if (writes && m_numWrites == m_plan.killAt) {
             beforeKill();
             ::kill(::getpid(), SIGKILL);
         }
         const size_t n = m_operations.size();
         const bool fails = n == m_plan.failAt || (m_plan.failFrom != 0 && n >= m_plan.failFrom) ||
+                           (asks && m_numQuestions == m_plan.failQuestion) ||
                            (!m_plan.failWhere.empty() && text.find(m_plan.failWhere) != String::npos);
         return fails ? Qx::FileError{m_plan.failCode, text, path} : Qx::FileError{};
     }
@@ -237,6 +251,7 @@ private:
     Plan m_plan;
     std::vector<String> m_operations;
     size_t m_numWrites = 0;
+    size_t m_numQuestions = 0;
 };
 
 } // namespace test

@@ -27,7 +27,7 @@ Qx::Status findExample(const char* name, String& path) {
     folders.emplace_back(QMEDIT_EXAMPLES_IN_TREE);
     for (const std::filesystem::path& folder : folders) {
         path = (folder / name).string();
-        if (Qx::fileExists(path)) {
+        if (Qx::askFile(path).isRegular()) {
             return {};
         }
     }

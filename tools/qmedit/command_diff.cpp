@@ -33,10 +33,10 @@ Qx::Status readItem(const ProjectSession& session, const String& name, bool hasP
     }
     String path = name;
     const cookie stated(std::string_view(name).substr(0, name.find('.')), true);
-    if (!Qx::fileExists(name) && hasProject && stated.isStorable()) {
+    if (!Qx::askFile(name).isRegular() && hasProject && stated.isStorable()) {
         path = getFilenameForCookie(stated) + String(name.substr(name.find('.'))).upper();
     }
-    if (!Qx::fileExists(path)) {
+    if (!Qx::askFile(path).isRegular()) {
         return Qx::Status::failure("'" + name +
                                    "' is neither a cookie of the project, nor a state of one such as "
                                    "E0001000.U1, nor a file");

@@ -132,11 +132,11 @@ int runRecover(const RecoverArguments& arguments) {
     }
     String kept;
     if (const Qx::Status replaced = replaceBy(item, *taken, present, kept); !replaced) {
-        return failed(Qx::Status::failure(
-            item.asString() + " was not recovered: " + replaced.reason() +
-            (kept.empty() || !Qx::fileExists(kept) || Qx::fileExists(getFilenameForCookie(item))
-                 ? String()
-                 : "; its state is kept as " + kept)));
+        return failed(Qx::Status::failure(item.asString() + " was not recovered: " + replaced.reason() +
+                                          (kept.empty() || !Qx::askFile(kept).isRegular() ||
+                                                   Qx::askFile(getFilenameForCookie(item)).isRegular()
+                                               ? String()
+                                               : "; its state is kept as " + kept)));
     }
     writeOut(item.asString() + ": recovered from " + taken->which + ", last changed " +
              localTimeText(taken->time) + (kept.empty() ? String() : "; what it was is kept as " + kept) +

@@ -22,11 +22,6 @@ struct VerifyArguments {
 
 constexpr const char* kMilestones = "Milestones";
 
-Qx::FileKind kindOf(const String& path) {
-    Qx::FileInfo info;
-    return Qx::fileSystem().info(path, info) ? Qx::FileKind::Missing : info.kind;
-}
-
 /// ".U1", ".R12".
 bool isBackupExtension(const String& extension) {
     return extension.size() > 2 && (extension[1] == 'U' || extension[1] == 'R') &&
@@ -48,7 +43,11 @@ bool itemOfFile(const String& name, cookie& item) {
 /// The names of a folder; none of one that is not there or is a link.
 Qx::Status namesIn(const String& folder, std::vector<String>& names) {
     names.clear();
-    if (kindOf(folder) != Qx::FileKind::Folder) {
+    const Qx::FileAnswer found = Qx::askFile(folder);
+    if (found.isUnknown()) {
+        return Qx::Status::failure(found.obstacle().text());
+    }
+    if (!found.isFolder()) {
         return {};
     }
     const Qx::FileError error = Qx::fileSystem().list(folder, names);

@@ -91,11 +91,8 @@ Qx::Status checkContent(const String& path, const String& start) {
 
 Qx::Status checkImportSource(const String& path, String& resolved) {
     resolved = path;
-    Qx::FileInfo info;
-    if (const Qx::FileError error = Qx::fileSystem().info(path, info); error) {
-        return Qx::Status::failure(error.text());
-    }
-    if (info.kind == Qx::FileKind::Link) {
+    Qx::FileAnswer found = Qx::askFile(path);
+    if (found.kind() == Qx::FileKind::Link) {
         std::error_code code;
         const std::filesystem::path target =
             std::filesystem::canonical(std::filesystem::path(path.c_str()), code);
@@ -103,17 +100,18 @@ Qx::Status checkImportSource(const String& path, String& resolved) {
             return failure(path, 0, "the link leads to no file; give the list itself");
         }
         resolved = target.string();
-        if (const Qx::FileError error = Qx::fileSystem().info(resolved, info); error) {
-            return Qx::Status::failure(error.text());
-        }
+        found = Qx::askFile(resolved);
     }
-    if (info.kind == Qx::FileKind::Missing) {
+    if (found.isUnknown()) {
+        return Qx::Status::failure(found.obstacle().text());
+    }
+    if (found.isMissing()) {
         return failure(path, 0, "there is no such file; check the name");
     }
-    if (info.kind == Qx::FileKind::Folder) {
+    if (found.isFolder()) {
         return failure(path, 0, "this is a folder; give the EDL file in it");
     }
-    if (info.kind != Qx::FileKind::Regular) {
+    if (!found.isRegular()) {
         return failure(path, 0, "not a regular file; save the list to a file and import that");
     }
     String start;

@@ -17,8 +17,7 @@ RevisionChain chain(const cookie& item, RevisionChain::Kind kind) {
 }
 
 uint64_t inodeOf(const String& path) {
-    Qx::FileInfo info;
-    return Qx::fileSystem().info(path, info) ? 0 : info.inode;
+    return Qx::askFile(path).info().inode;
 }
 
 /// What lies at the names of an edit before it is opened, by which its files are known afterwards.
@@ -160,7 +159,11 @@ int stepRevision(const EditArguments& arguments, bool redo) {
                                           ": look at the backup first ('qmedit show " + item.asString() +
                                           "'), then " + verb + " again"));
     }
-    const int number = chain(item, redo ? RevisionChain::Redo : RevisionChain::Undo).newest();
+    int number = 0;
+    const Qx::Status found = chain(item, redo ? RevisionChain::Redo : RevisionChain::Undo).findNewest(number);
+    if (!found) {
+        return failed(found);
+    }
     if (number == 0) {
         return failed(Qx::Status::failure(
             String("there is nothing to ") + verb + ": " + item.asString() + " has no " + verb + " backup; " +

@@ -18,23 +18,18 @@ namespace {
 
 constexpr cookie kUsualProject{Cookie_Type::Project, 1, 0};
 
-Qx::FileKind kindOf(const String& path) {
-    Qx::FileInfo info;
-    return Qx::fileSystem().info(path, info) ? Qx::FileKind::Missing : info.kind;
-}
-
 /// A folder named by a project's cookie, with settings in it.
 cookie projectOfFolder(const String& folder) {
     const cookie project(std::string_view(Qx::fileNameOf(folder)));
     const bool isProject = project.isStorable() && project.type() == Cookie_Type::Project &&
-                           Qx::fileExists(Qx::joinPath(folder, "Project.txt"));
+                           Qx::askFile(Qx::joinPath(folder, "Project.txt")).isRegular();
     return isProject ? project : invalid_cookie;
 }
 
 /// The project in a folder of projects: the usual one if it is there, else the only one.
 cookie projectIn(const String& root) {
     std::vector<String> names;
-    if (kindOf(Qx::joinPath(root, kUsualProject.asString())) != Qx::FileKind::Missing ||
+    if (!Qx::askFile(Qx::joinPath(root, kUsualProject.asString())).isMissing() ||
         Qx::fileSystem().list(root, names)) {
         return kUsualProject;
     }
@@ -54,7 +49,7 @@ cookie projectIn(const String& root) {
 Qx::Status damage(const String& path, const String& reason) {
     String text = (reason.find(path) == String::npos ? path + ": " : String()) + reason;
     const String backup = path + ".U1";
-    if (Qx::fileExists(backup)) {
+    if (Qx::askFile(backup).isRegular()) {
         text += "; its newest backup is " + backup;
     }
     return Qx::Status::failure(std::move(text));
@@ -163,8 +158,7 @@ String ProjectSession::folder() const {
 }
 
 bool ProjectSession::exists() const {
-    Qx::FileInfo info;
-    return !Qx::fileSystem().info(folder() + "/.", info) && info.kind == Qx::FileKind::Folder;
+    return Qx::askFile(folder() + "/.").isFolder();
 }
 
 void ProjectSession::makeCurrentUnwritten(Qx::FrameRate rate) const {
@@ -182,7 +176,7 @@ Qx::Status ProjectSession::openExisting() {
             "; name another with --project DIR, or make one with 'qmedit import FILE'");
     }
     // Settings that are not there are not written by reading.
-    if (!Qx::fileExists(Qx::joinPath(folder(), "Project.txt"))) {
+    if (Qx::askFile(Qx::joinPath(folder(), "Project.txt")).isMissing()) {
         makeCurrentUnwritten({});
         return {};
     }
@@ -243,7 +237,7 @@ bool ProjectSession::isListed(const cookie& item) const {
 
 Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
     const String path = getFilenameForCookie(item);
-    if (kindOf(path) == Qx::FileKind::Missing) {
+    if (Qx::askFile(path).isMissing()) {
         if (isListed(item)) {
             return Qx::Status::failure(path + ": " + missingText(item));
         }
@@ -279,14 +273,14 @@ Qx::Status ProjectSession::lockForWriting() {
 
 projdb* ProjectSession::openRecords() {
     const String path = Qx::joinPath(folder(), projdb::kFileName);
-    Qx::FileInfo before;
-    if (Qx::fileSystem().info(path, before) || before.kind != Qx::FileKind::Regular) {
+    const Qx::FileAnswer before = Qx::askFile(path);
+    if (!before.isRegular()) {
         return nullptr;
     }
     manage();
     projdb* const records = edit_manager::get_projdb();
-    Qx::FileInfo after;
-    if (!Qx::fileSystem().info(path, after) && after.inode != before.inode) {
+    const Qx::FileAnswer after = Qx::askFile(path);
+    if (after.isRegular() && after.info().inode != before.info().inode) {
         reportWarning("the project's record was damaged; it was set aside as " + path +
                       ".DAMAGED and is made again. It is only a cache: no edit is concerned");
     }
@@ -296,8 +290,8 @@ projdb* ProjectSession::openRecords() {
 /// What the record says of an item, or else its file; `fresh` gets what only the file told.
 projdb::Record ProjectSession::recordOf(const cookie& item, const Records& known, Records& fresh) {
     const String path = getFilenameForCookie(item);
-    Qx::FileInfo info;
-    const bool hasInfo = !Qx::fileSystem().info(path, info) && info.kind == Qx::FileKind::Regular;
+    const Qx::FileInfo info = Qx::askFile(path).info();
+    const bool hasInfo = info.kind == Qx::FileKind::Regular;
     // A record of damage is not trusted: what kept a file from being read may be gone.
     if (const auto place = known.find(item);
         hasInfo && place != known.end() && isRecordOfFile(place->second, info) &&

@@ -40,10 +40,11 @@ void readHeader(Revision& revision) {
 
 /// Adds a file that is there.
 void add(std::vector<Revision>& to, Revision::Kind kind, String which, const String& path) {
-    Qx::FileInfo info;
-    if (Qx::fileSystem().info(path, info) || info.kind == Qx::FileKind::Missing) {
+    const Qx::FileAnswer found = Qx::askFile(path);
+    if (found.isMissing()) {
         return;
     }
+    const Qx::FileInfo& info = found.info();
     Revision& revision = to.emplace_back();
     revision.kind = kind;
     revision.which = std::move(which);
@@ -62,10 +63,8 @@ void add(std::vector<Revision>& to, Revision::Kind kind, String which, const Str
 void addOthers(std::vector<Revision>& to, Revision::Kind kind, const String& folder, const String& lead,
                const char* letter) {
     std::vector<String> names;
-    Qx::FileInfo info;
     // A link in the folder's place is not followed.
-    if (Qx::fileSystem().info(folder, info) || info.kind != Qx::FileKind::Folder ||
-        Qx::fileSystem().list(folder, names)) {
+    if (!Qx::askFile(folder).isFolder() || Qx::fileSystem().list(folder, names)) {
         return;
     }
     std::vector<Revision> found;
@@ -139,11 +138,13 @@ String changeText(const EditModification& change) {
 
 String freeCorruptName(const String& file) {
     String name = file + kCorrupt;
-    Qx::FileInfo info;
-    for (int number = 1; Qx::fileSystem().info(name, info) || info.kind != Qx::FileKind::Missing; ++number) {
+    Qx::FileAnswer found = Qx::askFile(name);
+    for (int number = 1; !found.isMissing() && !found.isUnknown(); ++number) {
         name = file + kCorrupt + String::format(".%d", number);
+        found = Qx::askFile(name);
     }
-    return name;
+    // Nothing can be moved to no name at all.
+    return found.isMissing() ? name : String();
 }
 
 String localTimeText(int64_t seconds) {

@@ -9,8 +9,12 @@ namespace {
 
 /// Keeps the file of another program as undo backup 1 if it is not the one this process knows.
 bool keepForeignFile(const ManagerState::CachedEdit& entry, int depth) {
-    const Qx::FileInfo present = fileInfo(entry.path);
-    if (present.kind != Qx::FileKind::Regular || Qx::isSameFile(entry.file, present)) {
+    const Qx::FileAnswer present = Qx::askFile(entry.path);
+    if (const Qx::FileError error = present.obstacle("replace")) {
+        herc_printf("edit_manager: nothing was written: %s\n", error.text().c_str());
+        return false;
+    }
+    if (present.isMissing() || Qx::isSameFile(entry.file, present.info())) {
         return true;
     }
     const Qx::Status kept = RevisionChain(entry.path, RevisionChain::Undo, depth).push();
@@ -36,14 +40,6 @@ ManagerState& managerState() {
 
 bool isNoItem(const cookie& item) {
     return !item.is_valid() || (item.word(0) == 0 && item.word(1) == 0 && item.word(2) == 0);
-}
-
-Qx::FileInfo fileInfo(const String& path) {
-    Qx::FileInfo info;
-    if (path.empty() || Qx::retryInterrupted([&] { return Qx::fileSystem().info(path, info); })) {
-        return {};
-    }
-    return info;
 }
 
 const ManagerMessages& managerMessages() {
@@ -122,7 +118,7 @@ std::unique_ptr<ManagerState::CachedEdit> ManagerState::removeHeld(const cookie&
 }
 
 void ManagerState::noteFile(CachedEdit& entry) {
-    entry.file = fileInfo(entry.path);
+    entry.file = Qx::askFile(entry.path).info();
 }
 
 bool ManagerState::write(CachedEdit& entry) {

@@ -38,7 +38,8 @@ struct ManagerState {
     struct CachedEdit : EditCacheEntry {
         String path; ///< of its file; empty for an item that has none
         Qx::FileInfo
-            file; ///< as this process last read, wrote or moved it; of kind Missing when there is none
+            file; ///< as this process last read, wrote or moved it; of kind Missing when there is none, of
+                  ///< kind Unknown when the system could not tell: it is then no file that anybody knows
         /// What the revision that an undo or redo brought back says of itself, until it is changed.
         std::optional<EditModification> ownDescription;
         /// It is about to leave the cache: who asks for it waits for what comes in its place. Guarded by
@@ -157,8 +158,6 @@ private:
 
 /// True for what is no item at all: the invalid cookie, or three zero words.
 [[nodiscard]] bool isNoItem(const cookie& item);
-/// Information about a file; of kind Missing also when the system refuses it.
-[[nodiscard]] Qx::FileInfo fileInfo(const String& path);
 /// Takes the writers' lock of the project that a file belongs to, waiting for other processes; a failure is
 /// logged.
 [[nodiscard]] bool takeWritersLock(EditManagerLock& writers);

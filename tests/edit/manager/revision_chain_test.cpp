@@ -71,8 +71,9 @@ TEST(RevisionChain, MovesWholeFilesAndPassesOverHoles) {
         ChainFiles files(depth);
         files.draw(before);
         RevisionChain& chain = files.chain();
+        int restored = 0;
         const int got = action == Push      ? static_cast<int>(chain.push().isOk())
-                        : action == Restore ? chain.restoreNewest()
+                        : action == Restore ? chain.restoreNewest(restored) ? restored : -1
                                             : static_cast<int>(chain.deleteTail(action == Delete1 ? 1 : 0));
         EXPECT_EQ(got, answer);
         EXPECT_EQ(files.drawn(static_cast<int>(std::string(before).size()) - 2), after);
@@ -89,15 +90,41 @@ TEST(RevisionChain, NamesOnlyItsOwnFiles) {
           "E0001000.qme.U2x", "E0002000.qme.U1"}) {
         files.folder().write(other, "x");
     }
-    EXPECT_FALSE(files.chain().exists());
+    bool exists = true;
+    EXPECT_TRUE(files.chain().exists(exists) && !exists);
     files.folder().write("E0001000.qme.U12", "x");
-    EXPECT_TRUE(files.chain().exists()) << "beyond the depth";
-    EXPECT_EQ(files.chain().newest(), 0);
+    EXPECT_TRUE(files.chain().exists(exists) && exists) << "beyond the depth";
+    int newest = -1;
+    EXPECT_TRUE(files.chain().findNewest(newest) && newest == 0);
     EXPECT_EQ(files.chain().numbers(), std::vector<int>{12});
     files.folder().write("E0001000.qme.U2", "x");
     test::FaultyFileSystem system;
-    EXPECT_TRUE(files.chain().exists());
+    EXPECT_TRUE(files.chain().exists(exists) && exists);
     EXPECT_EQ(system.count("list"), 0U) << "one in the depth is found by its name";
+}
+
+TEST(RevisionChain, LosesNothingWhenItCannotTellWhatIsThere) {
+    for (const std::string before : {"E:ab-", "-:ab-"}) {
+        bool done = false;
+        for (size_t question = 1; !done; ++question) {
+            SCOPED_TRACE(testing::Message() << before << ", question " << question);
+            ChainFiles files(3);
+            files.draw(before);
+            test::FaultyFileSystem system;
+            system.failQuestion(question, ESTALE);
+            int restored = 0;
+            const bool answer =
+                before[0] == 'E' ? files.chain().push().isOk() : files.chain().restoreNewest(restored).isOk();
+            done = answer && system.numQuestions() < question;
+            std::string left = files.drawn(3);
+            EXPECT_TRUE(answer || left == before) << left;
+            std::sort(left.begin(), left.end());
+            std::string whole = before;
+            std::sort(whole.begin(), whole.end());
+            EXPECT_EQ(left, whole);
+            ASSERT_LT(question, 20U);
+        }
+    }
 }
 
 TEST(RevisionChain, RandomStepsMatchAModelAlsoWithFailures) {
@@ -134,7 +161,9 @@ TEST(RevisionChain, RandomStepsMatchAModelAlsoWithFailures) {
                 }
             } else if (action == 1) {
                 const bool restores = !fails && !model.empty();
-                EXPECT_EQ(files.chain().restoreNewest(), restores ? 1 : 0);
+                int restored = 0;
+                EXPECT_EQ(files.chain().restoreNewest(restored).isOk(), !fails || model.empty());
+                EXPECT_EQ(restored, restores ? 1 : 0);
                 if (restores) {
                     file = model.front();
                     model.pop_front();

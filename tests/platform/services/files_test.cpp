@@ -72,7 +72,22 @@ TEST(MachineFileSystem, TellsKindsWithoutFollowingLinks) {
         Qx::FileInfo info;
         ASSERT_FALSE(Qx::fileSystem().info(folder.path(name), info)) << name;
         EXPECT_EQ(info.kind, kind) << name;
-        EXPECT_EQ(Qx::fileExists(folder.path(name)), kind == FileKind::Regular) << name;
+        const Qx::FileAnswer answer = Qx::askFile(folder.path(name));
+        EXPECT_EQ(answer.kind(), kind) << name;
+        const bool isUsable = kind == FileKind::Regular || kind == FileKind::Missing;
+        EXPECT_EQ(!answer.obstacle(), isUsable) << name;
+    }
+    // What the system cannot tell is neither there nor missing, whatever lies there.
+    for (const int code : {EIO, ESTALE, EACCES}) {
+        test::FaultyFileSystem system;
+        for (const char* const name : {"file", "none"}) {
+            system.reset();
+            system.failQuestion(1, code);
+            const Qx::FileAnswer answer = Qx::askFile(folder.path(name));
+            EXPECT_TRUE(answer.isUnknown() && !answer.isMissing() && !answer.isRegular()) << name;
+            EXPECT_EQ(answer.obstacle().code, code) << name;
+            EXPECT_FALSE(Qx::isSameFile(answer.info(), answer.info())) << name;
+        }
     }
     Qx::FileInfo info;
     ASSERT_FALSE(Qx::fileSystem().info(folder.path("file"), info));
