@@ -1,3 +1,4 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_diff.h"
@@ -7,8 +8,6 @@
 #include "edit/editing/editor.h"
 #include "edit/manager/edit_manager.h"
 #include "edit/model/channel_mask.h"
-
-#include <CLI/CLI.hpp>
 
 #include <cmath>
 #include <memory>
@@ -188,27 +187,33 @@ int runApply(const ApplyOptions& options) {
 
 } // namespace
 
-void addApplyCommand(CLI::App& app, CommandWork& work) {
+Command applyCommand() {
     const auto options = std::make_shared<ApplyOptions>();
-    CLI::App* command = app.add_subcommand("apply", "Perform an editing operation on an edit");
-    command
-        ->add_option("OPERATION", options->operation,
-                     "Its name or number: replace, insert, remove, lift, ...")
-        ->required()
-        ->type_name("");
-    command->add_option("--to", options->to, "The edit that is changed, with its marks")
-        ->required()
-        ->type_name("COOKIE[@IN[-OUT]]");
-    command->add_option("--from", options->from, "The source, with its marks; all of it without")
-        ->type_name("COOKIE[@IN-OUT]");
-    command
-        ->add_option("--channels", options->channels, "The channels of both edits that take part, else all")
-        ->type_name("VA1A2");
-    addProjectOption(*command, options->project);
-    command->add_flag("--dry-run", options->dryRun, "Show what would come of it and change nothing");
-    command->footer(
-        "Example:\n  qmedit apply insert --from E0002000@5s-8s --to E0001000@10:00:05:00\n\n"
-        "A time is record timecode, frames (125f) or seconds (5s) from the edit's beginning. The edit "
-        "is backed up before.");
-    command->callback([options, &work] { work = [options] { return runApply(*options); }; });
+    return {"apply",
+            "Perform an editing operation on an edit",
+            {{.name = "OPERATION",
+              .value = &options->operation,
+              .help = "Its name or number: replace, insert, remove, lift, ...",
+              .required = true},
+             {.name = "--to",
+              .value = &options->to,
+              .help = "The edit that is changed, with its marks",
+              .form = "COOKIE[@IN[-OUT]]",
+              .required = true},
+             {.name = "--from",
+              .value = &options->from,
+              .help = "The source, with its marks; all of it without",
+              .form = "COOKIE[@IN-OUT]"},
+             {.name = "--channels",
+              .value = &options->channels,
+              .help = "The channels of both edits that take part, else all",
+              .form = "VA1A2"},
+             projectOption(options->project),
+             {.name = "--dry-run",
+              .value = &options->dryRun,
+              .help = "Show what would come of it and change nothing"}},
+            "Example:\n  qmedit apply insert --from E0002000@5s-8s --to E0001000@10:00:05:00\n\n"
+            "A time is record timecode, frames (125f) or seconds (5s) from the edit's beginning. The edit "
+            "is backed up before.",
+            [options] { return runApply(*options); }};
 }

@@ -1,11 +1,10 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/managed_edit.h"
 #include "tools/qmedit/revisions.h"
 
 #include "platform/services/edit_filenames.h"
-
-#include <CLI/CLI.hpp>
 
 #include <memory>
 
@@ -45,12 +44,13 @@ int runBackup(const EditArguments& arguments) {
 
 } // namespace
 
-void addBackupCommand(CLI::App& app, CommandWork& work) {
+Command backupCommand() {
     const auto arguments = std::make_shared<EditArguments>();
-    CLI::App* command = app.add_subcommand("backup", "Keep the present state of an edit as an undo backup");
-    addEditArguments(*command, *arguments);
-    command->footer("Example:\n  qmedit backup E0001000\n\n"
-                    "'qmedit undo' goes back to it. What could be redone goes; beyond the depth (10) the "
-                    "oldest backup goes.");
-    command->callback([arguments, &work] { work = [arguments] { return runBackup(*arguments); }; });
+    return {"backup",
+            "Keep the present state of an edit as an undo backup",
+            {cookieOption(arguments->item), projectOption(arguments->project)},
+            "Example:\n  qmedit backup E0001000\n\n"
+            "'qmedit undo' goes back to it. What could be redone goes; beyond the depth (10) the "
+            "oldest backup goes.",
+            [arguments] { return runBackup(*arguments); }};
 }

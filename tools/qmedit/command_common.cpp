@@ -1,17 +1,35 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 
-#include <CLI/CLI.hpp>
+const std::vector<Command>& allCommands() {
+    static const std::vector<Command> commands{
+        importCommand(), exportCommand(), listCommand(),      showCommand(),    headerCommand(),
+        applyCommand(),  diffCommand(),   verifyCommand(),    salvageCommand(), historyCommand(),
+        backupCommand(), undoCommand(),   redoCommand(),      recoverCommand(), deleteCommand(),
+        flushCommand(),  demoCommand(),   completionCommand()};
+    return commands;
+}
 
-void addProjectOption(CLI::App& command, String& project) {
-    command
-        .add_option_function<std::string>(
-            "--project", [&project](const std::string& folder) { project = folder; },
-            "The project's folder (else $QMEDIT_PROJECT, else ./quillmarch-project)")
-        ->type_name("DIR")
-        ->check([](const std::string& folder) {
-            return folder.empty() ? std::string("the folder's name is empty") : "";
-        });
+String checkFolder(const std::string& folder) {
+    return folder.empty() ? "the folder's name is empty" : "";
+}
+
+CommandOption projectOption(String& project) {
+    return {.name = "--project",
+            .value = &project,
+            .help = "The project's folder (else $QMEDIT_PROJECT, else ./quillmarch-project)",
+            .form = "DIR",
+            .check = checkFolder};
+}
+
+CommandOption cookieOption(std::string& item) {
+    return {
+        .name = "COOKIE", .value = &item, .help = "The edit, as 'qmedit list' names it", .required = true};
+}
+
+CommandOption jsonOption(bool& json, const char* help) {
+    return {.name = "--json", .value = &json, .help = help};
 }
 
 int failed(const Qx::Status& status) {

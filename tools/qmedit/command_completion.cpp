@@ -1,30 +1,29 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
-
-#include <CLI/CLI.hpp>
 
 #include <memory>
 
 namespace {
 
 /// The long options of a command, as words.
-String optionWords(const CLI::App& command) {
-    String words;
-    for (const CLI::Option* option : command.get_options()) {
-        for (const std::string& name : option->get_lnames()) {
-            words += (words.empty() ? "--" : " --") + String(name);
+String optionWords(const Command& command) {
+    String words = kOptionsOfEveryCommand;
+    for (const CommandOption& option : command.options) {
+        if (option.name.starts_with("--")) {
+            words += " " + option.name;
         }
     }
     return words;
 }
 
 /// A bash function made from the declared commands and options, so that it cannot differ from them.
-String bashCompletion(const CLI::App& app) {
+String bashCompletion(const std::vector<Command>& all) {
     String commands;
     String options;
-    for (const CLI::App* command : app.get_subcommands(nullptr)) {
-        commands += (commands.empty() ? "" : " ") + command->get_name();
-        options += "        " + command->get_name() + ") options='" + optionWords(*command) + "' ;;\n";
+    for (const Command& command : all) {
+        commands += " " + command.name;
+        options += "        " + command.name + ") options='" + optionWords(command) + "' ;;\n";
     }
     return R"bash(# bash completion for qmedit; use it with: source <(qmedit completion bash)
 _qmedit_cookies() {
@@ -73,7 +72,7 @@ _qmedit() {
     esac
     case $command in
         '') options=')bash" +
-           optionWords(app) + " " + commands + "' ;;\n" + options + R"bash(    esac
+           String(kOptionsOfProgram) + commands + "' ;;\n" + options + R"bash(    esac
     if [[ $current == -* || -z $command ]]; then
         mapfile -t COMPREPLY < <(compgen -W "$options" -- "$current")
         return
@@ -92,18 +91,18 @@ complete -F _qmedit qmedit
 
 } // namespace
 
-void addCompletionCommand(CLI::App& app, CommandWork& work) {
-    const auto shell = std::make_shared<std::string>();
-    CLI::App* command = app.add_subcommand("completion", "Print the completion script for a shell");
-    command->add_option("SHELL", *shell, "The shell: bash")
-        ->required()
-        ->type_name("")
-        ->check(CLI::IsMember({"bash"}));
-    command->footer("Example:\n  source <(qmedit completion bash)");
-    command->callback([shell, &app, &work] { // the option writes to it: it lives as long as the command
-        work = [&app] {
-            writeOut(bashCompletion(app));
-            return static_cast<int>(kDone);
-        };
-    });
+Command completionCommand() {
+    const auto shell = std::make_shared<std::string>(); // the option writes to it
+    return {"completion",
+            "Print the completion script for a shell",
+            {{.name = "SHELL",
+              .value = shell.get(),
+              .help = "The shell: bash",
+              .required = true,
+              .choices = {"bash"}}},
+            "Example:\n  source <(qmedit completion bash)",
+            [shell] {
+                writeOut(bashCompletion(allCommands()));
+                return static_cast<int>(kDone);
+            }};
 }

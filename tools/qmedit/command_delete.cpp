@@ -1,3 +1,4 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/managed_edit.h"
@@ -5,8 +6,6 @@
 
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
-
-#include <CLI/CLI.hpp>
 
 #include <algorithm>
 #include <memory>
@@ -103,12 +102,16 @@ int runDelete(const DeleteArguments& arguments) {
 
 } // namespace
 
-void addDeleteCommand(CLI::App& app, CommandWork& work) {
+Command deleteCommand() {
     const auto arguments = std::make_shared<DeleteArguments>();
-    CLI::App* command = app.add_subcommand("delete", "Delete an edit with all its backups");
-    addEditArguments(*command, *arguments);
-    command->add_flag("--force", arguments->force, "Also a shot that an edit of the project plays");
-    command->footer("Example:\n  qmedit delete E0001000\n\n"
-                    "There is no way back but by milestones, which stay.");
-    command->callback([arguments, &work] { work = [arguments] { return runDelete(*arguments); }; });
+    return {"delete",
+            "Delete an edit with all its backups",
+            {cookieOption(arguments->item),
+             projectOption(arguments->project),
+             {.name = "--force",
+              .value = &arguments->force,
+              .help = "Also a shot that an edit of the project plays"}},
+            "Example:\n  qmedit delete E0001000\n\n"
+            "There is no way back but by milestones, which stay.",
+            [arguments] { return runDelete(*arguments); }};
 }

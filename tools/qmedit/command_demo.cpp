@@ -1,9 +1,8 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 
 #include "platform/services/files.h"
-
-#include <CLI/CLI.hpp>
 
 #include <cstdio>
 #include <cstdlib>
@@ -129,13 +128,12 @@ int runDemo(String project) {
 
 } // namespace
 
-void addDemoCommand(CLI::App& app, CommandWork& work) {
+Command demoCommand() {
     const auto project = std::make_shared<String>();
-    CLI::App* command =
-        app.add_subcommand("demo", "Import two examples, cut one into the other, undo, redo, export");
-    addProjectOption(*command, *project);
-    command->footer(
-        "Example:\n  qmedit demo\n\n"
-        "Without --project a fresh folder is made for temporary files; it is kept, and named at the end.");
-    command->callback([project, &work] { work = [project] { return runDemo(*project); }; });
+    return {"demo",
+            "Import two examples, cut one into the other, undo, redo, export",
+            {projectOption(*project)},
+            "Example:\n  qmedit demo\n\n"
+            "Without --project a fresh folder is made for temporary files; it is kept, and named at the end.",
+            [project] { return runDemo(*project); }};
 }

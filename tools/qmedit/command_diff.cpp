@@ -1,3 +1,4 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/content_diff.h"
@@ -7,8 +8,6 @@
 #include "edit/persist/edit_salvage.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
-
-#include <CLI/CLI.hpp>
 
 #include <memory>
 
@@ -105,21 +104,26 @@ int runDiff(const DiffOptions& options) {
 
 } // namespace
 
-void addDiffCommand(CLI::App& app, CommandWork& work) {
+Command diffCommand() {
     const auto options = std::make_shared<DiffOptions>();
-    CLI::App* command = app.add_subcommand("diff", "Tell where two edits differ");
-    command->add_option("BEFORE", options->before, "An edit of the project, or an edit file")
-        ->required()
-        ->type_name("COOKIE|FILE");
-    command->add_option("AFTER", options->after, "The edit to compare with it")
-        ->required()
-        ->type_name("COOKIE|FILE");
-    addProjectOption(*command, options->project);
-    command->add_flag("--json", options->json, "Write JSON");
-    command->footer(
+    return {
+        "diff",
+        "Tell where two edits differ",
+        {{.name = "BEFORE",
+          .value = &options->before,
+          .help = "An edit of the project, or an edit file",
+          .form = "COOKIE|FILE",
+          .required = true},
+         {.name = "AFTER",
+          .value = &options->after,
+          .help = "The edit to compare with it",
+          .form = "COOKIE|FILE",
+          .required = true},
+         projectOption(options->project),
+         jsonOption(options->json, "Write JSON")},
         "Example:\n  qmedit diff E0001000 /backup/E0001000.qme\n\n"
         "Channels are compared by kind and place: V2 with V2. Header properties that every save changes are "
         "left out. The exit code is 0 whether they differ or "
-        "not; the output is 'the same' when they do not.");
-    command->callback([options, &work] { work = [options] { return runDiff(*options); }; });
+        "not; the output is 'the same' when they do not.",
+        [options] { return runDiff(*options); }};
 }

@@ -1,3 +1,4 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/project_session.h"
@@ -5,8 +6,6 @@
 #include "interchange/edl_export.h"
 #include "interchange/legacy_text.h"
 #include "platform/services/files.h"
-
-#include <CLI/CLI.hpp>
 
 #include <memory>
 
@@ -77,22 +76,21 @@ int runExport(const ExportArguments& arguments) {
 
 } // namespace
 
-void addExportCommand(CLI::App& app, CommandWork& work) {
+Command exportCommand() {
     const auto arguments = std::make_shared<ExportArguments>();
-    CLI::App* command =
-        app.add_subcommand("export", "Write an edit as a cut list (.edl) or as legacy text (.ed2)");
-    command->add_option("COOKIE", arguments->item, "The edit, as 'qmedit list' names it")
-        ->required()
-        ->type_name("");
-    command
-        ->add_option("FILE", arguments->file,
-                     "The file to write, replaced if it is there; its extension says its form")
-        ->required()
-        ->type_name("");
-    addProjectOption(*command, arguments->project);
-    command->add_flag("--strict", arguments->strict, "Write nothing if anything of the edit would be lost");
-    command->add_flag("--crlf", arguments->crlf, "End the lines of an EDL with CR and LF");
-    command->footer("Example:\n  qmedit export E0001000 reel2.edl\n\n"
-                    "What the form cannot hold goes to standard error, a line each.");
-    command->callback([arguments, &work] { work = [arguments] { return runExport(*arguments); }; });
+    return {"export",
+            "Write an edit as a cut list (.edl) or as legacy text (.ed2)",
+            {cookieOption(arguments->item),
+             {.name = "FILE",
+              .value = &arguments->file,
+              .help = "The file to write, replaced if it is there; its extension says its form",
+              .required = true},
+             projectOption(arguments->project),
+             {.name = "--strict",
+              .value = &arguments->strict,
+              .help = "Write nothing if anything of the edit would be lost"},
+             {.name = "--crlf", .value = &arguments->crlf, .help = "End the lines of an EDL with CR and LF"}},
+            "Example:\n  qmedit export E0001000 reel2.edl\n\n"
+            "What the form cannot hold goes to standard error, a line each.",
+            [arguments] { return runExport(*arguments); }};
 }

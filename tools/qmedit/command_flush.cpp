@@ -1,10 +1,9 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/project_session.h"
 
 #include "platform/services/files.h"
-
-#include <CLI/CLI.hpp>
 
 #include <memory>
 
@@ -40,12 +39,12 @@ int runFlush(const String& project) {
 
 } // namespace
 
-void addFlushCommand(CLI::App& app, CommandWork& work) {
+Command flushCommand() {
     const auto project = std::make_shared<String>();
-    CLI::App* command =
-        app.add_subcommand("flush", "Bring the project's record of its edits up to date, or make it");
-    addProjectOption(*command, *project);
-    command->footer("Example:\n  qmedit flush --project ~/feature\n\n"
-                    "The record (Project.db) makes listings of large projects quick. It is only a cache.");
-    command->callback([project, &work] { work = [project] { return runFlush(*project); }; });
+    return {"flush",
+            "Bring the project's record of its edits up to date, or make it",
+            {projectOption(*project)},
+            "Example:\n  qmedit flush --project ~/feature\n\n"
+            "The record (Project.db) makes listings of large projects quick. It is only a cache.",
+            [project] { return runFlush(*project); }};
 }

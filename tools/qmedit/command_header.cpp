@@ -1,11 +1,10 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/project_session.h"
 #include "tools/qmedit/safe_text.h"
 #include "tools/qmedit/value_text.h"
-
-#include <CLI/CLI.hpp>
 
 #include <algorithm>
 #include <memory>
@@ -70,16 +69,15 @@ int runHeader(const HeaderOptions& options) {
 
 } // namespace
 
-void addHeaderCommand(CLI::App& app, CommandWork& work) {
+Command headerCommand() {
     const auto options = std::make_shared<HeaderOptions>();
-    CLI::App* command = app.add_subcommand("header", "Show the header properties of an edit, or one of them");
-    command->add_option("COOKIE", options->item, "The edit, as 'qmedit list' names it")
-        ->required()
-        ->type_name("");
-    command->add_option("KEY", options->key, "Only this property, its value alone (in any case)")
-        ->type_name("");
-    addProjectOption(*command, options->project);
-    command->add_flag("--json", options->json, "Write JSON: an object of the properties");
-    command->footer("Example:\n  qmedit header E0001000 FRAME_RATE");
-    command->callback([options, &work] { work = [options] { return runHeader(*options); }; });
+    return {
+        "header",
+        "Show the header properties of an edit, or one of them",
+        {cookieOption(options->item),
+         {.name = "KEY", .value = &options->key, .help = "Only this property, its value alone (in any case)"},
+         projectOption(options->project),
+         jsonOption(options->json, "Write JSON: an object of the properties")},
+        "Example:\n  qmedit header E0001000 FRAME_RATE",
+        [options] { return runHeader(*options); }};
 }

@@ -1,11 +1,10 @@
 #include "tools/qmedit/column_table.h"
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/managed_edit.h"
 #include "tools/qmedit/revisions.h"
-
-#include <CLI/CLI.hpp>
 
 #include <memory>
 
@@ -55,14 +54,14 @@ String revisionTable(const std::vector<Revision>& revisions, const Console& cons
     return table.text(console, false);
 }
 
-void addHistoryCommand(CLI::App& app, CommandWork& work) {
+Command historyCommand() {
     const auto arguments = std::make_shared<HistoryArguments>();
-    CLI::App* command =
-        app.add_subcommand("history", "List the states of an edit: its backups, milestones, damaged files");
-    addEditArguments(*command, *arguments);
-    command->add_flag("--json", arguments->json, "Write JSON: an object with the states");
-    command->footer("Example:\n  qmedit history E0001000\n\n"
-                    "Newest first: what redo brings back (R), the edit, what undo goes back to (U), then "
-                    "milestones (M) and what was set aside as CORRUPT. 'qmedit recover' takes one of them.");
-    command->callback([arguments, &work] { work = [arguments] { return runHistory(*arguments); }; });
+    return {"history",
+            "List the states of an edit: its backups, milestones, damaged files",
+            {cookieOption(arguments->item), projectOption(arguments->project),
+             jsonOption(arguments->json, "Write JSON: an object with the states")},
+            "Example:\n  qmedit history E0001000\n\n"
+            "Newest first: what redo brings back (R), the edit, what undo goes back to (U), then "
+            "milestones (M) and what was set aside as CORRUPT. 'qmedit recover' takes one of them.",
+            [arguments] { return runHistory(*arguments); }};
 }

@@ -1,3 +1,4 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/import_source.h"
@@ -6,8 +7,6 @@
 #include "interchange/edl_import.h"
 #include "interchange/legacy_text.h"
 #include "platform/services/files.h"
-
-#include <CLI/CLI.hpp>
 
 #include <memory>
 
@@ -84,39 +83,32 @@ int importFile(const ImportOptions& options, cookie& item) {
     return kDone;
 }
 
-void addImportCommand(CLI::App& app, CommandWork& work) {
-    struct Arguments {
-        std::string file;
-        std::string rate;
-        ImportOptions options;
-    };
-    const auto arguments = std::make_shared<Arguments>();
-    CLI::App* command =
-        app.add_subcommand("import", "Make an edit of a cut list (CMX 3600 EDL) or of legacy text (.ed2)");
-    command->add_option("FILE", arguments->file, "The list: an EDL, or a legacy text by its extension .ed2")
-        ->required()
-        ->type_name("");
-    addProjectOption(*command, arguments->options.project);
-    command
-        ->add_option("--rate", arguments->rate,
-                     "Frames a second, which an EDL does not state (else the project's; 25 in a fresh one)")
-        ->type_name("FPS")
-        ->check(checkRate);
-    command->add_flag("--strict", arguments->options.strict,
-                      "Import nothing if anything of the list would be lost");
-    command->footer("Example:\n  qmedit import reel2.edl --rate 24 --project ~/feature\n\n"
-                    "The last line on standard output is the new edit's cookie; what was lost or odd goes to "
-                    "standard error.");
-    command->callback([arguments, &work] {
-        work = [arguments] {
-            arguments->options.file = arguments->file;
-            arguments->options.rate = arguments->rate;
-            cookie item;
-            const int code = importFile(arguments->options, item);
-            if (code == kDone) {
-                writeOut(item.asString() + "\n");
-            }
-            return code;
-        };
-    });
+Command importCommand() {
+    const auto options = std::make_shared<ImportOptions>();
+    return {"import",
+            "Make an edit of a cut list (CMX 3600 EDL) or of legacy text (.ed2)",
+            {{.name = "FILE",
+              .value = &options->file,
+              .help = "The list: an EDL, or a legacy text by its extension .ed2",
+              .required = true},
+             projectOption(options->project),
+             {.name = "--rate",
+              .value = &options->rate,
+              .help = "Frames a second, which an EDL does not state (else the project's; 25 in a fresh one)",
+              .form = "FPS",
+              .check = checkRate},
+             {.name = "--strict",
+              .value = &options->strict,
+              .help = "Import nothing if anything of the list would be lost"}},
+            "Example:\n  qmedit import reel2.edl --rate 24 --project ~/feature\n\n"
+            "The last line on standard output is the new edit's cookie; what was lost or odd goes to "
+            "standard error.",
+            [options] {
+                cookie item;
+                const int code = importFile(*options, item);
+                if (code == kDone) {
+                    writeOut(item.asString() + "\n");
+                }
+                return code;
+            }};
 }

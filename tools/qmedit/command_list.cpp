@@ -1,4 +1,5 @@
 #include "tools/qmedit/column_table.h"
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
@@ -7,8 +8,6 @@
 
 #include "platform/media/timecode.h"
 #include "platform/services/files.h"
-
-#include <CLI/CLI.hpp>
 
 #include <algorithm>
 #include <memory>
@@ -82,18 +81,18 @@ int runList(const ListOptions& options) {
 
 } // namespace
 
-void addListCommand(CLI::App& app, CommandWork& work) {
+Command listCommand() {
     const auto options = std::make_shared<ListOptions>();
-    CLI::App* command = app.add_subcommand("list", "List the edits of a project");
-    addProjectOption(*command, options->project);
-    command->add_flag("--json", options->json, "Write JSON");
-    command
-        ->add_option_function<std::string>(
-            "--type", [options](const std::string& type) { options->type = type; },
-            "Only items of a type (damaged files are listed all the same)")
-        ->type_name("TYPE")
-        ->check(CLI::IsMember({"edit", "shot", "ghost", "magic", "reel", "FXT"}));
-    command->footer("Example:\n  qmedit list --project ~/feature --type edit\n\n"
-                    "A file that cannot be read is listed as damaged, with the reason.");
-    command->callback([options, &work] { work = [options] { return runList(*options); }; });
+    return {"list",
+            "List the edits of a project",
+            {projectOption(options->project),
+             jsonOption(options->json, "Write JSON"),
+             {.name = "--type",
+              .value = &options->type,
+              .help = "Only items of a type (damaged files are listed all the same)",
+              .form = "TYPE",
+              .choices = {"edit", "shot", "ghost", "magic", "reel", "FXT"}}},
+            "Example:\n  qmedit list --project ~/feature --type edit\n\n"
+            "A file that cannot be read is listed as damaged, with the reason.",
+            [options] { return runList(*options); }};
 }

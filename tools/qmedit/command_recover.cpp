@@ -1,3 +1,4 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/managed_edit.h"
@@ -6,8 +7,6 @@
 #include "edit/manager/revision_chain.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
-
-#include <CLI/CLI.hpp>
 
 #include <algorithm>
 #include <memory>
@@ -146,17 +145,18 @@ int runRecover(const RecoverArguments& arguments) {
 
 } // namespace
 
-void addRecoverCommand(CLI::App& app, CommandWork& work) {
+Command recoverCommand() {
     const auto arguments = std::make_shared<RecoverArguments>();
-    CLI::App* command =
-        app.add_subcommand("recover", "Bring an edit back from a backup, a milestone or a file set aside");
-    addEditArguments(*command, *arguments);
-    command
-        ->add_option("--from", arguments->from,
-                     "The state to take, as 'qmedit history' names it: U1, R1, M3, CORRUPT")
-        ->type_name("WHICH");
-    command->footer("Example:\n  qmedit recover E0001000 --from M3\n\n"
-                    "Without --from the sound states are listed, and the newest is taken if the edit itself "
-                    "cannot be read. What the edit was is kept as an undo backup, or as CORRUPT if damaged.");
-    command->callback([arguments, &work] { work = [arguments] { return runRecover(*arguments); }; });
+    return {"recover",
+            "Bring an edit back from a backup, a milestone or a file set aside",
+            {cookieOption(arguments->item),
+             projectOption(arguments->project),
+             {.name = "--from",
+              .value = &arguments->from,
+              .help = "The state to take, as 'qmedit history' names it: U1, R1, M3, CORRUPT",
+              .form = "WHICH"}},
+            "Example:\n  qmedit recover E0001000 --from M3\n\n"
+            "Without --from the sound states are listed, and the newest is taken if the edit itself "
+            "cannot be read. What the edit was is kept as an undo backup, or as CORRUPT if damaged.",
+            [arguments] { return runRecover(*arguments); }};
 }

@@ -1,3 +1,4 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
@@ -6,8 +7,6 @@
 #include "edit/persist/edit_salvage.h"
 #include "interchange/import.h"
 #include "platform/services/current_project.h"
-
-#include <CLI/CLI.hpp>
 
 #include <memory>
 
@@ -58,26 +57,23 @@ int runSalvage(const SalvageArguments& arguments) {
 
 } // namespace
 
-void addSalvageCommand(CLI::App& app, CommandWork& work) {
+Command salvageCommand() {
     const auto arguments = std::make_shared<SalvageArguments>();
-    CLI::App* command =
-        app.add_subcommand("salvage", "Save what is sound of a damaged edit file as an edit of its own");
-    command->add_option("FILE", arguments->file, "The damaged file, under any name; it is not changed")
-        ->required()
-        ->type_name("");
-    command
-        ->add_option_function<std::string>(
-            "--into", [arguments](const std::string& folder) { arguments->into = folder; },
-            "The project that the edit is saved to, made if it is not there")
-        ->required()
-        ->type_name("DIR")
-        ->check([](const std::string& folder) {
-            return folder.empty() ? std::string("the folder's name is empty") : "";
-        });
-    command->add_flag("--json", arguments->json, "Write JSON: an object with the cookie and what is lost");
-    command->footer(
-        "Example:\n  qmedit salvage E0001000.qme --into ~/rescue\n\n"
-        "The last line on standard output is the edit's cookie in DIR; what is lost goes to standard "
-        "error, a line each.");
-    command->callback([arguments, &work] { work = [arguments] { return runSalvage(*arguments); }; });
+    return {"salvage",
+            "Save what is sound of a damaged edit file as an edit of its own",
+            {{.name = "FILE",
+              .value = &arguments->file,
+              .help = "The damaged file, under any name; it is not changed",
+              .required = true},
+             {.name = "--into",
+              .value = &arguments->into,
+              .help = "The project that the edit is saved to, made if it is not there",
+              .form = "DIR",
+              .required = true,
+              .check = checkFolder},
+             jsonOption(arguments->json, "Write JSON: an object with the cookie and what is lost")},
+            "Example:\n  qmedit salvage E0001000.qme --into ~/rescue\n\n"
+            "The last line on standard output is the edit's cookie in DIR; what is lost goes to standard "
+            "error, a line each.",
+            [arguments] { return runSalvage(*arguments); }};
 }

@@ -1,11 +1,10 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/event_table.h"
 #include "tools/qmedit/project_session.h"
 #include "tools/qmedit/track_picture.h"
-
-#include <CLI/CLI.hpp>
 
 #include <limits>
 #include <memory>
@@ -63,29 +62,21 @@ void drawEdit(const EditReport& report) {
     writeOut("\n" + editSummary(report, console) + "\n" + trackPicture(report, console) + "\n");
 }
 
-void addShowCommand(CLI::App& app, CommandWork& work) {
-    struct Arguments {
-        std::string item;
-        ShowOptions options;
-    };
-    const auto arguments = std::make_shared<Arguments>();
-    CLI::App* command = app.add_subcommand("show", "Draw the tracks of an edit and list its events");
-    command->add_option("COOKIE", arguments->item, "The edit, as 'qmedit list' names it")
-        ->required()
-        ->type_name("");
-    addProjectOption(*command, arguments->options.project);
-    auto* json =
-        command->add_flag("--json", arguments->options.json, "Write JSON: every pair of every channel");
-    command->add_flag("--events", arguments->options.allEvents, "List every event, however many there are")
-        ->excludes(json);
-    command->footer("Example:\n  qmedit show E0001000 --events | less -R\n\n"
-                    "The picture is as wide as the terminal, or as $COLUMNS says.");
-    command->callback([arguments, &work] {
-        work = [arguments] {
-            if (!readCookie(arguments->item, arguments->options.item)) {
-                return static_cast<int>(kWrongUsage);
-            }
-            return showEdit(arguments->options);
-        };
-    });
+Command showCommand() {
+    const auto options = std::make_shared<ShowOptions>();
+    const auto text = std::make_shared<std::string>();
+    return {"show",
+            "Draw the tracks of an edit and list its events",
+            {cookieOption(*text),
+             projectOption(options->project),
+             jsonOption(options->json, "Write JSON: every pair of every channel"),
+             {.name = "--events",
+              .value = &options->allEvents,
+              .help = "List every event, however many there are",
+              .excludes = "--json"}},
+            "Example:\n  qmedit show E0001000 --events | less -R\n\n"
+            "The picture is as wide as the terminal, or as $COLUMNS says.",
+            [options, text] {
+                return readCookie(*text, options->item) ? showEdit(*options) : static_cast<int>(kWrongUsage);
+            }};
 }

@@ -1,3 +1,4 @@
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
@@ -6,8 +7,6 @@
 #include "edit/persist/edit_salvage.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
-
-#include <CLI/CLI.hpp>
 
 #include <algorithm>
 #include <memory>
@@ -178,16 +177,15 @@ int runVerify(const VerifyArguments& arguments) {
 
 } // namespace
 
-void addVerifyCommand(CLI::App& app, CommandWork& work) {
+Command verifyCommand() {
     const auto arguments = std::make_shared<VerifyArguments>();
-    CLI::App* command =
-        app.add_subcommand("verify", "Check every edit file, backup and milestone of a project");
-    command->add_option("COOKIE", arguments->items, "Only the files of these edits")->type_name("");
-    addProjectOption(*command, arguments->project);
-    command->add_flag("--json", arguments->json, "Write JSON: an array of files");
-    command->footer(
-        "Example:\n  qmedit verify --project ~/feature\n\n"
-        "Nothing is written. The exit code is 1 if any file is not sound; 'qmedit salvage' saves what "
-        "is sound of one.");
-    command->callback([arguments, &work] { work = [arguments] { return runVerify(*arguments); }; });
+    return {"verify",
+            "Check every edit file, backup and milestone of a project",
+            {{.name = "COOKIE", .value = &arguments->items, .help = "Only the files of these edits"},
+             projectOption(arguments->project),
+             jsonOption(arguments->json, "Write JSON: an array of files")},
+            "Example:\n  qmedit verify --project ~/feature\n\n"
+            "Nothing is written. The exit code is 1 if any file is not sound; 'qmedit salvage' saves what "
+            "is sound of one.",
+            [arguments] { return runVerify(*arguments); }};
 }

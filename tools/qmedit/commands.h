@@ -4,47 +4,49 @@
 #include "platform/base/qx_string.h"
 #include "platform/base/status.h"
 
-#include <functional>
+#include <vector>
 
+struct Command;
+struct CommandOption;
 struct EditReport;
-
-namespace CLI {
-class App;
-}
 
 /// What qmedit answers to the shell.
 enum ExitCode : int { kDone = 0, kFailed = 1, kWrongUsage = 2 };
 
-/// The work of the command that was chosen; set while the command line is read, run after it. It returns an
-/// `ExitCode`.
-using CommandWork = std::function<int()>;
-
-/// \name Each declares its command, its options and its help, in a file of its own
+/// \name Each is declared, with its options and its help, in a file of its own
 /// @{
-void addImportCommand(CLI::App& app, CommandWork& work);
-void addExportCommand(CLI::App& app, CommandWork& work);
-void addListCommand(CLI::App& app, CommandWork& work);
-void addShowCommand(CLI::App& app, CommandWork& work);
-void addApplyCommand(CLI::App& app, CommandWork& work);
-void addDiffCommand(CLI::App& app, CommandWork& work);
-void addHeaderCommand(CLI::App& app, CommandWork& work);
-void addVerifyCommand(CLI::App& app, CommandWork& work);
-void addSalvageCommand(CLI::App& app, CommandWork& work);
-void addHistoryCommand(CLI::App& app, CommandWork& work);
-void addBackupCommand(CLI::App& app, CommandWork& work);
-void addUndoCommand(CLI::App& app, CommandWork& work);
-void addRedoCommand(CLI::App& app, CommandWork& work);
-void addRecoverCommand(CLI::App& app, CommandWork& work);
-void addDeleteCommand(CLI::App& app, CommandWork& work);
-void addFlushCommand(CLI::App& app, CommandWork& work);
-void addDemoCommand(CLI::App& app, CommandWork& work);
-void addCompletionCommand(CLI::App& app, CommandWork& work);
+Command importCommand();
+Command exportCommand();
+Command listCommand();
+Command showCommand();
+Command headerCommand();
+Command applyCommand();
+Command diffCommand();
+Command verifyCommand();
+Command salvageCommand();
+Command historyCommand();
+Command backupCommand();
+Command undoCommand();
+Command redoCommand();
+Command recoverCommand();
+Command deleteCommand();
+Command flushCommand();
+Command demoCommand();
+Command completionCommand();
 /// @}
+
+/// Every command, in the order of the help.
+const std::vector<Command>& allCommands();
 
 /// \name Shared by the commands
 /// @{
-/// Adds --project to a command; `project` stays empty when it is not given.
-void addProjectOption(CLI::App& command, String& project);
+/// --project; `project` stays empty when it is not given.
+CommandOption projectOption(String& project);
+/// The edit that a command is for, as its first word.
+CommandOption cookieOption(std::string& item);
+CommandOption jsonOption(bool& json, const char* help);
+/// Why a text cannot name a folder, or nothing.
+String checkFolder(const std::string& folder);
 /// Reports a failure and returns `kFailed`.
 int failed(const Qx::Status& status);
 /// Reads a COOKIE argument. On a text that is none, reports it and returns false.

@@ -8,8 +8,6 @@
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 
-#include <CLI/CLI.hpp>
-
 namespace {
 
 RevisionChain chain(const cookie& item, RevisionChain::Kind kind) {
@@ -85,13 +83,6 @@ String quotedChange(const String& change) {
 }
 
 } // namespace
-
-void addEditArguments(CLI::App& command, EditArguments& arguments) {
-    command.add_option("COOKIE", arguments.item, "The edit, as 'qmedit list' names it")
-        ->required()
-        ->type_name("");
-    addProjectOption(command, arguments.project);
-}
 
 ManagedEdit::ManagedEdit(const EditArguments& arguments)
     : m_arguments(arguments), m_session(arguments.project) {}

@@ -3,18 +3,11 @@
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/project_session.h"
 
-namespace CLI {
-class App;
-}
-
 /// What the commands on one edit are given.
 struct EditArguments {
     std::string item;
     String project;
 };
-
-/// Adds COOKIE and --project to a command.
-void addEditArguments(CLI::App& command, EditArguments& arguments);
 
 /// One edit of a project that a command changes through the edit manager, under the project's writers' lock
 /// from before it is opened until the object goes. What the user must know is told on standard error.
