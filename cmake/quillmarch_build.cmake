@@ -27,15 +27,34 @@ function(quillmarch_warnings target)
     endif()
 endfunction()
 
-# quillmarch_room([SOURCES file...] [HEADERS file...]): adds this folder's sources to the library and lists
-# the headers that are installed with it.
+# quillmarch_shared_library(<target>): version and linking of a library that is installed.
+function(quillmarch_shared_library target)
+    set_target_properties(${target} PROPERTIES VERSION ${PROJECT_VERSION} SOVERSION ${PROJECT_VERSION_MAJOR})
+    # A call within the library goes straight to the library's own function: nobody puts another in its place.
+    target_compile_options(${target} PRIVATE -fno-semantic-interposition)
+    if(NOT APPLE)
+        target_link_options(${target} PRIVATE -Wl,-Bsymbolic-functions)
+    endif()
+    if(NOT QUILLMARCH_SANITIZE AND NOT APPLE)
+        # What is declared and not defined is found here, not in the program of whoever links the library.
+        target_link_options(${target} PRIVATE -Wl,--no-undefined)
+    endif()
+endfunction()
+
+# quillmarch_headers(<target> HEADERS file...): lists the headers of this folder that are installed with a library.
+function(quillmarch_headers target)
+    cmake_parse_arguments(arg "" "" "HEADERS" ${ARGN})
+    file(RELATIVE_PATH room ${PROJECT_SOURCE_DIR} ${CMAKE_CURRENT_SOURCE_DIR})
+    foreach(header IN LISTS arg_HEADERS)
+        set_property(TARGET ${target} APPEND PROPERTY QUILLMARCH_PUBLIC_HEADERS ${room}/${header})
+    endforeach()
+endfunction()
+
+# quillmarch_room([SOURCES file...] [HEADERS file...]): adds this folder's sources to the edit library, and its headers.
 function(quillmarch_room)
     cmake_parse_arguments(arg "" "" "SOURCES;HEADERS" ${ARGN})
     foreach(source IN LISTS arg_SOURCES)
         target_sources(quillmarch_edit PRIVATE ${CMAKE_CURRENT_SOURCE_DIR}/${source})
     endforeach()
-    file(RELATIVE_PATH room ${PROJECT_SOURCE_DIR} ${CMAKE_CURRENT_SOURCE_DIR})
-    foreach(header IN LISTS arg_HEADERS)
-        set_property(GLOBAL APPEND PROPERTY QUILLMARCH_PUBLIC_HEADERS ${room}/${header})
-    endforeach()
+    quillmarch_headers(quillmarch_edit HEADERS ${arg_HEADERS})
 endfunction()

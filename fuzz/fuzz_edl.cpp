@@ -1,4 +1,4 @@
-#include "interchange/edl_import.h"
+#include "interchange/edl/edl_import.h"
 
 #include <cstddef>
 #include <cstdint>

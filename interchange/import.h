@@ -1,6 +1,7 @@
 #pragma once
 
 #include "edit/model/edit_ptr.h"
+#include "interchange/export.h"
 #include "interchange/loss_report.h"
 #include "platform/base/status.h"
 #include "platform/media/frame_rate.h"
@@ -28,12 +29,12 @@ struct Import {
 };
 
 /// The cookie of shot `index` of an import that is not saved: of kind 'F', so that nothing stores it.
-cookie provisionalCookie(size_t index);
+QM_INTERCHANGE_API cookie provisionalCookie(size_t index);
 
 /// Gives every edit a cookie of the current project, puts these in the place of the provisional ones wherever
 /// an event names a shot, and writes the shots, then the sequence, in one batch.
 ///
 /// On failure the project is as it was and the import is too, so that the call can be repeated.
-Qx::Status saveImport(Import& result);
+QM_INTERCHANGE_API Qx::Status saveImport(Import& result);
 
 } // namespace interchange

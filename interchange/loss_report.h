@@ -1,5 +1,6 @@
 #pragma once
 
+#include "interchange/export.h"
 #include "platform/base/qx_string.h"
 
 #include <vector>
@@ -15,7 +16,7 @@ struct Loss {
 
 /// What an import or export reports besides its result. A loss is something that the other side cannot hold;
 /// a warning is something that was read by a guess or that its author should look at. Not thread-safe.
-class LossReport {
+class QM_INTERCHANGE_API LossReport {
 public:
     /// The name that stands before each line.
     void setFile(String name) { m_file = std::move(name); }

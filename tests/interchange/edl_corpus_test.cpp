@@ -1,6 +1,6 @@
 #include "edl_printing.h"
 
-#include "interchange/edl_import.h"
+#include "interchange/edl/edl_import.h"
 
 #include <gtest/gtest.h>
 

@@ -1,7 +1,7 @@
-#include "interchange/edl_export.h"
-#include "interchange/edl_import.h"
-#include "interchange/edl_records.h"
-#include "interchange/edl_writer.h"
+#include "interchange/edl/edl_export.h"
+#include "interchange/edl/edl_import.h"
+#include "interchange/edl/edl_records.h"
+#include "interchange/edl/edl_writer.h"
 #include "interchange/marker_colour.h"
 
 #include "support/recording_log.h"

@@ -1,5 +1,5 @@
-#include "interchange/edl_import.h"
-#include "interchange/edl_records.h"
+#include "interchange/edl/edl_import.h"
+#include "interchange/edl/edl_records.h"
 #include "interchange/marker_colour.h"
 
 #include "edit/model/edit.h"

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "interchange/edl_tracks.h"
+#include "interchange/edl/edl_tracks.h"
 
 #include <string>
 

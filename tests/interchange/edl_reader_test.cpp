@@ -1,4 +1,4 @@
-#include "interchange/edl_tracks.h"
+#include "interchange/edl/edl_tracks.h"
 
 #include "support/temporary_folder.h"
 

@@ -1,5 +1,5 @@
-# Installs the library into a folder of its own, takes the example program out of README.md, builds it there
-# once with find_package and once with pkg-config, and runs both.
+# Installs the libraries into a folder of its own, takes the example program out of README.md, builds it there
+# once with find_package and once with pkg-config, and runs both; then the programs of examples/ likewise.
 cmake_minimum_required(VERSION 3.23)
 
 function(run_step what)
@@ -32,14 +32,16 @@ run_step("configuring with find_package" ${CMAKE_COMMAND} -S ${WORK}/program -B 
     -DCMAKE_PREFIX_PATH=${prefix} -DCMAKE_CXX_COMPILER=${COMPILER})
 run_step("building with find_package" ${CMAKE_COMMAND} --build ${WORK}/by_cmake)
 
-file(GLOB_RECURSE pc ${prefix}/*.pc)
+file(GLOB_RECURSE pc ${prefix}/*quillmarch_edit.pc)
 get_filename_component(pc_folder ${pc} DIRECTORY)
 get_filename_component(lib_folder ${pc_folder} DIRECTORY)
-run_step("asking pkg-config" ${CMAKE_COMMAND} -E env PKG_CONFIG_PATH=${pc_folder} pkg-config --cflags --libs quillmarch_edit)
-string(STRIP "${step_output}" step_output)
-separate_arguments(flags UNIX_COMMAND "${step_output}")
-run_step("building with pkg-config" ${COMPILER} -std=c++20 ${WORK}/program/main.cpp ${flags}
-    -Wl,-rpath,${lib_folder} -o ${WORK}/by_pkg_config)
+function(pkg_config_build source module program)
+    run_step("asking pkg-config" ${CMAKE_COMMAND} -E env PKG_CONFIG_PATH=${pc_folder} pkg-config --cflags --libs ${module})
+    string(STRIP "${step_output}" step_output)
+    separate_arguments(flags UNIX_COMMAND "${step_output}")
+    run_step("building with pkg-config" ${COMPILER} -std=c++20 ${source} ${flags} -Wl,-rpath,${lib_folder} -o ${program})
+endfunction()
+pkg_config_build(${WORK}/program/main.cpp quillmarch_edit ${WORK}/by_pkg_config)
 
 foreach(program ${WORK}/by_cmake/program ${WORK}/by_pkg_config)
     execute_process(COMMAND ${program} WORKING_DIRECTORY ${WORK}/ran RESULT_VARIABLE code OUTPUT_VARIABLE out ERROR_VARIABLE out)
@@ -51,4 +53,33 @@ foreach(program ${WORK}/by_cmake/program ${WORK}/by_pkg_config)
         message(FATAL_ERROR "${program} does not use the installed library:\n${step_output}")
     endif()
 endforeach()
+
+# The programs of examples/, each with what it is to say.
+file(WRITE ${WORK}/program/CMakeLists.txt "cmake_minimum_required(VERSION 3.23)
+project(examples LANGUAGES CXX)
+find_package(quillmarch_edit 11.1 REQUIRED COMPONENTS interchange)
+add_executable(convert_list ${SOURCE}/examples/convert_list.cpp)
+target_link_libraries(convert_list PRIVATE quillmarch::interchange)
+")
+run_step("configuring the examples" ${CMAKE_COMMAND} -S ${WORK}/program -B ${WORK}/examples -G Ninja
+    -DCMAKE_PREFIX_PATH=${prefix} -DCMAKE_CXX_COMPILER=${COMPILER})
+run_step("building the examples" ${CMAKE_COMMAND} --build ${WORK}/examples)
+pkg_config_build(${SOURCE}/examples/convert_list.cpp quillmarch_interchange ${WORK}/examples/convert_by_pkg_config)
+foreach(program convert_list convert_by_pkg_config)
+    run_step("running ${program}" ${WORK}/examples/${program} ${SOURCE}/examples/market_evening.edl 25 ${WORK}/out.edl)
+    if(NOT step_output MATCHES "[0-9]+ sources, [0-9.]+ s\n" OR NOT EXISTS ${WORK}/out.edl)
+        message(FATAL_ERROR "${program} said: ${step_output}")
+    endif()
+endforeach()
+
+# A component that is not there is told of as such.
+file(WRITE ${WORK}/program/CMakeLists.txt "cmake_minimum_required(VERSION 3.23)
+project(wrong LANGUAGES CXX)
+find_package(quillmarch_edit 11.1 REQUIRED COMPONENTS no_such_part)
+")
+execute_process(COMMAND ${CMAKE_COMMAND} -S ${WORK}/program -B ${WORK}/wrong -G Ninja -DCMAKE_PREFIX_PATH=${prefix}
+    -DCMAKE_CXX_COMPILER=${COMPILER} RESULT_VARIABLE code OUTPUT_QUIET ERROR_VARIABLE out)
+if(code EQUAL 0 OR NOT out MATCHES "no_such_part")
+    message(FATAL_ERROR "a missing component was not told of: ${out}")
+endif()
 file(REMOVE_RECURSE ${WORK})

@@ -3,7 +3,7 @@
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/project_session.h"
 
-#include "interchange/edl_export.h"
+#include "interchange/edl/edl_export.h"
 #include "interchange/legacy_text.h"
 #include "platform/services/files.h"
 

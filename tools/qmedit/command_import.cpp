@@ -4,7 +4,7 @@
 #include "tools/qmedit/import_source.h"
 #include "tools/qmedit/project_session.h"
 
-#include "interchange/edl_import.h"
+#include "interchange/edl/edl_import.h"
 #include "interchange/legacy_text.h"
 #include "platform/services/files.h"
 

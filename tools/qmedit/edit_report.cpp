@@ -1,6 +1,6 @@
 #include "tools/qmedit/edit_report.h"
 
-#include "interchange/edl_records.h"
+#include "interchange/edl/edl_records.h"
 #include "platform/media/timecode.h"
 #include "platform/services/current_project.h"
 

@@ -3,7 +3,7 @@
 #include "edit/manager/edit_record.h"
 #include "edit/persist/edit_init.h"
 #include "edit/project/project_details.h"
-#include "interchange/edl_records.h"
+#include "interchange/edl/edl_records.h"
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"

@@ -1,7 +1,7 @@
-#include "interchange/detail/edl_sources.h"
+#include "interchange/edl/detail/edl_sources.h"
 
-#include "interchange/detail/edl_line.h"
-#include "interchange/edl_records.h"
+#include "interchange/edl/detail/edl_line.h"
+#include "interchange/edl/edl_records.h"
 
 #include <algorithm>
 

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "edit/model/edit.h"
+#include "interchange/export.h"
 #include "interchange/loss_report.h"
 
 #include <functional>
@@ -43,10 +44,11 @@ struct EdlExportOptions {
 ///
 /// Losses: each track, channel group, level, fade, effect, nested edit, and time between frames that a list
 /// cannot hold is one line of the report.
-Qx::Status exportEdl(const Edit& edit, const EdlExportOptions& options, String& text, LossReport& report);
+QM_INTERCHANGE_API Qx::Status exportEdl(const Edit& edit, const EdlExportOptions& options, String& text,
+                                        LossReport& report);
 
 /// The same to a file, replaced atomically. A folder, link, FIFO or device in its place is refused.
-Qx::Status exportEdlFile(const Edit& edit, const EdlExportOptions& options, const String& path,
-                         LossReport& report);
+QM_INTERCHANGE_API Qx::Status exportEdlFile(const Edit& edit, const EdlExportOptions& options,
+                                            const String& path, LossReport& report);
 
 } // namespace interchange

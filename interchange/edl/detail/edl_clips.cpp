@@ -1,4 +1,4 @@
-#include "interchange/detail/edl_clips.h"
+#include "interchange/edl/detail/edl_clips.h"
 
 #include "platform/media/timecode.h"
 

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "interchange/export.h"
 #include "interchange/loss_report.h"
 #include "platform/base/status.h"
 #include "platform/media/frame_rate.h"
@@ -46,7 +47,7 @@ struct EdlSpeed {
 /// One event line with what the notes below it say. Times are frames from midnight, half open. A record out
 /// that lay before its in was on the next day and has 24 hours added; a source out likewise, unless the event
 /// plays in reverse.
-struct EdlEvent {
+struct QM_INTERCHANGE_API EdlEvent {
     int line = 0;
     String number; ///< the digits as written
     String reel;
@@ -103,10 +104,12 @@ inline constexpr size_t kMaxEdlEvents = 999'999;
 /// their bytes. A drop-frame label that does not exist moves up to the next that does. A list that says drop
 /// frame at a rate which has none is read as non-drop. The lines of a source table (">>>") are skipped. All
 /// four draw a warning.
-Qx::Status readEdl(std::string_view text, Qx::FrameRate rate, EdlList& list, LossReport& report);
+QM_INTERCHANGE_API Qx::Status readEdl(std::string_view text, Qx::FrameRate rate, EdlList& list,
+                                      LossReport& report);
 
 /// The same for a file of at most `kMaxEdlBytes`, refused unread when it is larger. Sets the report's file
 /// name, without its folder.
-Qx::Status readEdlFile(const String& path, Qx::FrameRate rate, EdlList& list, LossReport& report);
+QM_INTERCHANGE_API Qx::Status readEdlFile(const String& path, Qx::FrameRate rate, EdlList& list,
+                                          LossReport& report);
 
 } // namespace interchange

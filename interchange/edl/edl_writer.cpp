@@ -1,4 +1,4 @@
-#include "interchange/edl_writer.h"
+#include "interchange/edl/edl_writer.h"
 
 #include "platform/media/timecode.h"
 

@@ -1,6 +1,6 @@
-#include "interchange/detail/edl_note.h"
+#include "interchange/edl/detail/edl_note.h"
 
-#include "interchange/detail/edl_line.h"
+#include "interchange/edl/detail/edl_line.h"
 
 namespace interchange::detail {
 

@@ -1,4 +1,4 @@
-#include "interchange/detail/edl_line.h"
+#include "interchange/edl/detail/edl_line.h"
 
 #include <algorithm>
 

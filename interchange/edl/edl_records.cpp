@@ -1,4 +1,4 @@
-#include "interchange/edl_records.h"
+#include "interchange/edl/edl_records.h"
 
 #include "platform/base/text_lines.h"
 

@@ -1,7 +1,7 @@
 #pragma once
 
 #include "edit/model/edit.h"
-#include "interchange/edl_export.h"
+#include "interchange/edl/edl_export.h"
 
 #include <unordered_map>
 #include <unordered_set>

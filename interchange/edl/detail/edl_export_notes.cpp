@@ -1,8 +1,8 @@
-#include "interchange/detail/edl_export_notes.h"
+#include "interchange/edl/detail/edl_export_notes.h"
 
-#include "interchange/detail/edl_line.h"
-#include "interchange/detail/edl_note.h"
-#include "interchange/edl_writer.h"
+#include "interchange/edl/detail/edl_line.h"
+#include "interchange/edl/detail/edl_note.h"
+#include "interchange/edl/edl_writer.h"
 #include "platform/base/text_lines.h"
 
 #include <algorithm>

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "interchange/export.h"
 #include "platform/base/id_stamp.h"
 #include "platform/base/qx_string.h"
 
@@ -41,9 +42,9 @@ struct EdlRecord {
 ///     S00000000-00000000-00000000         an event's stamp, in any number
 ///     V047.6                              the digits of its speed
 ///     N* FROM CLIP NAME: x                a note line, in any number
-String packEdlRecords(const std::vector<EdlRecord>& records);
+QM_INTERCHANGE_API String packEdlRecords(const std::vector<EdlRecord>& records);
 
 /// Reads that text. Lines of other tags and lines before the first record are passed over.
-std::vector<EdlRecord> unpackEdlRecords(std::string_view text);
+QM_INTERCHANGE_API std::vector<EdlRecord> unpackEdlRecords(std::string_view text);
 
 } // namespace interchange

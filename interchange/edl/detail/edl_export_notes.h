@@ -1,7 +1,7 @@
 #pragma once
 
-#include "interchange/detail/edl_sources.h"
-#include "interchange/edl_reader.h"
+#include "interchange/edl/detail/edl_sources.h"
+#include "interchange/edl/edl_reader.h"
 
 namespace interchange::detail {
 

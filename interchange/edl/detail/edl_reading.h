@@ -1,7 +1,7 @@
 #pragma once
 
-#include "interchange/detail/edl_line.h"
-#include "interchange/detail/edl_note.h"
+#include "interchange/edl/detail/edl_line.h"
+#include "interchange/edl/detail/edl_note.h"
 #include "platform/media/timecode.h"
 
 namespace interchange::detail {

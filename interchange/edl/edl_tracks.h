@@ -1,6 +1,7 @@
 #pragma once
 
-#include "interchange/edl_reader.h"
+#include "interchange/edl/edl_reader.h"
+#include "interchange/export.h"
 
 /// Lays the events of a list on tracks.
 namespace interchange {
@@ -52,9 +53,11 @@ struct EdlProgramme {
 /// from one event to the next, the day is taken to begin after the longest pause.
 ///
 /// Takes n log n steps for n events. On failure `programme` is as it was.
-Qx::Status layTracks(const EdlList& list, bool strict, EdlProgramme& programme, LossReport& report);
+QM_INTERCHANGE_API Qx::Status layTracks(const EdlList& list, bool strict, EdlProgramme& programme,
+                                        LossReport& report);
 
 /// The record time of a marker in frames from the programme's start; markers of the next day are after it.
-int64_t markerPosition(const EdlList& list, const EdlProgramme& programme, const EdlMarker& marker);
+QM_INTERCHANGE_API int64_t markerPosition(const EdlList& list, const EdlProgramme& programme,
+                                          const EdlMarker& marker);
 
 } // namespace interchange

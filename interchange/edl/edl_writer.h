@@ -1,6 +1,7 @@
 #pragma once
 
-#include "interchange/edl_reader.h"
+#include "interchange/edl/edl_reader.h"
+#include "interchange/export.h"
 
 /// Writes the text of a CMX 3600 edit decision list: the inverse of edl_reader.h. It knows what the lines
 /// look like; which events a list has and what their notes say is the business of edl_export.h.
@@ -24,20 +25,21 @@ struct EdlTextOptions {
 /// are written by `edlChannelText`; what that cannot say must be in a note (`edlAudioNote`).
 ///
 /// Reading the text gives the list again, but for times beyond 24 hours, which wrap.
-String edlText(const EdlList& list, const EdlTextOptions& options = {});
+QM_INTERCHANGE_API String edlText(const EdlList& list, const EdlTextOptions& options = {});
 
 /// The channel field: "V", "A", "A2", "AA", "B", "A2/V", "AA/V"; "NONE" for none of picture, A1 and A2.
-std::string_view edlChannelText(EdlChannels channels);
+QM_INTERCHANGE_API std::string_view edlChannelText(EdlChannels channels);
 
 /// The note that adds the channels 3 and up: "AUD  3    4". Empty when there are none.
-String edlAudioNote(EdlChannels channels);
+QM_INTERCHANGE_API String edlAudioNote(EdlChannels channels);
 
 /// The note of a speed, `digits` as `edlSpeedDigits` gives them: reel, digits, and the source frame at which
 /// it applies.
-String edlSpeedNote(const String& reel, const String& digits, int64_t at, Qx::FrameRate rate, bool drop);
+QM_INTERCHANGE_API String edlSpeedNote(const String& reel, const String& digits, int64_t at,
+                                       Qx::FrameRate rate, bool drop);
 
 /// Frames a second of a speed factor, with one decimal: "047.6", "-024.0", "000.0". The factor counts the
 /// labels of a second (`EdlSpeed`).
-String edlSpeedDigits(double velocity, Qx::FrameRate rate);
+QM_INTERCHANGE_API String edlSpeedDigits(double velocity, Qx::FrameRate rate);
 
 } // namespace interchange

@@ -1,6 +1,7 @@
 #pragma once
 
-#include "interchange/edl_tracks.h"
+#include "interchange/edl/edl_tracks.h"
+#include "interchange/export.h"
 #include "interchange/import.h"
 
 namespace interchange {
@@ -18,10 +19,10 @@ namespace interchange {
 /// Each source is a shot (log type 1) that holds the span used of it, on the tracks used, at the source
 /// timecode in seconds from midnight. Two events have one source if reel, clip name and source file all
 /// agree; events of the reel "AX" without either name have a source each.
-Qx::Status importEdl(const String& path, const ImportOptions& options, Import& result);
+QM_INTERCHANGE_API Qx::Status importEdl(const String& path, const ImportOptions& options, Import& result);
 
 /// The same from a list that was read. `name` is used where it has no title.
-Qx::Status importEdlList(const EdlList& list, const String& name, const ImportOptions& options,
-                         Import& result);
+QM_INTERCHANGE_API Qx::Status importEdlList(const EdlList& list, const String& name,
+                                            const ImportOptions& options, Import& result);
 
 } // namespace interchange

@@ -1,8 +1,8 @@
-#include "interchange/detail/edl_markers.h"
+#include "interchange/edl/detail/edl_markers.h"
 
-#include "interchange/detail/edl_line.h"
-#include "interchange/detail/edl_note.h"
-#include "interchange/detail/edl_sources.h"
+#include "interchange/edl/detail/edl_line.h"
+#include "interchange/edl/detail/edl_note.h"
+#include "interchange/edl/detail/edl_sources.h"
 #include "interchange/marker_colour.h"
 #include "platform/media/timecode.h"
 

@@ -1,4 +1,4 @@
-#include "interchange/detail/edl_reading.h"
+#include "interchange/edl/detail/edl_reading.h"
 #include "platform/media/timecode.h"
 
 #include <algorithm>

@@ -1,8 +1,8 @@
 #pragma once
 
-#include "interchange/detail/edl_sources.h"
-#include "interchange/edl_reader.h"
-#include "interchange/edl_records.h"
+#include "interchange/edl/detail/edl_sources.h"
+#include "interchange/edl/edl_reader.h"
+#include "interchange/edl/edl_records.h"
 
 namespace interchange::detail {
 

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "interchange/edl_reader.h"
+#include "interchange/edl/edl_reader.h"
 
 namespace interchange::detail {
 

@@ -1,7 +1,7 @@
-#include "interchange/edl_import.h"
+#include "interchange/edl/edl_import.h"
 
 #include "edit/model/edit.h"
-#include "interchange/edl_records.h"
+#include "interchange/edl/edl_records.h"
 #include "interchange/marker_colour.h"
 #include "platform/services/files.h"
 

@@ -1,6 +1,6 @@
-#include "interchange/edl_reader.h"
+#include "interchange/edl/edl_reader.h"
 
-#include "interchange/detail/edl_reading.h"
+#include "interchange/edl/detail/edl_reading.h"
 #include "platform/base/text_lines.h"
 #include "platform/media/timecode.h"
 #include "platform/services/files.h"
