@@ -9,6 +9,7 @@
 #include "platform/store/streamable_layer.h"
 #include "platform/store/text_file.h"
 
+#include <functional>
 #include <map>
 
 /// How `chequerboard` treats a fade at a cut.
@@ -307,8 +308,11 @@ public:
     /// Merges pairs that touch. `MergeBlack`: black with black. `MergeThrough`: pairs of one source, velocity
     /// and code, the second going on where the first stops, at one level throughout and without a fade at the
     /// cut. The pair keeps the stamps of its two ends; what was bound to the in point at the cut is no longer
-    /// bound, so whoever binds effects asks first. False if there was nothing to merge.
-    bool simplify(Simplification::Type type);
+    /// bound, so whoever binds something says what may be merged: `mayMerge`, if given, is asked with the in
+    /// points of two pairs that would be, each followed by its out point. False if there was nothing to
+    /// merge.
+    using MayMerge = std::function<bool(const channel_event* pair, const channel_event* next)>;
+    bool simplify(Simplification::Type type, const MayMerge& mayMerge = nullptr);
 
     /// Non-zero if the events are consistent: in and out points paired, in order, every field one that a cel
     /// may hold, stamps set.

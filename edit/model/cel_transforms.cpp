@@ -256,16 +256,17 @@ bool cel::fillToTime(double time) {
     return true;
 }
 
-bool cel::simplify(Simplification::Type type) {
+bool cel::simplify(Simplification::Type type, const MayMerge& mayMerge) {
     if (m_events.size() % 2 != 0) {
         return false;
     }
-    const auto merge = [type](const channel_event* pair, const channel_event* next) {
+    const auto merge = [&](const channel_event* pair, const channel_event* next) {
         const bool black =
             (type & Simplification::MergeBlack) != 0 && pair->strip.isBlack() && next->strip.isBlack();
         const bool through =
             (type & Simplification::MergeThrough) != 0 && playsThrough(pair[0], pair[1], next[0], next[1]);
-        return next->editTime - pair[1].editTime <= kTolerance && (black || through);
+        return next->editTime - pair[1].editTime <= kTolerance && (black || through) &&
+               (!mayMerge || mayMerge(pair, next));
     };
     // Nothing is touched up to the first pair that goes, and nothing at all without one.
     size_t first = 2;
