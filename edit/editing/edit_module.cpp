@@ -170,6 +170,26 @@ std::pair<double, double> EditModule::getMarkTimes(const IdStamp& chan) const {
     return {getMarkTime(chan, InMark), getMarkTime(chan, OutMark)};
 }
 
+double EditModule::Record::markInOrder(MarkType type) const {
+    const bool turned = in != kNoTime && out != kNoTime && out < in;
+    return (type == InMark) == turned ? out : in;
+}
+
+double EditModule::getMarkedPlace(const IdStamp& chan, MarkType type) const {
+    const Record* const own = m_edit.valid() && isMarkType(type) ? record(chan) : nullptr;
+    double found = own != nullptr ? own->markInOrder(type) : kNoTime;
+    if (found != kNoTime || !m_edit.valid() || !isMarkType(type)) {
+        return found != kNoTime ? found : m_current;
+    }
+    for (const auto& [other, its] : m_records) {
+        const double time = its.selected ? its.markInOrder(type) : kNoTime;
+        if (time != kNoTime && (found == kNoTime || (type == InMark ? time < found : time > found))) {
+            found = time;
+        }
+    }
+    return found != kNoTime ? found : m_current;
+}
+
 bool EditModule::isMarked() const {
     return isMarked(InMark) || isMarked(OutMark);
 }

@@ -77,6 +77,12 @@ public:
     [[nodiscard]] double getMarkTime(Qx::MarkTypes::MarkType type) const;
     /// In and out mark.
     [[nodiscard]] std::pair<double, double> getMarkTimes(const IdStamp& chan) const;
+    /// The place that a mark names for a channel, as operations take it: of the channel's own marks, else of
+    /// those of the module's selected channels (the earliest in mark, the latest out mark), else the current
+    /// time. Marks are put in order first, as `getMarkedRegion` does: of two, the earlier is the in mark
+    /// whichever it was set as. Equal marks are one point. `Qx::kNoTime` if nothing is set; a null stamp asks
+    /// for the module's.
+    [[nodiscard]] double getMarkedPlace(const IdStamp& chan, Qx::MarkTypes::MarkType type) const;
     /// True if a selected channel has a mark, or one of the type.
     [[nodiscard]] bool isMarked() const;
     [[nodiscard]] bool isMarked(Qx::MarkTypes::MarkType type) const;
@@ -133,6 +139,7 @@ private:
         double out = Qx::kNoTime;
         bool selected = true;
         [[nodiscard]] bool marked() const { return in != Qx::kNoTime || out != Qx::kNoTime; }
+        [[nodiscard]] double markInOrder(Qx::MarkTypes::MarkType type) const;
     };
 
     [[nodiscard]] const Record* record(const IdStamp& chan) const;

@@ -11,7 +11,8 @@
 /// Each is drawn before and after: one character a second, an upper-case letter for each source in the
 /// destination, a lower-case one for what is laid, '.' for black. '[' and ']' stand over the first second
 /// behind an in mark and an out mark, '^' over the first second behind the current time. The source is
-/// "ddee", marked over its second and third second: its region is "de".
+/// "ddee", marked over its second and third second: its region is "de". The earlier of two marks is the in
+/// mark, whichever it was set as.
 ///
 ///      1 Replace             ^                       The source region overwrites from the in mark, else
 ///                          AAAABBB  ->  AAdeBBB      the current time.
@@ -41,7 +42,8 @@
 ///                          AAAABBB  ->  AA...BB
 ///                          CCCCDDD  ->  CCAABDD
 ///     13 FillBlack           ^                       As Replace, but the source appears only where the
-///                          AAA.BBB  ->  AAAeBBB      destination is black.
+///                          AAA.BBB  ->  AAAeBBB      destination is black, and not behind the later of two
+///                                                    different marks of the destination.
 ///     14 BackInsert            ^                     As Insert, so that the inserted region ends at the out
 ///                          AAAABBB  ->  AdeAAABBB    mark, else the current time ('^' at 3 here).
 ///     15 BackInsertMarked    [  ]                    As InsertMarked, so that the inserted region ends at

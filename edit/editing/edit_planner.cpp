@@ -8,8 +8,11 @@
 using editing_detail::isContinuous;
 using editing_detail::secondsText;
 using Op = edit_operation;
+using editing_detail::roundTo;
 using Qx::kNoTime;
 using Qx::kTimeTolerance;
+using Qx::MarkTypes::InMark;
+using Qx::MarkTypes::OutMark;
 
 namespace {
 
@@ -41,9 +44,12 @@ IdStamp otherEye(const Edit& edit, const IdStamp& chan) {
 Editor::Planner::Planner(const EditModule& source, const EditModule& destination, edit_operation op,
                          unsigned flags)
     : m_source(source), m_destination(destination), m_op(op), m_core(::getCoreEditOperation(op)),
-      m_flags(flags),
-      m_mode((flags & Editor::ExactTimes) != 0 ? EditModule::ExactTimes : EditModule::WholeFrames),
-      m_span(0, 0) {}
+      m_flags(flags), m_rate(destination.getEdit()->getFrameRate()), m_sourceRate(m_rate), m_span(0, 0) {
+    m_source.verify();
+    if (editOpRequiresSourceAndDest(op) && Editor::checkMarks(m_source)) {
+        m_sourceRate = m_source.getEdit()->getFrameRate();
+    }
+}
 
 bool Editor::Planner::refuse(String reason) {
     m_reason = std::move(reason);
@@ -94,12 +100,13 @@ bool Editor::Planner::planWithSource() {
         !planPass(m_destination, true)) {
         return false;
     }
-    if (m_plan->steps.empty()) {
-        return refuse(m_op == Op::FillBlack
-                          ? "nothing is black in the destination's region"
-                          : "no selected channel of the source has one in the destination to go to");
+    if (std::none_of(m_plan->targets.begin(), m_plan->targets.end(),
+                     [](const Target& target) { return target.source.valid(); })) {
+        return refuse("no selected channel of the source has one in the destination to go to");
     }
-    return true;
+    return !m_plan->steps.empty() ||
+           refuse(m_op == Op::FillBlack ? "nothing is black in the destination's region"
+                                        : "the selected channels of the source hold nothing to lay");
 }
 
 /// The source's region, and for the operations that fill the destination's its length.
@@ -113,8 +120,8 @@ bool Editor::Planner::findSourceSpan() {
         return true;
     }
     const double end = m_source.getEdit()->getEndTime();
-    m_span = m_source.isMarked() ? m_source.getMarkedRegion(m_mode)
-                                 : Range(rounded(m_source.getEdit()->getStartTime()), rounded(end));
+    m_span = sourceRegion(m_source.isMarked() ? m_source.getMarkedRegion(EditModule::ExactTimes)
+                                              : Range(m_source.getEdit()->getStartTime(), end));
     if (m_span.end() == kNoTime) {
         return refuse("the source needs two different marks, or one and a current time");
     }
@@ -210,18 +217,27 @@ bool Editor::Planner::findLay(const Target& target, const EditModule& destinatio
         const double length = m_core == kCoreInsert ? m_markedLength : own.length();
         lay.at = lay.open = own.start();
         if (target.source.valid()) {
-            const double mark = editOpIsBackwards(m_op) ? outMark(m_source, target.source) - length
-                                                        : inMark(m_source, target.source);
-            lay.region = Range(mark, mark + length);
+            const bool back = editOpIsBackwards(m_op);
+            const double mark = m_source.getMarkedPlace(target.source, back ? OutMark : InMark);
+            const double place = exact() || mark >= kNoTime ? mark : roundTo(m_sourceRate, mark);
+            const double start = back ? place - length : place;
+            lay.region = Range(start, start + length);
         } else {
             lay.region = Range(0, length);
         }
     } else {
         const bool own = target.source.valid() && m_source.isMarked(target.source);
-        lay.region = own ? m_source.getMarkedRegion(target.source, m_mode) : m_span;
-        lay.open = editOpIsBackwards(m_op) ? outMark(destination, target.chan) - m_span.length()
-                                           : inMark(destination, target.chan);
-        lay.at = lay.open + (lay.region.start() - m_span.start());
+        lay.region =
+            own ? sourceRegion(m_source.getMarkedRegion(target.source, EditModule::ExactTimes)) : m_span;
+        const bool back = editOpIsBackwards(m_op);
+        const double place = rounded(destination.getMarkedPlace(target.chan, back ? OutMark : InMark));
+        lay.open = back ? place - m_span.length() : place;
+        lay.at = rounded(lay.open + (lay.region.start() - m_span.start()));
+        // Two roundings may add up to a frame more than the whole has.
+        const double room = lay.open + m_span.length() - lay.at;
+        if (lay.region.length() > room + kTimeTolerance) {
+            lay.region = Range(lay.region.start(), lay.region.start() + std::max(room, 0.0));
+        }
     }
     if (lay.open >= kNoTime || lay.at >= kNoTime || lay.region.end() >= kNoTime) {
         return refuse("the " + String(lay.region.end() >= kNoTime ? "source" : "destination") +
@@ -288,17 +304,16 @@ void Editor::Planner::addFillBlack(size_t target, const Lay& lay) {
     const Edit& edit = *m_destination.getEdit();
     const cel* const content = its.chan.valid() ? edit.get_edit_cel_p(edit.getIdx(its.chan)) : nullptr;
     double to = lay.at + lay.region.length();
-    if (m_destination.isMarked(Qx::MarkTypes::InMark) && m_destination.isMarked(Qx::MarkTypes::OutMark)) {
-        Range own;
-        if (!destinationRegion(m_destination, its.chan, own)) {
-            return;
-        }
-        to = std::min(to, own.end());
+    if (m_destination.isMarked(InMark) && m_destination.isMarked(OutMark)) {
+        const double out = m_destination.getMarkedPlace(its.chan, OutMark);
+        to = out > m_destination.getMarkedPlace(its.chan, InMark) ? std::min(to, rounded(out)) : to;
     }
     const auto fill = [&](double from, double end) {
         if (its.source.valid() && end - from > kTimeTolerance) {
-            const double start = lay.region.start() + (from - lay.at);
-            addCopyStep(target, from, *m_source.getEdit(), its.source, Range(start, start + (end - from)));
+            const double lead = from - lay.at;
+            const double start = lay.region.start() + lead;
+            addCopyStep(target, from, *m_source.getEdit(), its.source, Range(start, start + (end - from)),
+                        lead);
         }
     };
     double now = lay.at;

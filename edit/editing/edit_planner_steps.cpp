@@ -12,8 +12,6 @@ using editing_detail::secondsText;
 using Op = edit_operation;
 using Qx::kNoTime;
 using Qx::kTimeTolerance;
-using Qx::MarkTypes::InMark;
-using Qx::MarkTypes::OutMark;
 
 namespace {
 
@@ -77,26 +75,44 @@ bool isWritable(const Edit& edit) {
     return !edit.get_read_only() && !PermissionsManager::getReadOnly(edit.get_cookie());
 }
 
+double roundTo(Qx::FrameRate rate, double time) {
+    return rate.valid() ? rate.toSeconds(rate.toFrames(time)) : time;
+}
+
 String secondsText(double seconds) {
     return Qx::doubleToText(std::round(seconds * 1000) / 1000);
 }
 
 } // namespace editing_detail
 
+/// To whole frames of the destination, unless times are to stay exact; one that is not set stays so.
 double Editor::Planner::rounded(double time) const {
-    return m_mode == EditModule::ExactTimes || time >= kNoTime ? time : Qx::frameRound(time);
+    return exact() || time >= kNoTime ? time : editing_detail::roundTo(m_rate, time);
 }
 
-double Editor::Planner::inMark(const EditModule& module, const IdStamp& chan) const {
-    double time = module.getMarkTime(chan, InMark);
-    time = time == kNoTime ? module.getMarkTime(InMark) : time;
-    return rounded(time == kNoTime ? module.curTime() : time);
+/// A region of the source: it starts on a frame of the source and is whole frames of the destination long.
+cel::Range Editor::Planner::sourceRegion(const Range& exactly) {
+    if (exact() || exactly.end() >= kNoTime) {
+        return exactly;
+    }
+    const Range own(editing_detail::roundTo(m_sourceRate, exactly.start()),
+                    editing_detail::roundTo(m_sourceRate, exactly.end()));
+    if (!changesRate()) {
+        return own;
+    }
+    const double length = rounded(own.length());
+    m_plan->roundedBy = std::max(m_plan->roundedBy, std::abs(length - own.length()));
+    return {own.start(), own.start() + length};
 }
 
-double Editor::Planner::outMark(const EditModule& module, const IdStamp& chan) const {
-    double time = module.getMarkTime(chan, OutMark);
-    time = time == kNoTime ? module.getMarkTime(OutMark) : time;
-    return rounded(time == kNoTime ? module.curTime() : time);
+String Editor::Planner::notice(const Plan& plan) const {
+    if (plan.roundedBy <= kTimeTolerance) {
+        return {};
+    }
+    return "the source runs at " + m_sourceRate.asString() + " frames a second and the destination at " +
+           m_rate.asString() +
+           ": what was laid has its cuts on whole frames of the destination, moved by up to " +
+           secondsText(plan.roundedBy) + " s";
 }
 
 String Editor::Planner::nameOf(const Target& target) const {
@@ -106,8 +122,9 @@ String Editor::Planner::nameOf(const Target& target) const {
 
 /// A channel's own marked region, else the module's. False with the refusal set if there is none.
 bool Editor::Planner::destinationRegion(const EditModule& destination, const IdStamp& chan, Range& region) {
-    region = destination.isMarked(chan) ? destination.getMarkedRegion(chan, m_mode)
-                                        : destination.getMarkedRegion(m_mode);
+    region = destination.isMarked(chan) ? destination.getMarkedRegion(chan, EditModule::ExactTimes)
+                                        : destination.getMarkedRegion(EditModule::ExactTimes);
+    region = Range(rounded(region.start()), rounded(region.end()));
     if (region.start() == kNoTime) {
         return refuse("the destination has no marked region; set an in and an out mark");
     }
@@ -142,21 +159,54 @@ void Editor::Planner::addStep(Op core, size_t target, double at, double length,
     m_plan->steps.push_back(std::move(step));
 }
 
-void Editor::Planner::addBlackStep(Op core, size_t target, double at, double length) {
-    const bool continuous = isContinuous(m_plan->targets[target].type);
-    addStep(core, target, at, length, makePart(nullptr, Range(0, length), continuous));
+/// True for a channel that keeps its gaps and may not change in length, if what is laid up to `to` lies at
+/// its end: what is empty there has to be black.
+bool Editor::Planner::mustHoldEnd(const Target& target, double to) const {
+    return !editOpCanAffectTrackLength(m_op) && to >= endOf(target.chan) - kTimeTolerance;
 }
 
-/// A step that overwrites with a part of a channel, with the levels that are heard there.
+void Editor::Planner::addBlackStep(Op core, size_t target, double at, double length) {
+    const Target& its = m_plan->targets[target];
+    const bool black = isContinuous(its.type) || mustHoldEnd(its, at + length);
+    addStep(core, target, at, length, makePart(nullptr, Range(0, length), black));
+}
+
+/// A part as `makePart` gives it, with its cuts on frames of the destination. It lies `lead` seconds behind a
+/// frame of the destination; a lead is content of the source too.
+std::shared_ptr<cel> Editor::Planner::takePart(const cel* content, const Range& region, bool fillGaps,
+                                               double lead) {
+    if (content == nullptr || !changesRate()) {
+        return content != nullptr ? makePart(content, region, fillGaps) : nullptr;
+    }
+    const std::shared_ptr<cel> whole = makePart(content, {region.start() - lead, region.end()}, fillGaps);
+    const std::shared_ptr<cel> part = whole != nullptr ? onFrames(whole) : nullptr;
+    return part == nullptr || lead <= kTimeTolerance
+               ? part
+               : makePart(part.get(), {lead, lead + region.length()}, fillGaps);
+}
+
+std::shared_ptr<cel> Editor::Planner::onFrames(const std::shared_ptr<cel>& part) {
+    for (int i = 0; i < part->numEvents(); ++i) {
+        const double time = part->getChanEventPtr(i)->editTime;
+        m_plan->roundedBy = std::max(m_plan->roundedBy, std::abs(rounded(time) - time));
+    }
+    part->set_resolution(m_rate.frameDuration());
+    return part->quantise();
+}
+
+/// A step that overwrites with a part of a channel, with the levels that are heard there. The step lies
+/// `lead` seconds behind a frame of the destination.
 void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, const IdStamp& chan,
-                                  const Range& region) {
+                                  const Range& region, double lead) {
     Target& its = m_plan->targets[target];
-    const cel* const content = from.get_edit_cel_p(from.getIdx(chan));
     std::shared_ptr<cel> part =
-        content != nullptr ? makePart(content, region, isContinuous(its.type)) : nullptr;
+        takePart(from.get_edit_cel_p(from.getIdx(chan)), region, isContinuous(its.type), lead);
     const bool refers = from.isShot() && from.get_cookie().isStorable() && &from != &*m_destination.getEdit();
     if (refers && part != nullptr) {
         part = referTo(from.get_cookie(), *part, region.start());
+    }
+    if (part != nullptr && mustHoldEnd(its, at + region.length())) {
+        part->fillToTime(region.length());
     }
     if (part == nullptr) {
         refuse("a part of the source cannot be taken from " + from.getChanDisplayName(chan) +

@@ -1,7 +1,8 @@
 #include "edit/editing/detail/edit_plan.h"
 
-#include <cmath>
+#include <algorithm>
 
+using editing_detail::secondsText;
 using Op = edit_operation;
 using Qx::kTimeTolerance;
 
@@ -17,26 +18,26 @@ Vector<IdStamp> selectedOf(const EditModule& module, const Edit::ChanType& kind)
     return chans;
 }
 
-double endOf(const Edit& edit, const IdStamp& chan) {
+} // namespace
+
+double Editor::Planner::endOf(const IdStamp& chan) const {
+    const Edit& edit = *m_destination.getEdit();
     const cel* const its = edit.get_edit_cel_p(edit.getIdx(chan));
     return its != nullptr ? its->get_end_time() : 0;
 }
-
-} // namespace
 
 bool Editor::Planner::planWithin() {
     return editOpIsInterTrack(m_op) ? planInterTrack() : planRemoveOrLift();
 }
 
 bool Editor::Planner::planRemoveOrLift() {
-    const Edit& edit = *m_destination.getEdit();
     for (const Edit::ChanType& kind : kKinds) {
         for (const IdStamp& chan : selectedOf(m_destination, kind)) {
             Range region;
             if (!destinationRegion(m_destination, chan, region)) {
                 return false;
             }
-            const double end = endOf(edit, chan);
+            const double end = endOf(chan);
             if (region.start() >= end - kTimeTolerance) {
                 continue; // nothing lies there
             }
@@ -59,6 +60,7 @@ bool Editor::Planner::planInterTrack() {
     const char* const needed = m_op == Op::SwapTracks
                                    ? "needs exactly two selected channels of a kind to change places"
                                    : "needs at least two selected channels of a kind";
+    bool anyKind = false;
     for (const Edit::ChanType& kind : kKinds) {
         const Vector<IdStamp> chans = selectedOf(m_destination, kind);
         if (chans.size() < 2) {
@@ -67,68 +69,62 @@ bool Editor::Planner::planInterTrack() {
         if (m_op == Op::SwapTracks && chans.size() > 2) {
             return refuse(String(editOperationName(m_op)) + " " + needed);
         }
+        anyKind = true;
         if (!(m_op == Op::SwapTracks ? addSwap(chans) : addCopies(chans))) {
             return false;
         }
     }
-    if (m_plan->targets.empty()) {
+    if (!anyKind) {
         return refuse(String(editOperationName(m_op)) + " " + needed);
     }
     return !m_plan->steps.empty() || refuse("nothing lies in the marked region of the selected channels");
 }
 
-bool Editor::Planner::addSwap(const Vector<IdStamp>& chans) {
+/// A step that lays a region of one channel at the same times of another, as far as that reaches: no channel
+/// becomes longer. False with the refusal set if something would be left out so.
+bool Editor::Planner::addFittingStep(const IdStamp& from, const IdStamp& to, const Range& region) {
     const Edit& edit = *m_destination.getEdit();
-    Range regions[2];
-    for (size_t i = 0; i < 2; ++i) {
-        if (!destinationRegion(m_destination, chans[i], regions[i])) {
-            return false;
-        }
+    const cel* const content = edit.get_edit_cel_p(edit.getIdx(from));
+    const double reach = std::clamp(endOf(to), region.start(), region.end());
+    Target target;
+    target.type = edit.getChanTypeAndSubType(to);
+    target.chan = to;
+    target.source = from;
+    if (content != nullptr && region.end() - reach > kTimeTolerance &&
+        !content->isEmpty(Range(reach, region.end()))) {
+        return refuse(nameOf(target) + " ends at " + secondsText(endOf(to)) + " s, and " +
+                      String(editOperationName(m_op)) +
+                      " makes no channel longer; mark no more than that, "
+                      "deselect the channel or fill it first");
     }
-    if (std::abs(regions[0].length() - regions[1].length()) > kTimeTolerance) {
-        return refuse("the marked regions that shall change places differ in length");
-    }
-    // Beyond the end of both there is nothing to change, and no channel grows beyond the edit.
-    const double edge = edit.getEndTime();
-    const double length =
-        std::min({regions[0].length(), edge - regions[0].start(), edge - regions[1].start()});
-    if (!(length > kTimeTolerance)) {
-        return refuse("nothing lies in the marked region of the selected channels");
-    }
-    for (size_t i = 0; i < 2; ++i) {
-        Target target;
-        target.type = edit.getChanTypeAndSubType(chans[i]);
-        target.chan = chans[i];
-        target.source = chans[1 - i];
-        const double from = regions[1 - i].start();
-        addCopyStep(addTarget(target), regions[i].start(), edit, target.source, Range(from, from + length));
+    if (reach - region.start() > kTimeTolerance) {
+        addCopyStep(addTarget(target), region.start(), edit, from, Range(region.start(), reach));
     }
     return m_reason.empty();
 }
 
+bool Editor::Planner::addSwap(const Vector<IdStamp>& chans) {
+    Range region;
+    return destinationRegion(m_destination, IdStamp(), region) &&
+           addFittingStep(chans[0], chans[1], region) && addFittingStep(chans[1], chans[0], region);
+}
+
 bool Editor::Planner::addCopies(const Vector<IdStamp>& chans) {
-    const Edit& edit = *m_destination.getEdit();
     Range region;
     if (!destinationRegion(m_destination, chans[0], region)) {
         return false;
     }
-    const double length = std::min(region.end(), edit.getEndTime()) - region.start();
-    if (!(length > kTimeTolerance)) {
-        return refuse("nothing lies in the marked region of the selected channels");
-    }
-    Target target;
-    target.type = edit.getChanTypeAndSubType(chans[0]);
     for (size_t i = 1; i < chans.size(); ++i) {
-        target.chan = chans[i];
-        target.source = chans[0];
-        addCopyStep(addTarget(target), region.start(), edit, chans[0],
-                    Range(region.start(), region.start() + length));
+        if (!addFittingStep(chans[0], chans[i], region)) {
+            return false;
+        }
     }
-    const double own = std::min(length, endOf(edit, chans[0]) - region.start());
-    if (m_op == Op::MoveTrack && own > kTimeTolerance) {
-        target.chan = chans[0];
-        target.source = IdStamp();
-        addBlackStep(kCoreReplace, addTarget(target), region.start(), own);
+    const double length = std::min(region.end(), endOf(chans[0])) - region.start();
+    if (m_op == Op::MoveTrack && length > kTimeTolerance) {
+        Target first;
+        first.type = m_destination.getEdit()->getChanTypeAndSubType(chans[0]);
+        first.chan = chans[0];
+        addBlackStep(kCoreReplace, addTarget(first), region.start(), length);
     }
     return m_reason.empty();
 }

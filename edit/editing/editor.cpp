@@ -41,7 +41,6 @@ Editor::Result Editor::applyInternal(const EditModule& source, const EditModule&
         return result;
     }
     m_destination = destination;
-    m_destination.verify();
     Edit& edit = *m_destination.getEdit();
     // Whoever saves edits on another thread waits until this one is whole again.
     const std::lock_guard<criticalSection> hold(edit.section());
@@ -56,6 +55,7 @@ Editor::Result Editor::applyInternal(const EditModule& source, const EditModule&
         performEdit(op, result);
     }
     result.m_type = edit.getNumChans() == numChans ? m_type : kChansInserted;
+    result.m_notice = m_notice;
     doPostEditTasks(result);
     return result;
 }
@@ -78,9 +78,11 @@ bool Editor::doPreEditTasks(const EditModule& source, edit_operation op) {
 }
 
 bool Editor::makePlan(const EditModule& source, edit_operation op) {
+    m_destination.verify();
     Planner planner(source, m_destination, op, m_flags);
     m_plan = planner.plan();
     m_refusal = planner.reason();
+    m_notice = m_plan != nullptr ? planner.notice(*m_plan) : String();
     return m_plan != nullptr;
 }
 
@@ -96,7 +98,7 @@ bool Editor::backUp() {
         return false;
     }
     const bool together = config_int("undo_clipboard", 1) != 0;
-    if (m_clipboardReady && together && EditPtr(clipboard_cookie, eOpenOrCreate).valid() &&
+    if (m_clipboardReady && together && openClipboard().valid() &&
         !edit_manager::backup_edit(clipboard_cookie)) {
         herc_printf("Editor::backUp() : the clipboard cannot be backed up and is left as it is\n");
         m_clipboardReady = false;

@@ -19,7 +19,8 @@
 /// **Channels** correspond by kind (effects, video, audio) and by order among the selected ones of either
 /// side. Where a source has more, and no channel of the kind is deselected in the destination, channels are
 /// added for those that hold something; otherwise the surplus is left out. Where the destination has more, an
-/// insert opens them with black, `ReplaceToEnd` ends them, and other operations leave them alone.
+/// insert opens them with black, `ReplaceToEnd` ends them, and other operations leave them alone. An
+/// operation that needs a source is refused when no selected channel of it goes anywhere.
 ///
 /// **Shots.** A source that is a shot (`Edit::isShot`) is not copied but named: what is laid plays the shot,
 /// by the shot's own times, with the levels and effects that the shot has. The content of any other source is
@@ -28,14 +29,36 @@
 /// **Regions.** The source region of a channel is its own marked region, else the module's, else all that the
 /// source holds, from its first event to its last. Regions of different channels keep their distance from one
 /// another. The place in the destination is a channel's own mark, else the module's (earliest in, latest
-/// out), else the current time. What the source does not have within its region is black. The lengths by
-/// which channels move are worked out once for all of them, so that picture and sound stay in step to the
-/// sample however many operations are done.
+/// out), else the current time (`EditModule::getMarkedPlace`). Marks that were set the wrong way round are
+/// put in order, on both sides and for every operation. `SwapTracks` works on the module's marked region on
+/// both channels. What the source does not have within its region is black. The lengths by which channels
+/// move are worked out once for all of them, so that picture and sound stay in step to the sample however
+/// many operations are done.
+///
+/// **Frames.** Unless `ExactTimes` is asked for, marks and the current time are rounded to whole frames,
+/// those of the destination in the destination and those of the source in the source, and a region is whole
+/// frames of the destination long. The cuts of a source whose frame rate is another one are moved to the
+/// nearest frame of the destination; what plays at a time stays, each clip is trimmed or drawn out by less
+/// than a frame, and one that is rounded to nothing is left out. `Result::notice` tells of it. Cuts of a
+/// source of the same rate stay as they are, also those that lie between frames. Here '^' stands at the
+/// frames of the destination and a cut lies between two of them:
+///
+///     aaabbbbb  ->  aaaabbbb
+///     ^   ^   ^     ^   ^   ^
+///
+/// **Lengths.** `Lift`, `SwapTracks`, `CopyTrack` and `MoveTrack` change no channel's length. What ends with
+/// the region ends with black, on an effects channel too; where a channel ends before the region does,
+/// nothing is laid behind its end, and the operation is refused if anything but black would be left out so:
+///
+///                  [ ]                        [ ]
+///     CopyTrack  AAA.BB  ->  AAA.BB         AAAABB    refused: the second channel ends
+///                CCC         CCA            CCC       before what it would hold
 ///
 /// **Black.** Video and audio channels are continuous: an operation that lays something behind a channel's
 /// end fills up with black to it, gaps of what is laid become black, and where channels can change in length
-/// all are as long as the longest afterwards. Adjacent black is merged where the operation made it, unless
-/// something is bound to it. Effects channels keep their gaps and their lengths.
+/// all are as long as the longest afterwards. Adjacent black is merged where the operation made it, but for
+/// black that an effect is bound to and where a cue is attached to an event that would go. Effects channels
+/// keep their gaps and are not filled; black on one is no effect.
 ///
 /// **Levels** go with their audio channel: what is laid brings its levels along, or those of its clips, and
 /// what moves is heard as before. A levels channel is added where the source has levels and the destination
@@ -58,7 +81,8 @@
 /// **Clipboard.** What a removing or overwriting operation takes away is put, from time 0 on, into the
 /// clipboard edit, which is backed up too, and "CLIPBOARD_USED" is set in the destination. The clipboard
 /// stays as it is when it is the source or the destination itself, with `KeepClipboard`, and when there is no
-/// manager to open it; where it cannot be backed up the log says so and the operation goes on.
+/// manager to open it; where it cannot be opened, written or backed up the log says so and the operation goes
+/// on.
 ///
 /// The source may be the edit of the destination: the result is as if it had been copied first.
 ///
@@ -70,7 +94,7 @@ class QM_API Editor {
 public:
     /// Flags of `apply`, to be combined. Another bit refuses the operation.
     enum Flags : unsigned {
-        ExactTimes = 1,    ///< marks and times as they are, not rounded to whole frames
+        ExactTimes = 1,    ///< marks, times and cuts as they are, not rounded to whole frames
         KeepClipboard = 2, ///< the clipboard edit stays as it is
         NoBackup = 4,      ///< no undo backup is made; implies `KeepClipboard`
         NoNewChannels = 8  ///< no channel is added: what would need one is left out
@@ -92,6 +116,9 @@ public:
         [[nodiscard]] bool valid() const { return m_type != kNoModification; }
         /// Why it was refused: one line for a person, empty when it was done.
         [[nodiscard]] const String& reason() const { return m_reason; }
+        /// What a person should know of an operation that was done: one line; empty when it was done just as
+        /// asked. It tells that cuts were moved to whole frames (see Frames).
+        [[nodiscard]] const String& notice() const { return m_notice; }
 
     private:
         friend class Editor;
@@ -100,6 +127,7 @@ public:
         bool m_syncLoss = false;
         EditModificationType m_type = kNoModification;
         String m_reason;
+        String m_notice;
     };
 
     /// Performs an operation. `source` is not looked at by operations that need none.
@@ -160,6 +188,7 @@ private:
     void bindEffects(const cel::IdMap& copied, const cel::IdMap& splits);
     void padTracksWithBlack(edit_operation op);
     void simplifyBlack();
+    void noteTouched(const IdStamp& chan, const cel::Range& span);
     void verifyTracks();
     void verifyAudioNodes();
     [[nodiscard]] bool recordInterTrackSyncLosses();
@@ -170,18 +199,19 @@ private:
     /// Adds a channel with content to an edit; its stamp, or the null one.
     static IdStamp setCel(Edit& edit, Edit::ChanType type, std::unique_ptr<cel> content);
     [[nodiscard]] cel* celOf(const IdStamp& chan) const;
-    [[nodiscard]] bool mayMergeBlack(const cel& its) const;
+    [[nodiscard]] static EditPtr openClipboard();
 
     unsigned m_flags;
     EditModule m_destination; ///< the working copy
     EditPtr m_source;         ///< the edit whose objects are copied with its events
     SrcToDestChanMap m_map;
     std::unique_ptr<Plan> m_plan;
-    Vector<IdStamp> m_touched; ///< the channels whose content was changed
+    std::map<IdStamp, cel::Range> m_touched; ///< where the content of channels was changed
     Vector<IdStamp> m_added;
     size_t m_numLevelsAdded = 0;
     IdStamp m_firstLevelsAdded;
     EditModificationType m_type = kNoModification;
     bool m_clipboardReady = false;
     String m_refusal;
+    String m_notice;
 };

@@ -1,4 +1,6 @@
 #include "edit/editing/detail/edit_plan.h"
+#include "edit/manager/edit_manager.h"
+#include "platform/services/log.h"
 
 #include <algorithm>
 #include <mutex>
@@ -32,12 +34,26 @@ void copyEffects(const cel& its, TagBag& from, TagBag& to) {
 
 } // namespace
 
+/// The clipboard edit, made if the project has none; null if that is not possible. That it was looked for
+/// once and not there is remembered and answers every opening; it must not keep it from being made.
+EditPtr Editor::openClipboard() {
+    EditPtr clipboard(clipboard_cookie, eOpenOrCreate);
+    if (!clipboard.valid() && edit_manager::invalidateCache(clipboard_cookie)) {
+        clipboard = EditPtr(clipboard_cookie, eOpenOrCreate);
+    }
+    return clipboard;
+}
+
 /// Puts what the operation takes away or overwrites into the clipboard edit: a channel for each that is
 /// changed, the earliest region at time 0.
 void Editor::doClipboardEditing(edit_operation op) {
     Edit& edit = *m_destination.getEdit();
-    const EditPtr clipboard = m_clipboardReady ? EditPtr(clipboard_cookie, eOpenOrCreate) : EditPtr();
+    const EditPtr clipboard = m_clipboardReady ? openClipboard() : EditPtr();
     if (!clipboard.valid() || !editing_detail::isWritable(*clipboard)) {
+        if (m_clipboardReady) {
+            herc_printf("Editor::doClipboardEditing() : the clipboard cannot be %s and is left as it is\n",
+                        clipboard.valid() ? "written" : "opened");
+        }
         return;
     }
     const std::lock_guard<criticalSection> hold(clipboard->section());

@@ -64,6 +64,7 @@ void Editor::makeChanges(edit_operation op, CueFollower& cues) {
         if (its == nullptr) {
             continue; // a channel that could not be added; `autoAddTracks` has reported it
         }
+        const double end = its->get_end_time();
         if (step.core != kCoreRemove && editing_detail::isContinuous(target.type)) {
             its->fillToTime(step.at);
         }
@@ -77,9 +78,7 @@ void Editor::makeChanges(edit_operation op, CueFollower& cues) {
         EditOpPerformer::doLevels(levels, step);
         bindEffects(copied, splits);
         cues.noteCopies(target.chan, copied);
-        if (std::find(m_touched.begin(), m_touched.end(), target.chan) == m_touched.end()) {
-            m_touched.push_back(target.chan);
-        }
+        noteTouched(target.chan, {std::min(step.at, end), step.core == kCoreRemove ? step.at : step.end()});
     }
 }
 

@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <set>
 
 using editing_detail::isContinuous;
 using Qx::kTimeTolerance;
@@ -22,11 +23,12 @@ bool isBlackJoint(const cel& its, int pair) {
            touch(*out, *next);
 }
 
-/// The pairs of a cel that an operation on [from, to] may have changed, with a neighbour on either side.
-std::pair<int, int> pairsAround(const cel& its, double from, double to) {
-    const int first = std::max(its.find_ceh(from, CE_IN_POINT).index(), 0) / 2;
-    const int last = std::max(its.find_ceh(to, CE_IN_POINT).index(), 0) / 2;
-    return {std::max(first - 1, 0), std::min(last + 1, its.numPairs() - 1)};
+/// The pairs of a cel within a span that was changed, with the pieces that a cut left on either side and what
+/// touches those: a cue that kept them apart may have gone on with the other piece.
+std::pair<int, int> pairsAround(const cel& its, const cel::Range& span) {
+    const int first = std::max(its.find_ceh(span.start(), CE_IN_POINT).index(), 0) / 2;
+    const int last = std::max(its.find_ceh(span.end(), CE_IN_POINT).index(), 0) / 2;
+    return {std::max(first - 2, 0), std::min(last + 1, its.numPairs() - 1)};
 }
 
 } // namespace
@@ -108,64 +110,61 @@ void Editor::padTracksWithBlack(edit_operation op) {
         cel* const its = edit.get_edit_cel_p(i);
         if (its != nullptr && isContinuous({edit.getChanType(i), edit.getChanSubtype(i)}) &&
             its->fillToTime(end)) {
-            const IdStamp chan = edit.getId(i);
-            if (std::find(m_touched.begin(), m_touched.end(), chan) == m_touched.end()) {
-                m_touched.push_back(chan);
-            }
+            noteTouched(edit.getId(i), {CEHPair(its->get_end_ceh()).editRange().start(), end});
         }
     }
 }
 
-/// Merges black with black where the operation made them touch. The whole of a channel is walked only when
-/// there is something to merge.
+/// The channel was changed within the span: its pairs there, and those that touch them, are looked at when
+/// all is done.
+void Editor::noteTouched(const IdStamp& chan, const cel::Range& span) {
+    m_touched.try_emplace(chan, span).first->second.widen(span);
+}
+
+/// Merges black with black where the operation made them touch, but for black to which something is bound.
+/// The whole of a channel is walked only when there is something to merge.
 void Editor::simplifyBlack() {
-    const Edit& edit = *m_destination.getEdit();
-    for (const IdStamp& chan : m_touched) {
+    Edit& edit = *m_destination.getEdit();
+    std::set<IdStamp> cued; // worked out when first needed
+    bool cuesRead = false;
+    const auto mayMerge = [&](const channel_event* pair, const channel_event* next) {
+        const cue_list& cues = edit.get_cues();
+        for (size_t i = 0; !cuesRead && i < cues.get_num_cue_points(0); ++i) {
+            const cue_point& cue = *cues.get_cue_point(i, 0);
+            if (cue.attached() && cue.event().valid() != 0) {
+                cued.insert(cue.event().get_channel_event().id);
+            }
+        }
+        cuesRead = true;
+        // The events at the cut go; an effect would be seen for longer or not at all.
+        const TagBag& objects = edit.objectStore();
+        return !cued.contains(pair[1].id) && !cued.contains(next[0].id) &&
+               !objects.contains(pair[0].id.asString()) && !objects.contains(next[0].id.asString());
+    };
+    for (const auto& [chan, span] : m_touched) {
         cel* const its = celOf(chan);
-        if (its == nullptr || !isContinuous(edit.getChanTypeAndSubType(chan))) {
+        if (its == nullptr) {
             continue;
         }
-        const auto [first, last] = pairsAround(*its, m_plan->at, m_plan->at + m_plan->length);
-        bool found = isBlackJoint(*its, its->numPairs() - 2);
+        const auto [first, last] = pairsAround(*its, span);
+        bool found = false;
         for (int pair = first; pair <= last && !found; ++pair) {
             found = isBlackJoint(*its, pair);
         }
-        if (found && mayMergeBlack(*its)) {
-            its->simplify(Simplification::MergeBlack);
+        if (found) {
+            its->simplify(Simplification::MergeBlack, mayMerge);
         }
     }
-}
-
-/// False if an effect or a cue is bound to black that would be merged.
-bool Editor::mayMergeBlack(const cel& its) const {
-    Edit& edit = *m_destination.getEdit();
-    for (int pair = 0; pair + 1 < its.numPairs(); ++pair) {
-        if (isBlackJoint(its, pair)) {
-            for (const int event : {2 * pair, 2 * pair + 2}) {
-                if (edit.objectStore().contains(its.getChanEventPtr(event)->id.asString())) {
-                    return false;
-                }
-            }
-        }
-    }
-    const cue_list& cues = edit.get_cues();
-    for (size_t i = 0; i < cues.get_num_cue_points(0); ++i) {
-        const cue_point& cue = *cues.get_cue_point(i, 0);
-        if (cue.attached() && cue.event().get_its_cel() == &its && cue.event().get_strip_cookie().isBlack()) {
-            return false;
-        }
-    }
-    return true;
 }
 
 /// Checks the pairs about the place of the operation: in order, matched, without overlap.
 void Editor::verifyTracks() {
-    for (const IdStamp& chan : m_touched) {
+    for (const auto& [chan, span] : m_touched) {
         const cel* const its = celOf(chan);
         if (its == nullptr) {
             continue;
         }
-        const auto [first, last] = pairsAround(*its, m_plan->at, m_plan->at + m_plan->length);
+        const auto [first, last] = pairsAround(*its, span);
         for (int pair = first; pair <= last; ++pair) {
             const channel_event& in = *its->getChanEventPtr(2 * pair);
             const channel_event& out = *its->getChanEventPtr(2 * pair + 1);

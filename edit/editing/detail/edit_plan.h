@@ -37,6 +37,7 @@ struct Editor::Plan {
     double at = 0; ///< the span in the destination that the operation is about
     double length = 0;
     double current = Qx::kNoTime; ///< `Result::curTime`
+    double roundedBy = 0;         ///< how far a time of the source was moved to a whole frame, at most
 };
 
 /// Works out the plan of one operation. Changes nothing.
@@ -47,6 +48,8 @@ public:
     /// Null with `reason()` set when the operation is refused.
     [[nodiscard]] std::unique_ptr<Plan> plan();
     [[nodiscard]] const String& reason() const { return m_reason; }
+    /// What is to be told of a plan that was made (`Result::notice`).
+    [[nodiscard]] String notice(const Plan& plan) const;
 
 private:
     using Range = cel::Range;
@@ -76,27 +79,36 @@ private:
     bool planInterTrack();
     bool addSwap(const Vector<IdStamp>& chans);
     bool addCopies(const Vector<IdStamp>& chans);
+    bool addFittingStep(const IdStamp& from, const IdStamp& to, const Range& region);
+    [[nodiscard]] double endOf(const IdStamp& chan) const;
     // edit_planner_steps.cpp
     size_t addTarget(Target target);
     void addStep(edit_operation core, size_t target, double at, double length,
                  std::shared_ptr<const cel> part = nullptr);
-    void addCopyStep(size_t target, double at, const Edit& from, const IdStamp& chan, const Range& region);
+    void addCopyStep(size_t target, double at, const Edit& from, const IdStamp& chan, const Range& region,
+                     double lead = 0);
     void addBlackStep(edit_operation core, size_t target, double at, double length);
+    [[nodiscard]] bool mustHoldEnd(const Target& target, double to) const;
     bool destinationRegion(const EditModule& destination, const IdStamp& chan, Range& region);
+    Range sourceRegion(const Range& exact);
+    std::shared_ptr<cel> takePart(const cel* content, const Range& region, bool fillGaps, double lead);
+    std::shared_ptr<cel> onFrames(const std::shared_ptr<cel>& part);
     bool checkSteps();
     bool checkStep(const Step& step);
     void findShifts();
-    [[nodiscard]] double inMark(const EditModule& module, const IdStamp& chan) const;
-    [[nodiscard]] double outMark(const EditModule& module, const IdStamp& chan) const;
     [[nodiscard]] double rounded(double time) const;
+    [[nodiscard]] bool exact() const { return (m_flags & Editor::ExactTimes) != 0; }
+    /// True if what comes from the source lies on other frames than the destination's.
+    [[nodiscard]] bool changesRate() const { return !exact() && m_sourceRate != m_rate; }
     [[nodiscard]] String nameOf(const Target& target) const;
 
-    const EditModule& m_source;
+    EditModule m_source; ///< without the records of channels that are gone
     const EditModule& m_destination;
     edit_operation m_op;
     edit_operation m_core;
     unsigned m_flags;
-    EditModule::Mode m_mode;
+    Qx::FrameRate m_rate; ///< of the destination
+    Qx::FrameRate m_sourceRate;
     Range m_span;              ///< the module's source region
     double m_markedLength = 0; ///< of the destination's region, for the operations that fill it
     std::unique_ptr<Plan> m_plan;
@@ -119,6 +131,8 @@ namespace editing_detail {
 IdStamp addLevels(Edit& edit, const IdStamp& audio);
 /// True if an edit may be changed by the current user.
 [[nodiscard]] bool isWritable(const Edit& edit);
+/// A time rounded to whole frames; as it is for an unknown rate.
+[[nodiscard]] double roundTo(Qx::FrameRate rate, double time);
 /// A plain time for messages: seconds with up to three decimals.
 [[nodiscard]] String secondsText(double seconds);
 

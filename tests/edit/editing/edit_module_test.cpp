@@ -1,5 +1,7 @@
 #include "tests/edit/editing/editing_fixture.h"
 
+#include <cmath>
+
 using namespace test;
 using Qx::kNoTime;
 using Qx::MarkTypes::InMark;
@@ -76,6 +78,7 @@ TEST_F(EditModuleTest, RecordsAreOnlyOfTheDeselectedAndTheMarked) {
     EXPECT_EQ(m_module.numRecords(), 1u);
     m_module.clearMarks(chan(2));
     EXPECT_EQ(m_module.numRecords(), 0u);
+    m_module.setMarkTime(chan(1), std::nan(""), InMark);
     m_module.selectChan(IdStamp(1, 2, 3), false);
     m_module.setMarkTime(IdStamp(1, 2, 3), 4, InMark);
     EXPECT_EQ(m_module.numRecords(), 0u);
@@ -98,6 +101,12 @@ TEST_F(EditModuleTest, TheModulesRegionCoversThoseOfItsChannels) {
     EXPECT_EQ(m_module.getMarkedRegion(EditModule::ExactTimes), Range(2, 6));
     EXPECT_EQ(m_module.getMarkTime(InMark), 2);
     EXPECT_EQ(m_module.getMarkTime(OutMark), 3);
+    // Places: reversed marks in order, then those of the others, then the current time.
+    m_module.setMarkTime(chan(1), std::pair(8.0, 4.0));
+    EXPECT_EQ(m_module.getMarkedPlace(chan(1), InMark), 4);
+    EXPECT_EQ(m_module.getMarkedPlace(chan(3), OutMark), 8);
+    EXPECT_EQ(m_module.getMarkedPlace({}, InMark), 4);
+    EXPECT_EQ(EditModule(m_edit).getMarkedPlace({}, InMark), m_edit->get_current_time());
 }
 
 TEST_F(EditModuleTest, SourceRegionsAreTimesOfTheMaterial) {

@@ -1,6 +1,7 @@
 #include "tests/edit/editing/editing_fixture.h"
 
 #include <algorithm>
+#include <cmath>
 
 using namespace test;
 using Op = edit_operation;
@@ -36,10 +37,6 @@ Marks span(double from, double to) {
 
 const Case kCases[] = {
     {"ReplaceInside", Op::Replace, kDe, "AAAABBB", in(1), "AdeABBB"},
-    {"ReplaceUpToACut", Op::Replace, kDe, "AAAABBB", in(2), "AAdeBBB"},
-    {"ReplaceAtTheStart", Op::Replace, kDe, "AAAABBB", in(0), "deAABBB"},
-    {"ReplaceAtACut", Op::Replace, kDe, "AAAABBB", in(4), "AAAAdeB"},
-    {"ReplaceAcrossSeveral", Op::Replace, kDe, "ABCDE", in(1), "AdeDE"},
     {"ReplacePastTheEnd", Op::Replace, kDe, "AAAABBB", in(6), "AAAABBde"},
     {"ReplaceBeyondTheEnd", Op::Replace, kDe, "AAAABBB", in(9), "AAAABBB..de"},
     {"ReplaceAtTheCurrentTime", Op::Replace, kDe, "AAAABBB", at(5), "AAAABde"},
@@ -55,32 +52,33 @@ const Case kCases[] = {
     {"ReplaceMarkedEqualMarks", Op::ReplaceMarked, kDe, "AAAABBB", {2, 2, 4}, "AAdeBBB"},
     {"ReplaceMarkedFromCurrentTime", Op::ReplaceMarked, at(2), "AAAABBB", span(2, 4), "AAeeBBB"},
     {"InsertInside", Op::Insert, kDe, "AAAABBB", in(2), "AAdeAABBB"},
-    {"InsertAtACut", Op::Insert, kDe, "AAAABBB", in(4), "AAAAdeBBB"},
-    {"InsertAtTheStart", Op::Insert, kDe, "AAAABBB", in(0), "deAAAABBB"},
-    {"InsertAtTheEnd", Op::Insert, kDe, "AAAABBB", in(7), "AAAABBBde"},
     {"InsertBeyondTheEnd", Op::Insert, kDe, "AAAABBB", in(9), "AAAABBB..de"},
     {"InsertFromShortSource", Op::Insert, span(3, 6), "AAAABBB", at(1), "Ae..AAABBB"},
     {"RemoveInside", Op::Remove, {}, "AAAABBB", span(1, 2), "A|AABBB"},
     {"RemoveAcrossACut", Op::Remove, {}, "AAAABBB", span(2, 5), "AABB"},
-    {"RemoveFromTheStart", Op::Remove, {}, "AAAABBB", span(0, 2), "AABBB"},
     {"RemoveAcrossTheEnd", Op::Remove, {}, "AAAABBB", span(5, 9), "AAAAB"},
-    {"RemoveSeveral", Op::Remove, {}, "ABCDE", span(1, 4), "AE"},
     {"RemoveAll", Op::Remove, {}, "AAAABBB", span(0, 7), ""},
     {"RemoveMergesBlack", Op::Remove, {}, "A.BB.C", span(2, 4), "A..C"},
     {"InsertMarked", Op::InsertMarked, kDe, "AAAABBB", span(2, 5), "AAdeeAABBB"},
     {"InsertMarkedBeyondTheEnd", Op::InsertMarked, kDe, "AAAABBB", span(8, 10), "AAAABBB.de"},
     {"ReplaceToEnd", Op::ReplaceToEnd, kDe, "AAAABBB", in(2), "AAde"},
-    {"ReplaceToEndPastTheEnd", Op::ReplaceToEnd, kDe, "AAAABBB", in(6), "AAAABBde"},
     {"Lift", Op::Lift, {}, "AAAABBB", span(2, 5), "AA...BB"},
     {"LiftMergesBlack", Op::Lift, {}, "AA.BB.", span(3, 5), "AA...."},
     {"LiftStopsAtTheEnd", Op::Lift, {}, "AAAABBB", span(5, 9), "AAAAB.."},
     {"BackReplace", Op::BackReplace, kDe, "AAAABBB", out(5), "AAAdeBB"},
-    {"BackReplaceAtTheStart", Op::BackReplace, kDe, "AAAABBB", at(2), "deAABBB"},
+    {"ReplaceAtReversedMarks", Op::Replace, {3, 1}, "AAAABBB", span(6, 2), "AAdeBBB"},
+    {"ReplaceMarkedFromReversedMarks", Op::ReplaceMarked, {3, 1}, "AAAABBB", span(5, 2), "AAdeeBB"},
+    {"BackReplaceAtReversedMarks", Op::BackReplace, {3, 1}, "AAAABBB", span(5, 2), "AAAdeBB"},
+    {"BackReplaceMarkedReversed", Op::BackReplaceMarked, {3, 1}, "AAAABBB", span(5, 2), "AAddeBB"},
+    {"InsertAtReversedMarks", Op::Insert, {3, 1}, "AAAABBB", span(6, 2), "AAdeAABBB"},
+    {"InsertBehindAnEndOfBlack", Op::Insert, kDe, "AAA.", in(9), "AAA......de"},
     {"BackReplaceMarked", Op::BackReplaceMarked, kDe, "AAAABBB", span(2, 5), "AAddeBB"},
     {"FillBlack", Op::FillBlack, kDe, "AAA.BBB", in(2), "AAAeBBB"},
     {"FillBlackBothEnds", Op::FillBlack, {}, ".AA.BBB", in(0), "dAAeBBB"},
     {"FillBlackPastTheEnd", Op::FillBlack, kDe, "AAA", in(2), "AAAe"},
     {"FillBlackWithinMarks", Op::FillBlack, {}, ".....BB", span(1, 3), ".dd..BB"},
+    {"FillBlackWithinReversedMarks", Op::FillBlack, {}, ".....BB", span(3, 1), ".dd..BB"},
+    {"FillBlackFromEqualMarks", Op::FillBlack, {}, ".......", {1, 1, 2}, ".ddee.."},
     {"BackInsert", Op::BackInsert, kDe, "AAAABBB", out(3), "AdeAAABBB"},
     {"BackInsertMarked", Op::BackInsertMarked, kDe, "AAAABBB", span(2, 5), "AAddeAABBB"},
     {"ReplaceMaterial", Op::ReplaceMaterial, kDe, "AAAABBB", in(2), "AAdeBBB"},
@@ -149,13 +147,25 @@ TEST_F(EditorTable, OperationsBetweenChannels) {
          {"V AAA", "V BBB", "A CCC", "A DDD"},
          span(1, 2),
          {"V ABA", "V BAB", "A CDC", "A DCD"}},
-        {"SwapWithAnEmptyChannel", Op::SwapTracks, {"V AAAABBB", "V "}, span(2, 5), {"V AA...BB", "V ..AAB"}},
+        {"SwapUpToAnEnd", Op::SwapTracks, {"V AAA..BB", "V CCC"}, span(2, 5), {"V AAC..BB", "V CCA"}},
+        {"SwapEffects",
+         Op::SwapTracks,
+         {"E EE", "E  FF", "V AAA", "V BBB"},
+         span(1, 2),
+         {"E EF", "E  EF", "V ABA", "V BAB"}},
+        {"SwapEffectsAtAnEnd", Op::SwapTracks, {"E EE", "E F "}, span(0, 1), {"E FE", "E E"}},
+        {"MoveEffectsFromAnEnd", Op::MoveTrack, {"E  EE", "E FFF"}, span(1, 3), {"E  ..", "E FEE"}},
+        {"LiftEffectsAtAnEnd", Op::Lift, {"E EEEE"}, span(2, 4), {"E EE.."}},
         {"Copy",
          Op::CopyTrack,
          {"A AAAABBB", "A CCCCDDD", "A EEEEEEE"},
          span(2, 5),
          {"A AAAABBB", "A CCAABDD", "A EEAABEE"}},
-        {"CopyAcrossTheEnd", Op::CopyTrack, {"V AAAABBB", "V CCC"}, span(5, 9), {"V AAAABBB", "V CCC..BB"}},
+        {"CopyAcrossTheEnd",
+         Op::CopyTrack,
+         {"V AAAABBB", "V CCCCCC."},
+         span(5, 9),
+         {"V AAAABBB", "V CCCCCBB"}},
         {"Move", Op::MoveTrack, {"V AAAABBB", "V CCCCDDD"}, span(2, 5), {"V AA...BB", "V CCAABDD"}},
     };
     for (const BetweenCase& its : cases) {
@@ -172,6 +182,7 @@ TEST_F(EditorTable, EffectsChannelsKeepTheirGapsAndLengths) {
     run(before, source, in(1), Op::Replace, {"E E dd", "V AfffBBB"});
     run(before, source, in(4), Op::Replace, {"E EE   dd", "V AAAAfff"});
     run(before, source, span(0, 1), Op::Lift, {"E  E", "V .AAABBB"});
+    run(before, source, span(1, 2), Op::Lift, {"E E.", "V A.AABBB"});
     run(before, source, span(1, 3), Op::Remove, {"E E", "V A|ABBB"});
 }
 
@@ -190,6 +201,42 @@ TEST_F(EditorTable, WhatIsLaidPlaysTheMarkedPartOfTheSource) {
                                   moduleOf(copy, its.marks), its.op)
                         .valid());
         EXPECT_EQ(layout::drawStrips(*copy->get_edit_cel_p(0)), its.strips);
+    }
+}
+
+TEST_F(EditorTable, CutsOfASourceOfAnotherRateComeOntoTheFramesAndThatIsTold) {
+    const EditPtr from = editOf({"V ", "A "});
+    from->setFrameRate(Qx::FrameRate(Qx::FrameRate::Fps24));
+    for (int pair = 0; pair < 100; ++pair) {
+        for (int chan = 0; chan < 2; ++chan) {
+            from->get_edit_cel_p(chan)->appendEventPair(layout::sourceOf(static_cast<char>('a' + pair % 9)),
+                                                        5, pair * 7 / 24.0, 7 / 24.0);
+        }
+    }
+    for (const Op op : {Op::Replace, Op::InsertMarked, Op::FillBlack}) {
+        for (const unsigned flags : {0u, unsigned{Editor::ExactTimes}}) {
+            const EditPtr edit = editOf({"V AAA.......", "A AAA......."});
+            edit->get_edit_cel_p(0)->set_edit_time(ce_handle(edit->get_edit_cel_p(0), 1), 2.99, true);
+            edit->get_edit_cel_p(0)->set_edit_time(ce_handle(edit->get_edit_cel_p(0), 2), 2.99, true);
+            const Editor::Result result =
+                Editor::apply(moduleOf(from, {1 / 24.0, 4 + 2 / 24.0}), moduleOf(edit, {1, 6}), op, flags);
+            ASSERT_TRUE(result.valid()) << result.reason();
+            EXPECT_EQ(result.notice().empty(), flags != 0);
+            double furthest = 0;
+            for (int chan = 0; chan < 2; ++chan) {
+                const cel& its = *edit->get_edit_cel_p(chan);
+                ASSERT_NE(its.is_good_cel(), 0);
+                for (int i = 0; i < its.numEvents(); ++i) {
+                    const double time = its.getChanEventPtr(i)->editTime;
+                    const bool own = std::abs(std::fmod(time, 5) - 2.99) < 1e-6; // cut there before
+                    furthest = std::max(furthest, own ? 0 : std::abs(time - Qx::frameRound(time)));
+                }
+            }
+            EXPECT_EQ(furthest < 1e-6, flags == 0) << editOperationName(op);
+            // What plays is what played before, of the source from its first frame on.
+            EXPECT_NEAR(edit->get_edit_cel_p(1)->get_strip_time(5.0),
+                        from->get_edit_cel_p(1)->get_strip_time(4 + 1 / 24.0), 1e-6);
+        }
     }
 }
 

@@ -84,16 +84,24 @@ TEST_F(EditorTest, ARefusedOperationHasChangedNothing) {
         {"nothing lies in", Op::Remove, {}, {7, 9}},
         {"nothing lies in", Op::Lift, {}, {8, 9}},
         {"exactly two", Op::SwapTracks, {}, {1, 2}},
+        {"V3 ends at 6 s, and CopyTrack makes no channel longer", Op::CopyTrack, {}, {5, 7}},
         {"nothing lies in", Op::CopyTrack, {}, {9, 10}},
         {"nothing is black", Op::FillBlack, {0, 2}, {2}},
     };
-    const EditPtr edit = make({"V AAAABBB", "V CCCCCCC", "V DDDDDDD", "A EEEEEEE"});
+    const EditPtr edit = make({"V AAAABBB", "V CCCCCCC", "V DDDDDD", "A EEEEEEE"});
     const EditPtr from = make({"V ddee", "V ", "V ", "A ffff"}, 101);
     ASSERT_TRUE(apply({}, {}, edit, {1, 2}, Op::Lift).valid()); // a chain and a clipboard to be lost
     edit_manager::flush_changes();
     const String before = editState(*edit);
     const String kept = editState(*clipboard());
     const auto files = treeSnapshot(folder().path());
+    EditModule nothing = moduleOf(from, {0, 2});
+    nothing.selectAll(false);
+    for (const Op op : {Op::Replace, Op::Insert, Op::InsertMarked, Op::ReplaceToEnd, Op::BackInsert}) {
+        const Editor::Result result = Editor::apply(nothing, moduleOf(edit, {3, 5}), op);
+        EXPECT_NE(result.reason().find("no selected channel of the source"), String::npos);
+        EXPECT_TRUE(editState(*edit) == before && treeSnapshot(folder().path()) == files);
+    }
     for (const Case& its : cases) {
         SCOPED_TRACE(String(editOperationName(its.op)) + " " + its.reason);
         const Editor::Result result = apply(from, its.source, edit, its.destination, its.op, its.flags);
@@ -215,6 +223,13 @@ TEST_F(EditorTest, ChannelsWithMarksOfTheirOwnKeepTheirDistance) {
     const Editor::Result result = Editor::apply(moduleOf(from, {1, 3}), destination, Op::Insert);
     EXPECT_FALSE(result.syncLoss()); // both move by two seconds
     EXPECT_EQ(drawRows(*edit), (Rows{"V AddAAAA", "A BBBffBB"}));
+
+    // A swap takes the one region that covers all.
+    edit = make({"V AAABB", "V CCDDD"}, 102);
+    destination = moduleOf(edit, {1, 2});
+    destination.setMarkTime(edit->getId(1), EditModule::Range(2, 4));
+    ASSERT_TRUE(Editor::apply({}, destination, Op::SwapTracks).valid());
+    EXPECT_EQ(drawRows(*edit), (Rows{"V ACDDB", "V CAABD"}));
 }
 
 TEST_F(EditorTest, AShotIsNamedNotCopied) {
@@ -242,14 +257,6 @@ TEST_F(EditorTest, AShotIsNamedNotCopied) {
     EXPECT_EQ(drawRows(*shot).front(), "V      ddeed");
 }
 
-TEST_F(EditorTest, SourceMayBeTheDestination) {
-    const EditPtr edit = make({"V ABCDE", "A FGHIJ"});
-    ASSERT_TRUE(apply(edit, {1, 4}, edit, {2}, Op::Insert).valid());
-    EXPECT_EQ(drawRows(*edit), (Rows{"V AB|BCDCDE", "A FG|GHIHIJ"}));
-    ASSERT_TRUE(apply(edit, {0, 3}, edit, {1}, Op::Replace).valid());
-    EXPECT_EQ(drawRows(*edit), (Rows{"V A|AB|BDCDE", "A F|FG|GIHIJ"}));
-}
-
 TEST_F(EditorTest, TheClipboardHoldsWhatWentAndIsUndoneToo) {
     const EditPtr from = editOf({"V dd", "A ff"});
     EditPtr edit = make({"V AAAABBB", "A CCCCDDD"});
@@ -275,6 +282,13 @@ TEST_F(EditorTest, TheClipboardHoldsWhatWentAndIsUndoneToo) {
     ASSERT_TRUE(apply(clipboard(), {}, edit, {0}, Op::Replace).valid());
     EXPECT_EQ(drawRows(*edit), (Rows{"V AAB|B", "A CCD|D"}));
     EXPECT_EQ(drawRows(*clipboard()), (Rows{"V AAB", "A CCD"}));
+
+    // That it was looked for and not there does not keep it away.
+    ASSERT_TRUE(edit_manager::delete_edit_file_and_backups(clipboard_cookie, true));
+    EXPECT_FALSE(clipboard().valid());
+    ASSERT_TRUE(apply({}, {}, edit, {0, 2}, Op::Lift).valid());
+    ASSERT_TRUE(clipboard().valid());
+    EXPECT_EQ(drawRows(*clipboard()), (Rows{"V AA", "A CC"}));
 }
 
 TEST_F(EditorTest, LevelsGoWithTheirSound) {
@@ -363,6 +377,13 @@ TEST_F(EditorTest, EffectsAreBoundToCopiesAndToBothPartsOfACut) {
     title->objectStore().storeObject(black.asString(), std::make_unique<ChannelGroupList>());
     ASSERT_TRUE(apply({}, {}, title, {3, 4}, Op::Lift).valid());
     EXPECT_EQ(drawRows(*title), Rows{"V A..|.C"});
+    // So does black that a cue would lose; other black of the channel is merged all the same.
+    const EditPtr cued = make({"V AA..BBCC..DD"}, 102);
+    addCue(*cued, "c", 8.5, 0);
+    ASSERT_TRUE(apply({}, {}, cued, {6, 8}, Op::Lift).valid());
+    ASSERT_TRUE(apply({}, {}, cued, {4, 5}, Op::Lift).valid());
+    EXPECT_EQ(drawRows(*cued), Rows{"V AA...B..|..DD"});
+    EXPECT_EQ(cuesOf(*cued), "c 0 8.5;");
 }
 
 TEST_F(EditorTest, FadesStampsAndLevelsStayWhereTheCutDidNotTouchThem) {
