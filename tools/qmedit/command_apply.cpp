@@ -65,6 +65,9 @@ void reportResult(const Edit& edit, const EditReport& before, const EditReport& 
     const EditDiff diff = diffOf(before, after);
     writeOut(String(editOperationName(op)) + (diff.same() ? ": nothing looks different\n" : ":\n"));
     writeOut(diffText(diff, after));
+    if (!result.notice().empty()) {
+        writeOut("Note: " + result.notice() + ".\n");
+    }
     if (!result.syncLoss()) {
         return;
     }
