@@ -11,6 +11,7 @@
 
 #include <map>
 
+#include <memory>
 /// How `chequerboard` treats a fade at a cut.
 enum class SoftCuts {
     Ignore, ///< fades do not widen a pair
@@ -34,7 +35,10 @@ enum class SoftCuts {
 /// single fields change one field of one event, so whoever uses them does.
 ///
 /// An operation that answers false or null has changed nothing.
-class QM_API cel : public StreamableLayer {
+///
+/// An edit shares its cels (`Qx::Ptr`); what walks over one holds it too (`CelEventPair`), so that a channel
+/// may be removed or get another cel meanwhile.
+class QM_API cel : public StreamableLayer, public std::enable_shared_from_this<cel> {
 public:
     using IdMap = std::map<IdStamp, IdStamp>;
     using Range = NumRange<double, Ordered>;
