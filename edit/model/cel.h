@@ -99,11 +99,12 @@ public:
     /// @{
     [[nodiscard]] ce_handle get_start_ceh() const;
     [[nodiscard]] ce_handle get_end_ceh() const;
-    /// The event of a kind that governs a time, by binary search. Kind 1: the in point of the last pair that
-    /// starts at or before `time` (within the tolerance), whether it still plays or not. Kind 4: the first
-    /// out point at or after `time`. Kind 7: the last event at or before `time`. Invalid if there is none.
-    [[nodiscard]] ce_handle find_ceh(double time, ce_info kind) const;
-    [[nodiscard]] ce_handle get_next_ceh(const ce_handle& from, ce_info kind) const;
+    /// The event of some kinds (`ce_info` values, or'ed) that governs a time, by binary search. Kind 1: the
+    /// in point of the last pair that starts at or before `time` (within the tolerance), whether it still
+    /// plays or not. Kind 4: the first out point at or after `time`. Kind 7: the last event at or before
+    /// `time`. Invalid if there is none.
+    [[nodiscard]] ce_handle find_ceh(double time, int kinds) const;
+    [[nodiscard]] ce_handle get_next_ceh(const ce_handle& from, int kinds) const;
     [[nodiscard]] int check_ceh(const ce_handle& handle) const;
     /// The handle of the event with a stamp, an in point before an out point; invalid if none. Linear.
     [[nodiscard]] ce_handle findId(const IdStamp& id, int hint = -1) const;
@@ -384,14 +385,14 @@ inline ce_handle ce_handle::matching_out_ceh() const {
     return valid() != 0 ? ce_handle(m_cel, m_index | 1) : ce_handle(m_cel, -1);
 }
 
-inline void ce_handle::increment(ce_info kind) {
+inline void ce_handle::increment(int kinds) {
     if (m_cel == nullptr) {
         return;
     }
     const int at = m_index < 0 ? -1 : m_index;
     const int end = m_cel->numEvents();
-    const bool ins = (kind & CE_IN_POINT) != 0;
-    const bool outs = (kind & CE_OUT_POINT) != 0;
+    const bool ins = (kinds & CE_IN_POINT) != 0;
+    const bool outs = (kinds & CE_OUT_POINT) != 0;
     int to = end;
     if (ins && outs) {
         to = at + 1;
@@ -403,14 +404,14 @@ inline void ce_handle::increment(ce_info kind) {
     m_index = to < end ? to : end;
 }
 
-inline void ce_handle::decrement(ce_info kind) {
+inline void ce_handle::decrement(int kinds) {
     if (m_cel == nullptr) {
         return;
     }
     const int end = m_cel->numEvents();
     const int at = m_index > end ? end : m_index;
-    const bool ins = (kind & CE_IN_POINT) != 0;
-    const bool outs = (kind & CE_OUT_POINT) != 0;
+    const bool ins = (kinds & CE_IN_POINT) != 0;
+    const bool outs = (kinds & CE_OUT_POINT) != 0;
     int to = -1;
     if (ins && outs) {
         to = at - 1;

@@ -12,10 +12,10 @@ ce_handle cel::get_end_ceh() const {
     return {this, numEvents() - 1};
 }
 
-ce_handle cel::find_ceh(double time, ce_info kind) const {
+ce_handle cel::find_ceh(double time, int kinds) const {
     const double within = time + kTolerance;
-    const bool ins = (kind & CE_IN_POINT) != 0;
-    const bool outs = (kind & CE_OUT_POINT) != 0;
+    const bool ins = (kinds & CE_IN_POINT) != 0;
+    const bool outs = (kinds & CE_OUT_POINT) != 0;
     if (std::isnan(time) || (!ins && !outs)) {
         return {this, -1};
     }
@@ -33,9 +33,9 @@ ce_handle cel::find_ceh(double time, ce_info kind) const {
     return {this, 2 * pair + 1 < m_events.size() ? static_cast<int>(2 * pair) + 1 : -1};
 }
 
-ce_handle cel::get_next_ceh(const ce_handle& from, ce_info kind) const {
+ce_handle cel::get_next_ceh(const ce_handle& from, int kinds) const {
     ce_handle next(this, from.index());
-    next.increment(kind);
+    next.increment(kinds);
     return next;
 }
 
