@@ -142,8 +142,8 @@ channel_event ce_handle::get_channel_event() const {
 
 bool ce_handle::time_in_range_exclusive(double time) const {
     return valid() != 0 && matching_out_ceh().valid() != 0 &&
-           time > matching_in_ceh().get_edit_time() + kTolerance &&
-           time < matching_out_ceh().get_edit_time() - kTolerance;
+           !isNotPast(time, matching_in_ceh().get_edit_time()) &&
+           !isNotPast(matching_out_ceh().get_edit_time(), time);
 }
 
 IdStamp ce_handle::getEffectGraph() const {

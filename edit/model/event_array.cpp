@@ -1,5 +1,7 @@
 #include "edit/model/event_array.h"
 
+#include "platform/base/num_range.h"
+
 #include <algorithm>
 #include <atomic>
 #include <cstring>
@@ -24,16 +26,37 @@ void addTo(double& time, double shift) {
     time += shift;
 }
 
+/// True if no event lies within the tolerance of the one before it without being at its time. Asks for each:
+/// nearly all are apart, so nothing is gained by stopping at the first that is not.
+bool areApart(const channel_event* events, size_t count) {
+    unsigned close = 0;
+    for (size_t i = 1; i < count; ++i) {
+        const double step = events[i].editTime - events[i - 1].editTime;
+        close |= static_cast<unsigned>(step <= Qx::kTimeTolerance) & static_cast<unsigned>(step != 0);
+    }
+    return close == 0;
+}
+
+bool areApart(const double*, size_t) {
+    return true; // the events themselves are asked
+}
+
 /// Moves items within an array and adds `shift` to their times: block by block, so that each block is still
-/// in the cache nearest to the processor when its times are changed.
+/// in the cache nearest to the processor when its times are changed and compared. False if events among them
+/// came too close.
 template <typename Item>
-void moveShifted(Item* from, Item* to, size_t count, double shift) {
+bool moveShifted(Item* from, Item* to, size_t count, double shift) {
     constexpr size_t kBlock = 4096 / sizeof(Item);
+    bool apart = true;
     const auto moveBlock = [&](size_t first, size_t size) {
         std::memmove(static_cast<void*>(to + first), from + first, size * sizeof(Item));
         for (size_t i = first; i < first + size; ++i) {
             addTo(to[i], shift);
         }
+        // With the item next to the block that has been moved already, in whichever direction that lies.
+        const size_t before = to <= from && first > 0 ? 1 : 0;
+        const size_t behind = to > from && first + size < count ? 1 : 0;
+        apart = areApart(to + first - before, before + size + behind) && apart;
     };
     if (to > from) {
         for (size_t left = count; left > 0;) {
@@ -46,24 +69,28 @@ void moveShifted(Item* from, Item* to, size_t count, double shift) {
             moveBlock(done, std::min(count - done, kBlock));
         }
     }
+    return apart;
 }
 
 /// Moves the items from `last` on so that they begin at `to`, adding `shift` to their times. There is room.
+/// False if events among them came too close.
 template <typename Item>
-void moveTail(std::vector<Item>& items, size_t last, size_t to, double shift) {
+bool moveTail(std::vector<Item>& items, size_t last, size_t to, double shift) {
     const size_t tail = items.size() - last;
     if (to > last) {
         items.resize(to + tail);
     }
     Item* const all = items.data();
+    bool apart = true;
     if (shift != 0) {
-        moveShifted(all + last, all + to, tail, shift);
+        apart = moveShifted(all + last, all + to, tail, shift);
     } else if (to != last) {
         std::memmove(static_cast<void*>(all + to), all + last, tail * sizeof(Item));
     }
     if (to < last) {
         items.resize(to + tail);
     }
+    return apart;
 }
 
 /// The times of the in points among some events.
@@ -141,8 +168,11 @@ void EventArray::settle() {
 }
 
 void EventArray::reserve(size_t events) {
-    own().reserve(events);
-    m_body->starts.reserve((events + 1) / 2);
+    // By half as much again at least, so that asking for a little more each time does not move all each time.
+    Events& all = own();
+    const size_t room = events <= all.capacity() ? events : std::max(events, all.capacity() * 3 / 2);
+    all.reserve(room);
+    m_body->starts.reserve((room + 1) / 2);
     refer();
 }
 
@@ -177,22 +207,22 @@ void EventArray::borrow(std::shared_ptr<const void> lender, std::span<const chan
     m_size = events.size();
 }
 
-void EventArray::splice(size_t first, size_t last, std::span<const channel_event> block, double shift) {
+bool EventArray::splice(size_t first, size_t last, std::span<const channel_event> block, double shift) {
     if (!isOwn() || m_body->events.capacity() < m_size - (last - first) + block.size()) {
-        spliceAnew(first, last, block, shift);
-        return;
+        return spliceAnew(first, last, block, shift);
     }
-    moveTail(m_body->events, last, first + block.size(), shift);
+    const bool apart = moveTail(m_body->events, last, first + block.size(), shift);
     moveTail(m_body->starts, last / 2, (first + block.size()) / 2, shift);
     std::copy(block.begin(), block.end(), m_body->events.begin() + static_cast<std::ptrdiff_t>(first));
     for (size_t i = 0; i < block.size(); i += 2) {
         m_body->starts[(first + i) / 2] = block[i].editTime;
     }
     refer();
+    return apart;
 }
 
 /// The same into fresh memory: nothing is copied that does not stay.
-void EventArray::spliceAnew(size_t first, size_t last, std::span<const channel_event> block, double shift) {
+bool EventArray::spliceAnew(size_t first, size_t last, std::span<const channel_event> block, double shift) {
     auto body = std::make_unique<Body>();
     Events& events = body->events;
     events.reserve(withSlack(m_size - (last - first) + block.size()));
@@ -203,9 +233,11 @@ void EventArray::spliceAnew(size_t first, size_t last, std::span<const channel_e
     for (size_t i = tail; i < events.size(); ++i) {
         events[i].editTime += shift;
     }
+    const bool apart = shift == 0 || areApart(events.data() + tail, events.size() - tail);
     body->starts.reserve(events.capacity() / 2);
     adopt(body.release());
     settle();
+    return apart;
 }
 
 void EventArray::setTime(size_t index, double time) {

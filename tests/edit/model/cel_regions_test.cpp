@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 
+#include <chrono>
 #include <set>
 
 namespace {
@@ -198,6 +199,21 @@ TEST(CelRegions, PartsThatWereExtractedWeldTogetherAgain) {
     expectSound(*joined);
 }
 
+TEST(CelRegions, AWeldCostsWhatIsJoinedOn) {
+    const auto start = std::chrono::steady_clock::now();
+    const cel part = make("A");
+    cel joined;
+    for (int i = 0; i < 16000; ++i) {
+        ASSERT_TRUE(joined.weld(&part, i));
+    }
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(5));
+    std::set<IdStamp> stamps;
+    for (int i = 0; i < joined.numEvents(); ++i) {
+        stamps.insert(joined.get_event(i).id);
+    }
+    EXPECT_EQ(stamps.size(), 32000u);
+}
+
 TEST(CelRegions, TheSourceMayBeTheCelItself) {
     cel::IdMap ids;
     cel inserted = make("AABBCC");
@@ -260,7 +276,7 @@ TEST(CelRegions, ACutChangesNothingOfWhatIsHeard) {
     cel its = makeRich();
     const channel_event in = its.get_event(0);
     const channel_event out = its.get_event(1);
-    cel::IdMap splits;
+    cel::Splits splits;
     ASSERT_TRUE(its.remove({4, 6}, &splits));
     ASSERT_EQ(its.numEvents(), 4);
     EXPECT_EQ(its.get_event(0), in);
@@ -277,7 +293,7 @@ TEST(CelRegions, ACutChangesNothingOfWhatIsHeard) {
     EXPECT_EQ(cutOut.velocity, 2);
     EXPECT_EQ(its.get_event(3).rampQFrames, 12);
     EXPECT_EQ(its.get_event(3).id, out.id);
-    EXPECT_EQ(splits, (cel::IdMap{{in.id, cutIn.id}}));
+    EXPECT_EQ(splits, (cel::Splits{{in.id, cutIn.id}}));
     expectSound(its);
 }
 
@@ -290,7 +306,7 @@ TEST(CelRegions, WhatIsLeftOfATrimmedPairKeepsItsStamps) {
     EXPECT_EQ(its.get_event(0).rampQFrames, 0);
     EXPECT_DOUBLE_EQ(its.get_event(0).stripTime, 106);
     cel::IdMap ids;
-    cel::IdMap splits;
+    cel::Splits splits;
     const cel source = make("dddddd");
     ASSERT_TRUE(its.replace(&source, {0, 4}, 5, ids, false, &splits));
     EXPECT_EQ(its.get_event(1).id, out.id);
@@ -321,6 +337,19 @@ TEST(CelRegions, MaterialReplacementKeepsAllButTheMaterial) {
     EXPECT_EQ(its.get_event(0), expectedIn);
     EXPECT_EQ(its.get_event(1), expectedOut);
     EXPECT_TRUE(ids.empty()) << "nothing was copied, the events are the cel's own";
+
+    // Under the middle alone: three pieces, and whoever binds effects is told of both further ones.
+    cel::Splits splits;
+    ASSERT_TRUE(its.replace(&source, {5, 7}, 4, ids, true, &splits));
+    ASSERT_EQ(its.numEvents(), 6);
+    EXPECT_EQ(splits, (cel::Splits{{in.id, its.get_event(2).id}, {in.id, its.get_event(4).id}}));
+    // In gaps a pair of the source is copied: once, and split.
+    splits.clear();
+    cel gaps = make(" A  A ");
+    ASSERT_TRUE(gaps.replace(&source, {0, 6}, 0, ids, true, &splits));
+    const IdStamp copy = gaps.get_event(0).id;
+    EXPECT_EQ(ids.at(source.get_event(0).id), copy);
+    EXPECT_EQ(splits, (cel::Splits{{copy, gaps.get_event(4).id}, {copy, gaps.get_event(8).id}}));
 }
 
 } // namespace
