@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <cmath>
 #include <cstring>
 #include <type_traits>
 #include <utility>
@@ -26,37 +27,16 @@ void addTo(double& time, double shift) {
     time += shift;
 }
 
-/// True if no event lies within the tolerance of the one before it without being at its time. Asks for each:
-/// nearly all are apart, so nothing is gained by stopping at the first that is not.
-bool areApart(const channel_event* events, size_t count) {
-    unsigned close = 0;
-    for (size_t i = 1; i < count; ++i) {
-        const double step = events[i].editTime - events[i - 1].editTime;
-        close |= static_cast<unsigned>(step <= Qx::kTimeTolerance) & static_cast<unsigned>(step != 0);
-    }
-    return close == 0;
-}
-
-bool areApart(const double*, size_t) {
-    return true; // the events themselves are asked
-}
-
 /// Moves items within an array and adds `shift` to their times: block by block, so that each block is still
-/// in the cache nearest to the processor when its times are changed and compared. False if events among them
-/// came too close.
+/// in the cache nearest to the processor when its times are changed.
 template <typename Item>
-bool moveShifted(Item* from, Item* to, size_t count, double shift) {
+void moveShifted(Item* from, Item* to, size_t count, double shift) {
     constexpr size_t kBlock = 4096 / sizeof(Item);
-    bool apart = true;
     const auto moveBlock = [&](size_t first, size_t size) {
         std::memmove(static_cast<void*>(to + first), from + first, size * sizeof(Item));
         for (size_t i = first; i < first + size; ++i) {
             addTo(to[i], shift);
         }
-        // With the item next to the block that has been moved already, in whichever direction that lies.
-        const size_t before = to <= from && first > 0 ? 1 : 0;
-        const size_t behind = to > from && first + size < count ? 1 : 0;
-        apart = areApart(to + first - before, before + size + behind) && apart;
     };
     if (to > from) {
         for (size_t left = count; left > 0;) {
@@ -69,28 +49,24 @@ bool moveShifted(Item* from, Item* to, size_t count, double shift) {
             moveBlock(done, std::min(count - done, kBlock));
         }
     }
-    return apart;
 }
 
 /// Moves the items from `last` on so that they begin at `to`, adding `shift` to their times. There is room.
-/// False if events among them came too close.
 template <typename Item>
-bool moveTail(std::vector<Item>& items, size_t last, size_t to, double shift) {
+void moveTail(std::vector<Item>& items, size_t last, size_t to, double shift) {
     const size_t tail = items.size() - last;
     if (to > last) {
         items.resize(to + tail);
     }
     Item* const all = items.data();
-    bool apart = true;
     if (shift != 0) {
-        apart = moveShifted(all + last, all + to, tail, shift);
+        moveShifted(all + last, all + to, tail, shift);
     } else if (to != last) {
         std::memmove(static_cast<void*>(all + to), all + last, tail * sizeof(Item));
     }
     if (to < last) {
         items.resize(to + tail);
     }
-    return apart;
 }
 
 /// The times of the in points among some events.
@@ -101,6 +77,15 @@ void takeStarts(std::span<const channel_event> events, std::vector<double>& star
     }
 }
 
+/// The shortest time above 0 from an event to the next one, if it is below `least`, or else `least`.
+double shortestStep(std::span<const channel_event> events, double least = Qx::kNoTime) {
+    for (size_t i = 1; i < events.size(); ++i) {
+        const double step = events[i].editTime - events[i - 1].editTime;
+        least = step > 0 && step < least ? step : least;
+    }
+    return least;
+}
+
 } // namespace
 
 /// What arrays share. The events lie in `events`, or, with a lender, in its memory.
@@ -109,6 +94,9 @@ struct EventArray::Body {
     Events events;
     std::vector<double> starts;
     std::shared_ptr<const void> lender;
+    /// No two events that follow one another and differ in time are nearer than this; 0 if that is not known.
+    /// It spares a shift asking whether rounding brought any two too close: nearly always none can have been.
+    double leastStep = Qx::kNoTime;
 };
 
 void EventArray::swap(EventArray& other) noexcept {
@@ -156,6 +144,7 @@ EventArray::Events& EventArray::own(size_t more) {
         body->events.assign(begin(), end());
         body->starts.reserve((room + 1) / 2);
         body->starts.assign(m_starts, m_starts + (m_size + 1) / 2);
+        body->leastStep = m_body != nullptr ? m_body->leastStep : Qx::kNoTime;
         adopt(body.release());
         refer();
     }
@@ -164,6 +153,7 @@ EventArray::Events& EventArray::own(size_t more) {
 
 void EventArray::settle() {
     takeStarts(m_body->events, m_body->starts);
+    m_body->leastStep = 0;
     refer();
 }
 
@@ -188,6 +178,7 @@ void EventArray::append(const channel_event& event) {
     }
     events.push_back(added);
     refer();
+    noteSteps(m_size - 1);
 }
 
 void EventArray::assign(Events&& events) {
@@ -201,6 +192,7 @@ void EventArray::borrow(std::shared_ptr<const void> lender, std::span<const chan
     auto body = std::make_unique<Body>();
     body->lender = std::move(lender);
     takeStarts(events, body->starts);
+    body->leastStep = 0;
     adopt(body.release());
     m_events = events.data();
     m_starts = m_body->starts.data();
@@ -208,21 +200,39 @@ void EventArray::borrow(std::shared_ptr<const void> lender, std::span<const chan
 }
 
 bool EventArray::splice(size_t first, size_t last, std::span<const channel_event> block, double shift) {
+    double least = m_body != nullptr ? m_body->leastStep : Qx::kNoTime;
+    if (least == 0 && shift != 0) {
+        least = shortestStep({begin(), end()});
+    }
     if (!isOwn() || m_body->events.capacity() < m_size - (last - first) + block.size()) {
-        return spliceAnew(first, last, block, shift);
+        spliceAnew(first, last, block, shift);
+    } else {
+        moveTail(m_body->events, last, first + block.size(), shift);
+        moveTail(m_body->starts, last / 2, (first + block.size()) / 2, shift);
+        std::copy(block.begin(), block.end(), m_body->events.begin() + static_cast<std::ptrdiff_t>(first));
+        for (size_t i = 0; i < block.size(); i += 2) {
+            m_body->starts[(first + i) / 2] = block[i].editTime;
+        }
+        refer();
     }
-    const bool apart = moveTail(m_body->events, last, first + block.size(), shift);
-    moveTail(m_body->starts, last / 2, (first + block.size()) / 2, shift);
-    std::copy(block.begin(), block.end(), m_body->events.begin() + static_cast<std::ptrdiff_t>(first));
-    for (size_t i = 0; i < block.size(); i += 2) {
-        m_body->starts[(first + i) / 2] = block[i].editTime;
+    const size_t tail = first + block.size();
+    bool apart = true;
+    if (shift != 0 && tail < m_size) {
+        // Both ends of a step were rounded, each by no more than half of what lies between two numbers there.
+        const double greatest = std::max(std::abs(m_events[tail].editTime), std::abs(back().editTime));
+        least -= std::nextafter(greatest, Qx::kNoTime) - greatest;
+        if (!(least > Qx::kTimeTolerance)) {
+            apart = shortestStep({m_events + tail, end()}) > Qx::kTimeTolerance;
+            least = 0;
+        }
     }
-    refer();
+    const size_t ahead = first > 0 ? first - 1 : 0;
+    m_body->leastStep = shortestStep({m_events + ahead, m_events + std::min(tail + 1, m_size)}, least);
     return apart;
 }
 
 /// The same into fresh memory: nothing is copied that does not stay.
-bool EventArray::spliceAnew(size_t first, size_t last, std::span<const channel_event> block, double shift) {
+void EventArray::spliceAnew(size_t first, size_t last, std::span<const channel_event> block, double shift) {
     auto body = std::make_unique<Body>();
     Events& events = body->events;
     events.reserve(withSlack(m_size - (last - first) + block.size()));
@@ -233,11 +243,15 @@ bool EventArray::spliceAnew(size_t first, size_t last, std::span<const channel_e
     for (size_t i = tail; i < events.size(); ++i) {
         events[i].editTime += shift;
     }
-    const bool apart = shift == 0 || areApart(events.data() + tail, events.size() - tail);
     body->starts.reserve(events.capacity() / 2);
     adopt(body.release());
     settle();
-    return apart;
+}
+
+void EventArray::noteSteps(size_t index) {
+    const size_t from = index > 0 ? index - 1 : 0;
+    m_body->leastStep =
+        shortestStep({m_events + from, m_events + std::min(index + 2, m_size)}, m_body->leastStep);
 }
 
 void EventArray::setTime(size_t index, double time) {
@@ -245,4 +259,5 @@ void EventArray::setTime(size_t index, double time) {
     if (index % 2 == 0) {
         m_body->starts[index / 2] = time;
     }
+    noteSteps(index);
 }

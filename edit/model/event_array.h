@@ -136,7 +136,9 @@ private:
     [[nodiscard]] bool isOwn() const noexcept;
     /// Makes the packed times agree with the events.
     void settle();
-    bool spliceAnew(size_t first, size_t last, std::span<const channel_event> block, double shift);
+    /// The event at a place was put there or moved.
+    void noteSteps(size_t index);
+    void spliceAnew(size_t first, size_t last, std::span<const channel_event> block, double shift);
 
     Body* m_body = nullptr;
     const channel_event* m_events = nullptr;
