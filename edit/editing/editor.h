@@ -185,7 +185,7 @@ private:
     void performEdit(edit_operation op, Result& result);
     void perform(edit_operation op, Result& result);
     void makeChanges(edit_operation op, CueFollower& cues);
-    void bindEffects(const cel::IdMap& copied, const cel::IdMap& splits);
+    void bindEffects(const cel::IdMap& copied, const cel::Splits& splits);
     void padTracksWithBlack(edit_operation op);
     void simplifyBlack();
     void noteTouched(const IdStamp& chan, const cel::Range& span);

@@ -10,7 +10,8 @@ using Op = edit_operation;
 namespace {
 
 /// Binds copies of the objects that `from` has for some events to the events that were made of them.
-void copyObjects(TagBag& from, TagBag& to, const cel::IdMap& stamps) {
+template <typename Stamps>
+void copyObjects(TagBag& from, TagBag& to, const Stamps& stamps) {
     if (from.numObjects() == 0) {
         return;
     }
@@ -26,7 +27,7 @@ void copyObjects(TagBag& from, TagBag& to, const cel::IdMap& stamps) {
 } // namespace
 
 bool Editor::EditOpPerformer::doEdit(cel& its, const Step& step, cel::IdMap& copied,
-                                     cel::IdMap& splits) const {
+                                     cel::Splits& splits) const {
     const cel::Range all(0, step.length);
     switch (step.core) {
     case kCoreReplace:
@@ -69,7 +70,7 @@ void Editor::makeChanges(edit_operation op, CueFollower& cues) {
             its->fillToTime(step.at);
         }
         cel::IdMap copied;
-        cel::IdMap splits;
+        cel::Splits splits;
         if (!performer.doEdit(*its, step, copied, splits)) {
             ole_splat("Editor: a step of %s that was checked failed\n", editOperationName(op).data());
             continue;
@@ -82,7 +83,7 @@ void Editor::makeChanges(edit_operation op, CueFollower& cues) {
     }
 }
 
-void Editor::bindEffects(const cel::IdMap& copied, const cel::IdMap& splits) {
+void Editor::bindEffects(const cel::IdMap& copied, const cel::Splits& splits) {
     TagBag& store = m_destination.getEdit()->objectStore();
     copyObjects(m_source->objectStore(), store, copied);
     copyObjects(store, store, splits);

@@ -30,15 +30,15 @@ ce_info ce_handle::get_ce_info() const {
     return its != nullptr ? its->kind : ce_info{};
 }
 
-ce_handle ce_handle::get_next_ceh(ce_info kind) const {
+ce_handle ce_handle::get_next_ceh(int kinds) const {
     ce_handle next = *this;
-    next.increment(kind);
+    next.increment(kinds);
     return next;
 }
 
-ce_handle ce_handle::get_prev_ceh(ce_info kind) const {
+ce_handle ce_handle::get_prev_ceh(int kinds) const {
     ce_handle before = *this;
-    before.decrement(kind);
+    before.decrement(kinds);
     return before;
 }
 
@@ -55,8 +55,8 @@ ce_handle ce_handle::get_end_ceh() const {
     return m_cel != nullptr ? m_cel->get_end_ceh() : ce_handle();
 }
 
-bool ce_handle::find_ceh(ce_handle& found, double time, ce_info kind) const {
-    found = m_cel != nullptr ? m_cel->find_ceh(time, kind) : ce_handle();
+bool ce_handle::find_ceh(ce_handle& found, double time, int kinds) const {
+    found = m_cel != nullptr ? m_cel->find_ceh(time, kinds) : ce_handle();
     return found.valid() != 0;
 }
 
@@ -142,8 +142,8 @@ channel_event ce_handle::get_channel_event() const {
 
 bool ce_handle::time_in_range_exclusive(double time) const {
     return valid() != 0 && matching_out_ceh().valid() != 0 &&
-           time > matching_in_ceh().get_edit_time() + kTolerance &&
-           time < matching_out_ceh().get_edit_time() - kTolerance;
+           !isNotPast(time, matching_in_ceh().get_edit_time()) &&
+           !isNotPast(matching_out_ceh().get_edit_time(), time);
 }
 
 IdStamp ce_handle::getEffectGraph() const {
@@ -189,8 +189,10 @@ void ce_handle::change(Change&& apply) {
 
 CEHPair::CEHPair(const ce_handle& event) : m_in(event.matching_in_ceh()), m_out(event.matching_out_ceh()) {}
 
-CEHPair::CEHPair(const cel& its, double time) {
-    const ce_handle in = its.find_ceh(time, CE_IN_POINT);
+CEHPair::CEHPair(const cel& its, double time) : CEHPair(&its, time) {}
+
+CEHPair::CEHPair(const cel* its, double time) {
+    const ce_handle in = its != nullptr ? its->find_ceh(time, CE_IN_POINT) : ce_handle();
     const ce_handle out = in.matching_out_ceh();
     if (in.valid() != 0 && out.valid() != 0 &&
         Qx::timeIsConsideredToBeInRegion(time, {in.get_edit_time(), out.get_edit_time()})) {

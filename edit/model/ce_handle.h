@@ -31,12 +31,13 @@ public:
     /// The other end of the event's pair; for the end itself, a copy of this handle.
     [[nodiscard]] ce_handle matching_in_ceh() const;
     [[nodiscard]] ce_handle matching_out_ceh() const;
-    [[nodiscard]] ce_handle get_next_ceh(ce_info kind) const;
-    [[nodiscard]] ce_handle get_prev_ceh(ce_info kind) const;
-    /// Moves to the next event of a kind; past the last one, to the cel's event count.
-    void increment(ce_info kind);
-    /// Moves to the event of a kind before; before the first one, to -1.
-    void decrement(ce_info kind);
+    [[nodiscard]] ce_handle get_next_ceh(int kinds) const;
+    [[nodiscard]] ce_handle get_prev_ceh(int kinds) const;
+    /// Moves to the next event of some kinds (`ce_info` values, or'ed); past the last one, to the cel's event
+    /// count.
+    void increment(int kinds);
+    /// Moves to the event of some kinds before; before the first one, to -1.
+    void decrement(int kinds);
     /// `increment(CE_ANY)`; true while the handle is valid.
     bool next();
     ce_handle& operator++();
@@ -44,7 +45,7 @@ public:
     [[nodiscard]] ce_handle get_start_ceh() const;
     [[nodiscard]] ce_handle get_end_ceh() const;
     /// `cel::find_ceh` on the handle's cel; false when `found` is not valid.
-    bool find_ceh(ce_handle& found, double time, ce_info kind) const;
+    bool find_ceh(ce_handle& found, double time, int kinds) const;
 
     [[nodiscard]] double get_edit_time() const;
     /// See `cel::set_edit_time`.
@@ -93,8 +94,9 @@ public:
     CEHPair() = default;
     /// The pair that holds an event.
     explicit CEHPair(const ce_handle& event);
-    /// The pair that plays at a time.
+    /// The pair that plays at a time; of a null cel, none.
     CEHPair(const cel& its, double time);
+    CEHPair(const cel* its, double time);
     [[nodiscard]] bool valid() const { return m_in.valid() != 0 && m_out.valid() != 0; }
     [[nodiscard]] ce_handle inH() const { return m_in; }
     [[nodiscard]] ce_handle outH() const { return m_out; }

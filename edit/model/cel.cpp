@@ -47,10 +47,10 @@ bool cel::add_event(const channel_event& event) {
     }
     if (!m_events.empty()) {
         const double last = m_events.back().editTime;
-        if (added.editTime < last - kTolerance) {
+        if (!isNotPast(last, added.editTime)) {
             return false;
         }
-        added.editTime = std::max(added.editTime, last);
+        added.editTime = TimeLayer(last).lay(added.editTime);
     }
     m_events.append(added);
     changedNow();
@@ -66,24 +66,16 @@ ce_handle cel::insertEventPair(int pair, const cookie& strip, double stripTime, 
     if (pair < 0 || pair > numPairs() || m_events.size() % 2 != 0 || !(length >= 0)) {
         return {};
     }
-    FreshPair added(strip, stripTime, editTime, editTime + length);
     const size_t at = 2 * static_cast<size_t>(pair);
-    if (at > 0) {
-        const double before = m_events[at - 1].editTime;
-        if (added.in.editTime < before - kTolerance) {
-            return {};
-        }
-        added.in.editTime = std::max(added.in.editTime, before);
-        added.out.editTime = std::max(added.out.editTime, before);
+    const double before = timeBefore(at);
+    const double after = timeFrom(at);
+    const double end = editTime + length;
+    if (!isNotPast(before, editTime) || !isNotPast(end, after)) {
+        return {};
     }
-    if (at < m_events.size()) {
-        const double after = m_events[at].editTime;
-        if (added.out.editTime > after + kTolerance) {
-            return {};
-        }
-        added.in.editTime = std::min(added.in.editTime, after);
-        added.out.editTime = std::min(added.out.editTime, after);
-    }
+    TimeLayer layer(before, after);
+    const double from = layer.lay(editTime);
+    const FreshPair added(strip, stripTime, from, layer.lay(end));
     if (!isGoodEvent(added.in) || !isGoodEvent(added.out)) {
         return {};
     }
@@ -108,14 +100,14 @@ bool cel::setEvent(int index, const channel_event& event) {
         return false;
     }
     const size_t at = static_cast<size_t>(index);
-    const bool fits = event.kind == (at % 2 == 0 ? CE_IN_POINT : CE_OUT_POINT) &&
-                      (at == 0 || event.editTime >= m_events[at - 1].editTime) &&
-                      (at + 1 == m_events.size() || event.editTime <= m_events[at + 1].editTime);
-    if (!fits) {
+    const double before = timeBefore(at);
+    const double after = timeFrom(at + 1);
+    if (event.kind != (at % 2 == 0 ? CE_IN_POINT : CE_OUT_POINT) || event.editTime < before ||
+        event.editTime > after) {
         return false;
     }
     m_events.change(at) = event;
-    m_events.setTime(at, event.editTime);
+    m_events.setTime(at, TimeLayer(before, after).lay(event.editTime));
     changedNow();
     return true;
 }
@@ -157,31 +149,32 @@ namespace cel_detail {
 
 namespace {
 
-bool isInPlace(const channel_event& event, size_t index, double last) {
-    return isGoodEvent(event) && event.kind == (index % 2 == 0 ? CE_IN_POINT : CE_OUT_POINT) &&
-           event.editTime >= last;
+bool isInPlace(const channel_event& event, size_t index) {
+    return isGoodEvent(event) && event.kind == (index % 2 == 0 ? CE_IN_POINT : CE_OUT_POINT);
 }
 
 } // namespace
 
 bool isGood(std::span<const channel_event> events) {
-    double last = -cel::kGreatestTime;
+    double last = -Qx::kNoTime;
     for (size_t i = 0; i < events.size(); ++i) {
-        if (!isInPlace(events[i], i, last)) {
+        const double time = events[i].editTime;
+        if (!isInPlace(events[i], i) || (isNotPast(time, last) && time != last)) {
             return false;
         }
-        last = events[i].editTime;
+        last = time;
     }
     return events.size() % 2 == 0;
 }
 
 bool checkAndSettle(Events& events) {
-    double last = -cel::kGreatestTime;
+    double last = -Qx::kNoTime;
+    TimeLayer layer;
     for (size_t i = 0; i < events.size(); ++i) {
-        if (!isInPlace(events[i], i, last - kTolerance)) {
+        if (!isInPlace(events[i], i) || !isNotPast(last, events[i].editTime)) {
             return false;
         }
-        last = events[i].editTime = std::max(events[i].editTime, last);
+        last = events[i].editTime = layer.lay(events[i].editTime);
     }
     return events.size() % 2 == 0;
 }

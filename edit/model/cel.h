@@ -4,6 +4,7 @@
 #include "edit/model/channel_event.h"
 #include "edit/model/editable.h"
 #include "edit/model/event_array.h"
+#include "edit/model/stamp_index.h"
 #include "platform/base/status.h"
 #include "platform/media/tv_standard.h"
 #include "platform/store/streamable_layer.h"
@@ -11,6 +12,7 @@
 
 #include <functional>
 #include <map>
+#include <memory>
 
 /// How `chequerboard` treats a fade at a cut.
 enum class SoftCuts {
@@ -35,9 +37,14 @@ enum class SoftCuts {
 /// single fields change one field of one event, so whoever uses them does.
 ///
 /// An operation that answers false or null has changed nothing.
-class QM_API cel : public StreamableLayer {
+///
+/// An edit shares its cels (`Qx::Ptr`); what walks over one holds it too (`CelEventPair`), so that a channel
+/// may be removed or get another cel meanwhile.
+class QM_API cel : public StreamableLayer, public std::enable_shared_from_this<cel> {
 public:
     using IdMap = std::map<IdStamp, IdStamp>;
+    /// The stamp of an in point and that of each piece that was split from its pair.
+    using Splits = std::multimap<IdStamp, IdStamp>;
     using Range = NumRange<double, Ordered>;
 
     /// \name What an event may hold: the greatest absolute edit time and strip time in seconds, and velocity
@@ -71,12 +78,13 @@ public:
     void reserve(int pairs);
 
     /// Appends one event, while loading or building: an in point at or after the last out point, or the out
-    /// point of the last in point. One that lies before it by no more than the tolerance is moved up to it;
+    /// point of the last in point. One within the tolerance of that, after it or before, is moved to it;
     /// one without a stamp gets a fresh one. False, changing nothing, for an event that does not follow or
     /// holds what no cel may (`kGreatestTime` and its like, a level that is no number, another kind than 1
     /// and 4).
     bool add_event(const channel_event& event);
-    /// Appends or inserts a pair that plays `strip` from `stripTime` at [editTime, editTime + length).
+    /// Appends or inserts a pair that plays `strip` from `stripTime` at [editTime, editTime + length). An end
+    /// within the tolerance of a neighbour lies at it, and a length within it is none.
     /// Returns the in handle; an invalid one, with nothing changed, if the pair would overlap another, lie
     /// out of order, or have a length below zero. `insertEventPair` puts it before pair number `pair`.
     ce_handle appendEventPair(const cookie& strip, double stripTime, double editTime, double length);
@@ -88,7 +96,8 @@ public:
     [[nodiscard]] const channel_event* getChanEventPtr(int index) const {
         return index >= 0 && index < numEvents() ? m_events.data() + index : nullptr;
     }
-    /// Overwrites one event in place, that one alone. False if the result would not be consistent.
+    /// Overwrites one event in place, that one alone; its time becomes that of a neighbour within the
+    /// tolerance. False if the result would not be consistent.
     bool setEvent(int index, const channel_event& event);
     /// @}
 
@@ -96,11 +105,12 @@ public:
     /// @{
     [[nodiscard]] ce_handle get_start_ceh() const;
     [[nodiscard]] ce_handle get_end_ceh() const;
-    /// The event of a kind that governs a time, by binary search. Kind 1: the in point of the last pair that
-    /// starts at or before `time` (within the tolerance), whether it still plays or not. Kind 4: the first
-    /// out point at or after `time`. Kind 7: the last event at or before `time`. Invalid if there is none.
-    [[nodiscard]] ce_handle find_ceh(double time, ce_info kind) const;
-    [[nodiscard]] ce_handle get_next_ceh(const ce_handle& from, ce_info kind) const;
+    /// The event of some kinds (`ce_info` values, or'ed) that governs a time, by binary search. Kind 1: the
+    /// in point of the last pair that starts at or before `time` (within the tolerance), whether it still
+    /// plays or not. Kind 4: the first out point at or after `time`. Kind 7: the last event at or before
+    /// `time`. Invalid if there is none.
+    [[nodiscard]] ce_handle find_ceh(double time, int kinds) const;
+    [[nodiscard]] ce_handle get_next_ceh(const ce_handle& from, int kinds) const;
     [[nodiscard]] int check_ceh(const ce_handle& handle) const;
     /// The handle of the event with a stamp, an in point before an out point; invalid if none. Linear.
     [[nodiscard]] ce_handle findId(const IdStamp& id, int hint = -1) const;
@@ -112,8 +122,8 @@ public:
     [[nodiscard]] double get_end_time() const;   ///< 0 for an empty cel
     [[nodiscard]] double get_edit_time(const ce_handle& handle) const;
     /// Moves one event and changes nothing else of the pair: its strip time there and its velocity stay as
-    /// they are. Without `force` a move past a neighbour is refused (false); with it the event stops at the
-    /// neighbour.
+    /// they are. A time within the tolerance of a neighbour's is the neighbour's. Without `force` a move past
+    /// a neighbour is refused (false); with it the event stops at the neighbour.
     bool set_edit_time(const ce_handle& handle, double time, bool force);
     [[nodiscard]] double get_strip_time(const ce_handle& handle,
                                         double editTime = Qx::kStripTimeAtEvent) const;
@@ -139,14 +149,16 @@ public:
     /// between two pairs of one source, a cut.
     ///
     /// What holds for all of them:
-    /// - Marks are seconds. A mark within the tolerance (`Qx::kTimeTolerance`) of a cut means that cut, and
-    /// what
-    ///   is joined there meets exactly: no operation leaves a piece or a gap shorter than the tolerance. A
-    ///   pair of no length belongs to the region that starts with it.
-    /// - A range that is no longer than the tolerance, a mark that is no usable time (`kGreatestTime`), a
-    /// null
-    ///   source, and a result that would reach past `kGreatestTime` are refused; so is everything while the
-    ///   last pair is open (an in point added, its out point not).
+    /// - Marks are seconds. A mark within the tolerance (`Qx::kTimeTolerance`) of a cut means that cut, of
+    /// two
+    ///   the nearer, and what is joined there meets exactly. A pair of no length belongs to the region that
+    ///   starts with it.
+    /// - No operation leaves a piece or a gap shorter than the tolerance: what would be one, because a mark
+    ///   means a cut beside it or a time was rounded, goes. (Times are doubles: at 1e9 s they lie a tenth of
+    ///   the tolerance apart, so whatever moves there is rounded to that.)
+    /// - A range that is no longer than the tolerance or both of whose marks mean one cut, a mark that is no
+    ///   usable time (`kGreatestTime`), a null source, and a result that would reach past `kGreatestTime` are
+    ///   refused; so is everything while the last pair is open (an in point added, its out point not).
     /// - Gaps are content: a gap of the source is a gap where it is laid. Past the end of a cel lies a gap,
     /// so
     ///   what is laid there leaves one, and nothing is filled with black; a region past the end is not an
@@ -156,13 +168,14 @@ public:
     ///   cut are those that the pair has there. The events at the cut have no fade; the fade at an end that
     ///   stays, stays. The `dmod` codes of the two ends go with the pieces' ends.
     /// - Stamps: a piece that is left of a pair keeps both of the pair's stamps, and so what is bound to
-    /// them.
-    ///   Where both pieces stay in the cel, the left one keeps the in point's stamp, the right one the out
-    ///   point's, and the two events at the cut get fresh ones; `splits`, when given, receives the in point's
-    ///   stamp and the fresh one of the right piece's in point, so that an effect can be bound to both.
+    ///   them.
+    ///   Where several pieces stay in the cel, the first keeps the in point's stamp, the last the out
+    ///   point's, and the events at the cuts get fresh ones; `splits`, when given, receives the in point's
+    ///   stamp and the fresh one of each further piece's in point, so that an effect can be bound to all.
     /// - Events that are copied out of a source get fresh stamps; `ids` receives the stamp of each and the
     /// fresh
-    ///   one. Of a stamp that is copied several times it holds the last.
+    ///   one: of a pair that several gaps took a piece of (`materialOnly`), that of the first piece, from
+    ///   which the others count as split.
     /// - Velocity stays; the strip time of a piece's out point is where its in point and velocity lead.
     ///
     /// Cost: two binary searches, the events laid, and one pass over what follows if it moves. No allocation
@@ -192,7 +205,7 @@ public:
     ///     AA                                  AA de         past the end
     ///     (empty)                                de
     ///     AAABBB    insert([3, 6), 3)         AAAe  BBB     the source ends within its range
-    bool insert(const cel* source, const Range& sourceRange, double at, IdMap& ids, IdMap* splits = nullptr);
+    bool insert(const cel* source, const Range& sourceRange, double at, IdMap& ids, Splits* splits = nullptr);
 
     /// Takes a region out; all that follows moves earlier by its length.
     ///
@@ -201,7 +214,7 @@ public:
     ///     AAAAAAA                      AA|AA     the pair is split
     ///          BB                        BB      a gap goes too
     ///     A                            A         past the end: true, and nothing is changed
-    bool remove(const Range& range, IdMap* splits = nullptr);
+    bool remove(const Range& range, Splits* splits = nullptr);
 
     /// Overwrites from a time with a part of a source; nothing moves.
     ///
@@ -223,7 +236,7 @@ public:
     ///     region;
     ///                                                         between d and e lies the cut of A and B
     bool replace(const cel* source, const Range& sourceRange, double at, IdMap& ids,
-                 bool materialOnly = false, IdMap* splits = nullptr);
+                 bool materialOnly = false, Splits* splits = nullptr);
 
     /// Joins another cel on: its time 0 comes to lie at `at`. Refused if it would begin before this cel ends.
     ///
@@ -233,7 +246,8 @@ public:
     ///
     /// The events keep their stamps but for those that this cel has already, which become fresh ones: the
     /// parts that `extract` made weld together again. Pairs that play on through the joint stay two
-    /// (`simplify`).
+    /// (`simplify`). Costs what is joined on, also in a row of welds; the first of a row, or after another
+    /// change, costs one pass over the cel.
     bool weld(const cel* other, double at);
 
     /// A copy with `seconds` of black put before its first event ('S'), after its last ('E'), or both ('B').
@@ -255,7 +269,9 @@ public:
     ///     ^   ^   ^   ^   ^   ^
     ///
     /// Each end is trimmed or drawn out: what plays at an edit time that a pair still covers stays. A pair
-    /// that is rounded to nothing is left out; cuts that lay on one another still do.
+    /// that is rounded to nothing is left out; cuts that lay on one another still do. A resolution within the
+    /// tolerance leaves the times where they are. Null while the last pair is open, and if a time would be
+    /// rounded past `kGreatestTime`.
     [[nodiscard]] std::unique_ptr<cel> quantise() const;
 
     /// A copy of the part that is played when something plays this cel as its strip: the moments from
@@ -267,11 +283,13 @@ public:
     ///     AAABBBBCC    rescale(0, 3, 5, 2, ...)    BBA         backwards: each pair in reverse
     ///     AAABBBBCC    rescale(0, 3, 4, 4, ...)    BBB         a freeze of one moment
     ///
-    /// Strip times at the pairs' ends stay, velocities are multiplied by (stripOut - stripIn) / (editOut -
-    /// editIn). Levels at the ends are multiplied by a line from `levelIn` at `editIn` to `levelOut` at
-    /// `editOut`. Stamps are copied. With `quantiseResult` non-zero the result is quantised. Where nothing
-    /// plays the copy is empty. Null for times that are not usable, for an edit span that is not longer than
-    /// the tolerance, and where a velocity would pass `kGreatestVelocity`.
+    /// `stripIn` and `stripOut` are marks, as above; if both mean one time, it is a freeze. Strip times at
+    /// the pairs' ends stay, velocities are multiplied by (stripOut - stripIn) / (editOut - editIn). Levels
+    /// at the ends are multiplied by a line from `levelIn` at `editIn` to `levelOut` at `editOut`. Stamps are
+    /// copied. With `quantiseResult` non-zero the result is quantised. Where nothing plays the copy is empty;
+    /// a piece that would become shorter than the tolerance is left out. Null for times that are not usable,
+    /// for an edit span that is not longer than the tolerance, and where a velocity would pass
+    /// `kGreatestVelocity`.
     [[nodiscard]] std::unique_ptr<cel> rescale(double editIn, double editOut, double stripIn, double stripOut,
                                                double levelIn, double levelOut, int quantiseResult) const;
 
@@ -314,8 +332,8 @@ public:
     using MayMerge = std::function<bool(const channel_event* pair, const channel_event* next)>;
     bool simplify(Simplification::Type type, const MayMerge& mayMerge = nullptr);
 
-    /// Non-zero if the events are consistent: in and out points paired, in order, every field one that a cel
-    /// may hold, stamps set.
+    /// Non-zero if the events are consistent: in and out points paired, in order, each at the time of the one
+    /// ahead or beyond the tolerance from it, every field one that a cel may hold, stamps set.
     [[nodiscard]] int is_good_cel() const;
     /// @}
 
@@ -360,6 +378,15 @@ private:
         ++m_changeCount;
     }
 
+    /// Time of the event ahead of place `at`, and that of the first from there on; without such an event a
+    /// time beyond all that an event may have.
+    [[nodiscard]] double timeBefore(size_t at) const {
+        return at > 0 ? m_events[at - 1].editTime : -Qx::kNoTime;
+    }
+    [[nodiscard]] double timeFrom(size_t at) const {
+        return at < m_events.size() ? m_events[at].editTime : Qx::kNoTime;
+    }
+
     EventArray m_events;
     String m_name;
     IdStamp m_id;
@@ -368,6 +395,7 @@ private:
     double m_resolution = 0;
     bool m_changed = false;
     uint64_t m_changeCount = 0;
+    StampIndex m_stamps; ///< for `weld`
 };
 
 // Stepping and reading a handle is what every walk over a channel does for each pair, so it is inline.
@@ -384,14 +412,14 @@ inline ce_handle ce_handle::matching_out_ceh() const {
     return valid() != 0 ? ce_handle(m_cel, m_index | 1) : ce_handle(m_cel, -1);
 }
 
-inline void ce_handle::increment(ce_info kind) {
+inline void ce_handle::increment(int kinds) {
     if (m_cel == nullptr) {
         return;
     }
     const int at = m_index < 0 ? -1 : m_index;
     const int end = m_cel->numEvents();
-    const bool ins = (kind & CE_IN_POINT) != 0;
-    const bool outs = (kind & CE_OUT_POINT) != 0;
+    const bool ins = (kinds & CE_IN_POINT) != 0;
+    const bool outs = (kinds & CE_OUT_POINT) != 0;
     int to = end;
     if (ins && outs) {
         to = at + 1;
@@ -403,14 +431,14 @@ inline void ce_handle::increment(ce_info kind) {
     m_index = to < end ? to : end;
 }
 
-inline void ce_handle::decrement(ce_info kind) {
+inline void ce_handle::decrement(int kinds) {
     if (m_cel == nullptr) {
         return;
     }
     const int end = m_cel->numEvents();
     const int at = m_index > end ? end : m_index;
-    const bool ins = (kind & CE_IN_POINT) != 0;
-    const bool outs = (kind & CE_OUT_POINT) != 0;
+    const bool ins = (kinds & CE_IN_POINT) != 0;
+    const bool outs = (kinds & CE_OUT_POINT) != 0;
     int to = -1;
     if (ins && outs) {
         to = at - 1;

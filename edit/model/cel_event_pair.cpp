@@ -15,6 +15,7 @@ CelEventPair::CelEventPair(const EditPtr& edit, cel* its, const ce_handle& in) :
         m_in.set_its_cel(its);
     }
     m_out = m_in.matching_out_ceh();
+    hold();
 }
 
 CelEventPair::CelEventPair(const EditPtr& edit, const ce_handle& event, int chanIdx)
@@ -49,6 +50,14 @@ void CelEventPair::findAt(double time) {
 void CelEventPair::setPair(const ce_handle& event) {
     m_in = event.matching_in_ceh();
     m_out = event.matching_out_ceh();
+    hold();
+}
+
+void CelEventPair::hold() {
+    const cel* const its = getCel();
+    if (m_held.get() != its) {
+        m_held = its != nullptr ? its->weak_from_this().lock() : nullptr;
+    }
 }
 
 void CelEventPair::invalidate() {

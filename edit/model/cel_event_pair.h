@@ -3,15 +3,18 @@
 #include "edit/model/cel.h"
 #include "edit/model/channel_types.h"
 #include "edit/model/edit_ptr.h"
+#include "platform/base/ptr.h"
 
 class Streamable;
 
 /// One pair of a channel: an in point, its out point, and the edit and channel that they belong to.
 ///
-/// Holds a handle to the edit, so the edit stays open; it owns nothing else. Copying costs one count of the
-/// edit. The handles name events by index: after a change of the cel they name whatever events have those
-/// indices. A pair is valid when both handles are. Every query of an invalid pair answers the value given
-/// with it. Not thread-safe.
+/// Holds the edit, so that it stays open, and the cel, so that a walk which an observer interrupts goes on to
+/// the end over the cel that it began with, also when the channel was removed or has got another; `idx` then
+/// tells that. A cel that nothing shares (one on the stack) is not held and must outlive the pair. Copying
+/// costs a count of each. The handles name events by index: after a change of the cel they name whatever
+/// events have those indices. A pair is valid when both handles are. Every query of an invalid pair answers
+/// the value given with it. Not thread-safe.
 class QM_API CelEventPair {
 public:
     using Range = cel::Range;
@@ -117,7 +120,7 @@ public:
     /// @}
 
     /// \name Stepping
-    /// Neither allocates nor touches the edit's count (a postfix step copies the pair, which does).
+    /// Neither allocates nor touches a count (a postfix step copies the pair, which does).
     /// @{
     /// To the next pair; false past the last one, which leaves the handles one step past the end.
     bool inc() {
@@ -149,9 +152,11 @@ protected:
 
 private:
     void findAt(double time);
+    void hold();
 
     EditPtr m_edit;
     IdStamp m_chan;
     ce_handle m_in;
     ce_handle m_out;
+    Qx::Ptr<const cel> m_held; ///< the cel of the handles, if anything shares it
 };

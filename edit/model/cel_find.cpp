@@ -12,30 +12,29 @@ ce_handle cel::get_end_ceh() const {
     return {this, numEvents() - 1};
 }
 
-ce_handle cel::find_ceh(double time, ce_info kind) const {
-    const double within = time + kTolerance;
-    const bool ins = (kind & CE_IN_POINT) != 0;
-    const bool outs = (kind & CE_OUT_POINT) != 0;
+ce_handle cel::find_ceh(double time, int kinds) const {
+    const bool ins = (kinds & CE_IN_POINT) != 0;
+    const bool outs = (kinds & CE_OUT_POINT) != 0;
     if (std::isnan(time) || (!ins && !outs)) {
         return {this, -1};
     }
     if (ins) {
-        const int pair = static_cast<int>(m_events.numStartingUpTo(within)) - 1;
+        const int pair = static_cast<int>(m_events.numStartingUpTo(time, kTolerance)) - 1;
         const int index = 2 * pair;
         if (!outs || pair < 0) {
             return {this, pair < 0 ? -1 : index};
         }
         const bool ended =
-            index + 1 < numEvents() && m_events[static_cast<size_t>(index) + 1].editTime <= within;
+            index + 1 < numEvents() && isNotPast(m_events[static_cast<size_t>(index) + 1].editTime, time);
         return {this, ended ? index + 1 : index};
     }
-    const size_t pair = m_events.numEndingBefore(time - kTolerance);
+    const size_t pair = m_events.numEndingBefore(time, kTolerance);
     return {this, 2 * pair + 1 < m_events.size() ? static_cast<int>(2 * pair) + 1 : -1};
 }
 
-ce_handle cel::get_next_ceh(const ce_handle& from, ce_info kind) const {
+ce_handle cel::get_next_ceh(const ce_handle& from, int kinds) const {
     ce_handle next(this, from.index());
-    next.increment(kind);
+    next.increment(kinds);
     return next;
 }
 
@@ -76,12 +75,12 @@ bool cel::set_edit_time(const ce_handle& handle, double time, bool force) {
         return false;
     }
     const size_t at = static_cast<size_t>(handle.index());
-    const double least = at > 0 ? m_events[at - 1].editTime : -kGreatestTime;
-    const double most = at + 1 < m_events.size() ? m_events[at + 1].editTime : kGreatestTime;
-    if (!force && (time < least - kTolerance || time > most + kTolerance)) {
+    const double least = timeBefore(at);
+    const double most = timeFrom(at + 1);
+    if (!force && (!isNotPast(least, time) || !isNotPast(time, most))) {
         return false;
     }
-    m_events.setTime(at, std::clamp(time, least, most));
+    m_events.setTime(at, TimeLayer(least, most).lay(std::clamp(time, least, most)));
     changedNow();
     return true;
 }
@@ -94,7 +93,7 @@ namespace {
 
 /// The in point of the pair that plays at a time; null where none does.
 const channel_event* playingAt(const EventArray& events, double time) {
-    const size_t pairs = events.numStartingUpTo(time + kTolerance);
+    const size_t pairs = events.numStartingUpTo(time, kTolerance);
     if (pairs == 0 || 2 * pairs > events.size()) {
         return nullptr;
     }
@@ -145,13 +144,10 @@ cel::Range cel::getExtents(Editable::ExtentType type, bool fromZero) const {
 }
 
 bool cel::isEmpty(const Range& range) const {
-    for (size_t pair = m_events.numEndingBefore(range.start() + kTolerance); 2 * pair + 1 < m_events.size();
-         ++pair) {
-        const channel_event& in = m_events[2 * pair];
-        if (in.editTime >= range.end() - kTolerance) {
-            break;
-        }
-        if (!in.strip.isBlack()) {
+    const Region region(m_events, range.start(), range.end());
+    const size_t end = region.from.pair + region.numPairs();
+    for (size_t pair = region.from.pair; pair < end; ++pair) {
+        if (!m_events[2 * pair].strip.isBlack()) {
             return false;
         }
     }

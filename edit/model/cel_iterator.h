@@ -9,7 +9,7 @@
 ///
 /// Remembers the channel by its stamp and finds its cel again when it moves to the start or the end, so it
 /// may be moved there after the cel was replaced. A step moves two indices: it allocates nothing and touches
-/// no count. An iterator over a bare cel must not outlive it.
+/// no count. An iterator over a cel that nothing shares must not outlive it.
 class QM_API CelIterator : public CelEventPair {
 public:
     CelIterator() = default;

@@ -7,22 +7,8 @@ using namespace cel_detail;
 namespace {
 
 bool isUsableRange(const cel::Range& range) {
-    return isUsableTime(range.start()) && isUsableTime(range.end()) && range.length() > kTolerance;
+    return isUsableTime(range.start()) && isUsableTime(range.end()) && !isNotPast(range.end(), range.start());
 }
-
-/// A region of one cel, by its cuts.
-struct Region {
-    Cut from;
-    Cut to;
-
-    Region(const EventArray& events, double start, double end)
-        : from(cutAt(events, start)), to(cutAt(events, end)) {}
-    [[nodiscard]] double length() const { return to.time - from.time; }
-    /// Number of pairs that reach into it.
-    [[nodiscard]] size_t numPairs() const { return to.pair + (to.inside ? 1 : 0) - from.pair; }
-    /// True if a pair reaches out of it on either side, so that cutting the region out leaves two pieces.
-    [[nodiscard]] bool splitsOnePair() const { return from.inside && to.inside && from.pair == to.pair; }
-};
 
 /// Gives the events of a part fresh stamps and notes which stamp became which.
 void refresh(Events& events, size_t first, cel::IdMap& ids) {
@@ -33,9 +19,9 @@ void refresh(Events& events, size_t first, cel::IdMap& ids) {
     }
 }
 
-void noteSplit(cel::IdMap* splits, const IdStamp& old, const IdStamp& fresh) {
+void noteSplit(cel::Splits* splits, const IdStamp& old, const IdStamp& fresh) {
     if (splits != nullptr) {
-        splits->insert_or_assign(old, fresh);
+        splits->emplace(old, fresh);
     }
 }
 
@@ -54,54 +40,47 @@ void appendLeft(Events& block, const EventArray& events, const Cut& cut, bool sp
 /// Appends what is left of the pair after a cut, so that it begins at `at`; its end moves by `shift` as all
 /// that follows does.
 void appendRight(Events& block, const EventArray& events, const Cut& cut, bool split, double at, double shift,
-                 cel::IdMap* splits) {
+                 cel::Splits* splits) {
     channel_event in = cutIn(events[2 * cut.pair], events[2 * cut.pair + 1], cut.time);
     channel_event out = events[2 * cut.pair + 1];
+    in.editTime = at;
+    out.editTime += shift;
+    if (isNotPast(out.editTime, at)) {
+        return; // rounding left nothing of it
+    }
     if (split) {
         const IdStamp old = in.id;
         in.id = channel_event::newId();
         noteSplit(splits, old, in.id);
     }
-    in.editTime = at;
-    out.editTime = std::max(out.editTime + shift, at);
     block.push_back(in);
     block.push_back(out);
-}
-
-/// Puts `block` in the place of the events [first, last) and moves all that follow by `shift`. What then
-/// counts as one with `joint`, the end of the block's span, lies at it exactly.
-void splice(EventArray& events, size_t first, size_t last, const Events& block, double shift, double joint) {
-    events.splice(first, last, block, shift);
-    for (size_t i = first + block.size(); i < events.size() && events[i].editTime <= joint + kTolerance;
-         ++i) {
-        events.setTime(i, joint);
-    }
 }
 
 /// Lays the material of some pairs under the events of a region: writes the region's events as they are to
 /// be.
 class MaterialLayer {
 public:
-    MaterialLayer(Events& block, const Events& laid, cel::IdMap& ids, cel::IdMap* splits)
+    MaterialLayer(Events& block, const Events& laid, cel::IdMap& ids, cel::Splits* splits)
         : m_block(block), m_laid(laid), m_ids(ids), m_splits(splits) {}
 
     /// What lies between two pairs of the destination is laid as it is.
     void gap(double from, double to) {
         double now = from;
-        while (now < to - kTolerance && seek(now)) {
+        while (!isNotPast(to, now) && seek(now)) {
             const channel_event& in = m_laid[m_next];
             const channel_event& out = m_laid[m_next + 1];
-            const double start = in.editTime <= now + kTolerance ? now : in.editTime;
-            const double end = out.editTime >= to - kTolerance ? to : out.editTime;
-            if (start >= to - kTolerance) {
+            const double start = isNotPast(in.editTime, now) ? now : in.editTime;
+            const double end = isNotPast(to, out.editTime) ? to : out.editTime;
+            if (isNotPast(to, start)) {
                 break;
             }
             const size_t first = m_block.size();
-            m_block.push_back(start > in.editTime + kTolerance ? cutIn(in, out, start) : in);
-            m_block.push_back(end < out.editTime - kTolerance ? cutOut(in, out, end) : out);
+            m_block.push_back(isNotPast(start, in.editTime) ? in : cutIn(in, out, start));
+            m_block.push_back(isNotPast(out.editTime, end) ? out : cutOut(in, out, end));
             m_block[first].editTime = start;
             m_block[first + 1].editTime = end;
-            refresh(m_block, first, m_ids);
+            giveStamps(first);
             now = end;
         }
     }
@@ -113,11 +92,11 @@ public:
             const channel_event* material = nullptr;
             double end = to;
             if (seek(now)) {
-                const bool plays = m_laid[m_next].editTime <= now + kTolerance;
+                const bool plays = isNotPast(m_laid[m_next].editTime, now);
                 material = plays ? &m_laid[m_next] : nullptr;
                 end = m_laid[m_next + (plays ? 1 : 0)].editTime;
             }
-            end = end >= to - kTolerance ? to : end;
+            end = isNotPast(to, end) ? to : end;
             piece(in, out, now, end, material);
             now = end;
         } while (now < to);
@@ -126,10 +105,24 @@ public:
 private:
     /// Moves to the first laid pair that ends after a time; false if there is none.
     bool seek(double time) {
-        while (m_next < m_laid.size() && m_laid[m_next + 1].editTime <= time + kTolerance) {
+        while (m_next < m_laid.size() && isNotPast(m_laid[m_next + 1].editTime, time)) {
             m_next += 2;
         }
         return m_next < m_laid.size();
+    }
+
+    /// The stamps of the pair of the source that was just laid. The first piece of it counts as its copy;
+    /// what is laid of it in further gaps, as split from that.
+    void giveStamps(size_t first) {
+        if (m_copied == m_next + 1) {
+            m_block[first].id = channel_event::newId();
+            m_block[first + 1].id = channel_event::newId();
+            noteSplit(m_splits, m_copy, m_block[first].id);
+            return;
+        }
+        refresh(m_block, first, m_ids);
+        m_copied = m_next + 1;
+        m_copy = m_block[first].id;
     }
 
     void piece(const channel_event& in, const channel_event& out, double from, double to,
@@ -154,13 +147,15 @@ private:
     Events& m_block;
     const Events& m_laid;
     size_t m_next = 0;
+    size_t m_copied = 0; ///< 1 + place of the laid pair that was copied last
+    IdStamp m_copy;      ///< and the stamp of the copy's in point
     cel::IdMap& m_ids;
-    cel::IdMap* m_splits;
+    cel::Splits* m_splits;
 };
 
 /// The events of a region of `events` with the material of `laid` under them.
 void layMaterial(Events& block, const EventArray& events, const Region& region, const Events& laid,
-                 cel::IdMap& ids, cel::IdMap* splits) {
+                 cel::IdMap& ids, cel::Splits* splits) {
     MaterialLayer layer(block, laid, ids, splits);
     double now = region.from.time;
     const size_t end = region.from.pair + region.numPairs();
@@ -180,44 +175,92 @@ void layMaterial(Events& block, const EventArray& events, const Region& region, 
 
 namespace cel_detail {
 
-void appendPart(Events& part, const EventArray& source, const Cut& first, const Cut& last, double from,
-                double to) {
+namespace {
+
+/// Lays all times anew.
+void settle(Events& events) {
+    Events settled;
+    settled.reserve(events.size());
+    TimeLayer layer;
+    for (size_t i = 0; i < events.size(); i += 2) {
+        channel_event in = events[i];
+        channel_event out = events[i + 1];
+        const bool hadLength = in.editTime < out.editTime;
+        in.editTime = layer.lay(in.editTime);
+        out.editTime = layer.lay(out.editTime);
+        appendLaid(settled, in, out, hadLength);
+    }
+    events.swap(settled);
+}
+
+} // namespace
+
+void appendPart(Events& part, const EventArray& source, const Region& region, double from, double to) {
+    TimeLayer layer(from, to);
     const auto moved = [&](double time) {
-        if (time <= first.time) {
-            return from;
-        }
-        return time >= last.time ? to : std::clamp(from + (time - first.time), from, to);
+        return layer.lay(from == region.from.time ? time : from + (time - region.from.time));
     };
-    const size_t end = last.pair + (last.inside ? 1 : 0);
-    for (size_t pair = first.pair; pair < end; ++pair) {
-        const channel_event& in = source[2 * pair];
-        const channel_event& out = source[2 * pair + 1];
-        part.push_back(pair == first.pair && first.inside ? cutIn(in, out, first.time) : in);
-        part.push_back(pair == last.pair && last.inside ? cutOut(in, out, last.time) : out);
-        part[part.size() - 2].editTime = moved(part[part.size() - 2].editTime);
-        part.back().editTime = moved(part.back().editTime);
+    const Cut& first = region.from;
+    const Cut& last = region.to;
+    for (size_t pair = first.pair; pair < first.pair + region.numPairs(); ++pair) {
+        const channel_event& wholeIn = source[2 * pair];
+        const channel_event& wholeOut = source[2 * pair + 1];
+        channel_event in =
+            pair == first.pair && first.inside ? cutIn(wholeIn, wholeOut, first.time) : wholeIn;
+        channel_event out =
+            pair == last.pair && last.inside ? cutOut(wholeIn, wholeOut, last.time) : wholeOut;
+        const bool hadLength = in.editTime < out.editTime;
+        in.editTime = moved(in.editTime);
+        out.editTime = out.editTime < last.time ? moved(out.editTime) : to;
+        appendLaid(part, in, out, hadLength);
+    }
+}
+
+void spliceShifted(EventArray& events, size_t first, size_t last, std::span<const channel_event> block,
+                   double shift, double joint) {
+    bool apart = events.splice(first, last, block, shift);
+    size_t next = first + block.size();
+    if (next < events.size() && isNotPast(events[next].editTime, joint)) {
+        const double rounded = events[next].editTime;
+        for (; next < events.size() && events[next].editTime == rounded; ++next) {
+            events.setTime(next, joint);
+        }
+    }
+    if (next > 0 && next < events.size()) {
+        const double ahead = events[next - 1].editTime;
+        apart = apart && (events[next].editTime == ahead || !isNotPast(events[next].editTime, ahead));
+    }
+    if (!apart) {
+        settle(EventArray::Rewriting(events).events());
     }
 }
 
 } // namespace cel_detail
 
 std::unique_ptr<cel> cel::extract(double from, double to, unsigned flags) const {
-    if (!isUsableTime(from) || !isUsableTime(to) || !(to - from > kTolerance) || m_events.size() % 2 != 0) {
+    if (!isUsableTime(from) || !isUsableTime(to) || isNotPast(to, from) || m_events.size() % 2 != 0) {
         return nullptr;
     }
     const Region region(m_events, from, to);
-    const double start = (flags & KeepTimes) != 0 ? region.from.time : 0;
+    if (region.empty()) {
+        return nullptr;
+    }
+    const bool stays = (flags & KeepTimes) != 0;
     auto part = std::make_unique<cel>();
     part->m_resolution = m_resolution;
     Events events;
     events.reserve(2 * region.numPairs());
-    appendPart(events, m_events, region.from, region.to, start, start + region.length());
+    appendPart(events, m_events, region, stays ? region.from.time : 0,
+               stays ? region.to.time : region.length());
+    if (!events.empty() && !isUsableTime(events.back().editTime)) {
+        return nullptr;
+    }
     part->m_events.assign(std::move(events));
     part->changedNow();
     return part;
 }
 
-bool cel::insert(const cel* source, const Range& sourceRange, double at, IdMap& ids, IdMap* splits) {
+bool cel::insert(const cel* source, const Range& sourceRange, double at, IdMap& ids, Splits* splits) {
     if (source == nullptr || !isUsableRange(sourceRange) || !isUsableTime(at) || m_events.size() % 2 != 0 ||
         source->m_events.size() % 2 != 0) {
         return false;
@@ -226,7 +269,8 @@ bool cel::insert(const cel* source, const Range& sourceRange, double at, IdMap& 
     const Cut cut = cutAt(m_events, at);
     const double length = part.length();
     const double joint = cut.time + length;
-    if (!isUsableTime(std::max(get_end_time(), cut.time) + length)) {
+    if (part.empty() || isNotPast(joint, cut.time) ||
+        !isUsableTime(std::max(get_end_time(), cut.time) + length)) {
         return false;
     }
     Events block;
@@ -235,21 +279,24 @@ bool cel::insert(const cel* source, const Range& sourceRange, double at, IdMap& 
         appendLeft(block, m_events, cut, true);
     }
     const size_t first = block.size();
-    appendPart(block, source->m_events, part.from, part.to, cut.time, joint);
+    appendPart(block, source->m_events, part, cut.time, joint);
     refresh(block, first, ids);
     if (cut.inside) {
         appendRight(block, m_events, cut, true, joint, length, splits);
     }
-    splice(m_events, 2 * cut.pair, 2 * (cut.pair + (cut.inside ? 1 : 0)), block, length, joint);
+    spliceShifted(m_events, 2 * cut.pair, 2 * (cut.pair + (cut.inside ? 1 : 0)), block, length, joint);
     changedNow();
     return true;
 }
 
-bool cel::remove(const Range& range, IdMap* splits) {
+bool cel::remove(const Range& range, Splits* splits) {
     if (!isUsableRange(range) || m_events.size() % 2 != 0) {
         return false;
     }
     const Region region(m_events, range.start(), range.end());
+    if (region.empty()) {
+        return false;
+    }
     Events block;
     block.reserve(4);
     if (region.from.inside) {
@@ -261,14 +308,14 @@ bool cel::remove(const Range& range, IdMap* splits) {
     }
     const size_t last = region.from.pair + region.numPairs();
     if (region.numPairs() > 0 || 2 * last < m_events.size()) {
-        splice(m_events, 2 * region.from.pair, 2 * last, block, -region.length(), region.from.time);
+        spliceShifted(m_events, 2 * region.from.pair, 2 * last, block, -region.length(), region.from.time);
         changedNow();
     }
     return true;
 }
 
 bool cel::replace(const cel* source, const Range& sourceRange, double at, IdMap& ids, bool materialOnly,
-                  IdMap* splits) {
+                  Splits* splits) {
     if (source == nullptr || !isUsableRange(sourceRange) || !isUsableTime(at) ||
         !isUsableTime(at + sourceRange.length()) || m_events.size() % 2 != 0 ||
         source->m_events.size() % 2 != 0) {
@@ -276,7 +323,7 @@ bool cel::replace(const cel* source, const Range& sourceRange, double at, IdMap&
     }
     const Region part(source->m_events, sourceRange.start(), sourceRange.end());
     const Region region(m_events, at, at + sourceRange.length());
-    if (part.length() <= kTolerance || region.length() <= kTolerance) {
+    if (part.empty() || region.empty()) {
         return false;
     }
     Events block;
@@ -288,18 +335,18 @@ bool cel::replace(const cel* source, const Range& sourceRange, double at, IdMap&
     if (materialOnly) {
         Events laid;
         laid.reserve(2 * part.numPairs());
-        appendPart(laid, source->m_events, part.from, part.to, region.from.time, region.to.time);
+        appendPart(laid, source->m_events, part, region.from.time, region.to.time);
         layMaterial(block, m_events, region, laid, ids, splits);
     } else {
         const size_t first = block.size();
-        appendPart(block, source->m_events, part.from, part.to, region.from.time, region.to.time);
+        appendPart(block, source->m_events, part, region.from.time, region.to.time);
         refresh(block, first, ids);
     }
     if (region.to.inside) {
         appendRight(block, m_events, region.to, apart, region.to.time, 0, splits);
     }
-    splice(m_events, 2 * region.from.pair, 2 * (region.from.pair + region.numPairs()), block, 0,
-           region.to.time);
+    spliceShifted(m_events, 2 * region.from.pair, 2 * (region.from.pair + region.numPairs()), block, 0,
+                  region.to.time);
     changedNow();
     return true;
 }
@@ -309,34 +356,31 @@ bool cel::weld(const cel* other, double at) {
         other->m_events.size() % 2 != 0) {
         return false;
     }
-    const double end = get_end_time();
+    const double end = timeBefore(m_events.size());
     const double start = at + other->get_start_time();
     if (!isUsableTime(start) || !isUsableTime(at + other->get_end_time()) ||
-        (!m_events.empty() && !other->m_events.empty() && start < end - kTolerance)) {
+        (!other->m_events.empty() && !isNotPast(end, start))) {
         return false;
     }
-    std::vector<IdStamp> taken;
-    taken.reserve(m_events.size());
-    for (const channel_event& event : m_events) {
-        taken.push_back(event.id);
+    Events block;
+    block.reserve(other->m_events.size());
+    TimeLayer layer(end);
+    for (size_t i = 0; i < other->m_events.size(); i += 2) {
+        channel_event in = other->m_events[i];
+        channel_event out = other->m_events[i + 1];
+        const bool hadLength = in.editTime < out.editTime;
+        in.editTime = layer.lay(in.editTime + at);
+        out.editTime = layer.lay(out.editTime + at);
+        appendLaid(block, in, out, hadLength);
     }
-    std::sort(taken.begin(), taken.end());
-    const size_t count = other->m_events.size();
-    m_events.reserve(m_events.size() + count);
-    const double least = m_events.empty() ? -kGreatestTime : start < end + kTolerance ? end : start;
-    for (size_t i = 0; i < count; ++i) {
-        channel_event event = other->m_events[i];
-        event.editTime += at;
-        if (event.editTime < least || event.editTime <= end + kTolerance) {
-            event.editTime = std::max(event.editTime, least);
+    if (!block.empty()) {
+        m_stamps.follow(m_events, m_changeCount);
+        for (channel_event& event : block) {
+            event.id = m_stamps.contains(m_events, event.id) ? channel_event::newId() : event.id;
         }
-        if (std::binary_search(taken.begin(), taken.end(), event.id)) {
-            event.id = channel_event::newId();
-        }
-        m_events.append(event);
-    }
-    if (count > 0) {
+        m_events.splice(m_events.size(), m_events.size(), block);
         changedNow();
+        m_stamps.appended(m_changeCount);
     }
     return true;
 }

@@ -7,21 +7,29 @@ using namespace cel_detail;
 
 namespace {
 
+/// The nearest time on the grid of a quantum, or of the project's frames for 0. A grid that is finer than
+/// what times are told apart by leaves them where they are.
 double onGrid(double time, double quantum) {
-    return quantum > 0 ? std::round(time / quantum) * quantum : Qx::frameRound(time);
+    if (quantum == 0) {
+        return Qx::frameRound(time);
+    }
+    return quantum > kTolerance ? std::round(time / quantum) * quantum : time;
 }
 
-/// Rounds the edit times in place; pairs that become nothing go, unless they were nothing before.
-void quantiseEvents(Events& events, double quantum) {
-    size_t kept = 0;
-    for (size_t i = 0; i + 1 < events.size(); i += 2) {
+/// Rounds the edit times; pairs that become nothing go, unless they were nothing before. False, with the
+/// events as they were, if a time is rounded to one that no event may have.
+bool quantiseEvents(Events& events, double quantum) {
+    Events rounded;
+    rounded.reserve(events.size());
+    TimeLayer layer;
+    for (size_t i = 0; i < events.size(); i += 2) {
         channel_event in = events[i];
         channel_event out = events[i + 1];
-        const bool hadLength = out.editTime - in.editTime > kTolerance;
-        const double from = onGrid(in.editTime, quantum);
-        const double to = onGrid(out.editTime, quantum);
-        if (hadLength && to - from <= kTolerance) {
-            continue;
+        const bool hadLength = in.editTime < out.editTime;
+        const double from = layer.lay(onGrid(in.editTime, quantum));
+        const double to = layer.lay(onGrid(out.editTime, quantum));
+        if (!isUsableTime(from) || !isUsableTime(to)) {
+            return false;
         }
         const double start = stripAt(in, from);
         const double end = stripAt(in, to);
@@ -33,10 +41,10 @@ void quantiseEvents(Events& events, double quantum) {
         }
         in.editTime = from;
         out.editTime = to;
-        events[kept++] = in;
-        events[kept++] = out;
+        appendLaid(rounded, in, out, hadLength);
     }
-    events.resize(kept);
+    events.swap(rounded);
+    return true;
 }
 
 /// Exchanges the ends of a pair in time; each stamp and kind stays with its end.
@@ -47,19 +55,20 @@ void turnRound(channel_event& in, channel_event& out) {
     out.kind = CE_OUT_POINT;
 }
 
-/// The mapping of `rescale`.
+/// The mapping of `rescale`. Strip times are those of the cuts that the marks mean.
 struct Mapping {
     double editIn;
     double editOut;
     double stripIn;
-    double velocity;
+    double stripOut;
     double levelIn;
     double levelOut;
 
-    void apply(channel_event& event) const {
-        const double time = editIn + (event.editTime - stripIn) / velocity;
-        event.editTime = std::clamp(time, editIn, editOut);
-        event.velocity *= velocity;
+    [[nodiscard]] double velocity() const { return (stripOut - stripIn) / (editOut - editIn); }
+    void apply(channel_event& event, TimeLayer& layer) const {
+        const double time = editIn + (event.editTime - stripIn) / velocity();
+        event.editTime = layer.lay(std::clamp(time, editIn, editOut));
+        event.velocity *= velocity();
         scaleLevel(event);
     }
     void scaleLevel(channel_event& event) const {
@@ -70,13 +79,12 @@ struct Mapping {
 
 /// A freeze: the pair that plays at one moment, all over the span.
 void freeze(Events& to, const EventArray& from, const Mapping& map) {
-    const Cut cut = cutAt(from, map.stripIn);
-    const size_t first = 2 * cut.pair;
-    if (first >= from.size() || from[first].editTime > map.stripIn + kTolerance) {
+    const size_t pairs = from.numStartingUpTo(map.stripIn);
+    if (pairs == 0 || from[2 * pairs - 1].editTime <= map.stripIn) {
         return;
     }
-    channel_event in = cutIn(from[first], from[first + 1], map.stripIn);
-    channel_event out = cutOut(from[first], from[first + 1], map.stripIn);
+    channel_event in = cutIn(from[2 * pairs - 2], from[2 * pairs - 1], map.stripIn);
+    channel_event out = cutOut(from[2 * pairs - 2], from[2 * pairs - 1], map.stripIn);
     in.editTime = map.editIn;
     out.editTime = map.editOut;
     in.velocity = out.velocity = 0;
@@ -84,6 +92,31 @@ void freeze(Events& to, const EventArray& from, const Mapping& map) {
     map.scaleLevel(out);
     to.push_back(in);
     to.push_back(out);
+}
+
+/// The part of a cel between two cuts, mapped: backwards if the first is the later.
+void mapPart(Events& to, const EventArray& from, const Region& region, const Mapping& map) {
+    const bool backwards = map.velocity() < 0;
+    Events events;
+    events.reserve(2 * region.numPairs());
+    appendPart(events, from, region, region.from.time, region.to.time);
+    if (backwards) {
+        std::reverse(events.begin(), events.end());
+    }
+    to.reserve(events.size());
+    TimeLayer layer(map.editIn, map.editOut);
+    for (size_t i = 0; i < events.size(); i += 2) {
+        channel_event& in = events[i];
+        channel_event& out = events[i + 1];
+        const bool hadLength = in.editTime != out.editTime;
+        if (backwards) {
+            std::swap(in, out);
+            turnRound(in, out);
+        }
+        map.apply(in, layer);
+        map.apply(out, layer);
+        appendLaid(to, in, out, hadLength);
+    }
 }
 
 bool isStill(const channel_event& out, const channel_event& next) {
@@ -127,7 +160,7 @@ std::unique_ptr<cel> cel::add_black_to_ends(int seconds, char ends) const {
         const double from = get_start_time();
         const FreshPair black(black_cookie, 0, from, from + added);
         const channel_event both[] = {black.in, black.out};
-        padded->m_events.splice(0, 0, both, added);
+        spliceShifted(padded->m_events, 0, 0, both, added, from + added);
     }
     if (end) {
         const double from = padded->get_end_time();
@@ -141,7 +174,10 @@ std::unique_ptr<cel> cel::add_black_to_ends(int seconds, char ends) const {
 
 std::unique_ptr<cel> cel::quantise() const {
     auto rounded = copy();
-    quantiseEvents(EventArray::Rewriting(rounded->m_events).events(), m_resolution);
+    if (m_events.size() % 2 != 0 ||
+        !quantiseEvents(EventArray::Rewriting(rounded->m_events).events(), m_resolution)) {
+        return nullptr;
+    }
     rounded->changedNow();
     return rounded;
 }
@@ -150,34 +186,27 @@ std::unique_ptr<cel> cel::rescale(double editIn, double editOut, double stripIn,
                                   double levelIn, double levelOut, int quantiseResult) const {
     const bool usable = isUsableTime(editIn) && isUsableTime(editOut) && isUsableTime(stripIn) &&
                         isUsableTime(stripOut) && std::isfinite(levelIn) && std::isfinite(levelOut) &&
-                        editOut - editIn > kTolerance && m_events.size() % 2 == 0;
+                        !isNotPast(editOut, editIn) && m_events.size() % 2 == 0;
     if (!usable) {
         return nullptr;
     }
     auto scaled = std::make_unique<cel>(*this);
     Events events;
-    const Mapping map{editIn, editOut, stripIn, (stripOut - stripIn) / (editOut - editIn), levelIn, levelOut};
-    if (std::abs(stripOut - stripIn) <= kTolerance) {
+    const Region region(m_events, std::min(stripIn, stripOut), std::max(stripIn, stripOut));
+    const bool backwards = stripOut < stripIn;
+    const Mapping map{editIn,
+                      editOut,
+                      backwards ? region.to.time : region.from.time,
+                      backwards ? region.from.time : region.to.time,
+                      levelIn,
+                      levelOut};
+    if (region.empty()) {
         freeze(events, m_events, map);
     } else {
-        const Cut first = cutAt(m_events, std::min(stripIn, stripOut));
-        const Cut last = cutAt(m_events, std::max(stripIn, stripOut));
-        events.reserve(2 * (last.pair + 1 - first.pair));
-        appendPart(events, m_events, first, last, first.time, last.time);
-        if (map.velocity < 0) {
-            std::reverse(events.begin(), events.end());
-        }
-        for (size_t i = 0; i < events.size(); i += 2) {
-            if (map.velocity < 0) {
-                std::swap(events[i], events[i + 1]);
-                turnRound(events[i], events[i + 1]);
-            }
-            map.apply(events[i]);
-            map.apply(events[i + 1]);
-        }
+        mapPart(events, m_events, region, map);
     }
-    if (quantiseResult != 0) {
-        quantiseEvents(events, m_resolution);
+    if (quantiseResult != 0 && !quantiseEvents(events, m_resolution)) {
+        return nullptr;
     }
     if (!isGood(events)) {
         return nullptr;
@@ -205,7 +234,7 @@ int cel::chequerboard(cel** parts, int& numParts, int maxParts, double overlap, 
         }
         const Range reach = reachOf(in, out, overlap, softCuts);
         size_t part = 0;
-        while (part < made.size() && reached[part] > reach.start() + kTolerance) {
+        while (part < made.size() && !isNotPast(reached[part], reach.start())) {
             ++part;
         }
         if (part == static_cast<size_t>(maxParts)) {
@@ -220,8 +249,9 @@ int cel::chequerboard(cel** parts, int& numParts, int maxParts, double overlap, 
         if (widen) {
             const double least = events.empty() ? std::max(-kGreatestTime, std::min(0.0, in.editTime))
                                                 : events.back().editTime;
-            const double from = std::max(reach.start(), least);
-            const double to = std::min(reach.end(), kGreatestTime);
+            TimeLayer layer(events.empty() ? -Qx::kNoTime : least);
+            const double from = layer.lay(std::max(reach.start(), least));
+            const double to = layer.lay(std::min(reach.end(), kGreatestTime));
             out.stripTime = stripAt(in, to);
             in.stripTime = stripAt(in, from);
             in.editTime = from;
@@ -246,7 +276,7 @@ int cel::chequerboard(cel** parts, int& numParts, int maxParts, double overlap, 
 
 bool cel::fillToTime(double time) {
     const double end = get_end_time();
-    if (!isUsableTime(time) || time <= end + kTolerance || m_events.size() % 2 != 0) {
+    if (!isUsableTime(time) || isNotPast(time, end) || m_events.size() % 2 != 0) {
         return false;
     }
     const FreshPair black(black_cookie, 0, end, time);
@@ -265,7 +295,7 @@ bool cel::simplify(Simplification::Type type, const MayMerge& mayMerge) {
             (type & Simplification::MergeBlack) != 0 && pair->strip.isBlack() && next->strip.isBlack();
         const bool through =
             (type & Simplification::MergeThrough) != 0 && playsThrough(pair[0], pair[1], next[0], next[1]);
-        return next->editTime - pair[1].editTime <= kTolerance && (black || through) &&
+        return isNotPast(next->editTime, pair[1].editTime) && (black || through) &&
                (!mayMerge || mayMerge(pair, next));
     };
     // Nothing is touched up to the first pair that goes, and nothing at all without one.

@@ -6,13 +6,18 @@
 
 #include <cstdint>
 
-/// Kinds of event, as bits so that a set of kinds can be asked for.
+/// Kinds of event, as bits so that a set of kinds can be asked for. Where a set is asked for, a plain number
+/// does as well.
 enum ce_info : uint8_t {
     CE_IN_POINT = 1,
     CE_RESERVED = 2, ///< no event is of this kind
     CE_OUT_POINT = 4,
     CE_ANY = 7
 };
+
+[[nodiscard]] constexpr ce_info operator|(ce_info a, ce_info b) {
+    return static_cast<ce_info>(int{a} | int{b});
+}
 
 /// One event of a cel: it places a moment of a source item (its strip) at a moment of edit time. 64 bytes,
 /// kept in the file in exactly this order, little-endian: do not change it.

@@ -13,6 +13,10 @@ enum Edit_Chan_Type : uint32_t {
     NoChan = 128     ///< "X": the answer for what names no typed channel
 };
 
+[[nodiscard]] constexpr Edit_Chan_Type operator|(Edit_Chan_Type a, Edit_Chan_Type b) {
+    return static_cast<Edit_Chan_Type>(uint32_t{a} | uint32_t{b});
+}
+
 /// Subtype of a channel, as a bit. The numbers and names live in files: do not change them.
 enum class Edit_Chan_SubType : uint32_t {
     NONE = 0,
@@ -23,6 +27,10 @@ enum class Edit_Chan_SubType : uint32_t {
     ANY = 15,  ///< filter: every subtype
     INVALID = 16
 };
+
+[[nodiscard]] constexpr Edit_Chan_SubType operator|(Edit_Chan_SubType a, Edit_Chan_SubType b) {
+    return static_cast<Edit_Chan_SubType>(static_cast<uint32_t>(a) | static_cast<uint32_t>(b));
+}
 
 /// The letter that stands for a channel type in texts.
 enum class Edit_Chan_Letter : char { V = 'V', A = 'A', T = 'T', C = 'C', M = 'M', G = 'G', X = 'X' };

@@ -25,4 +25,8 @@ enum Type {
     MergeThrough = 2, ///< adjacent pairs that play on through the cut become one
     MergeAll = 3
 };
+
+[[nodiscard]] constexpr Type operator|(Type a, Type b) {
+    return static_cast<Type>(int{a} | int{b});
 }
+} // namespace Simplification

@@ -1,7 +1,10 @@
 #include "edit/model/event_array.h"
 
+#include "platform/base/num_range.h"
+
 #include <algorithm>
 #include <atomic>
+#include <cmath>
 #include <cstring>
 #include <type_traits>
 #include <utility>
@@ -74,6 +77,15 @@ void takeStarts(std::span<const channel_event> events, std::vector<double>& star
     }
 }
 
+/// The shortest time above 0 from an event to the next one, if it is below `least`, or else `least`.
+double shortestStep(std::span<const channel_event> events, double least = Qx::kNoTime) {
+    for (size_t i = 1; i < events.size(); ++i) {
+        const double step = events[i].editTime - events[i - 1].editTime;
+        least = step > 0 && step < least ? step : least;
+    }
+    return least;
+}
+
 } // namespace
 
 /// What arrays share. The events lie in `events`, or, with a lender, in its memory.
@@ -82,6 +94,9 @@ struct EventArray::Body {
     Events events;
     std::vector<double> starts;
     std::shared_ptr<const void> lender;
+    /// No two events that follow one another and differ in time are nearer than this; 0 if that is not known.
+    /// It spares a shift asking whether rounding brought any two too close: nearly always none can have been.
+    double leastStep = Qx::kNoTime;
 };
 
 void EventArray::swap(EventArray& other) noexcept {
@@ -129,6 +144,7 @@ EventArray::Events& EventArray::own(size_t more) {
         body->events.assign(begin(), end());
         body->starts.reserve((room + 1) / 2);
         body->starts.assign(m_starts, m_starts + (m_size + 1) / 2);
+        body->leastStep = m_body != nullptr ? m_body->leastStep : Qx::kNoTime;
         adopt(body.release());
         refer();
     }
@@ -137,12 +153,16 @@ EventArray::Events& EventArray::own(size_t more) {
 
 void EventArray::settle() {
     takeStarts(m_body->events, m_body->starts);
+    m_body->leastStep = 0;
     refer();
 }
 
 void EventArray::reserve(size_t events) {
-    own().reserve(events);
-    m_body->starts.reserve((events + 1) / 2);
+    // By half as much again at least, so that asking for a little more each time does not move all each time.
+    Events& all = own();
+    const size_t room = events <= all.capacity() ? events : std::max(events, all.capacity() * 3 / 2);
+    all.reserve(room);
+    m_body->starts.reserve((room + 1) / 2);
     refer();
 }
 
@@ -158,6 +178,7 @@ void EventArray::append(const channel_event& event) {
     }
     events.push_back(added);
     refer();
+    noteSteps(m_size - 1);
 }
 
 void EventArray::assign(Events&& events) {
@@ -171,24 +192,43 @@ void EventArray::borrow(std::shared_ptr<const void> lender, std::span<const chan
     auto body = std::make_unique<Body>();
     body->lender = std::move(lender);
     takeStarts(events, body->starts);
+    body->leastStep = 0;
     adopt(body.release());
     m_events = events.data();
     m_starts = m_body->starts.data();
     m_size = events.size();
 }
 
-void EventArray::splice(size_t first, size_t last, std::span<const channel_event> block, double shift) {
+bool EventArray::splice(size_t first, size_t last, std::span<const channel_event> block, double shift) {
+    double least = m_body != nullptr ? m_body->leastStep : Qx::kNoTime;
+    if (least == 0 && shift != 0) {
+        least = shortestStep({begin(), end()});
+    }
     if (!isOwn() || m_body->events.capacity() < m_size - (last - first) + block.size()) {
         spliceAnew(first, last, block, shift);
-        return;
+    } else {
+        moveTail(m_body->events, last, first + block.size(), shift);
+        moveTail(m_body->starts, last / 2, (first + block.size()) / 2, shift);
+        std::copy(block.begin(), block.end(), m_body->events.begin() + static_cast<std::ptrdiff_t>(first));
+        for (size_t i = 0; i < block.size(); i += 2) {
+            m_body->starts[(first + i) / 2] = block[i].editTime;
+        }
+        refer();
     }
-    moveTail(m_body->events, last, first + block.size(), shift);
-    moveTail(m_body->starts, last / 2, (first + block.size()) / 2, shift);
-    std::copy(block.begin(), block.end(), m_body->events.begin() + static_cast<std::ptrdiff_t>(first));
-    for (size_t i = 0; i < block.size(); i += 2) {
-        m_body->starts[(first + i) / 2] = block[i].editTime;
+    const size_t tail = first + block.size();
+    bool apart = true;
+    if (shift != 0 && tail < m_size) {
+        // Both ends of a step were rounded, each by no more than half of what lies between two numbers there.
+        const double greatest = std::max(std::abs(m_events[tail].editTime), std::abs(back().editTime));
+        least -= std::nextafter(greatest, Qx::kNoTime) - greatest;
+        if (!(least > Qx::kTimeTolerance)) {
+            apart = shortestStep({m_events + tail, end()}) > Qx::kTimeTolerance;
+            least = 0;
+        }
     }
-    refer();
+    const size_t ahead = first > 0 ? first - 1 : 0;
+    m_body->leastStep = shortestStep({m_events + ahead, m_events + std::min(tail + 1, m_size)}, least);
+    return apart;
 }
 
 /// The same into fresh memory: nothing is copied that does not stay.
@@ -208,9 +248,16 @@ void EventArray::spliceAnew(size_t first, size_t last, std::span<const channel_e
     settle();
 }
 
+void EventArray::noteSteps(size_t index) {
+    const size_t from = index > 0 ? index - 1 : 0;
+    m_body->leastStep =
+        shortestStep({m_events + from, m_events + std::min(index + 2, m_size)}, m_body->leastStep);
+}
+
 void EventArray::setTime(size_t index, double time) {
     own()[index].editTime = time;
     if (index % 2 == 0) {
         m_body->starts[index / 2] = time;
     }
+    noteSteps(index);
 }

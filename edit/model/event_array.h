@@ -15,9 +15,9 @@
 /// changes that. Whoever changes a part pays for what is moved, and once for the copy if the array is shared
 /// or borrowed.
 ///
-/// It knows no rule about times and tolerances: the cel keeps them in order. References and pointers into it
-/// last until the next change. Threads: as a container of the standard library; two arrays that share memory
-/// may be used by two threads.
+/// The cel keeps the times in order and apart; of the tolerance this knows only to look times up with it and
+/// to tell when moved events came too close. References and pointers into it last until the next change.
+/// Threads: as a container of the standard library; two arrays that share memory may be used by two threads.
 class QM_API EventArray {
 public:
     using Events = std::vector<channel_event>;
@@ -45,18 +45,32 @@ public:
     [[nodiscard]] const channel_event& back() const { return m_events[m_size - 1]; }
     [[nodiscard]] const channel_event* begin() const { return m_events; }
     [[nodiscard]] const channel_event* end() const { return m_events + m_size; }
-    /// How many whole pairs start before a time, and how many at it or before.
+    /// How many whole pairs start before a time, and how many at it, at most `tolerance` after it, or before.
     [[nodiscard]] size_t numStartingBefore(double time) const {
         return numStarting([time](double start) { return start < time; });
     }
-    [[nodiscard]] size_t numStartingUpTo(double time) const {
-        return numStarting([time](double start) { return start <= time; });
+    [[nodiscard]] size_t numStartingUpTo(double time, double tolerance = 0) const {
+        const double last = time + tolerance;
+        size_t count = numStarting([last](double start) { return start <= last; });
+        // The sum is rounded; the difference of two times so close is not.
+        while (count > 0 && m_starts[count - 1] - time > tolerance) {
+            --count;
+        }
+        while (count < m_size / 2 && m_starts[count] - time <= tolerance) {
+            ++count;
+        }
+        return count;
     }
-    /// How many whole pairs end before a time. A pair ends no later than the next one starts, so only the
-    /// last that starts before the time is in question.
-    [[nodiscard]] size_t numEndingBefore(double time) const {
-        const size_t started = numStartingBefore(time);
-        return started > 0 && m_events[2 * started - 1].editTime >= time ? started - 1 : started;
+    /// How many whole pairs end more than `tolerance` before a time.
+    [[nodiscard]] size_t numEndingBefore(double time, double tolerance) const {
+        size_t count = numStartingBefore(time - tolerance);
+        while (count > 0 && !(time - m_events[2 * count - 1].editTime > tolerance)) {
+            --count;
+        }
+        while (count < m_size / 2 && time - m_events[2 * count + 1].editTime > tolerance) {
+            ++count;
+        }
+        return count;
     }
     /// @}
 
@@ -72,8 +86,9 @@ public:
     void borrow(std::shared_ptr<const void> lender, std::span<const channel_event> events);
     /// Puts `block` in the place of the events [first, last) and moves the edit times of all that follow by
     /// `shift` seconds: one pass over what follows. All three, and the size of the array, are even. `block`
-    /// does not lie in the array.
-    void splice(size_t first, size_t last, std::span<const channel_event> block, double shift = 0);
+    /// does not lie in the array. False if rounding brought two events that follow within the tolerance of
+    /// one another without being one: the caller is to settle them.
+    bool splice(size_t first, size_t last, std::span<const channel_event> block, double shift = 0);
     void setTime(size_t index, double time);
     /// An event for a change of anything but its edit time.
     [[nodiscard]] channel_event& change(size_t index) { return own()[index]; }
@@ -121,6 +136,8 @@ private:
     [[nodiscard]] bool isOwn() const noexcept;
     /// Makes the packed times agree with the events.
     void settle();
+    /// The event at a place was put there or moved.
+    void noteSteps(size_t index);
     void spliceAnew(size_t first, size_t last, std::span<const channel_event> block, double shift);
 
     Body* m_body = nullptr;

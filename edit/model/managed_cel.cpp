@@ -5,40 +5,32 @@
 ManagedCel::~ManagedCel() = default;
 
 bool ManagedCel::simplify(Simplification::Type type) {
-    const bool done = valid() && m_cel->simplify(type);
-    if (done) {
-        modification();
-    }
-    return done;
+    return noted(valid() && m_cel->simplify(type));
 }
 
 ManagedCel::Range ManagedCel::getExtents(Editable::ExtentType type, bool fromZero) const {
     return valid() ? m_cel->getExtents(type, fromZero) : Editable::invalidRange();
 }
 
-bool ManagedCel::insert(const ManagedCel& source, const Range& sourceRange, double at, cel::IdMap& ids) {
-    const bool done = valid() && m_cel->insert(source.getCel(), sourceRange, at, ids);
-    if (done) {
-        modification();
-    }
-    return done;
+bool ManagedCel::insert(const ManagedCel& source, const Range& sourceRange, double at, cel::IdMap& ids,
+                        cel::Splits* splits) {
+    return noted(valid() && m_cel->insert(source.getCel(), sourceRange, at, ids, splits));
 }
 
-bool ManagedCel::remove(const Range& range) {
-    const bool done = valid() && m_cel->remove(range);
-    if (done) {
-        modification();
-    }
-    return done;
+bool ManagedCel::remove(const Range& range, cel::Splits* splits) {
+    return noted(valid() && m_cel->remove(range, splits));
 }
 
 bool ManagedCel::replace(const ManagedCel& source, const Range& sourceRange, double at, cel::IdMap& ids,
-                         bool materialOnly) {
-    const bool done = valid() && m_cel->replace(source.getCel(), sourceRange, at, ids, materialOnly);
-    if (done) {
+                         bool materialOnly, cel::Splits* splits) {
+    return noted(valid() && m_cel->replace(source.getCel(), sourceRange, at, ids, materialOnly, splits));
+}
+
+bool ManagedCel::noted(bool changed) {
+    if (changed) {
         modification();
     }
-    return done;
+    return changed;
 }
 
 void ManagedCel::modification() {}

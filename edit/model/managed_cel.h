@@ -15,6 +15,11 @@ public:
     ManagedCel(const ManagedCel&) = default;
     ManagedCel& operator=(const ManagedCel&) = default;
 
+    [[nodiscard]] static ManagedCel createInvalid() { return {}; }
+    /// One with a deep copy of the cel and the same stamp; a typed form's own `clone` keeps what that form
+    /// has besides.
+    [[nodiscard]] ManagedCel clone() const { return {cloneCel(), m_id}; }
+
     [[nodiscard]] bool valid() const { return m_cel != nullptr; }
     [[nodiscard]] const IdStamp& id() const { return m_id; }
     void id(const IdStamp& id) { m_id = id; }
@@ -25,10 +30,14 @@ public:
     bool simplify(Simplification::Type type);
     [[nodiscard]] Range getExtents(Editable::ExtentType type = Editable::Everything,
                                    bool fromZero = false) const;
-    bool insert(const ManagedCel& source, const Range& sourceRange, double at, cel::IdMap& ids);
-    bool remove(const Range& range);
+    /// \name The operations of `cel` of these names; false, with nothing changed, for an invalid one
+    /// @{
+    bool insert(const ManagedCel& source, const Range& sourceRange, double at, cel::IdMap& ids,
+                cel::Splits* splits = nullptr);
+    bool remove(const Range& range, cel::Splits* splits = nullptr);
     bool replace(const ManagedCel& source, const Range& sourceRange, double at, cel::IdMap& ids,
-                 bool materialOnly = false);
+                 bool materialOnly = false, cel::Splits* splits = nullptr);
+    /// @}
 
 protected:
     /// Called on every change made through this object.
@@ -37,6 +46,9 @@ protected:
     [[nodiscard]] Qx::Ptr<cel> cloneCel() const;
 
 private:
+    /// Passes on whether something was changed, and tells `modification` if so.
+    bool noted(bool changed);
+
     Qx::Ptr<cel> m_cel;
     IdStamp m_id;
 };

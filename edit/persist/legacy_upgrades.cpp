@@ -205,7 +205,7 @@ void makeMaterialNodesTransient(Edit& edit) {
 void validateUTRIDs(Edit& edit) {
     std::set<IdStamp> seen;
     int fixed = 0;
-    forEachCel(edit, static_cast<Edit_Chan_Type>(VideoChan | AudioChan), [&](const IdStamp&, cel& content) {
+    forEachCel(edit, VideoChan | AudioChan, [&](const IdStamp&, cel& content) {
         for (int i = 0; i < content.numEvents(); ++i) {
             channel_event event = content.get_event(i);
             const cookie strip = content.get_event(i & ~1).strip;

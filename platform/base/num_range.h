@@ -52,7 +52,7 @@ inline constexpr double kNoPairTime = -1.0;
 /// True if `t` lies in the half-open region: the start belongs to it, the end does not, both with the
 /// tolerance of `kTimeTolerance`.
 [[nodiscard]] constexpr bool timeIsConsideredToBeInRegion(double t, const NumRange<double, Ordered>& region) {
-    return t >= region.start() - kTimeTolerance && t < region.end() - kTimeTolerance;
+    return region.start() - t <= kTimeTolerance && region.end() - t > kTimeTolerance;
 }
 
 } // namespace Qx

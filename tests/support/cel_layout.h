@@ -3,6 +3,7 @@
 #include "edit/model/cel.h"
 
 #include <cmath>
+#include <set>
 #include <string>
 #include <string_view>
 
@@ -67,6 +68,31 @@ inline std::string draw(const cel& its) {
         end = to;
     }
     return drawing;
+}
+
+/// What is wrong with a cel, or nothing: inconsistent, a stamp used twice, a pair or a gap of less than
+/// `leastStep` seconds (a pair of no length too), strip times that do not agree with the velocity.
+inline std::string faultOf(const cel& its, double leastStep = Qx::kTimeTolerance) {
+    if (its.is_good_cel() == 0) {
+        return "not a good cel";
+    }
+    std::set<IdStamp> stamps;
+    for (int i = 0; i < its.numEvents(); ++i) {
+        const channel_event event = its.get_event(i);
+        const channel_event before = i > 0 ? its.get_event(i - 1) : channel_event();
+        const double step = event.editTime - before.editTime;
+        const bool isOut = i % 2 != 0;
+        if (!stamps.insert(event.id).second) {
+            return "the stamp of event " + std::to_string(i) + " is used twice";
+        }
+        if (i > 0 && (isOut || step != 0) && step < leastStep) {
+            return "a sliver before event " + std::to_string(i) + " at " + std::to_string(event.editTime);
+        }
+        if (isOut && std::abs(before.stripTime + step * before.velocity - event.stripTime) > 1e-3) {
+            return "strip times of the pair of event " + std::to_string(i) + " disagree";
+        }
+    }
+    return "";
 }
 
 /// The last digit of the strip second that each second plays, '.' for black, ' ' for a gap.

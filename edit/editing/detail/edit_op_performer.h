@@ -14,7 +14,7 @@ public:
 
     /// Makes one change of a channel's cel; receives the stamps of copied and of cut events. False, with the
     /// channel unchanged, for a core that is none of replace, insert and remove.
-    bool doEdit(cel& its, const Step& step, cel::IdMap& copied, cel::IdMap& splits) const;
+    bool doEdit(cel& its, const Step& step, cel::IdMap& copied, cel::Splits& splits) const;
     /// The same for the levels of an audio channel.
     static void doLevels(AudLevelsCel& its, const Step& step);
 

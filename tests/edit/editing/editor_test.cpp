@@ -364,12 +364,17 @@ TEST_F(EditorTest, EffectsAreBoundToCopiesAndToBothPartsOfACut) {
     const IdStamp whole = bind(*edit, 0);
     bind(*from, 0);
     ASSERT_TRUE(apply(from, {}, edit, {2}, Op::Insert).valid());
-    std::string bound;
-    for (int i = 0; i < 8; i += 2) {
-        const IdStamp id = edit->get_edit_cel_p(0)->getChanEventPtr(i)->id;
-        bound += edit->objectStore().contains(id.asString()) ? (id == whole ? 'w' : 'c') : '-';
-    }
-    EXPECT_EQ(bound, "wcc-"); // the whole's, the source's copy, the right part's copy, nothing on B
+    const auto bound = [&] {
+        std::string found;
+        for (int i = 0; i < edit->get_edit_cel_p(0)->numEvents(); i += 2) {
+            const IdStamp id = edit->get_edit_cel_p(0)->getChanEventPtr(i)->id;
+            found += edit->objectStore().contains(id.asString()) ? (id == whole ? 'w' : 'c') : '-';
+        }
+        return found;
+    };
+    EXPECT_EQ(bound(), "wcc-"); // the whole's, the source's copy, the right part's copy, nothing on B
+    ASSERT_TRUE(apply(from, {0, 1}, edit, {0.5}, Op::ReplaceMaterial).valid());
+    EXPECT_EQ(bound(), "wcccc-"); // three pieces of the whole, the middle one with other material
 
     // Black with something bound to it stays apart.
     const EditPtr title = make({"V A..BC"}, 101);

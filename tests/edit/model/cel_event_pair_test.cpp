@@ -193,10 +193,21 @@ TEST_F(PairsOfAnEdit, AreWalkedBothWays) {
     EXPECT_EQ(CelIterator().idx(), NO_CHAN);
 }
 
-TEST_F(PairsOfAnEdit, AnIteratorFindsTheCelAgain) {
+TEST_F(PairsOfAnEdit, AWalkGoesOnOverTheCelThatItBeganWithUntilItIsMoved) {
     CelIterator it(edit, chan);
     ASSERT_TRUE(edit->set_edit_cel_p(index, new cel(make("XYZ"))));
-    it.moveToStart();
+    const std::weak_ptr<cel> second = edit->getCel(chan)->weak_from_this();
+    EXPECT_EQ(letters(it, true), "ABC");
+    for (CelIterator removed(edit, chan); removed.valid(); removed.inc()) {
+        ASSERT_FALSE(second.expired());
+        EXPECT_EQ(removed.length(), 1);
+        edit->removeChan(chan, false);
+        EXPECT_EQ(removed.idx(), NO_CHAN);
+    }
+    EXPECT_TRUE(second.expired());
+    const EditPtr other = edit->copy();
+    index = other->addChan(VideoChan, new cel(make("XYZ")), false);
+    it = CelIterator(other, index);
     EXPECT_EQ(letters(it, true), "XYZ");
     it.moveToEnd();
     EXPECT_EQ(letters(it, false), "ZYX");

@@ -1,6 +1,7 @@
 // Events, finding and stepping, single-field setters, extents.
 
 #include "edit/model/cel.h"
+#include "edit/model/channel_types.h"
 #include "edit/model/managed_cel.h"
 #include "support/cel_layout.h"
 
@@ -228,7 +229,25 @@ TEST(ManagedCels, ShareOneCelAndCloneAnother) {
                  none.simplify(Simplification::MergeAll) || none.setShotSound(0, BeginEnd::Begin, 1));
     EXPECT_FALSE(sound.insert(none, {0, 1}, 0, ids));
     EXPECT_EQ(none.getExtents(), Editable::invalidRange());
-    EXPECT_FALSE(none.clone().valid());
+    EXPECT_FALSE(none.clone().valid() || ManagedCel::createInvalid().valid());
+
+    ManagedCel base = sound.clone().ManagedCel::clone();
+    cel::Splits splits;
+    EXPECT_TRUE(base.insert(sound, {0, 1}, 1, ids, &splits) && base.remove({3.5, 4}, &splits) &&
+                base.replace(sound, {0, 0.1}, 0.5, ids, false, &splits));
+    EXPECT_EQ(splits.size(), 3u);
+}
+
+TEST(CelKinds, CombineWithoutCastsAndMayBeWrittenAsNumbers) {
+    const cel its = make("AABB");
+    const ce_info both = CE_IN_POINT | CE_OUT_POINT;
+    EXPECT_EQ(its.find_ceh(3, 1).index(), 2);
+    EXPECT_EQ(its.find_ceh(3, 4).get_prev_ceh(both).index(), 2);
+    const Edit_Chan_Type types = VideoChan | AudioChan;
+    const Edit_Chan_SubType subtypes = Edit_Chan_SubType::FX | Edit_Chan_SubType::ALIAS;
+    EXPECT_EQ(static_cast<uint32_t>(types) + static_cast<uint32_t>(subtypes), 15u);
+    EXPECT_EQ(CEHPair(&its, 3).inH().index(), 2);
+    EXPECT_FALSE(CEHPair(nullptr, 3).valid());
 }
 
 } // namespace
