@@ -1,5 +1,9 @@
 #include "edit/editing/detail/cue_follower.h"
 
+#include <algorithm>
+#include <map>
+#include <utility>
+
 using Op = edit_operation;
 
 Editor::CueFollower::CueFollower(Edit& edit, const Plan& plan, edit_operation op)
@@ -34,25 +38,35 @@ void Editor::CueFollower::noteCopies(const IdStamp& chan, const cel::IdMap& copi
 
 void Editor::CueFollower::follow() {
     cue_list& cues = m_edit.get_cues();
+    moveToCopies();
+    cues.update_edit_time();
+    cues.delete_cues_if([this](size_t i, const cue_point& cue) {
+        return i < m_hadEvent.size() && m_hadEvent[i] && cue.event().valid() == 0;
+    });
+}
+
+/// The cues whose moment went to another channel: to the copies of their events there.
+void Editor::CueFollower::moveToCopies() {
+    std::map<IdStamp, std::vector<std::pair<IdStamp, size_t>>> wanted; // events and cues of each channel
     for (const Moved& moved : m_moved) {
-        const auto copy = m_copies.find(moved.event);
-        cue_point* const cue = cues.get_cue_point(moved.cue, 0);
-        if (copy == m_copies.end() || cue == nullptr) {
-            continue;
-        }
-        const int index = m_edit.getIdx(copy->second.chan);
-        const cel* const its = m_edit.get_edit_cel_p(index);
-        const ce_handle event = its != nullptr ? its->findId(copy->second.event) : ce_handle();
-        if (event.valid() != 0) {
-            cue->setEvent(event);
-            cue->setChannel(cue->channel() == kAnyCueChan ? kAnyCueChan : index);
+        if (const auto copy = m_copies.find(moved.event); copy != m_copies.end()) {
+            wanted[copy->second.chan].emplace_back(copy->second.event, moved.cue);
         }
     }
-    cues.update_edit_time();
-    for (size_t i = m_hadEvent.size(); i-- > 0;) {
-        const cue_point* const cue = cues.get_cue_point(i, 0);
-        if (m_hadEvent[i] && cue != nullptr && cue->event().valid() == 0) {
-            cues.delete_cue_point(i);
+    for (auto& [chan, events] : wanted) {
+        const int index = m_edit.getIdx(chan);
+        const cel* const its = m_edit.get_edit_cel_p(index);
+        std::sort(events.begin(), events.end());
+        for (int i = 0; its != nullptr && i < its->numEvents(); ++i) {
+            const IdStamp& event = its->getChanEventPtr(i)->id;
+            for (auto at = std::lower_bound(events.begin(), events.end(), std::pair(event, size_t{0}));
+                 at != events.end() && at->first == event; ++at) {
+                cue_point* const cue = m_edit.get_cues().get_cue_point(at->second, 0);
+                if (cue != nullptr) {
+                    cue->setEvent(ce_handle(its, i));
+                    cue->setChannel(cue->channel() == kAnyCueChan ? kAnyCueChan : index);
+                }
+            }
         }
     }
 }

@@ -68,7 +68,7 @@ IdStamp addLevels(Edit& edit, const IdStamp& audio) {
     AudLevelsCel levels = AudLevelsCel::create();
     levels.replaceClipNodes(edit.getAudCel(audio));
     levels.setChanged(true);
-    return edit.addLevelsChan(audio, levels);
+    return edit.addLevelsChan(audio, levels, false);
 }
 
 bool isWritable(const Edit& edit) {

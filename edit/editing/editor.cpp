@@ -155,6 +155,11 @@ void Editor::doPostEditTasks(Result& result) {
     sendChannelsAdded(edit, VideoChan, added[0]);
     sendChannelsAdded(edit, AudioChan, added[1]);
     edit.setChangeDescription(change, true);
+    for (const Target& target : m_plan->targets) {
+        if (target.type.type == AudioChan && edit.is_original()) {
+            edit.notifyShotSoundAltered(target.chan);
+        }
+    }
 }
 
 cel* Editor::celOf(const IdStamp& chan) const {

@@ -89,7 +89,7 @@ void Editor::doClipboardEditing(edit_operation op) {
         if (kept.valid() && !levels.is_dummy()) {
             AudLevelsCel copy = AudLevelsCel::create();
             copy.replace(levels, {from, to}, start);
-            clipboard->addLevelsChan(kept, copy);
+            clipboard->addLevelsChan(kept, copy, false);
         }
     }
     if (clipboard->getNumChans() == 0) {

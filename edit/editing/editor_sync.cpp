@@ -56,7 +56,7 @@ bool Editor::recordInterTrackSyncLosses() {
         const double further = movement.shift - movements[reference].shift;
         if (std::abs(further) > kTimeTolerance) {
             const double loss = edit.getSyncLoss(movement.chan) + further;
-            edit.setSyncLoss(movement.chan, std::abs(loss) > kTimeTolerance ? loss : 0);
+            edit.setSyncLoss(movement.chan, std::abs(loss) > kTimeTolerance ? loss : 0, false);
             lost = lost || std::abs(loss) > kTimeTolerance;
         }
     }

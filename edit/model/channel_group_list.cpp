@@ -127,7 +127,7 @@ unsigned ChannelGroupList::destroyAllGroups(ChannelGroup::eType type) {
     return static_cast<unsigned>(gone);
 }
 
-bool ChannelGroupList::removeMember(const IdStamp& chan) {
+bool ChannelGroupList::removeMember(IdStamp chan) {
     size_t taken = 0;
     for (ChannelGroup& group : m_groups) {
         taken += std::erase(group.m_chans, chan);
@@ -137,7 +137,7 @@ bool ChannelGroupList::removeMember(const IdStamp& chan) {
     return taken > 0;
 }
 
-bool ChannelGroupList::replaceMember(const IdStamp& from, const IdStamp& to) {
+bool ChannelGroupList::replaceMember(IdStamp from, IdStamp to) {
     if (!to.valid() || isMember(to) || !isMember(from)) {
         return false;
     }

@@ -9,8 +9,8 @@
 /// the edit, of which channels exist, of dirt or of notification.
 ///
 /// A group has at least two members and no member twice; what would leave one with fewer removes it. That a
-/// channel is in at most one group is up to `Edit::groupChannels`, through which groups are made.
-/// Not thread-safe.
+/// channel is in at most one group is up to `Edit::groupChannels`, through which groups are made. Stamps that
+/// are given to a change may be members of the list's own groups. Not thread-safe.
 class QM_API ChannelGroupList : public StreamableLayer {
 public:
     /// The names in the object store. They live in files: do not change them.
@@ -39,10 +39,10 @@ public:
     unsigned destroyAllGroups(ChannelGroup::eType type);
     /// Takes a channel out of every group it is in; a group left with one member goes. False if it is in
     /// none.
-    bool removeMember(const IdStamp& chan);
+    bool removeMember(IdStamp chan);
     /// The stamp `from` becomes `to` wherever it is a member. False, changing nothing, if it is nowhere, or
     /// `to` is null or a member already.
-    bool replaceMember(const IdStamp& from, const IdStamp& to);
+    bool replaceMember(IdStamp from, IdStamp to);
 
     /// True from a change until `setChanged(false)`, so that the object store can be told to pack the list
     /// again.

@@ -64,8 +64,8 @@ bool cue_list::delete_cue_point(size_t i) {
 }
 
 size_t cue_list::delete_matching_cues(int flags, int chan) {
-    return std::erase_if(m_cues,
-                         [&](const cue_point& cue) { return cue.hasFlags(flags) && isOnChan(cue, chan); });
+    return delete_cues_if(
+        [&](size_t, const cue_point& cue) { return cue.hasFlags(flags) && isOnChan(cue, chan); });
 }
 
 void cue_list::shuffleChans(int firstChan, int count) {
@@ -96,9 +96,9 @@ bool cue_list::slide(double seconds) {
 
 int cue_list::update_edit_time() {
     int changed = 0;
-    int shift = 0;
+    EventSearch search;
     for (cue_point& cue : m_cues) {
-        if (cue.updateEditTime(shift)) {
+        if (cue.updateEditTime(search)) {
             changed = 1;
         }
     }
@@ -106,8 +106,9 @@ int cue_list::update_edit_time() {
 }
 
 void cue_list::update_strip_time() {
+    EventSearch search;
     for (cue_point& cue : m_cues) {
-        cue.update_strip_time();
+        cue.updateStripTime(search);
     }
 }
 
@@ -134,18 +135,20 @@ bool cue_list::rescale(double editFactor, double stripFactor, double editOffset,
 }
 
 void cue_list::convert(const Vector<cel*>& cels) {
+    EventSearch search;
     for (cue_point& cue : m_cues) {
-        cue.convert(cels);
+        cue.convert(cels, search);
     }
 }
 
 void cue_list::rebindCel(const cel* from, cel* to) {
+    EventSearch search;
     for (cue_point& cue : m_cues) {
         if (from == nullptr || cue.event().get_its_cel() != from) {
             continue;
         }
         const int hint = std::max(cue.event().index(), 0);
-        const int index = to != nullptr ? EventSearch::nearest(*to, cue.m_eventId, hint, 0) : -1;
+        const int index = to != nullptr ? search.nearest(*to, cue.m_eventId, hint) : -1;
         cue.m_event = index >= 0 ? ce_handle(to, index) : ce_handle();
     }
 }
@@ -159,6 +162,7 @@ std::unique_ptr<cue_list> cue_list::extract(double from, double to, int chan, ce
     if (!(from < to)) {
         return cut;
     }
+    EventSearch search;
     for (const cue_point& cue : m_cues) {
         if (!isOnChan(cue, chan) || !Qx::timeIsConsideredToBeInRegion(cue.editTime(), {from, to})) {
             continue;
@@ -167,7 +171,7 @@ std::unique_ptr<cue_list> cue_list::extract(double from, double to, int chan, ce
         if (!moved.slide(-from)) {
             continue;
         }
-        if (part == nullptr || !moved.attached() || !moved.attachByTimes({part})) {
+        if (part == nullptr || !moved.attached() || !moved.attachByTimes({part}, search)) {
             moved.detach();
         }
         cut->m_cues.push_back(std::move(moved));

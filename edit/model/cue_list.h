@@ -3,6 +3,7 @@
 #include "edit/model/cue_point.h"
 #include "platform/store/streamable_layer.h"
 
+#include <utility>
 #include <vector>
 
 /// The cues of an edit: an ordered sequence, held by value, in the order in which they were added until
@@ -37,6 +38,23 @@ public:
     /// False when there is no such cue.
     bool delete_cue_point(size_t i);
     void delete_all_cues() { m_cues.clear(); }
+    /// Removes the cues for which `gone(place, cue)` is true, asked of each once, in order; the order of the
+    /// others stays. Returns how many went.
+    template <typename Predicate>
+    size_t delete_cues_if(Predicate gone) {
+        size_t kept = 0;
+        for (size_t i = 0; i < m_cues.size(); ++i) {
+            if (!gone(i, std::as_const(m_cues[i]))) {
+                if (kept != i) {
+                    m_cues[kept] = std::move(m_cues[i]);
+                }
+                ++kept;
+            }
+        }
+        const size_t removed = m_cues.size() - kept;
+        m_cues.erase(m_cues.end() - static_cast<std::ptrdiff_t>(removed), m_cues.end());
+        return removed;
+    }
     /// Removes every cue whose flag word contains every bit of `flags` on a channel; the order of the others
     /// stays. Returns how many went.
     size_t delete_matching_cues(int flags, int chan);
@@ -72,6 +90,19 @@ public:
     void rebindCel(const cel* from, cel* to);
     /// A cel goes: the cues attached to it lose their event.
     void dropCel(const cel* gone) { rebindCel(gone, nullptr); }
+    /// The same for the cels for which `gone(cel)` is true.
+    template <typename Predicate>
+    void dropCels(Predicate gone) {
+        for (cue_point& cue : m_cues) {
+            if (gone(std::as_const(cue).event().get_its_cel())) {
+                cue.m_event = ce_handle();
+            }
+        }
+    }
+    /// The same for all cels. `convert` finds the events again, first by their stamps.
+    void dropCels() {
+        dropCels([](const cel*) { return true; });
+    }
     /// @}
 
     /// \name Lists from lists

@@ -152,9 +152,8 @@ void cue_point::remember() {
     m_stripTo = span.stripTo;
 }
 
-/// Brings the handle back to the cue's event after the cel changed; `shift` is by how much the index of
-/// another cue's event moved. Without one the handle is left at no event.
-bool cue_point::findEvent(int shift) {
+/// Brings the handle back to the cue's event after the cel changed. Without one it is left at no event.
+bool cue_point::findEvent(EventSearch& search) {
     const cel* its = m_event.get_its_cel();
     if (its == nullptr || m_event.index() < 0) {
         return false;
@@ -162,9 +161,9 @@ bool cue_point::findEvent(int shift) {
     if (!m_eventId.valid()) {
         return m_event.valid() != 0;
     }
-    int index = EventSearch::nearest(*its, m_eventId, m_event.index(), shift);
+    int index = search.nearest(*its, m_eventId, m_event.index());
     if (index < 0 && m_outId.valid() && m_event.index() % 2 == 0) {
-        const int out = EventSearch::nearest(*its, m_outId, m_event.index() + 1, shift);
+        const int out = search.nearest(*its, m_outId, m_event.index() + 1);
         if (out > 0) {
             const Span span(*its, out - 1);
             const bool part = span.strip == m_stripCookie && span.within(m_stripFrom, m_stripTo);
@@ -189,27 +188,28 @@ void cue_point::takeOverStrip() {
 
 /// After a split: to the piece that plays the cue's strip time, when the one with the stamp does not any
 /// more.
-void cue_point::moveToPiece() {
+void cue_point::moveToPiece(EventSearch& search) {
     const cel& its = *m_event.get_its_cel();
-    const auto isLast = [&](int in) {
-        const channel_event* out = its.getChanEventPtr(in + 1);
-        return out == nullptr || out->id == m_outId;
-    };
     const bool played = m_stripTime >= std::min(m_stripFrom, m_stripTo) - Qx::kTimeTolerance &&
                         m_stripTime <= std::max(m_stripFrom, m_stripTo) + Qx::kTimeTolerance;
-    int in = m_event.index();
+    const int in = m_event.index();
+    const channel_event* const out = its.getChanEventPtr(in + 1);
     // A pair that has its out point still was trimmed at most.
-    if (in % 2 != 0 || !played || isLast(in) || Span(its, in).plays(m_stripTime)) {
+    if (in % 2 != 0 || !played || out == nullptr || out->id == m_outId || !m_outId.valid() ||
+        Span(its, in).plays(m_stripTime)) {
         return;
     }
-    do {
-        in += 2;
-        const Span span(its, in);
+    // Of pieces that follow one another a later moment lies in a later one.
+    const double way = m_stripTo >= m_stripFrom ? 1.0 : -1.0;
+    const int last = search.nearest(its, m_outId, in + 1) - 1;
+    for (int piece = search.firstPiece(its, in, m_stripTime * way); piece <= last; piece += 2) {
+        const Span span(its, piece);
         if (span.strip == m_stripCookie && span.plays(m_stripTime) && span.within(m_stripFrom, m_stripTo)) {
-            m_event.set_index(in);
+            search.notePiece(its, in, m_stripTime * way, piece);
+            m_event.set_index(piece);
             return;
         }
-    } while (!isLast(in));
+    }
 }
 
 bool cue_point::moveTo(double time) {
@@ -223,7 +223,12 @@ bool cue_point::moveTo(double time) {
 }
 
 void cue_point::update_strip_time() {
-    if (findEvent(0)) {
+    EventSearch search;
+    updateStripTime(search);
+}
+
+void cue_point::updateStripTime(EventSearch& search) {
+    if (findEvent(search)) {
         setStripTime(m_event.get_strip_time(editTime()));
         m_stripCookie = m_event.get_strip_cookie();
         remember();
@@ -233,22 +238,20 @@ void cue_point::update_strip_time() {
 }
 
 bool cue_point::update_edit_time() {
-    int shift = 0;
-    return updateEditTime(shift);
+    EventSearch search;
+    return updateEditTime(search);
 }
 
-bool cue_point::updateEditTime(int& shift) {
+bool cue_point::updateEditTime(EventSearch& search) {
     if (!attached()) {
         m_flags.set(CueFlag::kInside, true);
         return false;
     }
-    const int before = m_event.index();
-    if (!findEvent(shift)) {
+    if (!findEvent(search)) {
         return moveTo(0.0);
     }
-    shift = m_event.index() - before;
     takeOverStrip();
-    moveToPiece();
+    moveToPiece(search);
     remember();
     const double from = m_event.get_edit_time();
     const bool moved = moveTo(m_stripTime - m_event.get_strip_time(Qx::kStripTimeAtEvent) + from);
@@ -267,6 +270,11 @@ std::unique_ptr<cue_point> cue_point::copy() const {
 }
 
 void cue_point::convert(const Vector<cel*>& cels) {
+    EventSearch search;
+    convert(cels, search);
+}
+
+void cue_point::convert(const Vector<cel*>& cels, EventSearch& search) {
     if (!attached()) {
         return;
     }
@@ -276,7 +284,7 @@ void cue_point::convert(const Vector<cel*>& cels) {
     } else if (m_channel >= 0 && m_channel < std::ssize(cels)) {
         searched.push_back(cels[static_cast<size_t>(m_channel)]);
     }
-    if (!attachByStamp(searched) && !attachByTimes(searched)) {
+    if (!attachByStamp(searched, search) && !attachByTimes(searched, search)) {
         const bool reread = hasFlags(CueFlag::kInside);
         for (const cel* its : searched) {
             const ce_handle event = reread ? playing(its, editTime()) : ce_handle();
@@ -289,13 +297,13 @@ void cue_point::convert(const Vector<cel*>& cels) {
     }
 }
 
-bool cue_point::attachByStamp(const Vector<cel*>& cels) {
+bool cue_point::attachByStamp(const Vector<cel*>& cels, EventSearch& search) {
     if (!m_eventId.valid()) {
         return false;
     }
     const int hint = std::max(m_event.index(), 0);
     for (cel* its : cels) {
-        const int index = its != nullptr ? EventSearch::nearest(*its, m_eventId, hint, 0) : -1;
+        const int index = its != nullptr ? search.nearest(*its, m_eventId, hint) : -1;
         if (index >= 0) {
             m_event = ce_handle(its, index);
             return true;
@@ -305,7 +313,7 @@ bool cue_point::attachByStamp(const Vector<cel*>& cels) {
 }
 
 /// To the event that plays the cue's strip time at its edit time.
-bool cue_point::attachByTimes(const Vector<cel*>& cels) {
+bool cue_point::attachByTimes(const Vector<cel*>& cels, EventSearch& search) {
     const double time = editTime();
     const auto fits = [&](const Span& span) {
         return (!m_stripCookie.is_valid() || span.strip == m_stripCookie) &&
@@ -320,12 +328,16 @@ bool cue_point::attachByTimes(const Vector<cel*>& cels) {
             best = there;
             break;
         }
-        for (int in = 0; its != nullptr && in < its->numEvents(); in += 2) {
-            const Span span(*its, in);
-            if (!span.strip.isBlack() && fits(span) &&
-                (best.valid() == 0 || span.distance(time) < bestDistance)) {
-                best = ce_handle(its, in);
-                bestDistance = span.distance(time);
+        const int near =
+            its == nullptr ? -1 : search.nearestPair(*its, time, time - m_stripTime, [&](int in) {
+                const Span span(*its, in);
+                return !span.strip.isBlack() && fits(span);
+            });
+        if (near >= 0) {
+            const double distance = Span(*its, near).distance(time);
+            if (best.valid() == 0 || distance < bestDistance) {
+                best = ce_handle(its, near);
+                bestDistance = distance;
             }
         }
     }

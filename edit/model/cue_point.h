@@ -11,6 +11,8 @@
 #include <cstddef>
 #include <memory>
 
+class EventSearch;
+
 /// The flag bits of a cue that have a fixed role. They live in files: do not change them.
 namespace CueFlag {
 inline constexpr int kAttached = 1; ///< the cue follows the event named by its handle
@@ -128,14 +130,16 @@ public:
 private:
     friend class cue_list;
 
-    bool updateEditTime(int& shift);
+    bool updateEditTime(EventSearch& search);
+    void updateStripTime(EventSearch& search);
     bool moveTo(double editTime);
-    bool findEvent(int shift);
+    bool findEvent(EventSearch& search);
     void takeOverStrip();
-    void moveToPiece();
+    void moveToPiece(EventSearch& search);
     void remember();
-    bool attachByStamp(const Vector<cel*>& cels);
-    bool attachByTimes(const Vector<cel*>& cels);
+    void convert(const Vector<cel*>& cels, EventSearch& search);
+    bool attachByStamp(const Vector<cel*>& cels, EventSearch& search);
+    bool attachByTimes(const Vector<cel*>& cels, EventSearch& search);
 
     strp_field m_text;
     tc_field m_editTime;

@@ -41,9 +41,15 @@ class TextFile;
 /// or (`NoChan`, `INVALID`) and never fail otherwise. An operation that answers false, or a null stamp, or
 /// `NO_CHAN`, has changed nothing.
 ///
-/// Changes: a write of the header dirties the edit. The operations on channels, names and times either record
-/// a change of their own (counted in "MOD_COUNT", described, dirtied, announced) or, where they are a part of
-/// what a caller describes with `setChangeDescription`, dirty only; each says which.
+/// Changes: a write of the header dirties the edit. The operations on channels, names, groups and cues either
+/// record a change of their own (counted in "MOD_COUNT", described, dirtied, announced) or, where they are a
+/// part of what a caller describes with `setChangeDescription`, dirty only; each says which. Where one has an
+/// argument `notify`, that decides.
+///
+/// Read-only: what a save would lose is refused. While the edit is read-only, for the user or by its header,
+/// and is no temporary one, the operations that change channels, groups and kept cues answer false with a
+/// line in the log. Cels and levels are changed through their own operations, which know of no edit: ask
+/// first.
 class QM_API Edit : public Notifier, public Dirtiable {
 public:
     /// Type and subtype of a channel; the default is "not found".
@@ -266,10 +272,12 @@ public:
     [[nodiscard]] VFXCel getVFXCel(const IdStamp& chan) const;
     [[nodiscard]] AudCel getAudCel(const IdStamp& chan) const;
     [[nodiscard]] AudLevelsCel getLevelsCel(const IdStamp& chan) const;
-    /// Changes the audio properties of a channel (output, cross-fades, levels channel); dirties only. False
-    /// if it is none of the edit's, shares another cel than the channel's, or names a levels channel that is
-    /// not there or is another audio channel's. A levels channel that is let go stays.
-    bool setAudCel(const AudCel& audio);
+    /// Changes the audio properties of a channel. With `notify`, another output or levels channel records a
+    /// change of type `kLevelsChanged`, other cross-fades alone one of type `kFadesChanged`; in a shot or a
+    /// ghost of one either is of type `kShotSoundChanged` and "editShotSound" is sent. False if it is none of
+    /// the edit's, shares another cel than the channel's, or names a levels channel that is not there or is
+    /// another audio channel's. A levels channel that is let go stays.
+    bool setAudCel(const AudCel& audio, bool notify = true);
 
     /// The channel's own name (UTF-8, may be empty), and the name shown: its own, else "FX1", "V1", "A2",
     /// "L1" by its place in its list.
@@ -302,9 +310,9 @@ public:
     /// does. Cues of the channels behind are renumbered.
     ///
     /// False for a type and subtype that an edit does not hold, for a `count` of 0, for a time that is not
-    /// finite or not below `Qx::kNoTime`, and where there would be more than 32 audio or 24 video channels
-    /// ("Too many audio channels for <...>", "Too many video channels for <...>" in the log) or effects
-    /// channels beyond the reach of an index.
+    /// finite or past `cel::kGreatestTime`, for a read-only edit, and where there would be more than 32 audio
+    /// or 24 video channels or an index would reach `NO_CHAN` ("Too many audio channels for <...>" and so on
+    /// in the log).
     bool insertChans(Edit_Chan_Type type, Edit_Chan_SubType subtype, int at, unsigned count, bool before,
                      bool notify, double time);
     /// Inserts one channel at the end of its list, as `insertChans` does. Returns the new index, or `NO_CHAN`
@@ -316,23 +324,26 @@ public:
     /// `notify`: a change of type `kChansRemoved` naming it is recorded, the message "editChanDeleted" is
     /// sent for each channel that went, levels first ("cookie type index count", with the index before the
     /// removal), and the change is recorded again and announced. The cel lives until everybody was told.
-    /// False for an unknown stamp.
+    /// False for an unknown stamp and for a read-only edit.
     bool removeChan(const IdStamp& chan, bool notify);
-    /// Removes every channel, with one message of type `AnyChan` and index 0. False if there was none.
+    /// Removes every channel, with one message of type `AnyChan` and index 0. False if there was none and for
+    /// a read-only edit.
     bool removeChans(bool notify);
-    /// Puts a cel (taken over on success) in the place of a channel's own; dirties only. Attached cues follow
-    /// to the events with the same stamps. False for a levels channel or no channel, or without a cel.
-    bool set_edit_cel_p(int index, cel* content);
+    /// Puts a cel (taken over on success) in the place of a channel's own. With `notify`, records a change of
+    /// type `kEventsChanged`; for a sound channel of a shot see `setAudCel`. Attached cues follow to the
+    /// events with the same stamps. False for a levels channel or no channel, or without a cel.
+    bool set_edit_cel_p(int index, cel* content, bool notify = true);
     /// Makes `getCel` by stamp answer with a cel that the caller owns, until the channel gets another or
     /// goes; null ends it. No change of the edit. False for an unknown stamp or a levels channel.
     bool cacheCelForTrack(const IdStamp& chan, cel* content);
     /// Gives a channel another stamp, in its group and its pairing with levels too; dirties only. False if
     /// the stamp is null or taken.
     bool setChannelID(const IdStamp& chan, const IdStamp& newId);
-    /// Adds a levels channel that shares the levels, and pairs it with an audio channel that has none;
-    /// dirties only. It keeps its stamp unless that is null or taken. The null stamp on failure: no such
-    /// audio channel, one that has levels, or invalid ones.
-    IdStamp addLevelsChan(const IdStamp& audio, const AudLevelsCel& levels);
+    /// Adds a levels channel that shares the levels, and pairs it with an audio channel that has none. With
+    /// `notify`, records a change of type `kLevelsChanged`; for a shot see `setAudCel`. It keeps its stamp
+    /// unless that is null or taken. The null stamp on failure: no such audio channel, one that has levels,
+    /// invalid ones, an index that would reach `NO_CHAN`.
+    IdStamp addLevelsChan(const IdStamp& audio, const AudLevelsCel& levels, bool notify = true);
     /// Adds a channel that was read, at the end of its list, with its stamp, name and material text; an
     /// invalid or taken stamp is replaced by a fresh one, and the standard name of its place counts as none
     /// of its own. Records nothing and knows no limits: who reads checks those. The null stamp for a type
@@ -343,15 +354,18 @@ public:
     [[nodiscard]] double get_start_or_end_time(bool start, bool withLevels) const;
     [[nodiscard]] double getStartTime() const { return get_start_or_end_time(true, false); }
     [[nodiscard]] double getEndTime() const { return get_start_or_end_time(false, false); }
-    /// Sync loss of a channel in seconds, 0 if none is recorded; the setter dirties only. False for an
-    /// unknown stamp or a number that is not finite.
+    /// Sync loss of a channel in seconds, 0 if none is recorded. With `notify`, another one records a change
+    /// of type `kSyncChanged`. False for an unknown stamp or a number that is not finite.
     [[nodiscard]] double getSyncLoss(const IdStamp& chan) const;
-    bool setSyncLoss(const IdStamp& chan, double seconds);
+    bool setSyncLoss(const IdStamp& chan, double seconds, bool notify = true);
     /// @}
 
     /// \name Current time and mark (seconds)
     /// An edit has one of each; the channel argument is accepted and not used. The setters dirty when the
-    /// value changes, the `_raw` forms never; a number that is not finite is ignored.
+    /// value changes and tell the observers of the change descriptions, with the time as the place of a
+    /// change of type `kCurrentTimeChanged` or `kMarkChanged`. That is no change of what was edited: it is
+    /// not counted, and the description of the last edit stays. The `_raw` forms do neither; a number that is
+    /// not finite is ignored.
     /// @{
     [[nodiscard]] double get_current_time(int chan = NO_CHAN) const;
     void set_current_time(int chan, double time);
@@ -415,7 +429,8 @@ public:
     /// Send "impendingRevChange" and "revChange", with the number of `type` behind the cookie.
     void notifyImpendingRevisionChange(RevisionChangeType type);
     void notifyRevisionChange(RevisionChangeType type);
-    /// Sends "editShotSound" with the channel's stamp behind the cookie.
+    /// Sends "editShotSound" with the channel's stamp behind the cookie: what the operations of the edit do
+    /// for a shot, and whoever changes the cels or levels of one.
     void notifyShotSoundAltered(const IdStamp& chan);
     /// The types of the messages, interned when the library loads. "editChanged" is for its users to send.
     [[nodiscard]] static NotifyMsgType getEditChangedNotifyMsgType();
@@ -516,14 +531,16 @@ public:
     /// Operations that change groups record a change of type `kGroupsChanged` with notification.
     /// @{
     /// The edit's groups, opened or made on first use; null when the stored ones cannot be read, which then
-    /// stay in the file as they are. Lives as long as the edit or until it is read again. A change made
-    /// through the pointer is saved but not recorded.
+    /// stay in the file as they are. Lives as long as the edit, or until that is read again or the list goes
+    /// from the object store. A change made through the pointer is saved but not recorded. The list may name
+    /// what is no channel of the edit, as another program's file may: the questions below pass that over.
     [[nodiscard]] ChannelGroupList* retrieveGroupsList() const;
     /// The default grouping of a shot; null if none is stored.
     [[nodiscard]] ChannelGroupList* retrieveDefaultGroupsList() const;
     /// Ties channels into one group, in the given order; where one is in a group already, that group's
     /// members come in its place and that group goes. What is no channel's stamp is left out, and no group is
-    /// made of fewer than two. False, changing nothing, for fewer than two stamps or without a list.
+    /// made of fewer than two. `chans` may be a group's own members. False, changing nothing, for fewer than
+    /// two stamps or without a list.
     bool groupChannels(const Vector<IdStamp>& chans, ChannelGroup::eType type);
     /// Dissolves the channel's group. False if it is in none.
     bool ungroupChannels(const IdStamp& chan);
@@ -533,9 +550,10 @@ public:
     bool removeFromGroup(const IdStamp& chan);
     [[nodiscard]] bool isGrouped(const IdStamp& chan) const;
     /// Appends the members of a channel's group, or the channel itself when it is in none; nothing for what
-    /// is no channel of the edit.
+    /// is no channel of the edit, and of the members too.
     void getGroupContainingChan(const IdStamp& chan, Vector<IdStamp>& members) const;
-    /// The stamp itself when it is in no group.
+    /// The first and last member of a channel's group that is a channel of the edit, or, where none is, the
+    /// first and last. The stamp itself when it is in no group.
     [[nodiscard]] IdStamp getFirstInGroup(const IdStamp& chan) const;
     [[nodiscard]] IdStamp getLastInGroup(const IdStamp& chan) const;
     [[nodiscard]] bool isFirstInGroup(const IdStamp& chan) const { return getFirstInGroup(chan) == chan; }
@@ -614,6 +632,15 @@ private:
     void recordChange(const EditModification& change, bool notify);
     /// A part of a greater change, which its caller describes: dirtied only.
     void recordUndescribed();
+    /// The one or the other, of one channel; and the same of a channel that is heard.
+    void recordChangeOf(EditModificationType type, const IdStamp& chan, bool notify);
+    void soundChanged(EditModificationType type, const IdStamp& chan, bool notify);
+    /// Another current time or mark: dirtied and announced, but neither counted nor described.
+    void announcePosition(const EditModification& change);
+    /// True, with a line in the log, where a change would be lost because the edit is read-only. Asked last,
+    /// when nothing else stands against the change.
+    [[nodiscard]] bool refusesChange() const;
+    void warnOfReadOnly() const;
     /// @}
     void announceDirt();
     void writeDescription();
@@ -636,14 +663,14 @@ private:
     /// A channel that had an index goes, or is gone: it leaves its group, in the groups and the default ones,
     /// its cues go and those of the channels after it are renumbered. To be called while its cel exists.
     void channelRemoved(const IdStamp& chan, int index);
+    /// The same of all channels at once.
+    void allChannelsRemoved();
     /// A channel's stamp changes: its groups follow.
     void channelRenamed(const IdStamp& from, const IdStamp& to);
     /// A channel's cel is replaced: its cues follow to the events with the same stamps.
     void celReplaced(const cel* from, cel* to);
     /// Before a save: tells the object store which group lists changed.
     void storeGroups();
-    /// When the object store was opened or emptied: the group list is looked up anew.
-    void forgetGroups();
     void cuesChanged();
     void groupsChanged();
 
@@ -674,7 +701,9 @@ private:
     bool m_celCuesLoaded = false;
     mutable TagBag m_store;
     std::shared_ptr<StoredCels> m_storedCels; ///< which cel the store holds under which name
+    static constexpr uint64_t kNeverFound = UINT64_MAX;
     mutable std::atomic<ChannelGroupList*> m_groups{nullptr};
+    mutable std::atomic<uint64_t> m_groupsFoundAt{kNeverFound}; ///< the store's departures at the time
     ValServer<EditModification> m_changes;
     String m_fileError;
     mutable criticalSection m_section;

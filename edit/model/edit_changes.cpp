@@ -87,8 +87,7 @@ void Edit::set_dirty(bool dirty) {
         return;
     }
     if (isReadOnly()) {
-        herc_printf("Mild warning: attempt to dirty read-only edit \"%s\"\n",
-                    cookie_string(m_cookie).c_str());
+        warnOfReadOnly();
         return;
     }
     if (!m_dirty) {
@@ -204,6 +203,44 @@ void Edit::recordChange(const EditModification& change, bool notify) {
 void Edit::recordUndescribed() {
     if (!m_loading) {
         set_dirty(true);
+    }
+}
+
+bool Edit::refusesChange() const {
+    if (m_initialising || m_loading || m_temporary || !isReadOnly()) {
+        return false;
+    }
+    warnOfReadOnly();
+    return true;
+}
+
+void Edit::warnOfReadOnly() const {
+    herc_printf("Mild warning: attempt to dirty read-only edit \"%s\"\n", cookie_string(m_cookie).c_str());
+}
+
+void Edit::recordChangeOf(EditModificationType type, const IdStamp& chan, bool notify) {
+    if (notify) {
+        recordChange(EditModification(type).setChan(chan), true);
+    } else {
+        recordUndescribed();
+    }
+}
+
+void Edit::soundChanged(EditModificationType type, const IdStamp& chan, bool notify) {
+    const KeepAlive keep(*this);
+    const IdStamp altered = chan; // the caller's may belong to what a listener changes
+    const bool ofShot = is_original() && !m_initialising && !m_loading;
+    recordChangeOf(ofShot ? kShotSoundChanged : type, altered, notify);
+    if (ofShot && notify) {
+        notifyShotSoundAltered(altered);
+    }
+}
+
+void Edit::announcePosition(const EditModification& change) {
+    const KeepAlive keep(*this);
+    recordUndescribed();
+    if (!m_initialising && !m_loading) {
+        m_changes.announce(change);
     }
 }
 

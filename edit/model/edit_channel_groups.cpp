@@ -1,12 +1,21 @@
 #include "edit/model/edit.h"
 
+#include <algorithm>
+#include <functional>
+#include <iterator>
 #include <mutex>
+#include <set>
 
 namespace {
 
 /// A list as it lies in the store; null if there is none or it cannot be read.
 ChannelGroupList* openList(TagBag& store, const char* name) {
     return store.contains(name) ? dynamic_cast<ChannelGroupList*>(store.openObject(name)) : nullptr;
+}
+
+/// A list may name what is no channel of the edit: it is a file's, or was changed by its own operations.
+auto isChannelOf(const Edit& edit) {
+    return [&edit](const IdStamp& chan) { return edit.chanValid(chan); };
 }
 
 /// One piece of a group's name: a letter with a number, or a name of the channel's own (number 0).
@@ -91,14 +100,18 @@ void Edit::groupsChanged() {
 }
 
 ChannelGroupList* Edit::retrieveGroupsList() const {
-    if (ChannelGroupList* list = m_groups.load(std::memory_order_acquire)) {
-        return list;
+    // The list is the store's, which anybody may take it out of: no object must have gone since it was found.
+    const auto isKnown = [this] {
+        return m_groupsFoundAt.load(std::memory_order_acquire) == m_store.numDepartures();
+    };
+    if (isKnown()) {
+        return m_groups.load(std::memory_order_relaxed);
     }
     const std::lock_guard lock(m_section);
-    ChannelGroupList* list = m_groups.load(std::memory_order_relaxed);
-    if (list != nullptr) {
-        return list;
+    if (isKnown()) {
+        return m_groups.load(std::memory_order_relaxed);
     }
+    ChannelGroupList* list = nullptr;
     if (m_store.contains(ChannelGroupList::Id)) {
         list = openList(m_store, ChannelGroupList::Id);
     } else {
@@ -106,18 +119,15 @@ ChannelGroupList* Edit::retrieveGroupsList() const {
         list = empty.get();
         m_store.storeObject(ChannelGroupList::Id, std::move(empty));
     }
-    m_groups.store(list, std::memory_order_release);
+    if (list != nullptr) {
+        m_groups.store(list, std::memory_order_relaxed);
+        m_groupsFoundAt.store(m_store.numDepartures(), std::memory_order_release);
+    }
     return list;
 }
 
 ChannelGroupList* Edit::retrieveDefaultGroupsList() const {
-    const std::lock_guard lock(m_section);
     return openList(m_store, ChannelGroupList::IdForDefaultGrouping);
-}
-
-void Edit::forgetGroups() {
-    const std::lock_guard lock(m_section);
-    m_groups.store(nullptr, std::memory_order_release);
 }
 
 void Edit::storeGroups() {
@@ -127,30 +137,36 @@ void Edit::storeGroups() {
             list->setChanged(false);
         }
     };
-    tell(m_groups.load(std::memory_order_acquire), ChannelGroupList::Id);
+    // A list that nobody asked for has no change.
+    if (m_groupsFoundAt.load() != kNeverFound) {
+        tell(openList(m_store, ChannelGroupList::Id), ChannelGroupList::Id);
+    }
     tell(retrieveDefaultGroupsList(), ChannelGroupList::IdForDefaultGrouping);
 }
 
 bool Edit::groupChannels(const Vector<IdStamp>& chans, ChannelGroup::eType type) {
     ChannelGroupList* list = retrieveGroupsList();
-    if (chans.size() < 2 || list == nullptr) {
+    if (chans.size() < 2 || list == nullptr || refusesChange()) {
         return false;
     }
-    // The list keeps each member once, so a second mention of one is harmless.
+    // `chans` may be the members of one of the groups: nothing goes before everything was read. The list
+    // keeps each member once, so a second mention of one is harmless.
     Vector<IdStamp> members;
-    bool changed = false;
+    std::set<unsigned, std::greater<>> merged;
     for (const IdStamp& chan : chans) {
         const int group = list->findGroupContaining(chan);
         if (group < 0) {
             members.push_back(chan);
-            continue;
+        } else if (merged.insert(static_cast<unsigned>(group)).second) {
+            list->getGroupContents(static_cast<unsigned>(group), members);
         }
-        list->getGroupContents(static_cast<unsigned>(group), members);
-        list->destroyGroup(static_cast<unsigned>(group));
-        changed = true;
     }
-    changed = list->addGroup(members, type) || changed;
-    if (changed) {
+    const ChannelGroupList before(*list);
+    for (const unsigned group : merged) {
+        list->destroyGroup(group);
+    }
+    list->addGroup(members, type);
+    if (!(*list == before)) {
         groupsChanged();
     }
     return true;
@@ -159,7 +175,7 @@ bool Edit::groupChannels(const Vector<IdStamp>& chans, ChannelGroup::eType type)
 bool Edit::ungroupChannels(const IdStamp& chan) {
     ChannelGroupList* list = retrieveGroupsList();
     const int group = list != nullptr ? list->findGroupContaining(chan) : -1;
-    if (group < 0) {
+    if (group < 0 || refusesChange()) {
         return false;
     }
     list->destroyGroup(static_cast<unsigned>(group));
@@ -169,7 +185,7 @@ bool Edit::ungroupChannels(const IdStamp& chan) {
 
 bool Edit::ungroupAllChannels() {
     ChannelGroupList* list = retrieveGroupsList();
-    if (list == nullptr) {
+    if (list == nullptr || refusesChange()) {
         return false;
     }
     if (list->destroyAllGroups(ChannelGroup::eAll) > 0) {
@@ -179,10 +195,10 @@ bool Edit::ungroupAllChannels() {
 }
 
 bool Edit::removeFromGroup(const IdStamp& chan) {
-    ChannelGroupList* list = retrieveGroupsList();
-    if (list == nullptr || !list->removeMember(chan)) {
+    if (!isGrouped(chan) || refusesChange()) {
         return false;
     }
+    retrieveGroupsList()->removeMember(chan);
     groupsChanged();
     return true;
 }
@@ -200,21 +216,32 @@ void Edit::getGroupContainingChan(const IdStamp& chan, Vector<IdStamp>& members)
     const int group = list != nullptr ? list->findGroupContaining(chan) : -1;
     if (group < 0) {
         members.push_back(chan);
-    } else {
-        list->getGroupContents(static_cast<unsigned>(group), members);
+        return;
     }
+    const Vector<IdStamp>& all = list->getGroup(static_cast<unsigned>(group))->getChans();
+    std::copy_if(all.begin(), all.end(), std::back_inserter(members), isChannelOf(*this));
 }
 
 IdStamp Edit::getFirstInGroup(const IdStamp& chan) const {
     const ChannelGroupList* list = retrieveGroupsList();
     const int group = list != nullptr ? list->findGroupContaining(chan) : -1;
-    return group < 0 ? chan : list->getGroup(static_cast<unsigned>(group))->getChans().front();
+    if (group < 0) {
+        return chan;
+    }
+    const Vector<IdStamp>& all = list->getGroup(static_cast<unsigned>(group))->getChans();
+    const auto first = std::find_if(all.begin(), all.end(), isChannelOf(*this));
+    return first != all.end() ? *first : all.front();
 }
 
 IdStamp Edit::getLastInGroup(const IdStamp& chan) const {
     const ChannelGroupList* list = retrieveGroupsList();
     const int group = list != nullptr ? list->findGroupContaining(chan) : -1;
-    return group < 0 ? chan : list->getGroup(static_cast<unsigned>(group))->getChans().back();
+    if (group < 0) {
+        return chan;
+    }
+    const Vector<IdStamp>& all = list->getGroup(static_cast<unsigned>(group))->getChans();
+    const auto last = std::find_if(all.rbegin(), all.rend(), isChannelOf(*this));
+    return last != all.rend() ? *last : all.back();
 }
 
 unsigned Edit::numGroups(Edit_Chan_Type) const {

@@ -12,20 +12,18 @@ using Place = Edit::ChannelSet::Place;
 /// The new cels are filled to the end of the edit.
 constexpr double kFillToEdit = -1.0;
 
-/// Prints why `count` more channels do not fit into a list, if they do not.
-bool fits(List list, uint64_t present, uint64_t total, uint64_t count, const cookie& item) {
-    const char* what = nullptr;
-    if (list == Edit::ChannelSet::Audio && present + count > kMaxAudioChans) {
-        what = "audio";
-    } else if (list == Edit::ChannelSet::Video && present + count > kMaxVideoChans) {
-        what = "video";
-    } else if (list == Edit::ChannelSet::Effects && total + count >= static_cast<uint64_t>(NO_CHAN)) {
-        what = "effects";
-    }
-    if (what == nullptr) {
+/// Prints why `count` more channels do not fit into a list, if they do not: for its own limit, or because an
+/// index would reach `NO_CHAN`.
+bool fits(List list, const Edit::ChannelSet& channels, uint64_t count, const cookie& item) {
+    static constexpr struct {
+        const char* what;
+        uint64_t limit;
+    } kLists[] = {
+        {"effects", NO_CHAN}, {"video", kMaxVideoChans}, {"audio", kMaxAudioChans}, {"levels", NO_CHAN}};
+    if (channels.size(list) + count <= kLists[list].limit && channels.size() + count <= NO_CHAN) {
         return true;
     }
-    herc_printf("Too many %s channels for <%s>\n", what, cookie_string(item).c_str());
+    herc_printf("Too many %s channels for <%s>\n", kLists[list].what, cookie_string(item).c_str());
     return false;
 }
 
@@ -53,10 +51,8 @@ bool Edit::insertChans(Edit_Chan_Type type, Edit_Chan_SubType subtype, int at, u
 IdStamp Edit::insertChannels(ChanType type, int at, unsigned count, bool before, bool notify, double time,
                              cel* content) {
     const List list = ChannelSet::listFor(type.type, type.subtype);
-    if (list == ChannelSet::kNumLists || count == 0 || !std::isfinite(time) || time >= Qx::kNoTime) {
-        return {};
-    }
-    if (!fits(list, m_channels->size(list), m_channels->size(), count, m_cookie)) {
+    if (list == ChannelSet::kNumLists || count == 0 || !std::isfinite(time) || time > cel::kGreatestTime ||
+        refusesChange() || !fits(list, *m_channels, count, m_cookie)) {
         return {};
     }
     const double fillTo = time == kFillToEdit ? get_start_or_end_time(false, false) : time;
@@ -96,13 +92,30 @@ int Edit::addChan(Edit_Chan_Type type, cel* content, bool notify, Edit_Chan_SubT
     return getIdx(added);
 }
 
+IdStamp Edit::addLevelsChan(const IdStamp& audio, const AudLevelsCel& levels, bool notify) {
+    const Place place = m_channels->find(audio);
+    if (place.list != ChannelSet::Audio || !levels.valid() ||
+        m_channels->audio()[place.position].getLevelsChanID().valid() || refusesChange() ||
+        !fits(ChannelSet::Levels, *m_channels, 1, m_cookie)) {
+        return {};
+    }
+    const IdStamp owner = audio;
+    const IdStamp id = usableStamp(levels.id());
+    const int index = getNumChans();
+    m_channels->insertLevels(levels, id, place.position);
+    shuffleCueChans(index, 1);
+    dropDerivedValues();
+    soundChanged(kLevelsChanged, owner, notify);
+    return id;
+}
+
 bool Edit::isGivenCel(const cel* content) {
     return reinterpret_cast<uintptr_t>(content) > 1;
 }
 
 bool Edit::removeChan(const IdStamp& chan, bool notify) {
     const Place place = m_channels->find(chan);
-    if (!place) {
+    if (!place || refusesChange()) {
         return false;
     }
     const IdStamp levels =
@@ -134,13 +147,13 @@ bool Edit::removeChan(const IdStamp& chan, bool notify) {
 
 bool Edit::removeChans(bool notify) {
     const int count = getNumChans();
-    if (count == 0) {
+    if (count == 0 || refusesChange()) {
         return false;
     }
+    allChannelsRemoved();
     std::vector<ChannelSet::Removed> removed; // kept until everybody was told
     removed.reserve(static_cast<size_t>(count));
     for (int i = count - 1; i >= 0; --i) {
-        channelRemoved(getId(i), i);
         removed.push_back(m_channels->remove(m_channels->find(i)));
     }
     dropDerivedValues();

@@ -205,7 +205,7 @@ AudLevelsCel Edit::getLevelsCel(const IdStamp& chan) const {
                                             : AudLevelsCel::createInvalid();
 }
 
-bool Edit::setAudCel(const AudCel& audio) {
+bool Edit::setAudCel(const AudCel& audio, bool notify) {
     const Place place = m_channels->find(audio.id());
     if (place.list != ChannelSet::Audio || m_channels->content(place) != audio.getCel()) {
         return false;
@@ -218,8 +218,18 @@ bool Edit::setAudCel(const AudCel& audio) {
             return false;
         }
     }
+    const AudCel& present = m_channels->audio()[place.position];
+    const bool fades = present.getXFadesEnabled() != audio.getXFadesEnabled();
+    const bool sound = present.getSoundOutputEnabled() != audio.getSoundOutputEnabled() ||
+                       present.getLevelsChanID() != levels;
+    if (!fades && !sound) {
+        return true;
+    }
+    if (refusesChange()) {
+        return false;
+    }
     m_channels->setAudio(place.position, audio);
-    recordUndescribed();
+    soundChanged(sound ? kLevelsChanged : kFadesChanged, audio.id(), notify);
     return true;
 }
 
@@ -230,7 +240,7 @@ String Edit::getChanName(const IdStamp& chan) const {
 
 bool Edit::setChanName(const IdStamp& chan, const String& name) {
     ChannelSet::Entry* const known = m_channels->entry(chan);
-    if (known == nullptr || !isGoodName(name)) {
+    if (known == nullptr || !isGoodName(name) || (known->name != name && refusesChange())) {
         return false;
     }
     if (known->name != name) {
@@ -265,7 +275,7 @@ String Edit::getMaterialInfo(const IdStamp& chan) const {
 
 bool Edit::setMaterialInfo(const IdStamp& chan, const String& text) {
     ChannelSet::Entry* const known = m_channels->entry(chan);
-    if (known == nullptr) {
+    if (known == nullptr || (known->materialInfo != text && refusesChange())) {
         return false;
     }
     if (known->materialInfo != text) {
@@ -275,15 +285,23 @@ bool Edit::setMaterialInfo(const IdStamp& chan, const String& text) {
     return true;
 }
 
-bool Edit::set_edit_cel_p(int index, cel* content) {
+bool Edit::set_edit_cel_p(int index, cel* content, bool notify) {
     const Place place = m_channels->find(index);
     if (!isGivenCel(content) || m_channels->content(place) == nullptr) {
         return false;
     }
-    if (content != m_channels->content(place)) {
-        celReplaced(m_channels->content(place), content);
-        m_channels->setContent(place, Qx::Ptr<cel>(content));
-        recordUndescribed();
+    if (content == m_channels->content(place)) {
+        return true;
+    }
+    if (refusesChange()) {
+        return false;
+    }
+    celReplaced(m_channels->content(place), content);
+    m_channels->setContent(place, Qx::Ptr<cel>(content));
+    if (place.list == ChannelSet::Audio) {
+        soundChanged(kEventsChanged, m_channels->id(place), notify);
+    } else {
+        recordChangeOf(kEventsChanged, m_channels->id(place), notify);
     }
     return true;
 }
@@ -306,28 +324,14 @@ bool Edit::setChannelID(const IdStamp& chan, const IdStamp& newId) {
     if (chan == newId) {
         return true;
     }
-    if (m_channels->contains(newId)) {
+    if (m_channels->contains(newId) || refusesChange()) {
         return false;
     }
-    m_channels->rename(place, newId);
-    channelRenamed(old, newId);
+    const IdStamp wanted = newId;
+    m_channels->rename(place, wanted);
+    channelRenamed(old, wanted);
     recordUndescribed();
     return true;
-}
-
-IdStamp Edit::addLevelsChan(const IdStamp& audio, const AudLevelsCel& levels) {
-    const Place place = m_channels->find(audio);
-    if (place.list != ChannelSet::Audio || !levels.valid() ||
-        m_channels->audio()[place.position].getLevelsChanID().valid()) {
-        return {};
-    }
-    const IdStamp id = usableStamp(levels.id());
-    const int index = getNumChans();
-    m_channels->insertLevels(levels, id, place.position);
-    shuffleCueChans(index, 1);
-    dropDerivedValues();
-    recordUndescribed();
-    return id;
 }
 
 IdStamp Edit::setupEditChannel(ChanType type, Qx::Ptr<cel> content) {
@@ -382,14 +386,14 @@ double Edit::getSyncLoss(const IdStamp& chan) const {
     return known != nullptr ? known->syncLoss : 0;
 }
 
-bool Edit::setSyncLoss(const IdStamp& chan, double seconds) {
+bool Edit::setSyncLoss(const IdStamp& chan, double seconds, bool notify) {
     ChannelSet::Entry* const known = m_channels->entry(chan);
-    if (known == nullptr || !std::isfinite(seconds)) {
+    if (known == nullptr || !std::isfinite(seconds) || (known->syncLoss != seconds && refusesChange())) {
         return false;
     }
     if (known->syncLoss != seconds) {
         known->syncLoss = seconds;
-        recordUndescribed();
+        recordChangeOf(kSyncChanged, chan, notify);
     }
     return true;
 }

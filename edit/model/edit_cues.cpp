@@ -1,5 +1,7 @@
 #include "edit/model/edit.h"
 
+#include <unordered_set>
+
 namespace {
 
 /// The cue list's name in the object store. It lives in files: do not change it.
@@ -16,13 +18,7 @@ void Edit::cuesChanged() {
 }
 
 bool Edit::delete_all_cel_cues() {
-    const size_t before = m_cues.get_num_cue_points(0);
-    for (size_t i = before; i-- > 0;) {
-        if (isCelCue(*m_cues.get_cue_point(i, 0))) {
-            m_cues.delete_cue_point(i);
-        }
-    }
-    if (m_cues.get_num_cue_points(0) == before) {
+    if (m_cues.delete_cues_if([](size_t, const cue_point& cue) { return isCelCue(cue); }) == 0) {
         return false;
     }
     cuesChanged();
@@ -35,7 +31,7 @@ bool Edit::cel_cues_off() {
 }
 
 bool Edit::deleteCues(int chan) {
-    if (m_cues.delete_matching_cues(0, chan) == 0) {
+    if (m_cues.get_num_cue_points(0) == 0 || refusesChange() || m_cues.delete_matching_cues(0, chan) == 0) {
         return false;
     }
     cuesChanged();
@@ -43,7 +39,7 @@ bool Edit::deleteCues(int chan) {
 }
 
 bool Edit::deleteCue(size_t index) {
-    if (!m_cues.delete_cue_point(index)) {
+    if (m_cues.get_cue_point(index, 0) == nullptr || refusesChange() || !m_cues.delete_cue_point(index)) {
         return false;
     }
     cuesChanged();
@@ -73,12 +69,13 @@ void Edit::shuffleCueChans(int firstChan, int count) {
 }
 
 void Edit::storeCues() {
-    auto kept = std::make_unique<cue_list>(m_cues);
-    for (size_t i = kept->get_num_cue_points(0); i-- > 0;) {
-        if (!kept->get_cue_point(i, 0)->hasFlags(CueFlag::kKept)) {
-            kept->delete_cue_point(i);
+    auto kept = std::make_unique<cue_list>();
+    for (size_t i = 0; const cue_point* const cue = m_cues.get_cue_point(i, 0); ++i) {
+        if (cue->hasFlags(CueFlag::kKept)) {
+            kept->add_cue_point(*cue);
         }
     }
+    kept->dropCels(); // they may go before the stored cues do
     m_store.storeObject(kCueId, std::move(kept));
 }
 
@@ -92,6 +89,9 @@ bool Edit::retrieveCues() {
         return false;
     }
     m_cues = *stored;
+    if (!m_initialising && !m_loading) {
+        convertCues(); // else the channels are still to come
+    }
     return true;
 }
 
@@ -115,6 +115,27 @@ void Edit::channelRemoved(const IdStamp& chan, int index) {
         m_cues.delete_matching_cues(0, index);
         m_cues.shuffleChans(index + 1, -1);
     }
+}
+
+void Edit::allChannelsRemoved() {
+    const int count = getNumChans();
+    std::unordered_set<const cel*> cels;
+    Vector<IdStamp> chans;
+    for (int i = 0; i < count; ++i) {
+        chans.push_back(getId(i));
+        cels.insert(get_edit_cel_p(i));
+    }
+    if (!m_loading) {
+        for (ChannelGroupList* list : {retrieveGroupsList(), retrieveDefaultGroupsList()}) {
+            for (size_t i = 0; list != nullptr && list->size() > 0 && i < chans.size(); ++i) {
+                list->removeMember(chans[i]);
+            }
+        }
+    }
+    m_cues.delete_cues_if(
+        [count](size_t, const cue_point& cue) { return cue.channel() >= 0 && cue.channel() < count; });
+    m_cues.dropCels([&](const cel* gone) { return cels.contains(gone); });
+    m_cues.shuffleChans(count, -count);
 }
 
 void Edit::channelRenamed(const IdStamp& from, const IdStamp& to) {

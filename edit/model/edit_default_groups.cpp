@@ -21,7 +21,7 @@ bool Edit::isDefaultGroupingPresent() const {
 
 bool Edit::applyDefaultGrouping() {
     ChannelGroupList* list = isDefaultGroupingPresent() ? retrieveGroupsList() : nullptr;
-    if (list == nullptr) {
+    if (list == nullptr || refusesChange()) {
         return false;
     }
     const ChannelGroupList& defaults = *retrieveDefaultGroupsList();
@@ -46,7 +46,7 @@ bool Edit::updateDefaultGroupingForShot() {
     }
     const ChannelGroupList* defaults = retrieveDefaultGroupsList();
     const bool unreadable = defaults == nullptr && m_store.contains(ChannelGroupList::IdForDefaultGrouping);
-    if (unreadable || (defaults != nullptr ? *defaults == *list : list->size() == 0)) {
+    if (unreadable || (defaults != nullptr ? *defaults == *list : list->size() == 0) || refusesChange()) {
         return false;
     }
     if (list->size() == 0) {

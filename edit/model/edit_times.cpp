@@ -9,7 +9,7 @@ double Edit::get_current_time(int /*chan*/) const {
 void Edit::set_current_time(int chan, double time) {
     if (std::isfinite(time) && time != m_currentTime) {
         set_current_time_raw(chan, time);
-        recordUndescribed();
+        announcePosition(EditModification(kCurrentTimeChanged).setSpan(time, 0));
     }
 }
 
@@ -26,7 +26,7 @@ double Edit::get_mark_time(int /*chan*/) const {
 void Edit::set_mark_time(int chan, double time) {
     if (std::isfinite(time) && time != m_markTime) {
         set_mark_time_raw(chan, time);
-        recordUndescribed();
+        announcePosition(EditModification(kMarkChanged).setSpan(time, 0));
     }
 }
 

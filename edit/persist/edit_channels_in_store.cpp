@@ -329,7 +329,6 @@ void EditFile::reset(Edit& edit) {
         const Quiet quiet(edit);
         edit.removeChans(false);
         edit.get_cues().delete_all_cues();
-        edit.forgetGroups();
         edit.m_storedCels.reset();
     }
     const cookie item = edit.m_cookie;

@@ -60,7 +60,6 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
         // Before the store is opened, as channels that go leave the groups in it.
         EditFile::reset(*this);
     }
-    forgetGroups();
     m_storedCels.reset();
 
     ReadFileRC result = kReadFailed;

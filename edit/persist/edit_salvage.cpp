@@ -281,6 +281,7 @@ Qx::Status EditFile::salvage(Edit& edit, const String& path, Salvaging& salvagin
             }
         }
     }
+    EditFile::leaveLostChannelsOut(edit);
     salvaging.finish();
     edit.getInfoFromHeader();
     return {};
@@ -297,7 +298,22 @@ static Qx::Status salvageInto(const String& path, EditPtr& edit, std::vector<Str
     return {};
 }
 
+void EditFile::leaveLostChannelsOut(Edit& edit) {
+    for (ChannelGroupList* const list : {edit.retrieveGroupsList(), edit.retrieveDefaultGroupsList()}) {
+        Vector<IdStamp> members;
+        for (unsigned i = 0; list != nullptr && i < list->size(); ++i) {
+            list->getGroupContents(i, members);
+        }
+        for (const IdStamp& chan : members) {
+            if (!edit.chanValid(chan)) {
+                list->removeMember(chan);
+            }
+        }
+    }
+}
+
 void EditFile::convert(Edit& edit, std::vector<String>& lost) {
+    const Quiet quiet(edit); // a read-only edit too is brought up to date
     try {
         edit.doEditConversions();
     } catch (const std::exception& error) {

@@ -177,7 +177,6 @@ Qx::Status EditFile::openStore(Edit& edit, const String& path) {
         store.storeObject(object, std::move(held));
     }
     edit.m_storedCels.reset();
-    edit.forgetGroups();
     if (result != TagBag::NewStore && result != TagBag::Opened) {
         return Qx::Status::failure(store.openError());
     }

@@ -40,7 +40,10 @@ public:
         m_subscribers.tell(value);
     }
 
-    /// Hears each value that is set until the guard goes.
+    /// Informs every observer of a value that does not become the current one.
+    void announce(T value) { m_subscribers.tell(value); }
+
+    /// Hears each value that is set or announced until the guard goes.
     [[nodiscard]] Qx::Ptr<Qx::Guard> addListener(Listener listener) {
         return Qx::guardFor(m_subscribers.add(std::move(listener)));
     }

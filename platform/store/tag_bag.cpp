@@ -254,6 +254,7 @@ void TagBag::storeObject(std::string_view name, std::unique_ptr<Streamable> obje
     Contents::Entry& entry = m_contents->findOrAdd(name);
     m_contents->forgetBytes(entry);
     entry.lent = nullptr;
+    m_contents->takeOwned(entry);
     entry.owned = std::move(object);
     entry.changed = true;
 }
@@ -264,7 +265,7 @@ void TagBag::lendObject(std::string_view name, const Streamable& object, bool ch
         return;
     }
     Contents::Entry& entry = m_contents->findOrAdd(name);
-    entry.owned.reset();
+    m_contents->takeOwned(entry);
     entry.lent = &object;
     entry.changed = entry.changed || changed || entry.layer != object.layerName();
 }
@@ -299,6 +300,10 @@ Streamable* TagBag::openObject(std::string_view name) {
     return entry->owned.get();
 }
 
+uint64_t TagBag::numDepartures() const {
+    return m_contents->numDepartures;
+}
+
 std::unique_ptr<Streamable> TagBag::extractObject(std::string_view name) {
     Contents::Entry* entry = m_contents->find(name);
     if (entry != nullptr && entry->lent != nullptr) {
@@ -312,7 +317,7 @@ std::unique_ptr<Streamable> TagBag::extractObject(std::string_view name) {
     if (openObject(name) == nullptr) {
         return nullptr;
     }
-    std::unique_ptr<Streamable> object = std::move(entry->owned);
+    std::unique_ptr<Streamable> object = m_contents->takeOwned(*entry);
     if (!entry->hasBytes()) {
         m_contents->erase(name);
     }

@@ -93,8 +93,12 @@ public:
     void releaseLent();
 
     /// The object under a name, as a live object that the bag owns: unpacked from its bytes on the first
-    /// call. Null when there is none or its bytes do not make one; `objectError` then tells which.
+    /// call. Null when there is none or its bytes do not make one; `objectError` then tells which. The
+    /// pointer is good until the object goes: while `numDepartures` is what it was, none has.
     [[nodiscard]] Streamable* openObject(std::string_view name);
+    /// How often live objects that the bag owned went from it: replaced, lent over, handed over, removed, or
+    /// with the whole content. Never falls.
+    [[nodiscard]] uint64_t numDepartures() const;
     /// The same, handed over: the bag knows the bytes still (see `lendObject`) but owns no object any more;
     /// an object that was never written goes from the bag. Bytes of an object handed over are not kept in
     /// memory but found again in the file: if that was replaced or moved since, and no object is lent in

@@ -15,6 +15,7 @@ constexpr size_t kLeastPartInUse = 8;
 
 void TagBag::Contents::clear() {
     m_index.clear();
+    ++numDepartures;
     entries.clear();
     image.drop();
     source = {};
@@ -52,9 +53,15 @@ void TagBag::Contents::erase(std::string_view name) {
         if (entry->isInImage()) {
             m_imageBytesInUse -= entry->memory.size();
         }
+        takeOwned(*entry);
         m_index.erase(found);
         entries.erase(entry);
     }
+}
+
+std::unique_ptr<Streamable> TagBag::Contents::takeOwned(Entry& entry) {
+    numDepartures += entry.owned != nullptr ? 1 : 0;
+    return std::move(entry.owned);
 }
 
 void TagBag::Contents::takeImage(std::span<const StoredObject> objects, std::span<const String> complaints,

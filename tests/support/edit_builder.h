@@ -34,7 +34,7 @@ public:
             AudLevelsCel levels = AudLevelsCel::create();
             levels.insertNode(i + 1.0, 0.5F);
             levels.setChanged(false);
-            (void)edit->addLevelsChan(audio[i], levels);
+            (void)edit->addLevelsChan(audio[i], levels, false);
         }
         edit->set_dirty(false);
         return edit;

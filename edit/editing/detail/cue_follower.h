@@ -15,6 +15,8 @@ public:
     void follow();
 
 private:
+    void moveToCopies();
+
     struct Copy {
         IdStamp chan;
         IdStamp event;

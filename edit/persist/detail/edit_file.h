@@ -78,6 +78,8 @@ public:
 
     /// Reads all that is sound of a file into an edit without a file. Fails when that makes no edit.
     static Qx::Status salvage(Edit& edit, const String& path, Salvaging& salvaging);
+    /// Takes stamps of channels that could not be read out of the groups of an edit that was salvaged.
+    static void leaveLostChannelsOut(Edit& edit);
     /// Brings an edit that was salvaged up to date; what fails is told in `lost`.
     static void convert(Edit& edit, std::vector<String>& lost);
 

@@ -57,6 +57,8 @@ public:
     void dropMemory(Entry& entry);
     /// Forgets an object's bytes wherever they are.
     void forgetBytes(Entry& entry);
+    /// Takes the live object out of an entry, if the bag owns one there.
+    std::unique_ptr<Streamable> takeOwned(Entry& entry);
 
     [[nodiscard]] String path() const;
     /// Writes the file once. `retry` is set when bytes could not be taken over from `source`: then nothing
@@ -72,6 +74,7 @@ public:
     String objectError;
     size_t numPacked = 0;
     size_t numKept = 0;
+    uint64_t numDepartures = 0;
     Entries entries; ///< in the order of the file
     Qx::detail::StoreImage image;
     Qx::detail::StoreIdentity source;

@@ -6,6 +6,7 @@
 #include "tests/support/recording_log.h"
 #include "tests/support/recording_registry.h"
 
+#include <functional>
 #include <gtest/gtest.h>
 
 using test::EditBuilder;
@@ -234,6 +235,52 @@ TEST(Notification, OfChannelsNamesThemInOrder) {
     listener.heard.clear();
     ASSERT_TRUE(edit->removeChans(true));
     EXPECT_EQ(listener.heard, (Calls{"editChanDeleted E0016001 127 0 4", "channels-removed"}));
+}
+
+TEST(Notification, OfWhatIsSetOfAChannelAndOfTheTimes) {
+    const auto setAudio = [](Edit& edit, void (*change)(AudCel&)) {
+        AudCel audio = edit.getAudCel(edit.getId(1));
+        change(audio);
+        EXPECT_TRUE(edit.setAudCel(audio));
+    };
+    struct Case {
+        const char* told;
+        bool isSound;
+        bool isEdit; ///< counted and described
+        std::function<void(Edit&)> change;
+    };
+    for (const Case& c :
+         {Case{"levels", true, true,
+               [&](Edit& e) { setAudio(e, [](AudCel& a) { a.setSoundOutputEnabled(false); }); }},
+          Case{"levels", true, true,
+               [](Edit& e) { EXPECT_TRUE(e.addLevelsChan(e.getId(1), AudLevelsCel::create()).valid()); }},
+          Case{"fades", true, true,
+               [&](Edit& e) { setAudio(e, [](AudCel& a) { a.setXFadesEnabled(true); }); }},
+          Case{"events", true, true, [](Edit& e) { EXPECT_TRUE(e.set_edit_cel_p(1, new cel)); }},
+          Case{"events", false, true, [](Edit& e) { EXPECT_TRUE(e.set_edit_cel_p(0, new cel)); }},
+          Case{"sync", false, true, [](Edit& e) { EXPECT_TRUE(e.setSyncLoss(e.getId(0), 2)); }},
+          Case{"current-time", false, false, [](Edit& e) { e.set_current_time(0, 2); }},
+          Case{"mark", false, false, [](Edit& e) { e.set_mark_time(0, 2); }}}) {
+        for (const bool shot : {false, true}) {
+            SCOPED_TRACE(String(c.told) + (shot ? " of a shot" : ""));
+            const EditPtr edit = EditBuilder().item(kItem).video(1).audio(1).build();
+            edit->Opts().setInt("ORIGINAL_MATERIAL", shot ? 1 : 0);
+            edit->setChangeDescription(kOpInsert, false);
+            edit->set_dirty(false);
+            Listener listener(*edit);
+            c.change(*edit);
+            Calls told{shot && c.isSound ? "shot-sound" : c.told};
+            if (shot && c.isSound) {
+                told.push_back("editShotSound E0016001 " + edit->getId(1).asString());
+            }
+            EXPECT_EQ(listener.heard, told);
+            EXPECT_TRUE(edit->get_dirty());
+            EXPECT_EQ(edit->getModificationCount(), c.isEdit ? 2U : 1U);
+            EXPECT_EQ(edit->getChangeDescription().type(), c.isEdit ? kSeveral : kOpInsert);
+            edit->setChangeDescription(kOpInsert, false);
+            EXPECT_EQ(edit->getChangeDescription().type(), c.isEdit ? kSeveral : kOpInsert);
+        }
+    }
 }
 
 TEST(Notification, OfTheEditItself) {

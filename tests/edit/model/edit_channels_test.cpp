@@ -3,6 +3,7 @@
 #include "tests/support/edit_state.h"
 #include "tests/support/recording_log.h"
 
+#include <functional>
 #include <gtest/gtest.h>
 
 #include <limits>
@@ -162,7 +163,8 @@ TEST(Insertion, RefusedChangesNothing) {
           Case{ControlChan, Sub::NONE, 1, 0, ""}, Case{TChan, Sub::NONE, 1, 0, ""},
           Case{AnyChan, Sub::ANY, 1, 0, ""}, Case{NoChan, Sub::INVALID, 1, 0, ""},
           Case{VideoChan, Sub::NONE, 0, 0, ""}, Case{VideoChan, Sub::NONE, 1, nan, ""},
-          Case{VideoChan, Sub::NONE, 1, Qx::kNoTime, ""}}) {
+          Case{VideoChan, Sub::NONE, 1, Qx::kNoTime, ""},
+          Case{VideoChan, Sub::NONE, 1, cel::kGreatestTime + 1, ""}}) {
         const test::RecordingLog log;
         EXPECT_FALSE(edit->insertChans(c.type, c.subtype, NO_CHAN, c.count, false, true, c.time));
         EXPECT_EQ(log.log(), c.logged);
@@ -172,6 +174,20 @@ TEST(Insertion, RefusedChangesNothing) {
     EXPECT_EQ(editState(*edit), before);
     EXPECT_TRUE(edit->insertChans(AudioChan, Sub::NONE, NO_CHAN, 1, false, true, 0));
     EXPECT_TRUE(edit->insertChans(VideoChan, Sub::NONE, NO_CHAN, 1, false, true, 0));
+}
+
+TEST(Insertion, NoIndexReachesNoChan) {
+    const EditPtr edit = EditBuilder().audio(1).build();
+    const test::RecordingLog log;
+    const unsigned most = NO_CHAN - 1;
+    ASSERT_TRUE(edit->insertChans(VideoChan, Sub::ALIAS, NO_CHAN, most, false, false, 0));
+    EXPECT_FALSE(edit->addLevelsChan(edit->getId(NO_CHAN - 1), AudLevelsCel::create()).valid());
+    for (const auto& [type, subtype] : {std::pair{VideoChan, Sub::ALIAS}, std::pair{VideoChan, Sub::NONE},
+                                        std::pair{AudioChan, Sub::NONE}}) {
+        EXPECT_EQ(edit->addChan(type, nullptr, true, subtype), NO_CHAN);
+    }
+    EXPECT_EQ(edit->getNumChans(), NO_CHAN);
+    EXPECT_TRUE(edit->removeChans(false));
 }
 
 TEST(Insertion, OfContentHandsItOver) {
@@ -267,6 +283,43 @@ TEST(Channels, RefusedChangesOfThemChangeNothing) {
     EXPECT_FALSE(edit->setSyncLoss(unknown, 1));
     EXPECT_FALSE(edit->setMaterialInfo(unknown, "x"));
     EXPECT_EQ(editState(*edit), before);
+}
+
+TEST(Channels, OfAReadOnlyEditAreNotChanged) {
+    const EditPtr edit = EditBuilder().video(1).audio(3).levels(1).clips({1}).build();
+    const IdStamp a1 = edit->getId(1), a2 = edit->getId(2), a3 = edit->getId(3);
+    ASSERT_TRUE(edit->groupChannels({a1, a2}, ChannelGroup::eStereo));
+    edit->get_cues().add_cue_point(cue_point("x", 0, 0, 0, {}, false));
+    edit->set_read_only(true);
+    edit->set_dirty(false);
+    const String before = editState(*edit);
+    cel spare;
+    AudCel muted = edit->getAudCel(a1);
+    muted.setSoundOutputEnabled(false);
+    const std::vector<std::function<bool()>> changes{
+        [&] { return edit->insertChans(AudioChan, Sub::NONE, NO_CHAN, 1, false, true, 0); },
+        [&] { return edit->addChan(VideoChan) != NO_CHAN; },
+        [&] { return edit->addLevelsChan(a2, AudLevelsCel::create()).valid(); },
+        [&] { return edit->removeChan(a1, true) || edit->removeChans(true); },
+        [&] { return edit->set_edit_cel_p(0, &spare) || edit->setAudCel(muted); },
+        [&] { return edit->setChanName(a1, "x") || edit->setMaterialInfo(a1, "x"); },
+        [&] {
+            return edit->setSyncLoss(a1, 1) || edit->setChannelID(a1, IdStamp::fresh(IdStampMagic::Channel));
+        },
+        [&] {
+            return edit->groupChannels({a1, a3}, ChannelGroup::ePlain) || edit->removeFromGroup(a1);
+        },
+        [&] { return edit->ungroupChannels(a1) || edit->ungroupAllChannels(); },
+        [&] { return edit->deleteCues(-1) || edit->deleteCue(0); },
+    };
+    for (size_t i = 0; i < changes.size(); ++i) {
+        const test::RecordingLog log;
+        EXPECT_FALSE(changes[i]()) << i;
+        EXPECT_TRUE(log.contains("Mild warning: attempt to dirty read-only edit")) << i;
+        EXPECT_EQ(editState(*edit), before) << i;
+    }
+    edit->setTemporary(true);
+    EXPECT_TRUE(edit->removeChans(true)) << "a temporary edit has nothing to lose";
 }
 
 TEST(Channels, KeepTheirPropertiesThroughChangesOfCelAndStamp) {

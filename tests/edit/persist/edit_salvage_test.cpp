@@ -128,6 +128,11 @@ TEST_F(DamagedFile, OneDamagedObjectCostsThatObject) {
             EXPECT_EQ(edit->getSyncLoss(boom), 1.25);
             EXPECT_FALSE(edit->getAudCel(boom).getSoundOutputEnabled());
         }
+        for (unsigned i = 0; i < edit->numGroups(); ++i) {
+            for (const IdStamp& member : edit->getTrackGroup(i)->getChans()) {
+                EXPECT_TRUE(edit->chanValid(member)) << "a group without its lost channels";
+            }
+        }
         // What is saved is an edit that reads again.
         edit->set_cookie(cookie(Cookie_Type::Edit, 99, 0));
         edit->init_dirty();

@@ -325,7 +325,7 @@ TEST(ChannelGroups, RandomChannelAndGroupChangesKeepTheInvariants) {
             }
             Edit& edit = *current;
             const IdStamp chan = anyChan();
-            switch (below(6)) {
+            switch (below(8)) {
             case 0: {
                 const auto type = below(2) != 0 ? VideoChan : AudioChan;
                 const auto sub =
@@ -340,13 +340,31 @@ TEST(ChannelGroups, RandomChannelAndGroupChangesKeepTheInvariants) {
                     naive.take(chan);
                 }
                 break;
-            case 2:
-                ASSERT_EQ(edit.removeFromGroup(chan), naive.find(chan) < naive.groups.size());
+            case 2: {
+                // The stamp may be the group's own.
+                const size_t group = naive.find(chan);
+                const auto* const its = edit.getTrackGroup(static_cast<unsigned>(group));
+                ASSERT_EQ(edit.removeFromGroup(its != nullptr ? *std::find(its->getChans().begin(),
+                                                                           its->getChans().end(), chan)
+                                                              : chan),
+                          group < naive.groups.size());
                 naive.take(chan);
                 break;
+            }
             case 3:
                 if (edit.ungroupChannels(chan)) {
                     naive.erase(naive.find(chan));
+                }
+                break;
+            case 4:
+                if (naive.groups.empty() || step % 40 == 0) {
+                    edit.objectStore().removeObject(ChannelGroupList::Id);
+                    naive.groups.clear();
+                } else {
+                    const unsigned group = below(static_cast<unsigned>(naive.groups.size()));
+                    naive.group(Vector<IdStamp>(naive.groups[group]));
+                    ASSERT_TRUE(
+                        edit.groupChannels(edit.getTrackGroup(group)->getChans(), ChannelGroup::ePlain));
                 }
                 break;
             default: {

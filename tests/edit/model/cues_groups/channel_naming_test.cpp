@@ -124,6 +124,21 @@ TEST(ChannelView, OrdersFiltersAndFolds) {
             EXPECT_EQ(list.getChan(static_cast<int>(i)), c.order[i]);
         }
     }
+    // What a group names that is no channel, first, last or between, hides nobody.
+    ChannelGroupList& groups = *edit->retrieveGroupsList();
+    const auto absent = [] { return IdStamp::fresh(IdStampMagic::Channel); };
+    Vector<IdStamp> members;
+    groups.getGroupContents(1, members);
+    groups.destroyGroup(1);
+    ASSERT_TRUE(groups.addGroup({absent(), members[0], absent(), members[1], members[2], absent()},
+                                ChannelGroup::ePlain));
+    for (const auto& c : cases) {
+        Vector<int> order;
+        ChannelView(edit, c.expanded).getChannelOrder(order, c.types, c.include, c.exclude);
+        EXPECT_EQ(order, c.order);
+    }
+    EXPECT_EQ(edit->getLastInGroup(members[0]), members[2]);
+
     ChannelView none({}, true);
     Vector<int> order;
     none.getChannelOrder(order, 3, 15, 0);

@@ -1,5 +1,7 @@
 #include "cue_fixture.h"
 
+#include <ctime>
+#include <functional>
 #include <gtest/gtest.h>
 #include <random>
 
@@ -215,6 +217,36 @@ private:
 };
 
 } // namespace
+
+TEST(CueFollows, ManyCuesTakeNoMoreThanAMomentEach) {
+    constexpr int kMany = 20000;
+    const std::vector<double> lengths(kMany, 2.0);
+    const auto timed = [](const char* what, const std::function<void()>& work) {
+        const std::clock_t start = std::clock(); // of the processor: the machine may be busy
+        work();
+        EXPECT_LT(std::clock() - start, CLOCKS_PER_SEC / 5) << what;
+    };
+    const EditPtr edit(new Edit);
+    cel* const its = edit->get_edit_cel_p(edit->addChan(VideoChan, cutList(1, lengths).release()));
+    cue_list& cues = edit->get_cues();
+    for (int i = 0; i < kMany; ++i) {
+        cues.add_cue_point("c", 2 * i + 0.5, 0, i, {its}, true);
+        cues.get_cue_point(static_cast<size_t>(i), 0)->setFlags(CueFlag::kAttached + i % 2 * CueFlag::kKept);
+    }
+    cue_list elsewhere = cues;
+    elsewhere.dropCels();
+    const auto moved = cutList(100000, lengths);
+    timed("converted to what plays elsewhere", [&] { elsewhere.convert({moved.get()}); });
+    EXPECT_TRUE(elsewhere.get_cue_point(0, 0)->attached()) << "to what plays there";
+    timed("stored", [&] { edit->storeCues(); });
+    cel::IdMap ids;
+    ASSERT_TRUE(its->replace(moved.get(), {0, kMany}, 0, ids));
+    timed("half of the events replaced", [&] { edit->updateCues(); });
+    EXPECT_EQ(cues.get_cue_point(kMany / 2 - 1, 0)->editTime(), 0);
+    EXPECT_EQ(cues.get_cue_point(kMany - 1, 0)->editTime(), 2 * kMany - 1.5);
+    timed("cel cues deleted", [&] { edit->delete_all_cel_cues(); });
+    EXPECT_EQ(cues.get_num_cue_points(0), kMany / 2);
+}
 
 TEST(CueFollows, RandomOperationsAsExpected) {
     for (unsigned seed = 1; seed <= 40; ++seed) {

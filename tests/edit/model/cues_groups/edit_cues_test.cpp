@@ -78,6 +78,10 @@ TEST(EditCues, OnlyKeptCuesAreStored) {
     EXPECT_EQ(edit->get_cues().get_num_cue_points(0), 3u);
     ASSERT_TRUE(edit->retrieveCues());
     EXPECT_EQ(texts(edit->get_cues()), "attached any ");
+    EXPECT_EQ(edit->get_cues().get_cue_point(0, 0)->event().get_its_cel(), edit->get_edit_cel_p(1));
+    ASSERT_TRUE(edit->removeChan(edit->getId(1), false));
+    ASSERT_TRUE(edit->retrieveCues());
+    EXPECT_EQ(edit->get_cues().get_cue_point(0, 0)->event().get_its_cel(), nullptr) << "its cel is gone";
     edit->objectStore().storeObject("CueId", std::make_unique<ChannelGroupList>());
     EXPECT_FALSE(edit->retrieveCues());
     EXPECT_EQ(texts(edit->get_cues()), "attached any ") << "a list that is none changes nothing";
