@@ -39,7 +39,7 @@ public:
     [[nodiscard]] bool isSoundOnlyShot() const;
     /// The "Flags" of the row (`EditRecordFlags`), in every case; 0 without any.
     [[nodiscard]] int getFlags() const;
-    /// Opens the edit where there is no row.
+    /// Opens the edit where there is no row; `kLogNone`, without opening it, where its file does not read.
     [[nodiscard]] edit_log_type_t getLogType() const;
     /// Seconds. Without an open edit they are rounded to frames of the project.
     [[nodiscard]] double getStartTime() const;
