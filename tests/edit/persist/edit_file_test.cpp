@@ -456,11 +456,12 @@ TEST_F(EditFileTest, RepeatedStampsAreReplacedAndLonelyLevelsIgnored) {
     EXPECT_EQ(edit.getId(0), id);
     EXPECT_TRUE(edit.getId(1).valid());
     EXPECT_NE(edit.getId(1), id);
-    // A channel that closes the gap does not bring back what lay behind it.
+    // A channel that closes the gap neither brings back what lay behind it nor costs its bytes.
     edit.addChan(VideoChan);
     ASSERT_NO_FATAL_FAILURE(save(edit));
-    const Edit again(path(), eOpenExisting);
+    Edit again(path(), eOpenExisting);
     EXPECT_EQ(again.getNumChans(), 3);
+    EXPECT_TRUE(again.objectStore().contains("Celid3.unread"));
     EXPECT_EQ(again.getIdx(behindAGap), NO_CHAN);
 }
 
