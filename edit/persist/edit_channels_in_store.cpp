@@ -110,13 +110,13 @@ std::vector<EditFile::LoadedCel> EditFile::loadCels(Edit& edit, Salvaging* salva
 std::vector<EditFile::LoadedLevels> EditFile::loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
                                                          Salvaging* salvaging) {
     std::vector<LoadedLevels> all;
-    int unread = 0;
     for (int m = 0;; ++m) {
         const Qx::AttribValuePair pair = levelsPair(edit.m_header, m);
         if (!pair.valid()) {
             break;
         }
         LoadedLevels& loaded = all.emplace_back();
+        loaded.pairing = pair.asString();
         loaded.audio = IdStamp(std::string_view(pair.value()));
         loaded.name = edit.m_header.getString(EditKeys::numbered(EditKeys::kLevelsName, m));
         loaded.place = edit.m_header.getInt(EditKeys::numbered(EditKeys::kLevelsPlace, m), m);
@@ -143,14 +143,8 @@ std::vector<EditFile::LoadedLevels> EditFile::loadLevels(Edit& edit, const std::
             salvaging->levelsFailed(m, why);
             continue;
         }
-        // A stamp names one object for ever, so it keeps its name; the pairing is kept beside those of
-        // others.
         herc_printf("EditFile::loadLevels( %s ) - %s; it is passed over and kept\n",
                     edit.get_cookie_str().c_str(), why.c_str());
-        while (edit.m_header.contains(EditKeys::numbered(EditKeys::kLevelsUnread, unread))) {
-            ++unread;
-        }
-        edit.m_header.setString(EditKeys::numbered(EditKeys::kLevelsUnread, unread), pair.asString());
     }
     std::stable_sort(all.begin(), all.end(),
                      [](const LoadedLevels& a, const LoadedLevels& b) { return a.place < b.place; });
@@ -205,10 +199,30 @@ void EditFile::setupLevels(Edit& edit, std::vector<LoadedLevels>& levels, std::v
             herc_printf("EditFile::setupLevels( %s ) - the levels %s are passed over: their audio channel "
                         "has levels already\n",
                         edit.get_cookie_str().c_str(), loaded.levels.id().asString().c_str());
+            loaded.levels = AudLevelsCel();
             continue;
         }
         edit.setChanName(channel.id, loaded.name);
     }
+}
+
+/// The pairings of levels that did not become a channel get keys of their own, so that a save keeps both the
+/// keys and the objects. A stamp names one object for ever, so those keep their names.
+void EditFile::setLevelsAside(Edit& edit, const std::vector<LoadedLevels>& levels) {
+    configb& header = edit.m_header;
+    int read = 0;
+    int unread = 0;
+    for (const LoadedLevels& loaded : levels) {
+        if (loaded.levels.valid()) {
+            header.setString(EditKeys::numbered(EditKeys::kLevels, read++), loaded.pairing);
+            continue;
+        }
+        while (header.contains(EditKeys::numbered(EditKeys::kLevelsUnread, unread))) {
+            ++unread;
+        }
+        header.setString(EditKeys::numbered(EditKeys::kLevelsUnread, unread), loaded.pairing);
+    }
+    EditKeys::removeNumbered(header, EditKeys::kLevels, read);
 }
 
 // What is wrong with the numbers of channels, if anything.
@@ -258,6 +272,10 @@ Qx::Status EditFile::readCels(Edit& edit, Salvaging* salvaging) {
         return status;
     }
     setupLevels(edit, levels, file);
+    const auto unread = [](const LoadedLevels& loaded) { return !loaded.levels.valid(); };
+    if (salvaging == nullptr && std::any_of(levels.begin(), levels.end(), unread)) {
+        setLevelsAside(edit, levels);
+    }
     edit.m_cues = cues;
     renumber(edit, file);
     edit.convertCues();
@@ -358,11 +376,10 @@ void EditFile::lendCels(Edit& edit) {
     auto lent = std::make_shared<Edit::StoredCels>();
     LevelsPairs levelsOf;
     int n = 0;
-    // Levels that the edit has no more leave the store; what a key names that are none stays.
+    // Levels that the edit has no more leave the store.
     for (int i = 0; levelsPair(header, i).valid(); ++i) {
         const IdStamp id(std::string_view(levelsPair(header, i).attrib()));
-        if (id.valid() && !edit.getLevelsCel(id).valid() && store.contains(id.asString()) &&
-            AudLevelsCel::createFromStore(id, store).valid()) {
+        if (id.valid() && !edit.getLevelsCel(id).valid()) {
             store.removeObject(id.asString());
         }
     }

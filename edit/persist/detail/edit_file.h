@@ -140,5 +140,6 @@ private:
     static std::vector<LoadedLevels> loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
                                                 Salvaging* salvaging);
     static Qx::Status setupChannels(Edit& edit, std::vector<LoadedCel>& cels, std::vector<FileChannel>& file);
+    static void setLevelsAside(Edit& edit, const std::vector<LoadedLevels>& levels);
     static void setupLevels(Edit& edit, std::vector<LoadedLevels>& levels, std::vector<FileChannel>& file);
 };

@@ -39,4 +39,5 @@ struct EditFile::LoadedLevels {
     IdStamp audio;
     String name;   ///< empty unless the levels channel has one of its own
     int place = 0; ///< among the levels channels
+    String pairing;
 };

@@ -388,6 +388,8 @@ TEST_F(EditFileTest, AnObjectThatDoesNotReadCostsWhatItHolds) {
             }
             ASSERT_NO_FATAL_FAILURE(save(read));
             ASSERT_EQ(read.readFile(path(), eOpenExisting), Edit::kReadOk) << read.lastFileError();
+            EXPECT_TRUE(read.objectStore().contains(made.getId(4).asString()) &&
+                        read.objectStore().contains(made.getId(5).asString()));
             EditHeaderProxy kept;
             EXPECT_TRUE(read.objectStore().readObject(c.kept, kept)) << read.objectStore().objectError();
             EXPECT_EQ(kept.header(), made.Opts());
