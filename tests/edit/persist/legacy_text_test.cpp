@@ -51,20 +51,6 @@ TEST_F(LegacyTextTest, ExportImportExportGivesTheSameText) {
     expectRoundTrips(40);
 }
 
-TEST_F(LegacyTextTest, HeaderTextsThatLookLikeSectionsAreNone) {
-    Edit edit;
-    edit.set_cookie(cookie(test::kItem));
-    edit.addChan(VideoChan);
-    edit.setName("CUE_LIST_ENTRIES 7");
-    edit.Opts().setString("CHANNEL_NAME V", "CHANNEL_NAME A1 SUBTYPE:NONE");
-    const String first = textOf(edit);
-    Edit read;
-    ASSERT_TRUE(read.readFromLegacyFile(path())) << read.lastFileError();
-    EXPECT_EQ(read.getNumChans(), 1);
-    EXPECT_EQ(read.getName(), edit.getName());
-    EXPECT_EQ(textOf(read, "again.ed2"), first);
-}
-
 TEST_F(LegacyTextTest, ForeignLocalesChangeNothing) {
     int tried = 0;
     for (const char* name : {"de_DE.UTF-8", "tr_TR.UTF-8", "de_DE.utf8", "tr_TR.utf8"}) {
@@ -156,6 +142,9 @@ TEST_F(LegacyTextTest, TextsOfOthersReadAsTheyAreMeant) {
     }
     edit.setSyncLoss(edit.getId(2), 0.5);
     edit.setMaterialInfo(edit.getId(0), "CHANNEL_NAME A9");
+    edit.setName("CUE_LIST_ENTRIES 7");
+    edit.Opts().setInt("END_EDIT_HEADER is near", 1);
+    edit.Opts().setString("CHANNEL_NAME V", "CHANNEL_NAME A1 SUBTYPE:NONE");
     for (const char* const name : {"one", "CHANNEL_NAME A7 x"}) {
         edit.get_cues().add_cue_point(cue_point(name, 1, 2, 7, {}, false));
     }
@@ -177,7 +166,7 @@ TEST_F(LegacyTextTest, TextsOfOthersReadAsTheyAreMeant) {
         {"\n00000006\n", "\n0x6 \n", 2, "0 0 0.5"},
         {"NUM_CHANS:int 3", "NUM_CHANS:int +3 ", 2, "0 0 0.5"},
         {"NUM_CHANS:int 3", "NUM_CHANS:int 2000000000", 2, "0 0 0.5"},
-        {"CHANNEL_NAME A1", "CHANNEL_NAME Q1", 2,
+        {"\nCHANNEL_NAME A1", "\nCHANNEL_NAME Q1", 2,
          "0 0.5"}, // a section that is passed over has its number, too
         {"CEL_EVENTS 0\nEND_CHANNEL", "CEL_EVENTS  +0 \n", 2, "0 0 0.5"},
         {"END_EDIT\n", "", 2, "0 0 0.5"},
@@ -208,6 +197,7 @@ TEST_F(LegacyTextTest, TextsOfOthersReadAsTheyAreMeant) {
             EXPECT_EQ(last.text(), "CHANNEL_NAME A7 x");
             EXPECT_EQ(last.channel(), read.getNumChans() - 1);
             EXPECT_EQ(read.getMaterialInfo(read.getId(0)), "CHANNEL_NAME A9");
+            EXPECT_EQ(read.getName(), "CUE_LIST_ENTRIES 7");
         }
     }
 }
