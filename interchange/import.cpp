@@ -7,6 +7,7 @@
 #include "platform/services/current_project.h"
 
 #include <unordered_map>
+#include <unordered_set>
 
 namespace interchange {
 
@@ -62,6 +63,38 @@ void giveCookies(const std::vector<Edit*>& edits, const std::vector<cookie>& coo
     edits.back()->set_cookie(cookies.back());
 }
 
+/// What the events and headers of the edits name that comes from elsewhere, as cookies of edits: an edit of
+/// the import that got such a number would be taken for it, and its media for those of that.
+std::vector<cookie> namedElsewhere(const std::vector<Edit*>& edits) {
+    std::unordered_set<cookie> own;
+    for (size_t i = 0; i + 1 < edits.size(); ++i) {
+        const cookie shot = edits[i]->get_cookie();
+        own.insert({shot, ofKind(Cookie_Type::Video, shot), ofKind(Cookie_Type::Sound, shot)});
+    }
+    std::unordered_set<cookie> named;
+    const auto name = [&](const cookie& item) {
+        const bool tied = item.type() == Cookie_Type::Edit || item.type() == Cookie_Type::Video ||
+                          item.type() == Cookie_Type::Sound;
+        if (tied && !item.isMagic() && !own.contains(item)) {
+            named.insert(ofKind(Cookie_Type::Edit, item));
+        }
+    };
+    for (Edit* const edit : edits) {
+        for (int chan = 0; chan < edit->getNumChans(); ++chan) {
+            const cel* const content = edit->get_edit_cel_p(chan);
+            for (int i = 0; content != nullptr && i < content->numEvents(); ++i) {
+                name(content->get_event(i).strip);
+            }
+        }
+        for (const String& key : edit->Opts().keys()) {
+            if (const cookie item = edit->Opts().getCookie(key); item.type() == Cookie_Type::Edit) {
+                name(item);
+            }
+        }
+    }
+    return {named.begin(), named.end()};
+}
+
 Qx::Status writeAll(const std::vector<Edit*>& edits) {
     Qx::AtomicBatch batch;
     for (Edit* const edit : edits) {
@@ -94,7 +127,9 @@ Qx::Status saveImport(Import& result) {
     std::vector<cookie> cookies;
     cookies.reserve(edits.size());
     CookieAllocator allocator(Qx::currentProject().folder());
-    if (Qx::Status status = allocator.allocate(static_cast<unsigned>(edits.size()), cookies); !status) {
+    if (Qx::Status status =
+            allocator.allocate(static_cast<unsigned>(edits.size()), cookies, namedElsewhere(edits));
+        !status) {
         return status;
     }
     giveCookies(edits, cookies);

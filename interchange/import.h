@@ -32,7 +32,8 @@ struct Import {
 QM_INTERCHANGE_API cookie provisionalCookie(size_t index);
 
 /// Gives every edit a cookie of the current project, puts these in the place of the provisional ones wherever
-/// an event names a shot, and writes the shots, then the sequence, in one batch.
+/// an event names a shot, and writes the shots, then the sequence, in one batch. No cookie that the edits
+/// name as a source from elsewhere is given to one of them, nor to an edit made later.
 ///
 /// On failure the project is as it was and the import is too, so that the call can be repeated.
 QM_INTERCHANGE_API Qx::Status saveImport(Import& result);

@@ -2,6 +2,7 @@
 
 #include "edit/manager/detail/manager_state.h"
 #include "edit/manager/edit_record.h"
+#include "platform/base/scanned_number.h"
 
 namespace {
 
@@ -34,7 +35,7 @@ edit_log_type_t ghostType(int flags) {
 
 int flagsFrom(const String& text) {
     int flags = 0;
-    return Qx::textToInt(text, flags) ? flags : 0;
+    return Qx::scanInt(text, flags) ? flags : 0;
 }
 
 } // namespace
@@ -131,6 +132,10 @@ edit_log_type_t EditInfo::getLogType() const {
         const String& type = record[column < 0 ? projdb::Type : static_cast<projdb::Column>(column)];
         return type == "ghost" ? ghostType(flagsFrom(record[projdb::Flags]))
                                : Edit::getLogTypeFromString(type);
+    }
+    // Opening an edit whose file does not read would set that aside, which a question must not.
+    if (!record[projdb::Damage].empty()) {
+        return kLogNone;
     }
     return ed().valid() ? m_edit->get_log_type() : kLogNone;
 }

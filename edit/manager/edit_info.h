@@ -3,9 +3,10 @@
 #include "edit/manager/edit_manager.h"
 
 /// Answers questions about an edit cheaply: from the edit where it is open, else from its row in the
-/// project's records, and opens the edit only where those cannot answer. Once opened it stays open as long as
-/// this object, or a copy, has it. Nothing here fails: what cannot be known is an empty text, 0, false or
-/// `Qx::kNoTime`. One object is used on one thread at a time.
+/// project's records, and opens the edit only where those cannot answer. The row is that of the edit's file;
+/// while that is away, of the undo backup that opening would bring back. What the row answers moves no file.
+/// Once opened it stays open as long as this object, or a copy, has it. Nothing here fails: what cannot be
+/// known is an empty text, 0, false or `Qx::kNoTime`. One object is used on one thread at a time.
 class QM_API EditInfo {
 public:
     EditInfo(EditPtr& edit);
@@ -39,7 +40,7 @@ public:
     [[nodiscard]] bool isSoundOnlyShot() const;
     /// The "Flags" of the row (`EditRecordFlags`), in every case; 0 without any.
     [[nodiscard]] int getFlags() const;
-    /// Opens the edit where there is no row.
+    /// Opens the edit where there is no row; `kLogNone`, without opening it, where its file does not read.
     [[nodiscard]] edit_log_type_t getLogType() const;
     /// Seconds. Without an open edit they are rounded to frames of the project.
     [[nodiscard]] double getStartTime() const;

@@ -46,10 +46,7 @@ String timeText(double seconds) {
     const Qx::CurrentProject project = Qx::currentProject();
     const Qx::FrameRate rate(project.frameRateCode);
     const int64_t frames = rate.toFrames(seconds);
-    if (!rate.valid() || frames < 0 || frames >= Qx::framesPerDay(rate, project.dropFrame)) {
-        return {};
-    }
-    return Qx::timecodeText(frames, rate, project.dropFrame);
+    return Qx::durationText(frames, rate, project.dropFrame);
 }
 
 } // namespace
@@ -90,9 +87,8 @@ bool isRecordOfFile(const projdb::Record& record, const Qx::FileInfo& file) {
 double recordTime(const String& text) {
     const Qx::CurrentProject project = Qx::currentProject();
     const Qx::FrameRate rate(project.frameRateCode);
-    Qx::TimecodeFields fields;
-    if (text.empty() || !rate.valid() || !Qx::parseTimecode(text, rate, fields)) {
-        return Qx::kNoTime;
-    }
-    return rate.toSeconds(Qx::timecodeFrames(fields, rate, project.dropFrame));
+    int64_t frames = 0;
+    const bool read =
+        !text.empty() && rate.valid() && Qx::parseDuration(text, rate, project.dropFrame, frames).isOk();
+    return read ? rate.toSeconds(frames) : Qx::kNoTime;
 }

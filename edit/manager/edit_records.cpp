@@ -1,5 +1,7 @@
 #include "edit/manager/detail/manager_state.h"
 #include "edit/manager/edit_record.h"
+#include "edit/manager/revision_chain.h"
+#include "edit/persist/edit_salvage.h"
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/log.h"
@@ -40,41 +42,91 @@ bool gatherFromMemory(const cookie& item, projdb::Record& record) {
     return true;
 }
 
-/// The record that an item's file gives, read without the cache and without recovery.
-projdb::Record readFromFile(const String& path, const Qx::FileInfo& info) {
-    projdb::Record record;
-    stampRecord(record, info);
+/// Reads what a record is made from: the item's file, without the cache and without recovery, or a backup of
+/// it. Null, with why, when it cannot be read; `refused` tells that the system would not have it read.
+EditPtr readRevision(const String& path, bool isBackup, String& why, bool& refused) {
+    EditPtr edit;
     try {
-        EditPtr edit(new Edit);
+        if (isBackup) {
+            std::vector<String> lost;
+            const Qx::Status status = salvageEdit(path, edit, lost);
+            why = !status ? status.reason() : (lost.empty() ? String() : path + ": " + lost.front());
+            return why.empty() ? edit : EditPtr();
+        }
+        edit = EditPtr(new Edit);
         edit->setNetworkNotificationSuppressed(true);
         if (edit->readFile(Qx::widen(path), eOpenExisting) == Edit::kReadOk) {
-            return editRecordOf(*edit, &info);
+            return edit;
         }
-        record[projdb::Damage] = edit->lastFileError();
+        why = edit->lastFileError();
+        refused = edit->objectStore().lastOpenResult() == TagBag::NotOpened;
     } catch (const std::exception& error) {
-        record[projdb::Damage] = path + " cannot be read: " + error.what();
+        why = path + " cannot be read: " + error.what();
+    }
+    return {};
+}
+
+projdb::Record readRecord(const String& path, bool isBackup, const Qx::FileInfo& info) {
+    String why;
+    bool refused = isBackup;
+    if (const EditPtr edit = readRevision(path, isBackup, why, refused); edit.valid()) {
+        return editRecordOf(*edit, &info);
+    }
+    projdb::Record record;
+    record[projdb::Damage] = why;
+    // What a person can put right without changing the file is looked at again each time.
+    if (!refused || info.kind != Qx::FileKind::Regular) {
+        stampRecord(record, info);
     }
     return record;
 }
 
+/// Brings the record of an item that is not in memory up to date: with its file, or, while that is away, with
+/// the backup that opening would bring back. A record that was made from a file goes with it. What nobody
+/// can be asked about leaves the record as it is.
+bool refreshFromDisk(const cookie& item, projdb::Record& record, bool found) {
+    ManagerState& state = managerState();
+    String path = getFilenameForCookie(item);
+    Qx::FileAnswer file = Qx::askFile(path);
+    const bool isAway = file.isMissing();
+    if (isAway) {
+        const RevisionChain undo(path, RevisionChain::Undo, state.backupDepth);
+        int newest = 0;
+        if (!undo.findNewest(newest)) {
+            return found;
+        }
+        if (newest == 0) {
+            if (found && !record[projdb::FileSize].empty()) {
+                state.records.remove(item);
+                found = false;
+            }
+            return found;
+        }
+        path = undo.path(newest);
+        file = undo.ask(newest);
+    }
+    if (file.isMissing() || file.isUnknown() || (found && isRecordOfFile(record, file.info()))) {
+        return found;
+    }
+    record = readRecord(path, isAway, file.info());
+    state.records.put(item, record);
+    return true;
+}
+
 /// Brings one record up to date; false if there is none.
 bool refreshRecord(projdb& records, const cookie& item, projdb::Record& record) {
-    ManagerState& state = managerState();
-    if (state.records.takeStale(item) && gatherFromMemory(item, record)) {
+    if (managerState().records.takeStale(item) && gatherFromMemory(item, record)) {
         return true;
     }
     const bool found = records.find(item, record);
     if (edit_manager::get_present(item)) {
         return found || gatherFromMemory(item, record);
     }
-    const String path = getFilenameForCookie(item);
-    const Qx::FileInfo info = Qx::askFile(path).info();
-    if (info.kind != Qx::FileKind::Regular || (found && isRecordOfFile(record, info))) {
-        return found;
+    if (refreshFromDisk(item, record, found)) {
+        return true;
     }
-    record = readFromFile(path, info);
-    state.records.put(item, record);
-    return true;
+    record = projdb::Record();
+    return false;
 }
 
 /// The items of the project: those with a file, and those of which only backups are there at the moment.

@@ -364,9 +364,10 @@ public:
     /// line of the channel. The form is docs/ed2-format.md. Times are written in seconds whatever the
     /// standard.
     void writeToED2(TextFile& file, Qx::Ed2Support::TVStd standard) const;
-    /// Reads those lines from line `first` on. A failure names the line (from 1) and what is wrong with it,
-    /// and leaves the cel as it was.
-    Qx::Status buildFrom(const TextFile& file, unsigned first);
+    /// Reads those lines from line `first` on; `after`, if it is given, becomes the line behind them. A
+    /// failure names the line (from 1) and what is wrong with it, and leaves the cel and `after` as they
+    /// were.
+    Qx::Status buildFrom(const TextFile& file, unsigned first, unsigned* after = nullptr);
     /// @}
 
 private:

@@ -1,4 +1,5 @@
 #include "edit/model/cel.h"
+#include "platform/base/scanned_number.h"
 
 #include <algorithm>
 #include <array>
@@ -197,12 +198,12 @@ void cel::writeToED2(TextFile& file, Qx::Ed2Support::TVStd /*standard*/) const {
     }
 }
 
-Qx::Status cel::buildFrom(const TextFile& file, unsigned first) {
+Qx::Status cel::buildFrom(const TextFile& file, unsigned first, unsigned* after) {
     cel built;
     unsigned line = first;
     if (file[line].starts_with(kResolution)) {
         double resolution = 0;
-        if (!Qx::textToDouble(std::string_view(file[line]).substr(kResolution.size()), resolution) ||
+        if (!Qx::scanDouble(std::string_view(file[line]).substr(kResolution.size()), resolution) ||
             !std::isfinite(resolution) || resolution <= 0) {
             return badLine(line, "the resolution is no length in seconds");
         }
@@ -217,7 +218,7 @@ Qx::Status cel::buildFrom(const TextFile& file, unsigned first) {
     }
     int count = 0;
     if (!file[line].starts_with(kEvents) ||
-        !Qx::textToInt(std::string_view(file[line]).substr(kEvents.size()), count) || count < 0 ||
+        !Qx::scanInt(std::string_view(file[line]).substr(kEvents.size()), count) || count < 0 ||
         count % 2 != 0) {
         return badLine(line, "CEL_EVENTS and an even number are expected");
     }
@@ -242,5 +243,8 @@ Qx::Status cel::buildFrom(const TextFile& file, unsigned first) {
     m_resolution = built.m_resolution;
     m_materialInfo.swap(built.m_materialInfo);
     changedNow();
+    if (after != nullptr) {
+        *after = line + 1;
+    }
     return {};
 }

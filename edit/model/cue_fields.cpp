@@ -2,9 +2,9 @@
 #include "edit/model/strp_field.h"
 #include "edit/model/tc_field.h"
 
+#include "platform/base/scanned_number.h"
 #include "platform/store/pstream.h"
 
-#include <charconv>
 #include <cmath>
 #include <fstream>
 #include <utility>
@@ -58,16 +58,7 @@ bool cue_flags_field::read(std::ifstream* file) {
     if (!readLine(file, line)) {
         return false;
     }
-    line = line.trimmed();
-    if (line.starts_with("0x") || line.starts_with("0X")) {
-        line.erase(0, 2);
-    }
-    uint32_t flags = 0;
-    if (std::from_chars(line.data(), line.data() + line.size(), flags, 16).ec != std::errc()) {
-        return false;
-    }
-    m_flags = flags;
-    return true;
+    return Qx::scanHex(line, m_flags);
 }
 
 bool cue_flags_field::write(std::ofstream* file) const {

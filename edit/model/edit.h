@@ -469,8 +469,9 @@ public:
     /// (no channels, too many) or the disk refuses.
     bool write_file();
     bool write_file(const WString& path);
-    /// Writes a form: 1 by `write_file`, true whatever came of it (`lastFileError` tells), 4 the legacy text.
-    /// Other forms are not written: false.
+    /// Writes a form: 1 by `write_file`, 4 the legacy text. Other forms are not written: false. True when the
+    /// file holds the edit as it is, for form 1 also one that was read from, or written to, this very path
+    /// and is unchanged since; `lastFileError` tells of a failure.
     bool writeToFile(const WString& path, QxEditFileType type);
     /// Writes or reads the legacy text, docs/ed2-format.md, which holds the first video channel and the audio
     /// channels. A failed write leaves the file as it was; a failed read leaves no channels.

@@ -1,4 +1,6 @@
 #include "edit/persist/detail/ed2_names.h"
+#include "edit/persist/detail/edit_file.h"
+#include "platform/store/text_file.h"
 
 #include <algorithm>
 
@@ -61,6 +63,14 @@ String channelName(std::string_view field) {
         field.remove_prefix(kForeignName.size());
     }
     return unescaped(field);
+}
+
+int headerEnd(const TextFile& file) {
+    int at = file.find(EditKeys::kHeaderEnd);
+    while (at >= 0 && file[static_cast<unsigned>(at)].trimmed() != EditKeys::kHeaderEnd) {
+        at = file.find(EditKeys::kHeaderEnd, static_cast<unsigned>(at) + 1);
+    }
+    return at;
 }
 
 String cueLine(std::string_view name) {

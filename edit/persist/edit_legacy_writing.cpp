@@ -97,6 +97,8 @@ Qx::Ed2Support::TVStd Edit::writeED2Config(TextFile& file) const {
     EditKeys::removeNumbered(header, EditKeys::kCelKind, 0);
     EditKeys::removeNumbered(header, EditKeys::kLevels, 0);
     EditKeys::removeNumbered(header, EditKeys::kLevelsName, 0);
+    EditKeys::removeNumbered(header, EditKeys::kLevelsPlace, 0);
+    EditKeys::removeNumbered(header, EditKeys::kLevelsUnread, 0);
     header.remove(EditKeys::kTvType);
     header.writeTo(file);
 
@@ -119,11 +121,13 @@ Qx::Ed2Support::TVStd Edit::writeED2Config(TextFile& file) const {
 }
 
 void Edit::writeED2Cues(TextFile& file) const {
-    const size_t count = m_cues.get_num_cue_points(CueFlag::kKept);
+    cue_list cues = m_cues;
+    EditFile::renumberFor(*this, EditFile::legacyChannels(*this), cues);
+    const size_t count = cues.get_num_cue_points(CueFlag::kKept);
     file.appendLine("CUE_LIST_ENTRIES " + std::to_string(count));
     for (size_t i = 0; i < count; ++i) {
         // By design the first `count` cues of the whole list: kept cues stand first.
-        const cue_point& cue = *m_cues.get_cue_point(i, 0);
+        const cue_point& cue = *cues.get_cue_point(i, 0);
         file.appendLine(std::to_string(cue.text().size()) + " 0");
         file.appendLine(Ed2Names::cueLine(cue.text()));
         file.appendLine(Qx::doubleToText(cue.editTime()));

@@ -107,15 +107,11 @@ bool Edit::retrieve() {
         const EditFile::Quiet quiet(*this);
         status = EditFile::readHeader(*this);
         if (status) {
-            status = EditFile::readCues(*this);
-        }
-        if (status) {
+            EditFile::readCues(*this);
             status = EditFile::readCels(*this);
         }
         if (status) {
-            status = EditFile::readGroups(*this);
-        }
-        if (status) {
+            EditFile::readGroups(*this);
             getInfoFromHeader();
         }
     }

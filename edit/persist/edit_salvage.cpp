@@ -85,40 +85,6 @@ String EditFile::Salvaging::channelName(int number) const {
     }
 }
 
-void EditFile::Salvaging::renumberHeader() {
-    if (!m_celsLost || m_headerLost) {
-        return;
-    }
-    configb& header = m_edit->m_header;
-    const struct {
-        const char* name;
-        bool isAudio; ///< goes by the number of the audio channel
-        bool isDouble;
-    } keys[] = {{EditKeys::kSyncLoss, false, true},
-                {EditKeys::kSyncError, true, true},
-                {EditKeys::kSoundOutput, true, false},
-                {EditKeys::kSoundOutputXFade, true, false}};
-    for (const auto& key : keys) {
-        const configb before(header);
-        EditKeys::removeNumbered(header, key.name, 0);
-        int audio = 0;
-        for (size_t i = 0; i < m_read.size(); ++i) {
-            const bool isAudio = kindOf(m_read[i]) == 'A';
-            audio += isAudio ? 1 : 0;
-            const String from = EditKeys::numbered(key.name, key.isAudio ? audioIndex(m_read[i]) : m_read[i]);
-            const String to = EditKeys::numbered(key.name, key.isAudio ? audio : static_cast<int>(i));
-            if (!before.contains(from) || (key.isAudio && !isAudio)) {
-                continue;
-            }
-            if (key.isDouble) {
-                header.setDouble(to, before.getDouble(from));
-            } else {
-                header.setInt(to, before.getInt(from));
-            }
-        }
-    }
-}
-
 void EditFile::Salvaging::celMissing(int number) {
     const String object = EditKeys::numbered(EditKeys::kCelid, number);
     const String part = channelName(number) + " (object " + object + ")";
@@ -152,8 +118,7 @@ void EditFile::Salvaging::levelsFailed(int number, const String& why) {
     lose(levelsName(number) + ": " + why);
 }
 
-void EditFile::Salvaging::celRead(int number, const LoadedCel& loaded) {
-    m_read.push_back(number);
+void EditFile::Salvaging::celRead(const LoadedCel& loaded) {
     m_audioSeen = m_audioSeen || loaded.type.type == AudioChan;
 }
 
@@ -249,8 +214,9 @@ Qx::Status EditFile::salvage(Edit& edit, const String& path, Salvaging& salvagin
         salvaging.lose("the header: " + header.reason());
     }
     if (!salvaging.loseIfUnsound(EditKeys::kCues, "the cues")) {
-        if (Qx::Status cues = readCues(edit); !cues) {
-            salvaging.lose("the cues: " + cues.reason());
+        if (!edit.retrieveCues()) {
+            const String& why = edit.m_store.objectError();
+            salvaging.lose("the cues: " + (why.empty() ? String("the object is of another class") : why));
             edit.m_store.removeObject(EditKeys::kCues);
         }
     }
@@ -260,27 +226,17 @@ Qx::Status EditFile::salvage(Edit& edit, const String& path, Salvaging& salvagin
     // The cels have other numbers where some are lost: none is to be taken over as the bytes it was.
     edit.m_storedCels.reset();
     for (const String& name : edit.m_store.names()) {
-        if (name.starts_with(EditKeys::kCelid)) {
+        if (name.ends_with(EditKeys::kUnread)) {
+            salvaging.lose("object " + name + " did not read when the edit was opened, and was set aside");
+        } else if (name.starts_with(EditKeys::kCelid)) {
             edit.m_store.removeObject(name);
         }
     }
-    salvaging.renumberHeader();
     for (const char* name : {ChannelGroupList::Id, ChannelGroupList::IdForDefaultGrouping}) {
         salvaging.loseIfUnsound(name, name == ChannelGroupList::Id ? "the channel groups"
                                                                    : "the default channel groups");
     }
-    while (true) {
-        const Qx::Status groups = readGroups(edit);
-        if (groups) {
-            break;
-        }
-        salvaging.lose("the channel groups: " + groups.reason());
-        for (const char* name : {ChannelGroupList::Id, ChannelGroupList::IdForDefaultGrouping}) {
-            if (edit.m_store.contains(name) && edit.m_store.openObject(name) == nullptr) {
-                edit.m_store.removeObject(name);
-            }
-        }
-    }
+    readGroups(edit, &salvaging);
     EditFile::leaveLostChannelsOut(edit);
     salvaging.finish();
     edit.getInfoFromHeader();
@@ -333,8 +289,8 @@ void verifyEditFile(const String& path, std::vector<String>& faults) {
     // Objects that nothing above reads are sound unless their class is known and refuses them.
     TagBag& store = edit->objectStore();
     for (const String& name : store.names()) {
-        const bool cue = name == EditKeys::kCues || name == EditHeaderProxy::EditHeaderId;
-        const bool known = cue || name.starts_with(EditKeys::kCelid);
+        const bool known = name == EditKeys::kCues || name == EditHeaderProxy::EditHeaderId ||
+                           name.ends_with(EditKeys::kUnread);
         if (!known && store.openObject(name) == nullptr &&
             store.objectError().find("does not know") == String::npos) {
             faults.push_back(store.objectError());

@@ -64,9 +64,12 @@ bool Edit::write_file(const WString& path) {
 bool Edit::writeToFile(const WString& path, QxEditFileType type) {
     switch (type) {
     case kObjectStoreFile:
-        // True whatever became of the write: callers ask for a form, and lastFileError tells of a failure.
-        write_file(path);
-        return true;
+        // There is nothing to do for the file that the edit is from.
+        if (!isDirty(true) && !m_bad && m_store.isOpen() && m_store.path() == Qx::narrow(path)) {
+            m_fileError.clear();
+            return true;
+        }
+        return write_file(path);
     case kLegacyTextFile:
         return writeToLegacyFile(path);
     default:
@@ -100,6 +103,9 @@ bool Edit::store(const WString& path) {
         const EditFile::Quiet quiet(*this);
         updateHeaderBeforeWrite();
         storeCues();
+        if (auto* const cues = dynamic_cast<cue_list*>(m_store.openObject(EditKeys::kCues))) {
+            EditFile::renumberFor(*this, EditFile::storedChannels(*this), *cues);
+        }
         storeGroups();
         EditFile::lendCels(*this);
         const EditHeaderProxy header(m_header);
@@ -121,11 +127,7 @@ bool Edit::store(const WString& path) {
 
 void Edit::updateHeaderBeforeWrite() {
     // Labels are header keys and are carried along as they stand.
-    Vector<IdStamp> order;
-    for (int i = 0; i < getNumChans(); ++i) {
-        order.push_back(getId(i));
-    }
-    EditFile::updateHeader(*this, m_header, order);
+    EditFile::updateHeader(*this, m_header, EditFile::storedChannels(*this));
 }
 
 Qx::Status EditFile::checkStorable(const Edit& edit) {

@@ -1,4 +1,5 @@
 #include "edit/persist/detail/legacy_upgrades.h"
+#include "edit/persist/detail/ed2_names.h"
 
 #include "edit/model/edit.h"
 #include "edit/persist/detail/edit_file.h"
@@ -107,10 +108,11 @@ Qx::Ed2Support::TVStd getTvStandard(const configb& header) {
 
 Qx::Ed2Support::TVStd getNamedStandard(const TextFile& file) {
     // Only the header's own lines count: a text further on may begin with anything.
-    const int end = file.find(EditKeys::kHeaderEnd, 0, true);
+    const int end = Ed2Names::headerEnd(file);
     const auto valueOf = [&](const String& start) {
         const int at = file.find(start, 0, true);
-        return at >= 0 && at < end ? String(file[static_cast<unsigned>(at)].substr(start.size())) : String();
+        return at >= 0 && at < end ? String(file[static_cast<unsigned>(at)].substr(start.size())).trimmed()
+                                   : String();
     };
     configb header;
     header.setString(EditKeys::kTvType, valueOf(String(EditKeys::kTvType) + ":textdata "));

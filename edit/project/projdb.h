@@ -21,7 +21,8 @@ public:
         Type,      ///< "Type": the kind of item ("edit", "shot", "ghost", "reel", "magic", "FXT")
         Flags,     ///< "Flags": an integer: 8 hidden, 128, 512, 1024 and 2048 kinds of ghost
         Chans,     ///< "chans": the channels by kind and number, see `edit_record.h`
-        StartTime, ///< "start time" and "end time": timecode at the project's rate; may be empty
+        StartTime, ///< "start time" and "end time": timecode at the project's rate, on beyond 24 hours; may
+                   ///< be empty
         EndTime,
         Name,     ///< "name": UTF-8
         Rate,     ///< "rate": frames a second, as `Qx::FrameRate::asString`

@@ -153,6 +153,25 @@ Status parseTimecode(std::string_view text, FrameRate rate, TimecodeFields& fiel
     return {};
 }
 
+Status parseDuration(std::string_view text, FrameRate rate, bool dropFrame, int64_t& frames) {
+    constexpr int mostHours = 10'000'000;
+    const bool negative = text.starts_with('-');
+    const std::string_view label = text.substr(negative ? 1 : 0);
+    const std::string_view hours = label.substr(0, label.find(':'));
+    TimecodeFields fields;
+    int count = 0;
+    if (hours.size() == label.size() || hours.starts_with('-') || !textToInt(hours, count) ||
+        count > mostHours) {
+        return Status::failure(quoted(text) + " is not a length of the form hh:mm:ss:ff");
+    }
+    if (Status status = parseTimecode("00" + String(label.substr(hours.size())), rate, fields); !status) {
+        return status;
+    }
+    fields.hours = count;
+    frames = (negative ? -1 : 1) * timecodeFrames(fields, rate, dropFrame);
+    return {};
+}
+
 int64_t timecodeFrames(const TimecodeFields& fields, FrameRate rate, bool dropFrame, bool* skipped) {
     const int64_t nominal = rate.nominal();
     const int64_t minutes = int64_t{60} * fields.hours + fields.minutes;

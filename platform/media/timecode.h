@@ -27,6 +27,10 @@ struct TimecodeFields {
 /// text: its form, or a field out of range for the rate ("frame 25 at 25 frames a second").
 QM_API Status parseTimecode(std::string_view text, FrameRate rate, TimecodeFields& fields);
 
+/// Reads what `durationText` writes, in which the hours have any number of digits and a '-' may stand in
+/// front, as frames; so a timecode text, too. A failure names what is wrong and leaves `frames`.
+QM_API Status parseDuration(std::string_view text, FrameRate rate, bool dropFrame, int64_t& frames);
+
 /// Frames from midnight of a label. With `dropFrame`, for 29.97: frames = ((60 m + ss) 30 + ff) -
 /// 2 (m - floor(m / 10)), m = 60 hh + mm; for 59.94 with 60 and 4. A label that drop frame skips moves up to
 /// the next label that exists, and `*skipped` (if given) is set.

@@ -165,6 +165,7 @@ bool readBool(std::string_view text, configb::Value& value) {
 
 bool readWhole(size_t type, std::string_view text, configb::Value& value) {
     long long number = 0;
+    text.remove_prefix(text.starts_with('+') && !text.starts_with("+-") ? 1 : 0);
     if (!textToInt(text, number)) {
         return false;
     }

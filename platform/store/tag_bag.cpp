@@ -355,6 +355,10 @@ bool TagBag::removeObject(std::string_view name) {
     return there;
 }
 
+bool TagBag::renameObject(std::string_view name, std::string_view newName) {
+    return isStoredName(newName) && m_contents->rename(name, newName);
+}
+
 bool TagBag::contains(std::string_view name) const {
     return m_contents->find(name) != nullptr;
 }

@@ -114,6 +114,9 @@ public:
     void markChanged(std::string_view name);
     /// Removes an object and its bytes. False when there is none.
     bool removeObject(std::string_view name);
+    /// Gives an object another name; its bytes and its place in the file stay. False, changing nothing, when
+    /// there is no such object, the new name is taken, or it cannot be stored.
+    bool renameObject(std::string_view name, std::string_view newName);
 
     [[nodiscard]] bool contains(std::string_view name) const;
     [[nodiscard]] size_t numObjects() const;

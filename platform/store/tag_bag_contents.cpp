@@ -64,6 +64,18 @@ std::unique_ptr<Streamable> TagBag::Contents::takeOwned(Entry& entry) {
     return std::move(entry.owned);
 }
 
+bool TagBag::Contents::rename(std::string_view name, std::string_view newName) {
+    const auto found = m_index.find(name);
+    if (found == m_index.end() || find(newName) != nullptr) {
+        return false;
+    }
+    const Entries::iterator entry = found->second;
+    m_index.erase(found);
+    entry->name = String(newName);
+    m_index.emplace(entry->name, entry);
+    return true;
+}
+
 void TagBag::Contents::takeImage(std::span<const StoredObject> objects, std::span<const String> complaints,
                                  bool onFile) {
     m_index.reserve(objects.size());

@@ -73,6 +73,18 @@ TEST_F(QmeditFiles, LegacyTextGoesOutAndIn) {
     // The name of a shot's item in the text changes nothing; a fresh project takes the text's rate.
     const test::ProgramResult other = run({"import", text, "--project", folder.path("other")});
     EXPECT_EQ(other.code, 0) << other.err;
+    // No edit that is made there, at once or later, is one that the text names as a source.
+    ASSERT_EQ(run({"import", folder.path("list.edl"), "--project", folder.path("other")}).code, 0);
+    size_t edits = 0;
+    for (const auto& [name, bytes] : test::treeSnapshot(folder.path("other"))) {
+        if (name.ends_with(".qme")) {
+            ++edits;
+            EXPECT_EQ(folder.read("reel.ed2").find(" STRIP " + name.substr(0, name.size() - 4)),
+                      std::string::npos)
+                << name;
+        }
+    }
+    EXPECT_GT(edits, 2u);
     EXPECT_EQ(run({"import", text, "--rate", "24"}).code, 1) << "the text states its rate";
 }
 

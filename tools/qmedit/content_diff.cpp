@@ -25,9 +25,9 @@ bool isBookkeeping(const String& key) {
         // Of the channels, which are compared themselves.
         "NUM_CHANS"};
     // The same, followed by a number.
-    static constexpr std::string_view kNumbered[] = {"CelKind",           "Levels",     "LevelsName",
-                                                     "SyncLoss",          "SYNC_ERROR", "SOUND_OUTPUT_FLAG",
-                                                     "SOUND_OUTPUT_XFADE"};
+    static constexpr std::string_view kNumbered[] = {
+        "CelKind",  "Levels",     "LevelsName",        "LevelsPlace",
+        "SyncLoss", "SYNC_ERROR", "SOUND_OUTPUT_FLAG", "SOUND_OUTPUT_XFADE"};
     const size_t number = key.find_last_not_of("0123456789") + 1;
     return std::any_of(std::begin(kKeys), std::end(kKeys),
                        [&](const char* name) { return String::equalNoCase(key, name); }) ||

@@ -2,6 +2,8 @@
 
 #include "platform/base/qx_string.h"
 
+class TextFile;
+
 /// How texts of any kind stand in the lines of a legacy text, which ends lines at line ends and splits fields
 /// at blanks.
 namespace Ed2Names {
@@ -16,6 +18,9 @@ namespace Ed2Names {
 [[nodiscard]] String channelField(std::string_view name);
 /// The name that a field stands for.
 [[nodiscard]] String channelName(std::string_view field);
+
+/// The line that ends the header; -1 without one. The lines before it hold texts of any kind.
+[[nodiscard]] int headerEnd(const TextFile& file);
 
 /// The line of a cue's name: the name as it is, or escaped when it holds control characters. The line before
 /// it tells the name's length, so an escaped name is known by being longer.

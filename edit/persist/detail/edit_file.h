@@ -12,11 +12,14 @@ inline constexpr const char* kSyncError = "SYNC_ERROR";                ///< foll
 inline constexpr const char* kSoundOutput = "SOUND_OUTPUT_FLAG";       ///< followed by the old index
 inline constexpr const char* kSoundOutputXFade = "SOUND_OUTPUT_XFADE"; ///< followed by the old index
 inline constexpr const char* kEntireMedium = "ENTIRE_MEDIUM";
-inline constexpr const char* kLevels = "Levels";         ///< followed by a counter
-inline constexpr const char* kLevelsName = "LevelsName"; ///< followed by the counter of a Levels key
-inline constexpr const char* kCelKind = "CelKind";       ///< followed by the counter of a Celid object
-inline constexpr const char* kCelid = "Celid";           ///< name of a cel object, followed by a counter
-inline constexpr const char* kCues = "CueId";            ///< name of the cue object
+inline constexpr const char* kLevels = "Levels";             ///< followed by a counter
+inline constexpr const char* kLevelsName = "LevelsName";     ///< followed by the counter of a Levels key
+inline constexpr const char* kLevelsPlace = "LevelsPlace";   ///< followed by the counter of a Levels key
+inline constexpr const char* kLevelsUnread = "LevelsUnread"; ///< followed by a counter
+inline constexpr const char* kCelKind = "CelKind";           ///< followed by the counter of a Celid object
+inline constexpr const char* kCelid = "Celid";               ///< name of a cel object, followed by a counter
+inline constexpr const char* kUnread = ".unread"; ///< ends the name of an object that was set aside
+inline constexpr const char* kCues = "CueId";     ///< name of the cue object
 inline constexpr const char* kTvType = "tvtype";
 inline constexpr const char* kFrameRate = "FRAME_RATE";
 inline constexpr const char* kRevision = "ED2_REVISION";
@@ -68,12 +71,33 @@ public:
     [[nodiscard]] static int oldIndex(const Edit& edit, const IdStamp& audio);
 
     /// \name Reading from the open store
+    /// An object that does not read, or is none of what its name stands for, costs what it holds and nothing
+    /// else: with `salvaging` that is told there, without it on the log, and the object's bytes stay in the
+    /// store (`setAside`).
     /// @{
     static Qx::Status readHeader(Edit& edit);
-    static Qx::Status readCues(Edit& edit);
-    /// With `salvaging`, what fails is told there and the rest is read.
+    static void readCues(Edit& edit);
+    /// Fails for an edit without channels or with too many.
     static Qx::Status readCels(Edit& edit, Salvaging* salvaging = nullptr);
-    static Qx::Status readGroups(Edit& edit);
+    static void readGroups(Edit& edit, Salvaging* salvaging = nullptr);
+    /// Gives an object that does not read a name that no part of an edit has, and tells why on the log.
+    static void setAside(Edit& edit, const String& object, const String& why);
+    /// @}
+
+    /// \name Numbers of channels
+    /// Header keys and cues name channels by their place in the edit, and mean by that the channels of their
+    /// file.
+    /// @{
+    /// A channel of a file, in the order of the file's numbers.
+    struct FileChannel {
+        IdStamp id; ///< null for a channel that the edit does not have
+        bool isAudio = false;
+    };
+    /// Gives the header keys and the cues of a file the numbers that its channels have in the edit. A key of
+    /// a channel that the edit does not have goes; a cue of one stays where it is, on any channel.
+    static void renumber(Edit& edit, const std::vector<FileChannel>& file);
+    /// Gives cues of the edit the numbers that its channels have in a file of the channels `order`.
+    static void renumberFor(const Edit& edit, const Vector<IdStamp>& order, cue_list& cues);
     /// @}
 
     /// Reads all that is sound of a file into an edit without a file. Fails when that makes no edit.
@@ -87,6 +111,8 @@ public:
     /// @{
     /// A failure for an edit whose file could not be read again.
     static Qx::Status checkStorable(const Edit& edit);
+    /// The channels of the edit's object store: all but levels channels without an audio channel.
+    [[nodiscard]] static Vector<IdStamp> storedChannels(const Edit& edit);
     /// Directs the store to a path, opening it when it is not open; objects bound to it stay.
     static Qx::Status openStore(Edit& edit, const String& path);
     /// What the header says of channels, times and flags, for a file that has the channels `order`.
@@ -101,14 +127,21 @@ public:
     /// The first video channel and the audio channels: what a legacy text holds. Empty without video.
     [[nodiscard]] static Vector<IdStamp> legacyChannels(const Edit& edit);
     static Qx::Status readLegacy(Edit& edit, const String& path);
+    /// Adds the channels of a text; `sections` tells which channel each of its sections became.
+    static Qx::Status readLegacyChannels(Edit& edit, const TextFile& file,
+                                         std::vector<FileChannel>& sections);
     /// @}
 
     struct LoadedCel;
     struct LoadedLevels;
 
 private:
-    static Qx::Status loadCels(Edit& edit, std::vector<LoadedCel>& cels, Salvaging* salvaging);
-    static Qx::Status loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
-                                 std::vector<LoadedLevels>& levels, Salvaging* salvaging);
-    static Qx::Status setupChannels(Edit& edit, std::vector<LoadedCel>& cels);
+    static Qx::Status addLegacyChannel(Edit& edit, Edit_Chan_Type type, const std::vector<String>& fields,
+                                       std::unique_ptr<cel> content, IdStamp& added);
+    static std::vector<LoadedCel> loadCels(Edit& edit, Salvaging* salvaging);
+    static std::vector<LoadedLevels> loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
+                                                Salvaging* salvaging);
+    static Qx::Status setupChannels(Edit& edit, std::vector<LoadedCel>& cels, std::vector<FileChannel>& file);
+    static void setLevelsAside(Edit& edit, const std::vector<LoadedLevels>& levels);
+    static void setupLevels(Edit& edit, std::vector<LoadedLevels>& levels, std::vector<FileChannel>& file);
 };

@@ -24,15 +24,13 @@ public:
     [[nodiscard]] int lastCel() const;
     void celMissing(int number);
     void celFailed(int number, const String& why);
-    void celRead(int number, const LoadedCel& loaded);
+    void celRead(const LoadedCel& loaded);
     void levelsMissing(int number, bool hasAudio);
     void levelsFailed(int number, const String& why);
     /// Without its header nothing tells the kind of a channel that has a name of its own: it is taken for one
     /// that fits the order of the channels, and that is told. False where the header is there, the name is
     /// one by place ("A2"), or the cel does not read.
     bool guessKind(LoadedCel& loaded);
-    /// Header keys that go by the number of a channel follow the channels that are left.
-    void renumberHeader();
     /// Tells of the unsound objects that no part told of.
     void finish();
 
@@ -51,6 +49,5 @@ private:
     bool m_headerLost = false;
     bool m_audioSeen = false;
     bool m_celsLost = false;
-    std::vector<int> m_read;            ///< the numbers of the cels that were read
     std::map<String, String> m_unsound; ///< why, by the object's name
 };

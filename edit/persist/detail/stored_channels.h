@@ -27,15 +27,17 @@ struct Edit::StoredCels {
 
 /// A cel as it was read, before it is a channel.
 struct EditFile::LoadedCel {
-    Qx::Ptr<cel> content;
-    Edit::ChanType type;
+    Qx::Ptr<cel> content;      ///< null for one that does not read
+    Edit::ChanType type;       ///< of one that does not read: what the header says of it
     bool ownName = false;      ///< its name was given to the channel, not made from its place
     bool kindIsStated = false; ///< the header says what kind of channel it is
 };
 
-/// A levels cel that has its audio channel.
+/// The levels of a file's pairing, before they are a channel.
 struct EditFile::LoadedLevels {
-    AudLevelsCel levels;
+    AudLevelsCel levels; ///< invalid where they or their audio channel do not read
     IdStamp audio;
-    String name; ///< empty unless the levels channel has one of its own
+    String name;   ///< empty unless the levels channel has one of its own
+    int place = 0; ///< among the levels channels
+    String pairing;
 };

@@ -44,6 +44,8 @@ public:
     [[nodiscard]] const Entry* find(std::string_view name) const;
     Entry& findOrAdd(std::string_view name);
     void erase(std::string_view name);
+    /// False when there is no such object or the new name is taken.
+    bool rename(std::string_view name, std::string_view newName);
     /// Adds the objects of the image. `complaints` is empty or tells of each whether it is sound; those that
     /// are not are left out.
     void takeImage(std::span<const Qx::detail::StoredObject> objects, std::span<const String> complaints,

@@ -3,7 +3,9 @@
 #include "edit/project/projdb.h"
 #include "tests/edit/manager/managed_project.h"
 #include "tests/support/faulty_file_system.h"
+#include "tests/support/tree_snapshot.h"
 
+#include <fstream>
 #include <gtest/gtest.h>
 
 namespace {
@@ -99,6 +101,86 @@ TEST(EditInfo, ReadsTheKindOfItemFromItsRow) {
         EXPECT_DOUBLE_EQ(info.getStartTime(), 1.2);
         EXPECT_DOUBLE_EQ(info.getDuration(), 58.8);
     }
+}
+
+TEST(EditInfo, TimesGoOnBeyondADay) {
+    const ManagedProject project;
+    for (const double length : {86399.96, 86400.0, 90061.04, 1e8}) {
+        SCOPED_TRACE(length);
+        {
+            const EditPtr edit(kEdit, eOpenNew);
+            edit->get_edit_cel_p(0)->appendEventPair(cookie("M0001000"), 0, 0, length);
+            ASSERT_TRUE(edit_manager::flush_edit(kEdit));
+        }
+        edit_manager::close_all_edits();
+        const EditInfo info(kEdit, eOpenExisting);
+        EXPECT_NEAR(info.getDuration(), length, 0.021);
+        EXPECT_FALSE(edit_manager::get_present(kEdit));
+    }
+}
+
+/// The edit files of a project with all that is beside them.
+auto editFiles(const std::string& folder) {
+    auto files = test::treeSnapshot(folder);
+    std::erase_if(files, [](const auto& file) { return !file.first.starts_with("E000"); });
+    return files;
+}
+
+/// Each state of the files of an edit of three audio channels, and what is known of the edit then. Asking
+/// changes no file.
+TEST(EditInfo, AsksTheFileAndMovesNothing) {
+    const struct {
+        const char* what;
+        std::function<void(const std::string& file)> make;
+        bool known;
+    } cases[] = {
+        {"whole", [](const std::string&) {}, true},
+        {"damaged", [](const std::string& file) { std::filesystem::resize_file(file, 100); }, false},
+        {"no edit", [](const std::string& file) { std::ofstream(file) << "no edit"; }, false},
+        {"removed", [](const std::string& file) { std::filesystem::remove(file); }, false},
+        {"away, with a backup", [](const std::string& file) { std::filesystem::rename(file, file + ".U1"); },
+         true},
+        {"a link",
+         [](const std::string& file) {
+             std::filesystem::rename(file, file + ".kept");
+             std::filesystem::create_symlink(file + ".kept", file);
+         },
+         false},
+        {"a folder",
+         [](const std::string& file) {
+             std::filesystem::remove(file);
+             std::filesystem::create_directory(file);
+         },
+         false},
+    };
+    for (const auto& [what, make, known] : cases) {
+        for (const bool isRecorded : {true, false}) {
+            SCOPED_TRACE(String(what) + (isRecorded ? ", recorded" : ""));
+            const ManagedProject project;
+            makeEdit(kEdit, 3, 0);
+            edit_manager::close_all_edits();
+            if (!isRecorded) {
+                ASSERT_TRUE(edit_manager::get_projdb()->remove(kEdit).isOk());
+            }
+            make(project.folder() + "/E0001000.qme");
+            const auto before = editFiles(project.folder());
+            const EditInfo info(kEdit, eOpenExisting);
+            EXPECT_EQ(info.getAttrib("name"), known ? "named" : "");
+            EXPECT_EQ(info.hasAudioTracks(), known);
+            EXPECT_EQ(info.getEndTime() != Qx::kNoTime, known);
+            EXPECT_EQ(info.getLogType() != kLogNone, known);
+            EXPECT_EQ(editFiles(project.folder()), before);
+            EXPECT_FALSE(edit_manager::get_present(kEdit));
+        }
+    }
+    // A question that is not answered is no answer.
+    const ManagedProject project;
+    makeEdit(kEdit, 3, 0);
+    edit_manager::close_all_edits();
+    ASSERT_EQ(EditInfo(kEdit, eOpenExisting).getAttrib("name"), "named");
+    test::FaultyFileSystem system;
+    system.failWhere("info E0001000.qme", EIO);
+    EXPECT_EQ(EditInfo(kEdit, eOpenExisting).getAttrib("name"), "named");
 }
 
 TEST(EditInfo, KnowsNothingWithoutRecords) {

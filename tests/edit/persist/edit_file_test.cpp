@@ -289,26 +289,7 @@ TEST_F(EditFileTest, WhatCannotBeReadIsRefusedWhole) {
              ASSERT_TRUE(raw.bag.flush().isOk());
          },
          "no header"},
-        {"cel of another class",
-         [](RawStore& raw) {
-             raw.addCel(0, "V1");
-             raw.bag.storeObject("Celid1", std::make_unique<cue_list>());
-         },
-         "Celid1"},
-        {"cues of another class",
-         [](RawStore& raw) {
-             raw.addCel(0, "V1");
-             raw.bag.storeObject("CueId", std::make_unique<cel>());
-         },
-         "CueId"},
-        {"groups of another class",
-         [](RawStore& raw) {
-             raw.addCel(0, "V1");
-             raw.bag.storeObject("ChannelGroupList", std::make_unique<cel>());
-         },
-         "ChannelGroupList"},
-        {"a channel of no kind", [](RawStore& raw) { raw.addCel(0, "Q7"); }, "Celid0"},
-        {"an invalid subtype", [](RawStore& raw) { raw.addCel(0, "V1", "SUBTYPE:INVALID"); }, "Celid0"},
+        {"no channel that reads", [](RawStore& raw) { raw.addCel(0, "Q7"); }, "no channels"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.what);
@@ -327,6 +308,83 @@ TEST_F(EditFileTest, WhatCannotBeReadIsRefusedWhole) {
     EXPECT_EQ(missing.readFile(path("E0002000.qme"), eOpenExisting), Edit::kReadFailed);
     EXPECT_TRUE(log.contains("Edit::readFile( E0002000 ) : Failed to open store\n"));
     EXPECT_FALSE(missing.isLoading());
+}
+
+// The rest of the edit is whole, every number still means its channel, and the bytes survive a save.
+TEST_F(EditFileTest, AnObjectThatDoesNotReadCostsWhatItHolds) {
+    Edit made;
+    made.set_cookie(cookie(kItem));
+    for (const Edit_Chan_Type type : {VideoChan, VideoChan, AudioChan, AudioChan}) {
+        const int index = made.addChan(type, nullptr, false);
+        made.get_edit_cel_p(index)->appendEventPair(cookie("M0001000"), 0, 0, index + 1);
+        made.setSyncLoss(made.getId(index), 0.25 * (index + 1));
+    }
+    for (const int audio : {3, 2}) { // in another order than their channels
+        AudLevelsCel levels = AudLevelsCel::create();
+        levels.insertNode(audio, 0.5F);
+        made.setSyncLoss(made.addLevelsChan(made.getId(audio), levels), audio);
+    }
+    AudCel muted = made.getAudCel(made.getId(3));
+    muted.setSoundOutputEnabled(false);
+    made.setAudCel(muted);
+    made.groupChannels({made.getId(2), made.getId(3)}, ChannelGroup::ePlain);
+    for (int chan = 0; chan < 6; ++chan) {
+        made.get_cues().add_cue_point(cue_point(std::to_string(chan).c_str(), 0, chan, 0, {}, false));
+    }
+    ASSERT_NO_FATAL_FAILURE(save(made));
+    const std::string good = bytes("E0001000.qme");
+    const struct {
+        String object;
+        String kept;  ///< the name that its bytes have afterwards
+        int gone;     ///< the channel that it was; -1 for none
+        int alsoGone; ///< its levels
+    } cases[] = {{"Celid0", "Celid0.unread", 0, -1},
+                 {"Celid2", "Celid2.unread", 2, 5},
+                 {"Celid3", "Celid3.unread", 3, 4},
+                 {"CueId", "CueId.unread", -1, -1},
+                 {"ChannelGroupList", "ChannelGroupList.unread", -1, -1},
+                 {made.getId(4).asString(), made.getId(4).asString(), 4, -1}};
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.object);
+        folder.write("E0001000.qme", good);
+        {
+            TagBag bag;
+            ASSERT_EQ(bag.open(cookie(kItem), folder.path(), eOpenExisting, ".qme"), TagBag::Opened);
+            bag.storeObject(c.object, std::make_unique<EditHeaderProxy>(made.Opts()));
+            ASSERT_TRUE(bag.flush().isOk());
+        }
+        log.clear();
+        Edit read(path(), eOpenExisting);
+        ASSERT_FALSE(read.isBad()) << read.lastFileError();
+        EXPECT_TRUE(log.contains(c.object));
+        for (int round = 0; round < 3; ++round) {
+            const cue_list& cues = read.get_cues();
+            ASSERT_EQ(cues.get_num_cue_points(0), c.object == "CueId" ? 0U : 6U);
+            for (int i = 0; i < 6; ++i) {
+                const IdStamp id = made.getId(i);
+                const bool gone = i == c.gone || i == c.alsoGone;
+                EXPECT_EQ(read.getIdx(id) == NO_CHAN, gone) << i;
+                EXPECT_EQ(read.getSyncLoss(id), gone ? 0 : made.getSyncLoss(id)) << i;
+                const AudCel audio = gone ? AudCel::createInvalid() : made.getAudCel(id);
+                EXPECT_EQ(read.getAudCel(id).getSoundOutputEnabled(), audio.getSoundOutputEnabled()) << i;
+                if (c.object != "CueId") {
+                    EXPECT_EQ(cues.get_cue_point(static_cast<size_t>(i), 0)->channel(),
+                              gone ? kAnyCueChan : read.getIdx(id));
+                }
+            }
+            EXPECT_EQ(read.getCel(made.getId(1))->numPairs(), 1);
+            if (round == 1) {
+                read.addChan(VideoChan);
+            }
+            ASSERT_NO_FATAL_FAILURE(save(read));
+            ASSERT_EQ(read.readFile(path(), eOpenExisting), Edit::kReadOk) << read.lastFileError();
+            EXPECT_TRUE(read.objectStore().contains(made.getId(4).asString()) &&
+                        read.objectStore().contains(made.getId(5).asString()));
+            EditHeaderProxy kept;
+            EXPECT_TRUE(read.objectStore().readObject(c.kept, kept)) << read.objectStore().objectError();
+            EXPECT_EQ(kept.header(), made.Opts());
+        }
+    }
 }
 
 TEST_F(EditFileTest, ChannelLimits) {
@@ -378,17 +436,25 @@ TEST_F(EditFileTest, RepeatedStampsAreReplacedAndLonelyLevelsIgnored) {
     const IdStamp id = IdStamp::fresh(IdStampMagic::Channel);
     raw.addCel(0, "V1", "SUBTYPE:NONE", id);
     raw.addCel(1, "V2", "SUBTYPE:NONE", id);
-    raw.addCel(3, "V4"); // behind a gap
+    const IdStamp behindAGap = IdStamp::fresh(IdStampMagic::Channel);
+    raw.addCel(3, "V4", "SUBTYPE:NONE", behindAGap);
     const AudLevelsCel levels = AudLevelsCel::create();
     levels.writeToStore(raw.bag);
     raw.header.setString("Levels0", levels.id().asString() + "=" + id.asString());
     raw.finish();
-    const Edit edit(path(), eOpenExisting);
+    Edit edit(path(), eOpenExisting);
     ASSERT_FALSE(edit.isBad()) << edit.lastFileError();
     ASSERT_EQ(edit.getNumChans(), 2);
     EXPECT_EQ(edit.getId(0), id);
     EXPECT_TRUE(edit.getId(1).valid());
     EXPECT_NE(edit.getId(1), id);
+    // A channel that closes the gap neither brings back what lay behind it nor costs its bytes.
+    edit.addChan(VideoChan);
+    ASSERT_NO_FATAL_FAILURE(save(edit));
+    Edit again(path(), eOpenExisting);
+    EXPECT_EQ(again.getNumChans(), 3);
+    EXPECT_TRUE(again.objectStore().contains("Celid3.unread"));
+    EXPECT_EQ(again.getIdx(behindAGap), NO_CHAN);
 }
 
 TEST_F(EditFileTest, EveryFlippedByteAndEveryTruncationIsRefusedOrHarmless) {
@@ -426,6 +492,7 @@ TEST_F(EditFileTest, WhatIsNotToBeWrittenIsNot) {
     EXPECT_FALSE(edit.write_file(path("E0002000.qme"))); // named after another item
     EXPECT_NE(edit.lastFileError().find("E0002000.qme"), String::npos);
     EXPECT_FALSE(edit.write_file(L""));
+    EXPECT_FALSE(edit.writeToFile(path("E0002000.qme"), kObjectStoreFile));
     EXPECT_FALSE(edit.writeToFile(path(), kObjectStoreEd3File));
     EXPECT_FALSE(edit.writeToFile(path(), kUnknownFile));
     edit.set_cookie(cookie("F0001000"));
@@ -444,6 +511,8 @@ TEST_F(EditFileTest, AnEditGoesWhereItIsTold) {
     Edit edit;
     test::fillAtRandom(edit, 6);
     ASSERT_NO_FATAL_FAILURE(save(edit));
+    EXPECT_TRUE(edit.writeToFile(path(), kObjectStoreFile)); // holds it already
+    EXPECT_FALSE(edit.writeToFile(path("E0001000.ED3"), kObjectStoreFile));
     const std::string first = bytes("E0001000.qme");
     edit.set_cookie(cookie("E0002000"));
     edit.setName("the other");

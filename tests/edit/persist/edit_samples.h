@@ -4,6 +4,7 @@
 #include "platform/services/files.h"
 #include "platform/store/text_file.h"
 
+#include <algorithm>
 #include <random>
 
 namespace test {
@@ -96,6 +97,31 @@ inline void addPairs(Edit& edit, int index, int pairs, std::mt19937& random) {
     }
 }
 
+/// A text that a person, another program or an enemy may have given: among them the words of files.
+inline String anyText(std::mt19937& random) {
+    static const char* const parts[] = {"",
+                                        "roll 7",
+                                        "CHANNEL_NAME ",
+                                        "CHANNEL_NAME A1 x y SUBTYPE:NONE",
+                                        "\n",
+                                        "\r\n",
+                                        "END_CHANNEL",
+                                        "CUE_LIST_ENTRIES 3",
+                                        "SUBTYPE:",
+                                        " ",
+                                        "%41\\x41 \\",
+                                        "\xC3\x84\xE2\x82\xAC",
+                                        "END_EDIT",
+                                        "CEL_EVENTS 2",
+                                        "\xEF\xBB\xBF"};
+    String text;
+    for (unsigned i = random() % 4; i > 0; --i) {
+        text += parts[random() % std::size(parts)];
+        text += random() % 3 == 0 ? String(1, static_cast<char>(random())) : String();
+    }
+    return text;
+}
+
 /// An edit of its own for each seed, with something of everything that a file keeps.
 inline void fillAtRandom(Edit& edit, unsigned seed, int mostPairs = 6) {
     std::mt19937 random(seed);
@@ -115,7 +141,7 @@ inline void fillAtRandom(Edit& edit, unsigned seed, int mostPairs = 6) {
     for (int i = 0; i < edit.getNumChans(); ++i) {
         const IdStamp id = edit.getId(i);
         edit.setChanName(id, names[random() % 6]);
-        edit.setMaterialInfo(id, random() % 2 == 0 ? "" : "roll 7\nscene \\2");
+        edit.setMaterialInfo(id, anyText(random));
         edit.setSyncLoss(id, random() % 3 == 0 ? 0.125 * static_cast<double>(random() % 9) : 0);
         addPairs(edit, i,
                  static_cast<int>(random()) & 1
@@ -126,7 +152,9 @@ inline void fillAtRandom(Edit& edit, unsigned seed, int mostPairs = 6) {
             audio.push_back(id);
         }
     }
-    for (const IdStamp& id : audio) {
+    Vector<IdStamp> shuffled = audio;
+    std::shuffle(shuffled.begin(), shuffled.end(), random);
+    for (const IdStamp& id : shuffled) {
         AudCel channel = edit.getAudCel(id);
         channel.setSoundOutputEnabled(random() % 2 == 0);
         channel.setXFadesEnabled(random() % 2 == 0);
@@ -135,7 +163,9 @@ inline void fillAtRandom(Edit& edit, unsigned seed, int mostPairs = 6) {
             AudLevelsCel levels = AudLevelsCel::create();
             levels.insertNode(0.5, 0.25F);
             levels.insertNode(1.0 / 3, static_cast<float>(random() % 100) / 9);
-            edit.setChanName(edit.addLevelsChan(id, levels), "fader");
+            const IdStamp fader = edit.addLevelsChan(id, levels);
+            edit.setChanName(fader, "fader");
+            edit.setSyncLoss(fader, 0.125 * static_cast<double>(random() % 9));
         }
     }
     if (audio.size() > 1) {
@@ -143,10 +173,10 @@ inline void fillAtRandom(Edit& edit, unsigned seed, int mostPairs = 6) {
     }
     for (unsigned i = 0; i < random() % 4; ++i) {
         cue_point cue;
-        cue.setText(i == 1 ? "zwei\nZeilen %41" : "cue " + std::to_string(random()));
+        cue.setText(anyText(random));
         cue.setEditTime(static_cast<double>(random() % 1000) / 7);
         cue.setSecondTime(cue.editTime());
-        cue.setChannel(static_cast<int>(random() % 3));
+        cue.setChannel(static_cast<int>(random() % 9));
         cue.setCode(static_cast<int>(random()));
         cue.setFlags(random() % 4 == 0 ? CueFlag::kInside : CueFlag::kKept | CueFlag::kInside);
         edit.get_cues().add_cue_point(cue);

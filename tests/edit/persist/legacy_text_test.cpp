@@ -51,20 +51,6 @@ TEST_F(LegacyTextTest, ExportImportExportGivesTheSameText) {
     expectRoundTrips(40);
 }
 
-TEST_F(LegacyTextTest, HeaderTextsThatLookLikeSectionsAreNone) {
-    Edit edit;
-    edit.set_cookie(cookie(test::kItem));
-    edit.addChan(VideoChan);
-    edit.setName("CUE_LIST_ENTRIES 7");
-    edit.Opts().setString("CHANNEL_NAME V", "CHANNEL_NAME A1 SUBTYPE:NONE");
-    const String first = textOf(edit);
-    Edit read;
-    ASSERT_TRUE(read.readFromLegacyFile(path())) << read.lastFileError();
-    EXPECT_EQ(read.getNumChans(), 1);
-    EXPECT_EQ(read.getName(), edit.getName());
-    EXPECT_EQ(textOf(read, "again.ed2"), first);
-}
-
 TEST_F(LegacyTextTest, ForeignLocalesChangeNothing) {
     int tried = 0;
     for (const char* name : {"de_DE.UTF-8", "tr_TR.UTF-8", "de_DE.utf8", "tr_TR.utf8"}) {
@@ -92,7 +78,7 @@ TEST_F(LegacyTextTest, TheSectionsAreThoseOfTheForm) {
         cue.setText(name);
         cue.setEditTime(0.1);
         cue.setCode(7);
-        cue.setChannel(1);
+        cue.setChannel(2); // the first audio channel, which is the text's channel 1
         cue.setFlags(*name == 't' && name[1] == 'h' ? CueFlag::kKept : CueFlag::kInside);
         edit.get_cues().add_cue_point(cue);
     }
@@ -145,6 +131,75 @@ TEST_F(LegacyTextTest, TheRateComesBackFromTheStandard) {
     EXPECT_FALSE(read.readFromLegacyFile(path()));
     EXPECT_NE(read.lastFileError().find("tvtype"), String::npos);
     Qx::setCurrentProject(before);
+}
+
+// What other programs and people write, and what they mean by it.
+TEST_F(LegacyTextTest, TextsOfOthersReadAsTheyAreMeant) {
+    Edit edit;
+    edit.set_cookie(cookie(test::kItem));
+    for (const Edit_Chan_Type type : {VideoChan, AudioChan, AudioChan}) {
+        edit.addChan(type, nullptr, false);
+    }
+    edit.setSyncLoss(edit.getId(2), 0.5);
+    edit.setMaterialInfo(edit.getId(0), "CHANNEL_NAME A9");
+    edit.setName("CUE_LIST_ENTRIES 7");
+    edit.Opts().setInt("END_EDIT_HEADER is near", 1);
+    edit.Opts().setString("CHANNEL_NAME V", "CHANNEL_NAME A1 SUBTYPE:NONE");
+    for (const char* const name : {"one", "CHANNEL_NAME A7 x"}) {
+        edit.get_cues().add_cue_point(cue_point(name, 1, 2, 7, {}, false));
+    }
+    const String good = textOf(edit);
+    const struct {
+        const char* from;
+        const char* to;
+        size_t cues;
+        const char* losses; ///< sync losses of the channels
+    } cases[] = {
+        {"", "", 2, "0 0 0.5"},
+        {"ENTRIES 2\n", "ENTRIES 2 \n", 2, "0 0 0.5"},
+        {"ENTRIES 2\n", "ENTRIES +2 cues\n", 2, "0 0 0.5"},
+        {"ENTRIES 2\n", "ENTRIES  99999999999\n", 2, "0 0 0.5"},
+        {"ENTRIES 2\n", "ENTRIES -2\n", 0, nullptr}, // its cues are then lines like any others
+        {"ENTRIES 2\n", "ENTRIES x\n", 0, nullptr},
+        {"ENTRIES 2\n", "ENTRIES 1\n", 1, nullptr},
+        {"one\n1\n", "one\n +1.0 s\n", 2, "0 0 0.5"},
+        {"\n00000006\n", "\n0x6 \n", 2, "0 0 0.5"},
+        {"NUM_CHANS:int 3", "NUM_CHANS:int +3 ", 2, "0 0 0.5"},
+        {"NUM_CHANS:int 3", "NUM_CHANS:int 2000000000", 2, "0 0 0.5"},
+        {"\nCHANNEL_NAME A1", "\nCHANNEL_NAME Q1", 2,
+         "0 0.5"}, // a section that is passed over has its number, too
+        {"CEL_EVENTS 0\nEND_CHANNEL", "CEL_EVENTS  +0 \n", 2, "0 0 0.5"},
+        {"END_EDIT\n", "", 2, "0 0 0.5"},
+        {"tvtype:textdata pal", "tvtype:textdata pal ", 2, "0 0 0.5"},
+    };
+    for (const auto& c : cases) {
+        for (const bool dos : {false, true}) {
+            SCOPED_TRACE(String(c.to) + (dos ? " CRLF" : ""));
+            String text = good;
+            text.replace(text.find(c.from), std::strlen(c.from), c.to);
+            for (size_t at = 0; dos && (at = text.find('\n', at)) != String::npos; at += 2) {
+                text.insert(at, 1, '\r');
+            }
+            folder.write("E0001000.ed2", text);
+            Edit read;
+            const bool done = read.readFromLegacyFile(path());
+            EXPECT_EQ(read.get_cues().get_num_cue_points(0), done ? c.cues : 0);
+            if (c.losses == nullptr) {
+                continue;
+            }
+            ASSERT_TRUE(done) << read.lastFileError();
+            String losses;
+            for (int i = 0; i < read.getNumChans(); ++i) {
+                losses += (i == 0 ? "" : " ") + Qx::doubleToText(read.getSyncLoss(read.getId(i)));
+            }
+            EXPECT_EQ(losses, c.losses);
+            const cue_point& last = *read.get_cues().get_cue_point(1, 0);
+            EXPECT_EQ(last.text(), "CHANNEL_NAME A7 x");
+            EXPECT_EQ(last.channel(), read.getNumChans() - 1);
+            EXPECT_EQ(read.getMaterialInfo(read.getId(0)), "CHANNEL_NAME A9");
+            EXPECT_EQ(read.getName(), "CUE_LIST_ENTRIES 7");
+        }
+    }
 }
 
 TEST_F(LegacyTextTest, OnlyAProjectIsWrittenWithoutChannels) {
