@@ -290,7 +290,6 @@ void EditFile::readGroups(Edit& edit, Salvaging* salvaging) {
         }
         const String why =
             "object " + String(name) + " is not a list of groups that reads (" + whyNot(edit.m_store) + ")";
-        edit.forgetGroups();
         if (salvaging == nullptr) {
             setAside(edit, name, why);
         } else {
