@@ -2,6 +2,7 @@
 
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
+#include "tools/qmedit/interrupts.h"
 
 // The only source that reads it: it is slow to compile.
 #include <CLI/CLI.hpp>
@@ -86,6 +87,8 @@ int runCommandLine(const std::vector<Command>& commands, int count, char** argum
         reportError("name a command; see qmedit --help");
         return kWrongUsage;
     }
+    interrupts::install();
     const int code = chosen->run();
-    return finishOutput() ? code : static_cast<int>(kFailed);
+    return interrupts::exitCode(
+        finishOutput(code == kDone && interrupts::editsWereChanged()) ? code : static_cast<int>(kFailed));
 }
