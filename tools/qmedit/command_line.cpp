@@ -13,7 +13,8 @@ namespace {
 
 constexpr const char* kFooter =
     "Edits go to the project given by --project DIR, else by $QMEDIT_PROJECT, else to ./quillmarch-project.\n"
-    "Exit codes: 0 done, 1 failed, 2 wrong usage. 'qmedit COMMAND --help' shows an example of each command.";
+    "Exit codes: 0 done, 1 failed, 2 wrong usage, 128 and more interrupted.\n"
+    "'qmedit COMMAND --help' shows an example of each command.";
 
 /// The command that a wrong command line was for, for the advice on help.
 String commandOf(const CLI::App& app) {
