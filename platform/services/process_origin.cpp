@@ -59,7 +59,17 @@ bool ProcessOrigin::hasEnded(long process) const {
     if (!here || here->machine != machine || process <= 0 || process != static_cast<pid_t>(process)) {
         return false;
     }
-    return here->run != run || (::kill(static_cast<pid_t>(process), 0) != 0 && errno == ESRCH);
+    if (here->run != run) {
+        return true;
+    }
+    if (::kill(static_cast<pid_t>(process), 0) != 0) {
+        return errno == ESRCH;
+    }
+    // One that was killed keeps its number until its parent has asked for its end, which may be long. The
+    // state stands behind the program's name, which may hold anything.
+    const std::string status = systemText(("/proc/" + std::to_string(process) + "/stat").c_str());
+    const size_t name = status.rfind(") ");
+    return name != std::string::npos && name + 2 < status.size() && status[name + 2] == 'Z';
 }
 
 } // namespace Qx

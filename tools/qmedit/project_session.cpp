@@ -221,6 +221,10 @@ Qx::Status ProjectSession::create() {
     if (const Qx::Status started = edit_init(); !started) {
         reportWarning(started.reason());
     }
+    // What a writer of the project has in hand is no leftover; it cleans up itself.
+    if (EditManagerLock writers(folder()); writers.take()) {
+        cleanUp();
+    }
     return {};
 }
 
@@ -325,8 +329,15 @@ Qx::Status ProjectSession::lockForWriting() {
         return Qx::Status::failure("nothing was changed: " + taken.reason());
     }
     m_uninterrupted.emplace(true);
-    removeLeftovers(folder());
+    cleanUp();
     return {};
+}
+
+void ProjectSession::cleanUp() {
+    if (!m_isClean) {
+        removeLeftovers(folder());
+        m_isClean = true;
+    }
 }
 
 projdb* ProjectSession::openRecords() {

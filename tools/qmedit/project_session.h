@@ -47,7 +47,7 @@ public:
     /// Makes a project current so that edits can be prepared for it: the one that is there, else one of the
     /// given rate (25 for an invalid one) of which nothing is on the disk yet.
     Qx::Status prepare(Qx::FrameRate rateOfFresh);
-    /// After `prepare`: makes what is missing on the disk.
+    /// After `prepare`: makes what is missing on the disk, and removes what killed programs left there.
     Qx::Status create();
 
     /// Makes the edit manager, for the commands that work through it. It lives as long as the session.
@@ -93,6 +93,8 @@ private:
     [[nodiscard]] projdb::Record recordOf(const cookie& item, const Records& known, Records& fresh);
     [[nodiscard]] Known look(const cookie& item) const;
     [[nodiscard]] bool isListed(const cookie& item) const;
+    /// Removes what killed programs left, once, under the writers' lock.
+    void cleanUp();
     /// Reads the newest undo backup of an edit whose file is away. True if that settles the matter: `status`
     /// is how it went. False when there is none, or the file is back.
     [[nodiscard]] bool readBackup(const cookie& item, EditPtr& edit, Qx::Status& status) const;
@@ -105,6 +107,7 @@ private:
     mutable std::optional<std::unordered_set<cookie>> m_listed; ///< when an item was first missing
     mutable std::unordered_set<cookie> m_toldAway;              ///< of which a warning told
     size_t m_numRead = 0;
+    bool m_isClean = false;
     std::optional<interrupts::Hold> m_uninterrupted; ///< goes last: from the lock until all is closed
     std::unique_ptr<EditManagerLock> m_writers;
     std::unique_ptr<edit_manager> m_manager; ///< goes first: what it writes at its end is written locked
