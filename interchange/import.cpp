@@ -1,10 +1,13 @@
 #include "interchange/import.h"
 
+#include "edit/manager/edit_manager_lock.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_registry.h"
 #include "edit/project/cookie_allocator.h"
+#include "interchange/import_note.h"
 #include "platform/services/atomic_batch.h"
 #include "platform/services/current_project.h"
+#include "platform/services/edit_filenames.h"
 
 #include <unordered_map>
 #include <unordered_set>
@@ -95,17 +98,46 @@ std::vector<cookie> namedElsewhere(const std::vector<Edit*>& edits) {
     return {named.begin(), named.end()};
 }
 
-Qx::Status writeAll(const std::vector<Edit*>& edits) {
+/// Gives all files of a batch their names. On a failure those that have theirs go again.
+Qx::Status putInPlace(Qx::AtomicBatch& batch, const std::vector<cookie>& cookies) {
+    const String folder = Qx::currentProject().folder();
+    EditManagerLock writers(folder);
+    if (Qx::Status taken = writers.take(true); !taken) {
+        return taken;
+    }
+    UnfinishedImport unfinished;
+    // A single edit has its name or has not.
+    if (cookies.size() > 1) {
+        if (Qx::Status noted = writeImportNote(folder, cookies, unfinished.note); !noted) {
+            return noted;
+        }
+    }
+    const Qx::FileError error = batch.commit();
+    if (error) {
+        for (size_t i = 0; i < batch.numReplaced(); ++i) {
+            unfinished.files.push_back(getFilenameForCookie(cookies[i]));
+        }
+    }
+    if (!unfinished.note.empty() || !unfinished.files.empty()) {
+        takeBackImport(unfinished);
+    }
+    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+}
+
+Qx::Status writeAll(const std::vector<Edit*>& edits, const std::vector<cookie>& cookies,
+                    const std::function<bool()>& cancelled) {
     Qx::AtomicBatch batch;
+    const auto isCancelled = [&] { return cancelled && cancelled(); };
     for (Edit* const edit : edits) {
+        if (isCancelled()) {
+            break;
+        }
         if (!edit->write_file()) {
             return Qx::Status::failure(edit->lastFileError());
         }
     }
-    if (const Qx::FileError error = batch.commit()) {
-        return Qx::Status::failure(error.text());
-    }
-    return {};
+    return isCancelled() ? Qx::Status::failure("nothing was imported, as it was interrupted")
+                         : putInPlace(batch, cookies);
 }
 
 } // namespace
@@ -114,7 +146,7 @@ cookie provisionalCookie(size_t index) {
     return {Cookie_Type::Transient, static_cast<int>(index), 0};
 }
 
-Qx::Status saveImport(Import& result) {
+Qx::Status saveImport(Import& result, const std::function<bool()>& cancelled) {
     if (!result.sequence.valid()) {
         return Qx::Status::failure("there is no imported sequence to save");
     }
@@ -133,7 +165,7 @@ Qx::Status saveImport(Import& result) {
         return status;
     }
     giveCookies(edits, cookies);
-    if (Qx::Status status = writeAll(edits); !status) {
+    if (Qx::Status status = writeAll(edits, cookies, cancelled); !status) {
         giveCookies(edits, before);
         for (Edit* const edit : edits) {
             edit->init_dirty();

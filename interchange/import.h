@@ -6,6 +6,7 @@
 #include "platform/base/status.h"
 #include "platform/media/frame_rate.h"
 
+#include <functional>
 #include <vector>
 
 /// What an importer of another tool's timeline makes, and how it becomes part of the current project. The
@@ -33,9 +34,12 @@ QM_INTERCHANGE_API cookie provisionalCookie(size_t index);
 
 /// Gives every edit a cookie of the current project, puts these in the place of the provisional ones wherever
 /// an event names a shot, and writes the shots, then the sequence, in one batch. No cookie that the edits
-/// name as a source from elsewhere is given to one of them, nor to an edit made later.
+/// name as a source from elsewhere is given to one of them, nor to an edit made later. The edits take their
+/// names under the writers' lock of the project; what a process that dies on the way leaves,
+/// `unfinishedImports` finds.
 ///
-/// On failure the project is as it was and the import is too, so that the call can be repeated.
-QM_INTERCHANGE_API Qx::Status saveImport(Import& result);
+/// On failure the project is as it was and the import is too, so that the call can be repeated. `cancelled`
+/// is asked between the edits, until the first takes its name; once it says true the call fails.
+QM_INTERCHANGE_API Qx::Status saveImport(Import& result, const std::function<bool()>& cancelled = nullptr);
 
 } // namespace interchange

@@ -3,9 +3,12 @@
 #include "platform/base/id_stamp.h"
 #include "platform/services/atomic_batch.h"
 #include "platform/services/clock.h"
+#include "platform/services/process_origin.h"
 
 #include <algorithm>
 #include <cerrno>
+#include <charconv>
+#include <optional>
 #include <unistd.h>
 
 namespace Qx {
@@ -13,6 +16,7 @@ namespace Qx {
 namespace {
 
 constexpr std::string_view kTemporaryEnd = ".tmp";
+constexpr size_t kOriginDigits = 16;
 constexpr size_t kRandomDigits = 16;
 /// What is kept of a file's name in its temporary name, so that the latter is at most 255 bytes long.
 constexpr size_t kNameKept = 200;
@@ -26,10 +30,15 @@ String temporaryFor(const String& path) {
     // names.
     const IdStamp stamp = IdStamp::fresh(IdStampMagic::EffectNode);
     const String name = fileNameOf(path).substr(0, kNameKept);
+    const ProcessOrigin origin = ProcessOrigin::current().value_or(ProcessOrigin());
     const String temporary =
-        String::format(".%s.%ld-%08x%08x.tmp", name.c_str(), static_cast<long>(::getpid()),
-                       stamp.word(0) ^ stamp.word(1), stamp.word(2));
+        String::format(".%s.%ld-%08x%08x%08x%08x.tmp", name.c_str(), static_cast<long>(::getpid()),
+                       origin.machine, origin.run, stamp.word(0) ^ stamp.word(1), stamp.word(2));
     return path.find('/') == String::npos ? temporary : joinPath(folderOf(path), temporary);
+}
+
+bool failed(const std::from_chars_result& result) {
+    return result.ec != std::errc();
 }
 
 bool allOf(std::string_view text, std::string_view set) {
@@ -64,6 +73,7 @@ FileError AtomicFile::openTemporary() {
             return {};
         }
         if (error.code != EEXIST) {
+            error.path = m_path;
             break;
         }
     }
@@ -72,6 +82,10 @@ FileError AtomicFile::openTemporary() {
 
 FileError AtomicFile::fail(FileError error) {
     if (error) {
+        // The temporary name says nothing to whoever asked for the file.
+        if (error.path == m_temporary) {
+            error.path = m_path;
+        }
         m_failed = error;
         discard();
     }
@@ -189,17 +203,54 @@ void AtomicFile::discard() {
     }
 }
 
+namespace {
+
+/// What a temporary name tells of who made it.
+struct TemporaryName {
+    bool isOne = false;
+    long process = 0;
+    std::optional<ProcessOrigin> origin; ///< none in names that do not tell, as on a system that does not
+};
+
+TemporaryName parseTemporary(std::string_view name) {
+    TemporaryName parsed;
+    if (name.size() <= kTemporaryEnd.size() + 1 || name.front() != '.' || !name.ends_with(kTemporaryEnd)) {
+        return parsed;
+    }
+    name.remove_suffix(kTemporaryEnd.size());
+    const size_t dot = name.rfind('.');
+    const std::string_view tail = name.substr(dot + 1);
+    const size_t dash = tail.find('-');
+    if (dot <= 1 || dash == std::string_view::npos || !allOf(tail.substr(0, dash), "0123456789")) {
+        return parsed;
+    }
+    const std::string_view digits = tail.substr(dash + 1);
+    const bool hasOrigin = digits.size() == kOriginDigits + kRandomDigits;
+    parsed.isOne = (hasOrigin || digits.size() == kRandomDigits) && allOf(digits, "0123456789abcdef");
+    ProcessOrigin origin;
+    if (parsed.isOne && hasOrigin &&
+        !failed(std::from_chars(tail.data(), tail.data() + dash, parsed.process)) &&
+        !failed(std::from_chars(digits.data(), digits.data() + 8, origin.machine, 16)) &&
+        !failed(std::from_chars(digits.data() + 8, digits.data() + 16, origin.run, 16))) {
+        parsed.origin = origin;
+    }
+    return parsed;
+}
+
+} // namespace
+
 bool isTemporaryName(std::string_view fileName) {
-    if (fileName.size() <= kTemporaryEnd.size() + 1 || fileName.front() != '.' ||
-        !fileName.ends_with(kTemporaryEnd)) {
+    return parseTemporary(fileName).isOne;
+}
+
+bool isStaleTemporary(const String& path, int64_t age) {
+    const TemporaryName name = parseTemporary(fileNameOf(path));
+    if (!name.isOne) {
         return false;
     }
-    fileName.remove_suffix(kTemporaryEnd.size());
-    const size_t dot = fileName.rfind('.');
-    const std::string_view tail = fileName.substr(dot + 1);
-    const size_t dash = tail.find('-');
-    return dot > 1 && dash != std::string_view::npos && allOf(tail.substr(0, dash), "0123456789") &&
-           tail.size() - dash - 1 == kRandomDigits && allOf(tail.substr(dash + 1), "0123456789abcdef");
+    const FileAnswer found = askFile(path);
+    return found.isRegular() && ((name.origin && name.origin->hasEnded(name.process)) ||
+                                 found.info().modifiedNs / 1000000000 <= nowSeconds() - age);
 }
 
 unsigned removeStaleTemporaries(const String& folder, int64_t age) {
@@ -208,18 +259,10 @@ unsigned removeStaleTemporaries(const String& folder, int64_t age) {
     if (retryInterrupted([&] { return system.list(folder, names); })) {
         return 0;
     }
-    const int64_t newest = nowSeconds() - age;
     unsigned removed = 0;
     for (const String& name : names) {
-        if (!isTemporaryName(name)) {
-            continue;
-        }
         const String path = joinPath(folder, name);
-        const FileAnswer found = askFile(path);
-        if (!found.isRegular() || found.info().modifiedNs / 1000000000 > newest) {
-            continue;
-        }
-        if (!retryInterrupted([&] { return system.remove(path); })) {
+        if (isStaleTemporary(path, age) && !retryInterrupted([&] { return system.remove(path); })) {
             ++removed;
         }
     }

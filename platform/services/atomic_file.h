@@ -63,8 +63,12 @@ private:
 /// True for the names that `AtomicFile` gives its temporary files; a listing of a folder passes them over.
 QM_API bool isTemporaryName(std::string_view fileName);
 
-/// Removes the temporary files that a process which died left in a folder: those whose last change is at
-/// least `age` seconds ago. Returns how many went; a folder that cannot be listed has none.
+/// True for a temporary file that nobody is going to finish: the process that made it has ended, as far as
+/// that can be known here, or its last change is at least `age` seconds ago.
+QM_API bool isStaleTemporary(const String& path, int64_t age = 24 * 3600);
+
+/// Removes the stale temporary files of a folder. Returns how many went; a folder that cannot be listed has
+/// none.
 QM_API unsigned removeStaleTemporaries(const String& folder, int64_t age = 24 * 3600);
 
 } // namespace Qx

@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <csignal>
 #include <functional>
+#include <map>
 #include <mutex>
 #include <optional>
 #include <unistd.h>
@@ -52,7 +53,11 @@ public:
     void shortTransfers(size_t bytes) {
         plan([&](Plan& p) { p.transfer = bytes; });
     }
-    /// The disk takes this many more bytes; then writes fail with ENOSPC.
+    /// The process gets a signal when it comes to operation `n`, which then takes place.
+    void signalAt(size_t n, int signal) {
+        plan([&](Plan& p) { p.signalAt = n, p.signal = signal; });
+    }
+    /// The disk takes this many more bytes, and what is removed again; then writes fail with ENOSPC.
     void fullAfter(size_t bytes) {
         plan([&](Plan& p) { p.room = bytes; });
     }
@@ -103,10 +108,12 @@ public:
     }
     Qx::FileError rename(const String& from, const String& to) override {
         auto error = step("rename " + nameFor(from) + " " + nameFor(to), true, to);
+        freeRoom(from, false);
         return error ? error : machine().rename(from, to);
     }
     Qx::FileError remove(const String& path) override {
         auto error = step("remove " + nameFor(path), true, path);
+        freeRoom(path, !error);
         return error ? error : machine().remove(path);
     }
     Qx::FileError makeFolder(const String& path) override {
@@ -143,6 +150,8 @@ private:
         int failCode = EIO;
         size_t transfer = SIZE_MAX;
         std::optional<size_t> room;
+        size_t signalAt = 0;
+        int signal = 0;
         size_t killAt = 0;
     };
 
@@ -165,7 +174,7 @@ private:
                     m_system.step(String::format("write %s %zu", m_name.c_str(), size), true, m_path, half)) {
                 return error;
             }
-            size = m_system.takeRoom(size);
+            size = m_system.takeRoom(m_path, size);
             return size == 0 ? Qx::FileError{ENOSPC, "write", m_path} : m_real->write(from, size, put);
         }
         Qx::FileError seek(uint64_t offset) override {
@@ -216,14 +225,23 @@ private:
         const std::lock_guard hold(m_mutex);
         return m_plan.transfer;
     }
-    size_t takeRoom(size_t size) {
+    size_t takeRoom(const String& path, size_t size) {
         const std::lock_guard hold(m_mutex);
         size = std::min(size, m_plan.transfer);
         if (m_plan.room) {
             size = std::min(size, *m_plan.room);
             *m_plan.room -= size;
+            m_taken[path] += size;
         }
         return size;
+    }
+    /// A name goes: what was written to it is free again if its file goes with it.
+    void freeRoom(const String& path, bool isRemoved) {
+        const std::lock_guard hold(m_mutex);
+        const auto taken = m_taken.extract(path);
+        if (isRemoved && m_plan.room && !taken.empty()) {
+            *m_plan.room += taken.mapped();
+        }
     }
 
     /// Counts an operation, and kills or fails as planned.
@@ -240,6 +258,9 @@ private:
             ::kill(::getpid(), SIGKILL);
         }
         const size_t n = m_operations.size();
+        if (n == m_plan.signalAt) {
+            ::raise(m_plan.signal);
+        }
         const bool fails = n == m_plan.failAt || (m_plan.failFrom != 0 && n >= m_plan.failFrom) ||
                            (asks && m_numQuestions == m_plan.failQuestion) ||
                            (!m_plan.failWhere.empty() && text.find(m_plan.failWhere) != String::npos);
@@ -251,6 +272,7 @@ private:
     Plan m_plan;
     std::vector<String> m_operations;
     size_t m_numWrites = 0;
+    std::map<String, size_t> m_taken; ///< bytes of the files written on a disk that fills up
     size_t m_numQuestions = 0;
 };
 

@@ -3,11 +3,15 @@
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_diff.h"
 #include "tools/qmedit/edit_place.h"
+#include "tools/qmedit/managed_edit.h"
 #include "tools/qmedit/project_session.h"
+#include "tools/qmedit/spare_room.h"
 
 #include "edit/editing/editor.h"
 #include "edit/manager/edit_manager.h"
 #include "edit/model/channel_mask.h"
+#include "platform/services/edit_filenames.h"
+#include "platform/services/files.h"
 
 #include <cmath>
 #include <memory>
@@ -85,12 +89,18 @@ Qx::Status readSides(const ProjectSession& session, bool managed, bool hasSource
         if (side == &from && !hasSource) {
             continue;
         }
-        // The file is looked at first, so that one that does not read stays as it is.
-        if (Qx::Status read = session.readEdit(side->place.item, side->edit); !read) {
+        const cookie& item = side->place.item;
+        // The file is looked at first, so that one that does not read stays as it is. One that is away comes
+        // back when the edit is opened.
+        const bool isAway = managed && Qx::askFile(getFilenameForCookie(item)).isMissing() &&
+                            !edit_manager::getEditFiles(item).empty();
+        if (Qx::Status read = isAway ? Qx::Status() : session.readEdit(item, side->edit); !read) {
             return read;
         }
+        bool wasRestored = false;
         if (managed) {
-            side->edit = edit_manager::openEdit(side->place.item, eOpenExisting);
+            side->edit.invalidate();
+            static_cast<void>(openManaged(item, side->edit, wasRestored));
         } else if (side == &from && to.place.item == from.place.item) {
             side->edit = to.edit;
         }
@@ -102,6 +112,25 @@ Qx::Status readSides(const ProjectSession& session, bool managed, bool hasSource
         }
     }
     return {};
+}
+
+/// Takes the room that the changed edit can need at most, with the clipboard's.
+Qx::Status takeRoom(SpareRoom& room, const Side& to, const Side& from) {
+    constexpr uint64_t kMore = 65536;
+    const auto sizeOf = [](const cookie& item) {
+        return Qx::askFile(getFilenameForCookie(item)).info().size;
+    };
+    const uint64_t source = from.edit.valid() ? sizeOf(from.place.item) : 0;
+    return room.take(getFilenameForCookie(to.place.item), 2 * sizeOf(to.place.item) + source + kMore);
+}
+
+/// Lets go of everything after a failure, with the files of the edit and the clipboard under their names.
+String letGo(const cookie& item, Side& to, Side& from) {
+    from = {};
+    to.module = {};
+    EditPtr clipboard;
+    static_cast<void>(putFileBack(clipboard_cookie, clipboard));
+    return putFileBack(item, to.edit);
 }
 
 int applyOperation(ProjectSession& session, const ApplyOptions& options, edit_operation op, Side& to,
@@ -116,11 +145,24 @@ int applyOperation(ProjectSession& session, const ApplyOptions& options, edit_op
             selectChannels(from.module, mask);
         }
     }
+    const cookie item = to.place.item;
+    SpareRoom room;
+    if (const Qx::Status taken = options.dryRun ? Qx::Status() : takeRoom(room, to, from); !taken) {
+        return failed(Qx::Status::failure("nothing was changed: " + taken.reason()));
+    }
     const EditReport before = reportOf(*to.edit, session.sourceNamer());
     const unsigned flags = options.dryRun ? Editor::NoBackup : 0u;
     const Editor::Result result = Editor::apply(from.module, to.module, op, flags);
     if (!result.valid()) {
-        return failed(Qx::Status::failure(result.reason()));
+        return failed(Qx::Status::failure(result.reason() +
+                                          (options.dryRun ? String() : "; " + letGo(item, to, from))));
+    }
+    room.giveBack();
+    if (!options.dryRun && !edit_manager::flush_changes()) {
+        const String cause = to.edit->lastFileError();
+        return failed(Qx::Status::failure(getFilenameForCookie(item) + " could not be written" +
+                                          (cause.empty() ? String() : ": " + cause) + "; " +
+                                          letGo(item, to, from)));
     }
     const EditReport after = reportOf(*to.edit, session.sourceNamer());
     reportResult(*to.edit, before, after, op, result);
@@ -128,11 +170,6 @@ int applyOperation(ProjectSession& session, const ApplyOptions& options, edit_op
     if (options.dryRun) {
         writeOut("Nothing was changed: this was a trial.\n");
         return kDone;
-    }
-    if (!edit_manager::flush_changes()) {
-        return failed(
-            Qx::Status::failure("the edit " + to.place.item.asString() +
-                                " could not be written; its state before is its newest undo backup"));
     }
     return kDone;
 }

@@ -1,6 +1,7 @@
 #include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
+#include "tools/qmedit/interrupts.h"
 #include "tools/qmedit/managed_edit.h"
 #include "tools/qmedit/revisions.h"
 
@@ -35,6 +36,9 @@ Qx::Status findPlayers(ProjectSession& session, const cookie& item, String& play
         return listed;
     }
     for (const ListedEdit& edit : edits) {
+        if (interrupts::noted()) {
+            return Qx::Status::failure("nothing was deleted");
+        }
         // A shot plays its own media, nothing of the project.
         if (edit.item == item || edit.type == "shot") {
             continue;

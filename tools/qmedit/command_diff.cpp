@@ -5,7 +5,6 @@
 #include "tools/qmedit/edit_diff_json.h"
 #include "tools/qmedit/project_session.h"
 
-#include "edit/persist/edit_salvage.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 
@@ -27,7 +26,7 @@ Qx::Status readItem(const ProjectSession& session, const String& name, bool hasP
                     String& store) {
     const cookie item(name, true);
     if (item.isStorable() && hasProject) {
-        store = getFilenameForCookie(item);
+        store = ProjectSession::fileOf(item);
         return session.readEdit(item, edit);
     }
     String path = name;
@@ -49,13 +48,8 @@ Qx::Status readItem(const ProjectSession& session, const String& name, bool hasP
         return {};
     }
     EditPtr read;
-    std::vector<String> lost;
-    if (Qx::Status status = salvageEdit(path, read, lost); !status) {
+    if (Qx::Status status = ProjectSession::readRevision(path, read); !status) {
         return status;
-    }
-    if (!lost.empty()) {
-        return Qx::Status::failure(path + " is damaged: " + lost.front() +
-                                   "; 'qmedit salvage' saves what is sound of it");
     }
     const String file = Qx::fileNameOf(path);
     read->set_cookie(cookie(std::string_view(file).substr(0, file.find('.')), true));

@@ -1,6 +1,7 @@
 #include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
+#include "tools/qmedit/interrupts.h"
 #include "tools/qmedit/project_session.h"
 
 #include "interchange/edl/edl_export.h"
@@ -64,6 +65,7 @@ int runExport(const ExportArguments& arguments) {
     }
     interchange::LossReport report;
     report.setFile(item.asString());
+    const interrupts::Hold hold(false);
     const Qx::Status written = writeForm(arguments, form, session, *edit, report);
     for (const String& line : report.lines()) {
         reportProgress(line);

@@ -2,6 +2,7 @@
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/import_source.h"
+#include "tools/qmedit/interrupts.h"
 #include "tools/qmedit/project_session.h"
 
 #include "interchange/edl/edl_import.h"
@@ -73,10 +74,11 @@ int importFile(const ImportOptions& options, cookie& item) {
     if (const Qx::Status prepared = session.prepare(import.sequence->getFrameRate()); !prepared) {
         return failed(prepared);
     }
+    const interrupts::Hold hold(true);
     if (const Qx::Status created = session.create(); !created) {
         return failed(created);
     }
-    if (const Qx::Status saved = interchange::saveImport(import); !saved) {
+    if (const Qx::Status saved = interchange::saveImport(import, interrupts::noted); !saved) {
         return failed(saved);
     }
     item = import.sequence->get_cookie();

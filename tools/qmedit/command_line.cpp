@@ -2,6 +2,7 @@
 
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
+#include "tools/qmedit/interrupts.h"
 
 // The only source that reads it: it is slow to compile.
 #include <CLI/CLI.hpp>
@@ -12,7 +13,8 @@ namespace {
 
 constexpr const char* kFooter =
     "Edits go to the project given by --project DIR, else by $QMEDIT_PROJECT, else to ./quillmarch-project.\n"
-    "Exit codes: 0 done, 1 failed, 2 wrong usage. 'qmedit COMMAND --help' shows an example of each command.";
+    "Exit codes: 0 done, 1 failed, 2 wrong usage, 128 and more interrupted.\n"
+    "'qmedit COMMAND --help' shows an example of each command.";
 
 /// The command that a wrong command line was for, for the advice on help.
 String commandOf(const CLI::App& app) {
@@ -86,6 +88,8 @@ int runCommandLine(const std::vector<Command>& commands, int count, char** argum
         reportError("name a command; see qmedit --help");
         return kWrongUsage;
     }
+    interrupts::install();
     const int code = chosen->run();
-    return finishOutput() ? code : static_cast<int>(kFailed);
+    return interrupts::exitCode(
+        finishOutput(code == kDone && interrupts::editsWereChanged()) ? code : static_cast<int>(kFailed));
 }

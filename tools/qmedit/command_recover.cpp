@@ -34,7 +34,7 @@ Qx::Status replaceBy(const cookie& item, const Revision& taken, const Revision* 
     RevisionChain undo(item, RevisionChain::Undo, edit_manager::backupDepth());
     const String& file = undo.file();
     // Copied first: keeping the present state may move the one that is taken to another name.
-    const String copy = file + ".RECOVERY";
+    const String copy = file + kRecoveryCopy;
     if (Qx::Status copied = failure(Qx::copyFile(taken.path, copy)); !copied) {
         return copied;
     }
@@ -48,6 +48,12 @@ Qx::Status replaceBy(const cookie& item, const Revision& taken, const Revision* 
     }
     if (status) {
         status = failure(Qx::fileSystem().rename(copy, file));
+    }
+    if (!status && !kept.empty() && Qx::askFile(file).isMissing()) {
+        // What was there comes back. A failure is told of by the caller, who looks where it is.
+        int restored = 0;
+        static_cast<void>(present->isSound() ? undo.restoreNewest(restored).isOk()
+                                             : !Qx::fileSystem().rename(kept, file));
     }
     if (!status) {
         static_cast<void>(Qx::fileSystem().remove(copy).code);

@@ -2,6 +2,7 @@
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
+#include "tools/qmedit/interrupts.h"
 #include "tools/qmedit/project_session.h"
 
 #include "edit/persist/edit_salvage.h"
@@ -32,6 +33,7 @@ int runSalvage(const SalvageArguments& arguments) {
     if (const Qx::Status prepared = session.prepare(edit->getFrameRate()); !prepared) {
         return failed(prepared);
     }
+    const interrupts::Hold hold(true);
     if (const Qx::Status created = session.create(); !created) {
         return failed(created);
     }

@@ -2,6 +2,7 @@
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
+#include "tools/qmedit/leftovers.h"
 #include "tools/qmedit/project_session.h"
 
 #include "edit/persist/edit_salvage.h"
@@ -10,6 +11,8 @@
 
 #include <algorithm>
 #include <memory>
+#include <optional>
+#include <unordered_set>
 
 namespace {
 
@@ -17,6 +20,7 @@ struct VerifyArguments {
     std::vector<std::string> items;
     String project;
     bool json = false;
+    bool clean = false;
 };
 
 constexpr const char* kMilestones = "Milestones";
@@ -142,6 +146,61 @@ String verifyTable(const std::vector<VerifiedFile>& files, const Console& consol
            String::format("%zu file%s, %zu not sound\n", files.size(), files.size() == 1 ? "" : "s", unsound);
 }
 
+/// The items that the edits of a project play. Fails when one cannot be read, which may play anything.
+Qx::Status findPlayed(ProjectSession& session, std::unordered_set<cookie>& played) {
+    std::vector<ListedEdit> edits;
+    std::vector<String> others;
+    if (Qx::Status listed = session.list(edits, others); !listed) {
+        return listed;
+    }
+    for (const ListedEdit& listed : edits) {
+        EditPtr edit;
+        if (listed.type == "shot") {
+            continue;
+        }
+        if (Qx::Status read = session.readEdit(listed.item, edit); !read) {
+            return read;
+        }
+        for (const SourceReport& source : reportOf(*edit, {}).sources) {
+            played.insert(source.strip);
+        }
+    }
+    return {};
+}
+
+/// Tells of what killed programs left, and with `clean` removes it.
+Qx::Status tellLeftovers(ProjectSession& session, bool clean) {
+    const std::vector<Leftover> leftovers = findLeftovers(session.folder());
+    const size_t start = session.folder().size() + 1;
+    if (clean) {
+        if (Qx::Status locked = session.lockForWriting(); !locked) {
+            return locked;
+        }
+        std::unordered_set<cookie> played;
+        std::optional<Qx::Status> looked;
+        const auto isPlayed = [&](const cookie& shot) {
+            if (!looked) {
+                looked = findPlayed(session, played);
+            }
+            return !*looked || played.contains(shot);
+        };
+        static_cast<void>(removeAllLeftovers(session.folder(), isPlayed));
+    }
+    size_t left = 0;
+    for (const Leftover& leftover : leftovers) {
+        const bool isGone = clean && Qx::askFile(leftover.path).isMissing();
+        left += isGone ? 0 : 1;
+        reportProgress((isGone ? "removed: " : "left over: ") + leftover.path.substr(start) + ", " +
+                       leftover.what);
+    }
+    if (left > 0 && !clean) {
+        reportProgress(String::format("%zu file%s left over by programs that were killed; 'qmedit verify "
+                                      "--clean' removes what nothing refers to",
+                                      left, left == 1 ? "" : "s"));
+    }
+    return {};
+}
+
 int runVerify(const VerifyArguments& arguments) {
     std::vector<cookie> items;
     for (const std::string& text : arguments.items) {
@@ -161,6 +220,11 @@ int runVerify(const VerifyArguments& arguments) {
         writeOut(verifyJson(verifying.files()));
     } else {
         writeOut(verifyTable(verifying.files(), Console::forStandardOutput()));
+    }
+    if (items.empty() || arguments.clean) {
+        if (const Qx::Status told = tellLeftovers(session, arguments.clean); !told) {
+            return failed(told);
+        }
     }
     int code = kDone;
     for (const VerifiedFile& file : verifying.files()) {
@@ -183,9 +247,12 @@ Command verifyCommand() {
             "Check every edit file, backup and milestone of a project",
             {{.name = "COOKIE", .value = &arguments->items, .help = "Only the files of these edits"},
              projectOption(arguments->project),
-             jsonOption(arguments->json, "Write JSON: an array of files")},
+             jsonOption(arguments->json, "Write JSON: an array of files"),
+             {.name = "--clean",
+              .value = &arguments->clean,
+              .help = "Remove what killed programs left and nothing refers to"}},
             "Example:\n  qmedit verify --project ~/feature\n\n"
-            "Nothing is written. The exit code is 1 if any file is not sound; 'qmedit salvage' saves what "
-            "is sound of one.",
+            "Nothing is written without --clean. The exit code is 1 if any file is not sound; 'qmedit "
+            "salvage' saves what is sound of one. What killed programs left is told of on standard error.",
             [arguments] { return runVerify(*arguments); }};
 }

@@ -18,6 +18,7 @@ constexpr int kLeastWidth = 40;
 constexpr int kGreatestWidth = 500;
 
 int outputError = 0;
+String lastLine; ///< what was written last, if it is one line
 
 const char* environment(const char* name) {
     const char* value = std::getenv(name);
@@ -116,13 +117,15 @@ String Console::inked(Ink ink, std::string_view text) const {
 }
 
 void writeOut(std::string_view text) {
+    const bool isLine = !text.empty() && text.find('\n') == text.size() - 1;
+    lastLine = isLine ? String(text.substr(0, text.size() - 1)) : String();
     errno = 0;
     if (outputError == 0 && std::fwrite(text.data(), 1, text.size(), stdout) != text.size()) {
         outputError = errno != 0 ? errno : EIO;
     }
 }
 
-bool finishOutput() {
+bool finishOutput(bool changed) {
     errno = 0;
     if (std::fflush(stdout) != 0 && outputError == 0) {
         outputError = errno != 0 ? errno : EIO;
@@ -130,7 +133,9 @@ bool finishOutput() {
     if (outputError == 0) {
         return true;
     }
-    reportError(String("cannot write standard output: ") + std::strerror(outputError));
+    reportError(String("cannot write standard output: ") + std::strerror(outputError) +
+                (changed ? "; the command was carried out all the same" : "") +
+                (changed && !lastLine.empty() ? ": " + lastLine : String()));
     return false;
 }
 

@@ -58,8 +58,9 @@ private:
 
 /// Writes to standard output. A failure is remembered; see `finishOutput`.
 void writeOut(std::string_view text);
-/// Flushes standard output. False, with one line on standard error, if anything could not be written.
-[[nodiscard]] bool finishOutput();
+/// Flushes standard output. False, with one line on standard error, if anything could not be written. The
+/// line says so when edits were `changed` all the same, with the line that was to tell of it.
+[[nodiscard]] bool finishOutput(bool changed = false);
 
 /// One line on standard error, "qmedit: " and the text, made fit for a terminal.
 void reportError(std::string_view text);

@@ -110,19 +110,37 @@ int ManagedEdit::prepare(bool mayBeGone) {
     return kDone;
 }
 
-bool ManagedEdit::open(EditPtr& edit) {
-    const FilesBefore before(m_item);
-    const EditPtr opened = edit_manager::openEdit(m_item, eOpenExisting);
+bool openManaged(const cookie& item, EditPtr& edit, bool& wasRestored) {
+    const FilesBefore before(item);
+    const EditPtr opened = edit_manager::openEdit(item, eOpenExisting);
     if (!opened.valid()) {
-        reportNotOpened(m_item, before);
+        reportNotOpened(item, before);
         return false;
     }
     if (const int number = before.restored(); number != 0) {
-        m_wasRestored = true;
+        wasRestored = true;
         reportRestored(before, number);
     }
     edit = opened;
     return true;
+}
+
+String putFileBack(const cookie& item, EditPtr& edit) {
+    edit.invalidate();
+    edit_manager::invalidateCache(item);
+    RevisionChain undo = chain(item, RevisionChain::Undo);
+    int restored = 0;
+    if (Qx::askFile(undo.file()).isMissing() && undo.restoreNewest(restored) && restored != 0) {
+        static_cast<void>(undo.makeDurable().isOk());
+    }
+    return Qx::askFile(undo.file()).isRegular()
+               ? String("the edit is as it was")
+               : String("the edit is kept whole as its newest undo backup; 'qmedit recover " +
+                        item.asString() + "' brings it back when there is room");
+}
+
+bool ManagedEdit::open(EditPtr& edit) {
+    return openManaged(m_item, edit, m_wasRestored);
 }
 
 size_t ManagedEdit::numUndo() const {

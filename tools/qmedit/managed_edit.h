@@ -9,6 +9,15 @@ struct EditArguments {
     String project;
 };
 
+/// Opens an edit through the edit manager, under the writers' lock. Where its file was missing or unreadable
+/// the manager takes a backup in its place, which is reported and makes `wasRestored` true. A failure is
+/// reported and leaves `edit` null.
+[[nodiscard]] bool openManaged(const cookie& item, EditPtr& edit, bool& wasRestored);
+
+/// After a write that failed: lets go of the changes, and brings the file of an edit that lies as its newest
+/// undo backup back under its name, under the writers' lock. Says in one clause where the edit is.
+[[nodiscard]] String putFileBack(const cookie& item, EditPtr& edit);
+
 /// One edit of a project that a command changes through the edit manager, under the project's writers' lock
 /// from before it is opened until the object goes. What the user must know is told on standard error.
 class ManagedEdit {
@@ -18,8 +27,7 @@ public:
     /// Reads the cookie, opens the project and takes the lock; the item must not be marked read-only, and
     /// must have a file or a backup unless it `mayBeGone`. An `ExitCode`; what is wrong is reported.
     int prepare(bool mayBeGone = false);
-    /// Opens the edit. Where its file was missing or unreadable the manager takes a backup in its place,
-    /// which is reported and makes `wasRestored` true. A failure is reported and leaves `edit` null.
+    /// Opens the edit, by `openManaged`.
     bool open(EditPtr& edit);
     [[nodiscard]] bool wasRestored() const { return m_wasRestored; }
 

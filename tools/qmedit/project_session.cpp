@@ -1,13 +1,16 @@
 #include "tools/qmedit/project_session.h"
 
 #include "edit/manager/edit_record.h"
+#include "edit/manager/revision_chain.h"
 #include "edit/persist/edit_init.h"
+#include "edit/persist/edit_salvage.h"
 #include "edit/project/project_details.h"
 #include "interchange/edl/edl_records.h"
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 #include "tools/qmedit/console.h"
+#include "tools/qmedit/leftovers.h"
 
 #include <chrono>
 #include <cstdlib>
@@ -68,7 +71,7 @@ String fileOfRevision(const String& name) {
 }
 
 String missingText(const cookie& item) {
-    return "its file is missing, or a program is about to write it; 'qmedit history " + item.asString() +
+    return "its file is missing and it has no undo backup; 'qmedit history " + item.asString() +
            "' shows what is left of it, 'qmedit recover " + item.asString() + "' brings it back";
 }
 
@@ -97,13 +100,6 @@ std::vector<ItemFile> itemFiles(const std::vector<String>& names, std::vector<St
         }
     }
     return files;
-}
-
-ListedEdit missingEdit(const cookie& item) {
-    ListedEdit entry;
-    entry.item = item;
-    entry.damage = missingText(item);
-    return entry;
 }
 
 ListedEdit listedEdit(const cookie& item, const projdb::Record& record) {
@@ -151,6 +147,13 @@ ProjectSession::ProjectSession(const String& option) : m_root(option), m_project
     } else {
         m_project = projectIn(m_root);
     }
+}
+
+String ProjectSession::fileOf(const cookie& item) {
+    const RevisionChain undo(item, RevisionChain::Undo, edit_manager::backupDepth());
+    int number = 0;
+    const bool hasBackup = Qx::askFile(undo.file()).isMissing() && undo.findNewest(number) && number != 0;
+    return hasBackup ? undo.path(number) : undo.file();
 }
 
 String ProjectSession::folder() const {
@@ -201,6 +204,7 @@ Qx::Status ProjectSession::prepare(Qx::FrameRate rateOfFresh) {
 }
 
 Qx::Status ProjectSession::create() {
+    const interrupts::Hold hold(false);
     ProjectDetails defaults;
     defaults.name = Qx::fileNameOf(m_root);
     if (!Qx::isUtf8(defaults.name)) {
@@ -216,6 +220,10 @@ Qx::Status ProjectSession::create() {
     details.makeCurrent();
     if (const Qx::Status started = edit_init(); !started) {
         reportWarning(started.reason());
+    }
+    // What a writer of the project has in hand is no leftover; it cleans up itself.
+    if (EditManagerLock writers(folder()); writers.take()) {
+        cleanUp();
     }
     return {};
 }
@@ -235,21 +243,70 @@ bool ProjectSession::isListed(const cookie& item) const {
     return m_listed->contains(item);
 }
 
-Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
-    const String path = getFilenameForCookie(item);
-    if (Qx::askFile(path).isMissing()) {
-        if (isListed(item)) {
-            return Qx::Status::failure(path + ": " + missingText(item));
-        }
-        return Qx::Status::failure("there is no edit " + item.asString() + " in the project " + m_root +
-                                   "; 'qmedit list' shows those there are");
+bool ProjectSession::readBackup(const cookie& item, EditPtr& edit, Qx::Status& status) const {
+    const RevisionChain undo(item, RevisionChain::Undo, edit_manager::backupDepth());
+    int number = 0;
+    if (status = undo.findNewest(number); !status) {
+        return true;
     }
-    EditPtr read(new Edit);
-    if (read->read_file(item, eOpenExisting) != Edit::kReadOk) {
-        return damage(path, read->lastFileError());
+    if (number == 0) {
+        return false;
+    }
+    const String backup = undo.path(number);
+    if (status = readRevision(backup, edit); !status) {
+        // It may have been moved meanwhile, to the edit's name or to another number.
+        return Qx::askFile(undo.file()).isMissing() && !Qx::askFile(backup).isMissing();
+    }
+    edit->set_cookie(item);
+    if (m_toldAway.insert(item).second) {
+        reportWarning(undo.file() + " is away, as a program writes it or died; this is its undo backup " +
+                      std::to_string(number));
+    }
+    return true;
+}
+
+Qx::Status ProjectSession::readRevision(const String& path, EditPtr& edit) {
+    EditPtr read;
+    std::vector<String> lost;
+    if (Qx::Status status = salvageEdit(path, read, lost); !status) {
+        return status;
+    }
+    if (!lost.empty()) {
+        return Qx::Status::failure(path + " is damaged: " + lost.front() +
+                                   "; 'qmedit salvage' saves what is sound of it");
     }
     edit = read;
     return {};
+}
+
+Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
+    // Under one of its names it lies at every moment; a writer may move it between two looks.
+    constexpr int kLooks = 5;
+    const String path = getFilenameForCookie(item);
+    Qx::Status status;
+    for (int look = 0; look < kLooks; ++look) {
+        if (!Qx::askFile(path).isMissing()) {
+            EditPtr read(new Edit);
+            if (read->read_file(item, eOpenExisting) == Edit::kReadOk) {
+                edit = read;
+                return {};
+            }
+            if (!Qx::askFile(path).isMissing()) {
+                return damage(path, read->lastFileError());
+            }
+        }
+        if (readBackup(item, edit, status)) {
+            return status;
+        }
+        if (Qx::askFile(path).isMissing() && !isListed(item)) {
+            break;
+        }
+    }
+    if (isListed(item)) {
+        return Qx::Status::failure(path + ": " + missingText(item));
+    }
+    return Qx::Status::failure("there is no edit " + item.asString() + " in the project " + m_root +
+                               "; 'qmedit list' shows those there are");
 }
 
 void ProjectSession::manage() {
@@ -268,7 +325,19 @@ Qx::Status ProjectSession::lockForWriting() {
         std::this_thread::sleep_for(std::chrono::milliseconds(20));
         taken = m_writers->take();
     }
-    return taken ? Qx::Status() : Qx::Status::failure("nothing was changed: " + taken.reason());
+    if (!taken) {
+        return Qx::Status::failure("nothing was changed: " + taken.reason());
+    }
+    m_uninterrupted.emplace(true);
+    cleanUp();
+    return {};
+}
+
+void ProjectSession::cleanUp() {
+    if (!m_isClean) {
+        removeLeftovers(folder());
+        m_isClean = true;
+    }
 }
 
 projdb* ProjectSession::openRecords() {
@@ -314,6 +383,17 @@ projdb::Record ProjectSession::recordOf(const cookie& item, const Records& known
     return record;
 }
 
+ListedEdit ProjectSession::listedAway(const cookie& item) const {
+    EditPtr edit;
+    projdb::Record record;
+    if (const Qx::Status read = readEdit(item, edit); read) {
+        record = editRecordOf(*edit, nullptr);
+    } else {
+        record[projdb::Damage] = read.reason();
+    }
+    return listedEdit(item, record);
+}
+
 Qx::Status ProjectSession::list(std::vector<ListedEdit>& edits, std::vector<String>& others) {
     std::vector<String> names;
     if (const Qx::FileError error = Qx::fileSystem().list(folder(), names); error) {
@@ -331,8 +411,14 @@ Qx::Status ProjectSession::list(std::vector<ListedEdit>& edits, std::vector<Stri
     }
     m_numRead = 0;
     for (const ItemFile& file : itemFiles(names, others)) {
-        edits.push_back(file.isThere ? listedEdit(file.item, recordOf(file.item, known, fresh))
-                                     : missingEdit(file.item));
+        ListedEdit entry =
+            file.isThere ? listedEdit(file.item, recordOf(file.item, known, fresh)) : listedAway(file.item);
+        // A writer may have taken the file away since the folder was listed.
+        if (file.isThere && !entry.damage.empty() &&
+            Qx::askFile(getFilenameForCookie(file.item)).isMissing()) {
+            entry = listedAway(file.item);
+        }
+        edits.push_back(std::move(entry));
     }
     if (records != nullptr && !fresh.empty()) {
         storeRecords(*records, fresh);

@@ -6,6 +6,7 @@
 #include "edit/project/projdb.h"
 #include "platform/base/status.h"
 #include "tools/qmedit/edit_report.h"
+#include "tools/qmedit/interrupts.h"
 
 #include <memory>
 #include <optional>
@@ -46,7 +47,7 @@ public:
     /// Makes a project current so that edits can be prepared for it: the one that is there, else one of the
     /// given rate (25 for an invalid one) of which nothing is on the disk yet.
     Qx::Status prepare(Qx::FrameRate rateOfFresh);
-    /// After `prepare`: makes what is missing on the disk.
+    /// After `prepare`: makes what is missing on the disk, and removes what killed programs left there.
     Qx::Status create();
 
     /// Makes the edit manager, for the commands that work through it. It lives as long as the session.
@@ -57,13 +58,19 @@ public:
     Qx::Status lockForWriting();
     static constexpr int kLockPatience = 2;
 
-    /// Reads an edit. A failure names the file and says what to do.
+    /// Reads an edit. While its file is away, as a writer leaves it for a moment (or for good, when it dies),
+    /// the newest undo backup answers, with one warning for each edit; nothing is moved. A failure names the
+    /// file and says what to do.
     Qx::Status readEdit(const cookie& item, EditPtr& edit) const;
-    /// What there is to say of every edit file, in order of their cookies; an edit of which only backups
-    /// or damaged files that were set aside are there counts as damaged. `others` gets the names of files
-    /// with the edits' extension that are no cookie's. Where the project has a record ("Project.db") only the
-    /// files that it does not tell of are read, and it learns of them; without one every file is. What comes
-    /// out is the same. Fails only when the folder cannot be read.
+    /// Reads a file of an edit under any name: a backup, a milestone, a copy. A failure names the file.
+    static Qx::Status readRevision(const String& path, EditPtr& edit);
+    /// The file that `readEdit` reads.
+    [[nodiscard]] static String fileOf(const cookie& item);
+    /// What there is to say of every edit file, in order of their cookies, by `readEdit` where it is away; an
+    /// edit of which neither its file nor an undo backup is there counts as damaged. `others` gets the names
+    /// of files with the edits' extension that are no cookie's. Where the project has a record ("Project.db")
+    /// only the files that it does not tell of are read, and it learns of them; without one every file is.
+    /// What comes out is the same. Fails only when the folder cannot be read.
     Qx::Status list(std::vector<ListedEdit>& edits, std::vector<String>& others);
     /// How many files the last listing had to read.
     [[nodiscard]] size_t numRead() const { return m_numRead; }
@@ -86,13 +93,22 @@ private:
     [[nodiscard]] projdb::Record recordOf(const cookie& item, const Records& known, Records& fresh);
     [[nodiscard]] Known look(const cookie& item) const;
     [[nodiscard]] bool isListed(const cookie& item) const;
+    /// Removes what killed programs left, once, under the writers' lock.
+    void cleanUp();
+    /// Reads the newest undo backup of an edit whose file is away. True if that settles the matter: `status`
+    /// is how it went. False when there is none, or the file is back.
+    [[nodiscard]] bool readBackup(const cookie& item, EditPtr& edit, Qx::Status& status) const;
+    [[nodiscard]] ListedEdit listedAway(const cookie& item) const;
 
     String m_root;
     cookie m_project;
     Qx::FrameRate m_rateOfFresh;
     std::unordered_map<cookie, Known> m_known;
     mutable std::optional<std::unordered_set<cookie>> m_listed; ///< when an item was first missing
+    mutable std::unordered_set<cookie> m_toldAway;              ///< of which a warning told
     size_t m_numRead = 0;
+    bool m_isClean = false;
+    std::optional<interrupts::Hold> m_uninterrupted; ///< goes last: from the lock until all is closed
     std::unique_ptr<EditManagerLock> m_writers;
     std::unique_ptr<edit_manager> m_manager; ///< goes first: what it writes at its end is written locked
 };

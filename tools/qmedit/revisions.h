@@ -8,6 +8,9 @@
 class Console;
 class EditModification;
 
+/// The end of the name that a recovery copies to, beside the edit.
+inline constexpr const char* kRecoveryCopy = ".RECOVERY";
+
 /// One file that holds a state of an edit: its own, a backup, a milestone, or one that was set aside.
 struct Revision {
     enum Kind { Itself, Undo, Redo, Milestone, Corrupt };
