@@ -47,7 +47,7 @@ void edit_manager::limitEditCache(int limit) {
 }
 
 void evictOne(int limit) {
-    constexpr size_t kMost = 64;
+    constexpr size_t kMost = 16;
     std::unique_ptr<ManagerState::CachedEdit> evicted;
     const std::unique_lock<criticalSection> hold(managerState().lock, std::try_to_lock);
     if (hold.owns_lock() && !isWithin(limit)) {
