@@ -147,8 +147,11 @@ TEST(Keeping, WhatCouldNotBeWrittenWaitsToBe) {
     for (const bool byItself : {false, true}) {
         const ManagedProject project;
         ManagedProject::save("before");
-        ManagedProject::change("unwritten");
+        ASSERT_TRUE(edit_manager::backup_edit(kEdit));
         const EditPtr edit(kEdit, eOpenExisting);
+        if (byItself) {
+            edit->init_dirty();
+        }
         {
             test::FaultyFileSystem system;
             system.fullAfter(100);
