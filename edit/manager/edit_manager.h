@@ -88,8 +88,8 @@ public:
     /// With `limit` not -1 and at least `limit` entries: writes and drops the first edit, in the order of
     /// cookies, that nobody but the cache holds. At most one a call. An edit with changes that cannot be
     /// written, also because another process keeps the lock, stays, and the next one is tried. What
-    /// "edit_cache_size" asks for at each opening is less: it waits for no thread and looks at some edits only,
-    /// each time the next ones.
+    /// "edit_cache_size" asks for at each opening is less: it waits for no thread and looks at some edits
+    /// only, each time the next ones.
     static void limitEditCache(int limit);
     /// Drops an edit from the cache, unwritten, so that the next opening reads its file; forgets a remembered
     /// failure. Handles that others hold stay usable, but their edit is no longer the item's: changes to it
