@@ -2,22 +2,56 @@
 #include "platform/services/log.h"
 
 #include <algorithm>
+#include <cstdint>
+#include <mutex>
 
-void edit_manager::limitEditCache(int limit) {
+namespace {
+
+bool isWithin(int limit) {
+    return limit == -1 || managerState().cache.size() < static_cast<size_t>(std::max(limit, 0));
+}
+
+/// Writes and takes out the first edit that nobody holds among at most `most`, from where the last short
+/// search ended when not all are looked at. Under the lock; another process is not waited for.
+std::unique_ptr<ManagerState::CachedEdit> evictAmong(size_t most) {
     ManagerState& state = managerState();
-    std::unique_ptr<ManagerState::CachedEdit> evicted; // destroyed when the lock is released
-    const ManagerState::Hold hold(state.lock);
-    if (limit == -1 || state.cache.size() < static_cast<size_t>(std::max(limit, 0))) {
-        return;
-    }
-    for (const auto& [item, entry] : state.cache) {
+    const bool looksAtAll = state.cache.size() <= most;
+    auto place = looksAtAll ? state.cache.begin() : state.cache.lower_bound(state.evictFrom);
+    for (size_t count = std::min(most, state.cache.size()); count > 0; --count) {
+        if (place == state.cache.end()) {
+            place = state.cache.begin();
+        }
+        const cookie item = place->first;
+        ManagerState::CachedEdit& entry = *place++->second;
         // An edit that is never written and holds changes stays, and one that was opened meanwhile.
-        if (entry->edit.valid() && state.writeUnreferenced(*entry) == ManagerState::Unreferenced::Clean) {
-            evicted = state.removeUnreferenced(item, true);
-            if (evicted != nullptr) {
-                return;
+        if (entry.edit.valid() &&
+            state.writeUnreferenced(entry, false) == ManagerState::Unreferenced::Clean) {
+            if (auto evicted = state.removeUnreferenced(item, true)) {
+                state.evictFrom = item;
+                return evicted;
             }
         }
+    }
+    state.evictFrom = place == state.cache.end() ? cookie() : place->first;
+    return nullptr;
+}
+
+} // namespace
+
+void edit_manager::limitEditCache(int limit) {
+    std::unique_ptr<ManagerState::CachedEdit> evicted; // destroyed when the lock is released
+    const ManagerState::Hold hold(managerState().lock);
+    if (!isWithin(limit)) {
+        evicted = evictAmong(SIZE_MAX);
+    }
+}
+
+void evictOne(int limit) {
+    constexpr size_t kMost = 16;
+    std::unique_ptr<ManagerState::CachedEdit> evicted;
+    const std::unique_lock<criticalSection> hold(managerState().lock, std::try_to_lock);
+    if (hold.owns_lock() && !isWithin(limit)) {
+        evicted = evictAmong(kMost);
     }
 }
 
@@ -52,7 +86,10 @@ void edit_manager::reloadRequest(const cookie& item, bool reopen) {
     state.tell(invalidateCacheMsgType(), item);
     std::unique_ptr<ManagerState::CachedEdit> dropped;
     {
-        const ManagerState::Hold section(held->section());
+        const SectionHold section(held);
+        if (!section.isHeld()) {
+            return;
+        }
         if (held->isDirty(true)) {
             herc_printf("edit_manager::reloadRequest( %s ) : it was changed here too; what its file holds is "
                         "kept as a backup when it is written\n",

@@ -1,8 +1,13 @@
 #include "edit/manager/detail/manager_state.h"
 #include "edit/manager/milestone_ring.h"
 #include "platform/media/frame_rate.h"
+#include "platform/services/atomic_batch.h"
 #include "platform/services/current_project.h"
 #include "platform/services/log.h"
+
+#include <algorithm>
+#include <new>
+#include <span>
 
 namespace {
 
@@ -31,33 +36,74 @@ EditPtr cachedEdit(const cookie& item) {
     return found == nullptr ? EditPtr() : found->edit;
 }
 
+/// Does something for one edit; false when memory runs out over it, which is not to keep others from their
+/// turn.
+template <typename Work>
+bool inMemory(Work&& work) {
+    try {
+        return work();
+    } catch (const std::bad_alloc&) {
+        return false;
+    }
+}
+
 Vector<cookie> dirtyItems() {
     ManagerState& state = managerState();
     const std::lock_guard hold(state.dirtyMutex);
     return {state.dirty.begin(), state.dirty.end()};
 }
 
+/// So many edits share one sync of their folder.
+constexpr size_t kTogether = 32;
+
+/// Writes edits and then makes their names durable. One by one, not as an `AtomicBatch`: that would wait for
+/// all that the file system has not written yet, media too, and nobody else may touch the edits meanwhile.
+bool writeTogether(std::span<const cookie> items, const MilestoneRing& milestones) {
+    ManagerState& state = managerState();
+    bool allWritten = true;
+    Qx::FolderSyncs names;
+    Vector<EditPtr> written;
+    for (const cookie& item : items) {
+        const EditPtr edit = cachedEdit(item);
+        if (!edit.valid()) {
+            state.removeFromDirtyList(item);
+        } else if (!inMemory([&] { return writeCached(item, edit, &milestones); })) {
+            allWritten = false;
+        } else {
+            written.push_back(edit);
+        }
+    }
+    if (const Qx::FileError error = names.commit()) {
+        allWritten = false;
+        herc_printf("edit_manager::flush_changes: %s\n", error.text().c_str());
+        for (const EditPtr& edit : written) {
+            const SectionHold section(edit);
+            edit->init_dirty();
+            state.addToDirtyList(edit->get_cookie());
+        }
+    }
+    return allWritten;
+}
+
 } // namespace
 
-bool writeCached(const cookie& item, const EditPtr& edit, const MilestoneRing* milestones) {
+bool writeCached(const cookie& item, const EditPtr& edit, const MilestoneRing* milestones, bool isLast) {
     ManagerState& state = managerState();
     const CachedEditScope scope(item, edit);
     if (!scope.isWritable() || scope.entry() == nullptr) {
         return scope.isWritable();
     }
     ManagerState::CachedEdit& entry = *scope.entry();
-    // Before the question: what becomes dirty from here on goes onto the list again.
-    state.removeFromDirtyList(item);
+    if (isLast) {
+        return state.writeLast(entry);
+    }
     if (!edit->needsToBeWritten()) {
+        state.removeFromDirtyList(item);
         return true;
     }
-    const bool written = milestones != nullptr && milestones->isMilestoneBackupRequired(edit)
-                             ? writeWithMilestone(entry, *milestones)
-                             : state.write(entry);
-    if (!written) {
-        state.addToDirtyList(item);
-    }
-    return written;
+    return milestones != nullptr && milestones->isMilestoneBackupRequired(edit)
+               ? writeWithMilestone(entry, *milestones)
+               : state.write(entry);
 }
 
 bool edit_manager::flush_edit(const cookie& item) {
@@ -83,19 +129,13 @@ bool edit_manager::flush_changes() {
         if (!items.empty()) {
             static_cast<void>(writers.take(true).isOk());
         }
-        // One by one, not as an `AtomicBatch`: that would wait for all that the file system has not written
-        // yet, media too, and nobody else may touch the edits meanwhile.
-        for (const cookie& item : items) {
-            const EditPtr edit = cachedEdit(item);
-            if (!edit.valid()) {
-                state.removeFromDirtyList(item);
-            } else if (!writeCached(item, edit, &milestones)) {
-                allWritten = false;
-            }
+        for (size_t from = 0; from < items.size(); from += kTogether) {
+            const size_t count = std::min(kTogether, items.size() - from);
+            allWritten = writeTogether({items.data() + from, count}, milestones) && allWritten;
         }
         const cookie project = get_current_project_cookie();
         if (const EditPtr edit = cachedEdit(project); edit.valid()) {
-            allWritten = writeCached(project, edit, nullptr) && allWritten;
+            allWritten = inMemory([&] { return writeCached(project, edit, nullptr); }) && allWritten;
         }
     }
     storeRecords();
@@ -127,7 +167,7 @@ void reportLost(const cookie& item) {
 bool closeUnreferenced(const cookie& item, ManagerState::CachedEdit& entry) {
     ManagerState& state = managerState();
     while (entry.edit.valid()) {
-        const ManagerState::Unreferenced outcome = state.writeUnreferenced(entry);
+        const ManagerState::Unreferenced outcome = state.writeUnreferenced(entry, true);
         if (outcome == ManagerState::Unreferenced::InUse) {
             return false;
         }
@@ -143,14 +183,29 @@ bool closeUnreferenced(const cookie& item, ManagerState::CachedEdit& entry) {
     return state.removeCacheEntry(item) != nullptr;
 }
 
+/// The folder of the edits in the cache; empty when it has none.
+String folderOfCache() {
+    ManagerState& state = managerState();
+    const ManagerState::Hold hold(state.lock);
+    for (const auto& [item, entry] : state.cache) {
+        if (!entry->path.empty()) {
+            return Qx::folderOf(entry->path);
+        }
+    }
+    return {};
+}
+
 /// Closes all that nobody else holds. Appends the items that others hold.
 void closeUnreferenced(Vector<cookie>& held) {
     ManagerState& state = managerState();
+    EditManagerLock writers(folderOfCache());
+    static_cast<void>(writers.take(true).isOk()); // waited for before the lock is held
     const ManagerState::Hold hold(state.lock);
+    held.reserve(state.cache.size());
     for (auto place = state.cache.begin(); place != state.cache.end();) {
         const cookie item = place->first;
         ManagerState::CachedEdit& entry = *place++->second;
-        if (!closeUnreferenced(item, entry)) {
+        if (!inMemory([&] { return closeUnreferenced(item, entry); })) {
             held.push_back(item);
         }
     }
@@ -164,7 +219,7 @@ void closeHeld(const cookie& item, const EditPtr& edit) {
     // Who held it may have changed it and let it go since it was written.
     constexpr int kTries = 3;
     for (int tries = 1; dropped == nullptr; ++tries) {
-        written = writeCached(item, edit, nullptr);
+        written = inMemory([&] { return writeCached(item, edit, nullptr, true); });
         const ManagerState::Hold hold(state.lock);
         const ManagerState::CachedEdit* const found = state.findCacheEntry(item);
         if (found == nullptr || found->edit != edit) {

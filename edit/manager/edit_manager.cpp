@@ -8,8 +8,20 @@
 #include "platform/services/network.h"
 
 #include <algorithm>
+#include <atomic>
+#include <cstdio>
+#include <cstdlib>
+#include <exception>
+#include <mutex>
+#include <unistd.h>
 
 namespace {
+
+/// The process that made the manager.
+std::atomic<pid_t>& maker() {
+    static std::atomic<pid_t> process{0};
+    return process;
+}
 
 void hear(const Qx::Network::Message& message) {
     switch (message.kind) {
@@ -24,22 +36,68 @@ void hear(const Qx::Network::Message& message) {
     }
 }
 
+/// Called when the process ends: what a program left open is written. Not in a process that was split off
+/// from the one that opened it.
+void closeAtExit() {
+    if (edit_manager::theEditManager() != nullptr && ::getpid() == maker().load()) {
+        edit_exit();
+    }
+}
+
+/// Makes the manager for a program that never did; not again after it was shut down.
+EditRegistry* makeFirstManager() {
+    ManagerState& state = managerState();
+    static std::mutex making;
+    const std::lock_guard hold(making);
+    if (!state.wasMade) {
+        new edit_manager;
+    }
+    return state.instance.load();
+}
+
+/// From when on the first opening makes one.
+[[maybe_unused]] const bool isOffered = (EditRegistry::setMaker(makeFirstManager), true);
+
+/// A step of the shut-down. Nothing that fails in it keeps the next one from its turn.
+template <typename Step>
+void shutDown(Step&& step) noexcept {
+    try {
+        step();
+    } catch (const std::exception&) {
+        std::fputs("edit_manager: a step of shutting down failed; there may not be enough memory\n", stderr);
+    }
+}
+
 } // namespace
+
+edit_manager* managerForOpening() {
+    ManagerState& state = managerState();
+    if (state.instance.load() == nullptr && !state.wasMade) {
+        static_cast<void>(makeFirstManager());
+    }
+    return state.instance.load();
+}
 
 edit_manager::edit_manager() {
     ManagerState& state = managerState();
     Qx::Network::setNetworkMode(false);
     delete state.instance.load();
+    static const bool isHooked = std::atexit(closeAtExit) == 0;
+    static_cast<void>(isHooked);
+    maker() = ::getpid();
     {
         const ManagerState::Hold hold(state.lock);
+        ++state.epoch;
         state.newProject = cookie("P0001000");
         state.backupDepth = std::max(config_int("backup_depth", 10), 1);
         state.cacheLimit = ManagerState::kLimitNotRead;
         state.cachedAtLastOpen = 0;
         state.projectGeneration = 0;
         state.instance = this;
+        state.wasMade = true;
         const std::lock_guard holdLookup(state.lookup);
         state.lastOpened = invalid_cookie;
+        state.isLeaving = false;
     }
     EditRegistry::install(this);
     static_cast<void>(check_current_project(eOpenOrCreate));
@@ -53,7 +111,7 @@ edit_manager::edit_manager() {
 
 edit_manager::~edit_manager() {
     ManagerState& state = managerState();
-    herc_printf("edit_manager::~edit_manager: closing down edit manager\n");
+    shutDown([] { herc_printf("edit_manager::~edit_manager: closing down edit manager\n"); });
     m_listening.reset();
     std::function<void(bool)> uiDelete;
     std::function<bool()> confirmUpdate;
@@ -63,21 +121,27 @@ edit_manager::~edit_manager() {
         confirmUpdate.swap(state.confirmUpdate);
     }
     if (get_crash_flag() != 0) {
-        flush_changes();
+        shutDown([] { flush_changes(); });
     }
-    if (state.records.isOpen() && confirmUpdate && confirmUpdate() && !update_projdb()) {
-        herc_printf("edit_manager::~edit_manager: projdb update interrupted\n");
-    }
+    shutDown([&] {
+        if (state.records.isOpen() && confirmUpdate && confirmUpdate() && !update_projdb()) {
+            herc_printf("edit_manager::~edit_manager: projdb update interrupted\n");
+        }
+    });
     if (uiDelete) {
-        uiDelete(true);
+        shutDown([&] { uiDelete(true); });
     }
-    state.instance = nullptr; // from here on nothing opens any more
-    close_all_edits();
-    state.records.close();
+    // From here on nothing opens any more, and what is being opened is handed to nobody.
+    state.instance = nullptr;
+    state.setLeaving(true);
+    shutDown([] { close_all_edits(); });
+    shutDown([&] { state.records.close(); });
     EditRegistry::install(nullptr);
     const ManagerState::Hold hold(state.lock);
+    ++state.epoch;
     state.project = invalid_cookie;
     state.projectGeneration = 0;
+    state.setLeaving(false);
     const std::lock_guard holdDirty(state.dirtyMutex);
     state.dirty.clear();
 }

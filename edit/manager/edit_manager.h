@@ -32,15 +32,23 @@ struct EditCacheEntry {
 /// (`projdb`).
 ///
 /// All operations are static; the one instance exists for its roles towards others: it is the model's
-/// `EditRegistry` and hears messages of other seats. Without an instance opening yields a null handle.
+/// `EditRegistry` and hears messages of other seats. It is made when the first edit is opened, unless the
+/// application made one before, and shut down by `edit_exit`, which the library calls itself when the process
+/// ends (`exit`, return from `main`): what is still open then is written, so that a program which forgets to
+/// close loses nothing. A thread that holds an edit's section is waited for. After a shut-down opening yields
+/// a null handle until another instance is made.
 ///
 /// Threads: any thread may call anything. One recursive lock guards the cache, the project edit and every
 /// write of an edit file made here; it is never held while an edit file is read, and finding an edit in the
 /// cache takes a lock of its own for a few instructions. Openings of one item take
 /// turns. An edit itself is not locked: who changes it while another thread flushes must hold its section, as
-/// the flush does. Under an edit's section every operation may be called but those that write many edits
-/// (`flush_changes`, `close_all_edits`, undo and redo, which flush, and leaving a project): they take the
-/// sections of others. Observers are told under none of the manager's locks.
+/// the flush does. Under an edit's section every operation may be called but leaving a project and closing
+/// all edits. Threads that are inside one edit each and want the other's written, backed up or read again do
+/// not wait for each other for ever: one is refused, with nothing changed. Observers are told under none of
+/// the manager's locks.
+///
+/// Projects: what was opened for one project is never found from another, nor written into it. While a
+/// project is being left, opening yields a null handle, which is not remembered.
 ///
 /// Processes: what is written, renamed and deleted here is so under the project's `EditManagerLock`. A file
 /// that another process put in an edit's place since it was read is never lost: it becomes an undo backup
@@ -66,7 +74,10 @@ public:
 
     /// \name Opening and the cache
     /// A cached edit, or a failure that is remembered, costs one lookup, no file and no memory, and waits for
-    /// nobody who writes.
+    /// nobody who writes, also with a limit to the cache. A failure is remembered only where it is one for
+    /// certain: not while there are backups of the item, and not when the system, another process or a lack
+    /// of memory kept its file from being read. `eOpenOrCreate` makes a fresh edit only then too. What lies
+    /// at the edit's name and is no regular file (a symbolic link, a folder) is neither read nor replaced.
     /// @{
     [[nodiscard]] EditPtr open(const cookie& item, eEditOpenBehaviour behaviour) override;
     /// The same without an instance at hand.
@@ -77,7 +88,9 @@ public:
     [[nodiscard]] static size_t numCached();
     /// With `limit` not -1 and at least `limit` entries: writes and drops the first edit, in the order of
     /// cookies, that nobody but the cache holds. At most one a call. An edit with changes that cannot be
-    /// written stays, and the next one is tried.
+    /// written, also because another process keeps the lock, stays, and the next one is tried. What
+    /// "edit_cache_size" asks for at each opening is less: it waits for no thread and looks at some edits
+    /// only, each time the next ones.
     static void limitEditCache(int limit);
     /// Drops an edit from the cache, unwritten, so that the next opening reads its file; forgets a remembered
     /// failure. Handles that others hold stay usable, but their edit is no longer the item's: changes to it
@@ -100,7 +113,8 @@ public:
     void addToDirtyList(const cookie& item) override;
     /// How many edits wait to be written.
     [[nodiscard]] static size_t numDirty();
-    /// Writes every edit and empties the cache; edits that others hold are logged with their references, and
+    /// Writes every edit and empties the cache; one whose file became a backup and was not written since gets
+    /// its file back. Edits that others hold are logged with their references, and
     /// changes to them are not written any more. One that could not be written is told of on standard output
     /// too.
     static void close_all_edits();
@@ -162,7 +176,8 @@ public:
     /// Ok if a project is current. When the application has set another one meanwhile, the edits of the one
     /// before are written to their own folder and closed, and that one is adopted.
     static eStatus check_current_project(eEditOpenBehaviour behaviour);
-    /// Flushes, tells observers of "editmanExitProject", closes every edit and the project's records.
+    /// Flushes, tells observers of "editmanExitProject", closes every edit and the project's records. Nothing
+    /// when another thread is leaving the project.
     static void exitProject();
     /// The edit of the project's own cookie, opened or made when it is first asked for; null without a
     /// project. Valid until the edits are closed.
@@ -240,5 +255,7 @@ private:
     std::shared_ptr<void> m_listening; ///< to other seats, for a user with the network right
 };
 
-/// The library's exit hook: reports and destroys the manager. After a crash it says what was open.
+/// The library's exit hook: reports and destroys the manager, which writes what is open. After a crash it
+/// says what was open. The library calls it when the process ends, unless the application did or the process
+/// is a copy (`fork`) of the one that opened the edits; calling it again does no harm.
 QM_API void edit_exit();

@@ -2,9 +2,13 @@
 
 #include "platform/services/current_project.h"
 #include "platform/services/file_lock.h"
+#include "platform/services/log.h"
 
+#include <algorithm>
+#include <chrono>
 #include <map>
 #include <mutex>
+#include <thread>
 
 namespace {
 
@@ -15,8 +19,8 @@ struct HeldLock {
     unsigned count = 0;
 };
 
-/// The locks that this process holds, by project folder. The mutex is held while another process is waited
-/// for: whoever else asks has to wait for it all the same.
+/// The locks that this process holds, by project folder. Nothing is waited for under the mutex: a thread that
+/// holds other locks of the manager passes as soon as another thread of this process has the lock.
 struct HeldLocks {
     std::mutex mutex;
     std::map<String, HeldLock> byFolder;
@@ -37,7 +41,32 @@ EditManagerLock::~EditManagerLock() {
     release();
 }
 
-Qx::Status EditManagerLock::take(bool wait) {
+Qx::Status EditManagerLock::take(bool wait, bool* isBusy) {
+    using Clock = std::chrono::steady_clock;
+    constexpr std::chrono::milliseconds kLongestPause{16};
+    constexpr std::chrono::seconds kPatience{1};
+    const Clock::time_point start = Clock::now();
+    std::chrono::milliseconds pause{1};
+    bool isTold = false;
+    bool busy = false;
+    Qx::Status status = tryToTake(busy);
+    while (wait && busy) {
+        if (!isTold && Clock::now() - start >= kPatience) {
+            isTold = true;
+            herc_printf("edit_manager: waiting to write: %s\n", status.reason().c_str());
+        }
+        std::this_thread::sleep_for(pause);
+        pause = std::min(pause * 2, kLongestPause);
+        status = tryToTake(busy);
+    }
+    if (isBusy != nullptr) {
+        *isBusy = busy;
+    }
+    return status;
+}
+
+Qx::Status EditManagerLock::tryToTake(bool& isBusy) {
+    isBusy = false;
     if (m_isHeld || m_folder.empty()) {
         return {};
     }
@@ -45,7 +74,7 @@ Qx::Status EditManagerLock::take(bool wait) {
     const std::lock_guard hold(locks.mutex);
     const auto place = locks.byFolder.try_emplace(m_folder, m_folder).first;
     if (place->second.count == 0) {
-        if (Qx::Status status = place->second.file.take(wait); !status) {
+        if (Qx::Status status = place->second.file.take(false, &isBusy); !status) {
             locks.byFolder.erase(place);
             return status;
         }

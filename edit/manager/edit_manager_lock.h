@@ -26,16 +26,19 @@ public:
     EditManagerLock(const EditManagerLock&) = delete;
     EditManagerLock& operator=(const EditManagerLock&) = delete;
 
-    /// Takes the lock. Without `wait`, one that another process holds is a failure that names the holder.
-    /// Fails too when the folder is not there or cannot be written. Without a project folder there is nothing
-    /// to lock, which is a success. Taking what this object holds is a success.
-    Qx::Status take(bool wait = false);
+    /// Takes the lock. Without `wait`, one that another process holds is a failure that names the holder, and
+    /// `isBusy` tells it from the others; waiting for longer than a moment is told on the log. Fails too when
+    /// the folder is not there or cannot be written. Without a project folder there is nothing to lock, which
+    /// is a success. Taking what this object holds is a success.
+    Qx::Status take(bool wait = false, bool* isBusy = nullptr);
     void release();
     [[nodiscard]] bool isHeld() const { return m_isHeld; }
 
     static constexpr const char* kFileName = "Edits.lock";
 
 private:
+    Qx::Status tryToTake(bool& isBusy);
+
     String m_folder;
     bool m_isHeld = false;
 };

@@ -6,36 +6,79 @@
 #include "platform/services/log.h"
 
 #include <algorithm>
+#include <chrono>
+#include <thread>
+#include <utility>
 
 namespace {
 
-/// Takes the project that the application has set as the current one.
-eStatus adoptProject(unsigned generation) {
+/// The leaving of a project that has begun. Whatever keeps another one from being adopted, edits can be
+/// opened again afterwards.
+class Leaving {
+public:
+    Leaving() = default;
+    ~Leaving() { end(); }
+    Leaving(const Leaving&) = delete;
+    Leaving& operator=(const Leaving&) = delete;
+    void end() {
+        if (!std::exchange(m_isOver, true)) {
+            managerState().setLeaving(false);
+        }
+    }
+
+private:
+    bool m_isOver = false;
+};
+
+/// Takes a project in the place of the one that was left, and lets edits be opened again.
+eStatus adoptProject(const Qx::CurrentProject* wanted, Leaving& leaving) {
     ManagerState& state = managerState();
-    const Qx::CurrentProject current = Qx::currentProject();
-    const String folder = current.folder();
+    Qx::CurrentProject current;
+    String folder;
     {
         const ManagerState::Hold hold(state.lock);
+        if (wanted != nullptr) {
+            Qx::setCurrentProject(*wanted);
+        }
+        // Asked before the project itself: when another one is set meanwhile, it is seen to be out of date.
+        const unsigned generation = Qx::currentProjectGeneration();
+        current = Qx::currentProject();
+        folder = current.folder();
+        ++state.epoch;
         state.project = folder.empty() ? invalid_cookie : current.project;
         state.projectGeneration = generation;
+        if (!folder.empty()) {
+            state.records.use(folder);
+        }
+        leaving.end();
     }
     if (folder.empty()) {
         return eStatus::NoProject;
     }
-    state.records.use(folder);
     state.tell(edit_manager::projChangedMsgType(), current.project);
     return eStatus::Ok;
 }
 
-/// Writes and drops what belongs to the project.
-void leaveProject() {
+/// Writes and drops what belongs to the project. Nothing is opened until another one is adopted.
+void dropProject() {
     ManagerState& state = managerState();
-    state.tell(edit_manager::projExitMsgType(), edit_manager::get_current_project_cookie());
     edit_manager::close_all_edits();
     state.records.close();
     const ManagerState::Hold hold(state.lock);
+    ++state.epoch;
     state.project = invalid_cookie;
     state.projectGeneration = 0;
+}
+
+/// Tells that the project is being left, and begins to. False if there is none, or another thread does.
+bool beginToLeave() {
+    ManagerState& state = managerState();
+    const cookie project = edit_manager::get_current_project_cookie();
+    if (project.is_valid()) {
+        edit_manager::flush_changes();
+        state.tell(edit_manager::projExitMsgType(), project);
+    }
+    return state.setLeaving(true);
 }
 
 /// The settings of a project that is not the current one.
@@ -73,27 +116,26 @@ size_t numEditFiles(const cookie& project) {
 
 eStatus edit_manager::check_current_project(eEditOpenBehaviour) {
     ManagerState& state = managerState();
-    const unsigned generation = Qx::currentProjectGeneration();
-    bool leaves = false;
+    cookie left;
     {
         const ManagerState::Hold hold(state.lock);
-        if (state.projectGeneration.load() == generation) {
+        // Who leaves a project at the moment adopts the next one too.
+        if (state.projectGeneration.load() == Qx::currentProjectGeneration() || !state.setLeaving(true)) {
             return state.project.is_valid() ? eStatus::Ok : eStatus::NoProject;
         }
-        // Others that ask meanwhile go on: the edits in the cache know their files.
-        state.projectGeneration = generation;
-        leaves = state.project.is_valid();
+        left = state.project;
     }
-    if (leaves) {
-        // Rates are asked of the project that is current already: what would be recorded may be wrong.
-        state.records.close();
-        leaveProject();
+    Leaving leaving;
+    // Rates are asked of the project that is current already: what would be recorded may be wrong.
+    state.records.close();
+    if (left.is_valid()) {
+        state.tell(projExitMsgType(), left);
     }
-    return adoptProject(generation);
+    dropProject();
+    return adoptProject(nullptr, leaving);
 }
 
 eStatus edit_manager::set_current_project(const cookie& project, eEditOpenBehaviour behaviour) {
-    ManagerState& state = managerState();
     Qx::CurrentProject wanted = Qx::currentProject();
     wanted.project = project;
     if (project.type() != Cookie_Type::Project || wanted.folder().empty()) {
@@ -134,21 +176,20 @@ eStatus edit_manager::set_current_project(const cookie& project, eEditOpenBehavi
         }
         wanted.dropFrame = wanted.dropFrame && Qx::FrameRate(wanted.frameRateCode).hasDropFrame();
     }
-    bool leaves = false;
-    {
-        const ManagerState::Hold hold(state.lock);
-        leaves = state.project.is_valid();
+    // Two threads that set projects do so one after the other.
+    while (!beginToLeave()) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
     }
-    if (leaves) {
-        exitProject();
-    }
-    Qx::setCurrentProject(wanted);
-    return adoptProject(Qx::currentProjectGeneration());
+    Leaving leaving;
+    dropProject();
+    return adoptProject(&wanted, leaving);
 }
 
 void edit_manager::exitProject() {
-    flush_changes();
-    leaveProject();
+    if (beginToLeave()) {
+        const Leaving leaving;
+        dropProject();
+    }
 }
 
 Edit* edit_manager::get_current_project() {
@@ -165,7 +206,9 @@ Edit* edit_manager::get_current_project() {
     }
     const EditPtr opened = openEdit(project, eOpenOrCreate);
     const ManagerState::Hold hold(state.lock);
-    if (!state.projectEdit.valid()) {
+    const ManagerState::CachedEdit* const found = state.findCacheEntry(project);
+    // Not one of a project that was left meanwhile.
+    if (!state.projectEdit.valid() && !state.isLeaving && found != nullptr && found->edit == opened) {
         state.projectEdit = opened;
     }
     return state.projectEdit;

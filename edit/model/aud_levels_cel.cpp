@@ -67,7 +67,8 @@ AudLevelsCel AudLevelsCel::clone() const {
 }
 
 const AudLevelsCel::Store& AudLevelsCel::getNodeStore() const {
-    static const Store none;
+    // Never destroyed: what is open is written while the process ends.
+    static const Store& none = *new Store;
     const Contents* const contents = m_contents.get();
     return contents != nullptr ? contents->nodes : none;
 }

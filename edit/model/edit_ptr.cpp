@@ -14,7 +14,7 @@ EditPtr::EditPtr(const EditPtr& other) {
 }
 
 EditPtr::EditPtr(const cookie& item, eEditOpenBehaviour behaviour) {
-    if (EditRegistry* registry = EditRegistry::current()) {
+    if (EditRegistry* registry = EditRegistry::forOpening()) {
         EditPtr opened = registry->open(item, behaviour);
         std::swap(m_edit, opened.m_edit);
     }
@@ -27,7 +27,7 @@ EditPtr::~EditPtr() {
 EditPtr& EditPtr::open(const cookie& item, eEditOpenBehaviour behaviour) {
     const cookie wanted = item; // `item` may live in the edit that is released here
     invalidate();
-    if (EditRegistry* registry = EditRegistry::current()) {
+    if (EditRegistry* registry = EditRegistry::forOpening()) {
         *this = registry->open(wanted, behaviour);
     }
     return *this;

@@ -4,7 +4,8 @@
 
 namespace {
 std::atomic<EditRegistry*> installed{nullptr};
-}
+std::atomic<EditRegistry::Maker> makes{nullptr};
+} // namespace
 
 EditRegistry::~EditRegistry() {
     EditRegistry* self = this;
@@ -13,6 +14,16 @@ EditRegistry::~EditRegistry() {
 
 EditRegistry* EditRegistry::current() {
     return installed.load();
+}
+
+EditRegistry* EditRegistry::forOpening() {
+    EditRegistry* const present = current();
+    const Maker maker = makes.load();
+    return present != nullptr || maker == nullptr ? present : maker();
+}
+
+void EditRegistry::setMaker(Maker maker) {
+    makes = maker;
 }
 
 EditRegistry* EditRegistry::install(EditRegistry* registry) {

@@ -1,4 +1,5 @@
 #include "edit/model/channel_group_list.h"
+#include "edit/model/edit_registry.h"
 #include "edit/persist/detail/edit_salvaging.h"
 #include "edit/persist/detail/stored_channels.h"
 #include "platform/base/attrib_value_pair.h"
@@ -419,14 +420,8 @@ void EditFile::lendCels(Edit& edit) {
     edit.m_storedCels = std::move(lent);
 }
 
-void EditFile::extractCelsFromStore(Edit& edit, bool written) {
+void EditFile::extractCelsFromStore(Edit& edit, bool written) noexcept {
     edit.m_store.releaseLent();
-    for (int i = 0; i < edit.getNumChans(); ++i) {
-        const AudLevelsCel levels = edit.getLevelsCel(edit.getId(i));
-        if (levels.valid()) {
-            levels.extractFromStore(edit.m_store);
-        }
-    }
     if (!written) {
         // What the store holds under each name is not known after a failure: the next save packs every cel.
         edit.m_storedCels.reset();
@@ -436,12 +431,10 @@ void EditFile::extractCelsFromStore(Edit& edit, bool written) {
 // ---- both
 
 void EditFile::reset(Edit& edit) {
-    {
-        const Quiet quiet(edit);
-        edit.removeChans(false);
-        edit.get_cues().delete_all_cues();
-        edit.m_storedCels.reset();
-    }
+    const Quiet quiet(edit);
+    edit.removeChans(false);
+    edit.get_cues().delete_all_cues();
+    edit.m_storedCels.reset();
     const cookie item = edit.m_cookie;
     edit.init();
     edit.m_cookie = item;
@@ -457,4 +450,11 @@ void EditFile::markWritten(Edit& edit) {
         }
     }
     edit.set_dirty(false);
+}
+
+void EditFile::markUnwritten(Edit& edit) {
+    edit.init_dirty();
+    if (EditRegistry* const registry = EditRegistry::current()) {
+        registry->addToDirtyList(edit.m_cookie);
+    }
 }

@@ -6,6 +6,7 @@
 #include "platform/store/edit_header_proxy.h"
 
 #include <exception>
+#include <new>
 
 namespace {
 
@@ -17,6 +18,18 @@ cookie cookieOfPath(const String& path) {
 bool isNoItem(const cookie& item) {
     return !item.is_valid() || (item.word(0) == 0 && item.word(1) == 0 && item.word(2) == 0);
 }
+
+/// Keeps an edit from going while it is read; it is destroyed by nobody else than its holder afterwards.
+class Reading {
+public:
+    explicit Reading(Edit& edit) : m_edit(edit) { edit.incRefCount(); }
+    ~Reading() { m_edit.decRefCount(); }
+    Reading(const Reading&) = delete;
+    Reading& operator=(const Reading&) = delete;
+
+private:
+    Edit& m_edit;
+};
 
 } // namespace
 
@@ -43,17 +56,19 @@ Edit::ReadFileRC Edit::read_file(const cookie& item, eEditOpenBehaviour behaviou
 }
 
 Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviour) {
-    incRefCount();
-    m_loading = true;
     const String file = Qx::narrow(path);
     const cookie item = cookieOfPath(file);
     if (isNoItem(item)) {
+        incRefCount();
+        m_loading = true;
         // The reference stays held and the edit stays flagged as loading: whoever asked for such a name must
         // not find the edit usable or see it go.
         EditFile::fail(*this, "cannot read an edit from \"" + file +
                                   "\": its name is not that of an item; rename the file to its cookie");
         return kReadFailed;
     }
+    const Reading reading(*this);
+    const EditFile::Raised loading(m_loading);
     m_cookie = item;
     if (getNumChans() > 0 &&
         (behaviour == eOpenExisting || (behaviour == eOpenOrCreate && Qx::askFile(file).isRegular()))) {
@@ -70,6 +85,8 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
             try {
                 doEditConversions();
                 result = kReadOk;
+            } catch (const std::bad_alloc&) {
+                throw; // says nothing of the file
             } catch (const std::exception& error) {
                 m_bad = true;
                 EditFile::fail(*this, file + " was read, but bringing it up to date failed: " + error.what());
@@ -95,8 +112,6 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
         m_bad = false;
         m_fileError.clear();
     }
-    m_loading = false;
-    decRefCount();
     return result;
 }
 

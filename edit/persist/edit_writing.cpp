@@ -44,9 +44,17 @@ bool Edit::write_file(const WString& path) {
         return EditFile::fail(*this, get_cookie_str() +
                                          " needs no writing: it is unchanged, read-only or temporary");
     }
-    m_writing = true;
-    const bool stored = store(path);
-    m_writing = false;
+    bool stored = false;
+    try {
+        const EditFile::Raised writing(m_writing);
+        stored = store(path);
+    } catch (...) {
+        EditFile::markUnwritten(*this);
+        throw;
+    }
+    if (!stored) {
+        EditFile::markUnwritten(*this);
+    }
     if (stored && Qx::Network::networkMode()) {
         const String user = PermissionsManager::getCurrentUser();
         Qx::Network::send({Qx::Network::EditWritten, m_cookie, user});
@@ -107,17 +115,19 @@ bool Edit::store(const WString& path) {
             EditFile::renumberFor(*this, EditFile::storedChannels(*this), *cues);
         }
         storeGroups();
-        EditFile::lendCels(*this);
         const EditHeaderProxy header(m_header);
+        EditFile::Lending lending(*this);
+        EditFile::lendCels(*this);
         m_store.lendObject(EditHeaderProxy::EditHeaderId, header, true);
         status = m_store.flush();
-        EditFile::extractCelsFromStore(*this, status.isOk());
+        if (status) {
+            lending.setWritten();
+        }
         if (m_debug) {
             herc_printf(status ? "Stored the configb \n" : "Failed to store the configb \n");
         }
     }
     if (!status) {
-        init_dirty();
         return EditFile::fail(*this, status.reason());
     }
     EditFile::markWritten(*this);

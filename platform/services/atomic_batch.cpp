@@ -1,6 +1,7 @@
 #include "platform/services/atomic_batch.h"
 
 #include <iterator>
+#include <new>
 #include <set>
 #include <utility>
 
@@ -9,14 +10,20 @@ namespace Qx {
 namespace {
 
 thread_local AtomicBatch* innermost = nullptr;
+thread_local FolderSyncs* gathering = nullptr;
 
 } // namespace
 
 AtomicBatch::AtomicBatch() : m_outer(std::exchange(innermost, this)) {}
 
 AtomicBatch::~AtomicBatch() {
-    removeTemporaries(0);
     innermost = m_outer;
+    try {
+        removeTemporaries(0);
+    } catch (const std::bad_alloc&) {
+        // Without memory for the tale of a failure temporary files stay, as after a kill.
+        m_entries.clear();
+    }
 }
 
 AtomicBatch* AtomicBatch::current() {
@@ -96,6 +103,41 @@ AtomicBatch::Pause::Pause() : m_paused(std::exchange(innermost, nullptr)) {}
 
 AtomicBatch::Pause::~Pause() {
     innermost = m_paused;
+}
+
+FolderSyncs::FolderSyncs() : m_outer(gathering) {
+    if (m_outer == nullptr) {
+        gathering = this;
+    }
+}
+
+FolderSyncs::~FolderSyncs() {
+    try {
+        static_cast<void>(commit().code);
+    } catch (const std::bad_alloc&) {
+        m_folders.clear();
+    }
+    gathering = m_outer;
+}
+
+bool FolderSyncs::defer(const String& folder) {
+    if (gathering == nullptr) {
+        return false;
+    }
+    gathering->m_folders.insert(folder);
+    return true;
+}
+
+FileError FolderSyncs::commit() {
+    FileError failure;
+    for (auto folder = m_folders.begin(); folder != m_folders.end();) {
+        FileError error = retryInterrupted([&] { return fileSystem().syncFolder(*folder); });
+        folder = error ? std::next(folder) : m_folders.erase(folder);
+        if (error && !failure) {
+            failure = std::move(error);
+        }
+    }
+    return failure;
 }
 
 } // namespace Qx

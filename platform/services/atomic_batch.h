@@ -2,6 +2,8 @@
 
 #include "platform/services/files.h"
 
+#include <set>
+
 namespace Qx {
 
 /// Makes many files durable for the price of about one. While a batch is open, `AtomicFile::commit` on this
@@ -70,6 +72,31 @@ private:
     AtomicBatch* m_outer;
     std::vector<Entry> m_entries;
     size_t m_numReplaced = 0;
+};
+
+/// Makes the names of many files durable together. While one is open, each `AtomicFile` that is committed on
+/// this thread makes its bytes durable and takes its name at once, but leaves the sync of the folder to
+/// `commit`: until then a crash may bring the old file back. A sync waits for the disk, so that of one folder
+/// a file costs as much as the file. Used on the thread that made it, as a local variable; one inside another
+/// leaves the folders to the outer one.
+class QM_API FolderSyncs {
+public:
+    FolderSyncs();
+    /// Syncs what was not committed; a failure is not reported.
+    ~FolderSyncs();
+    FolderSyncs(const FolderSyncs&) = delete;
+    FolderSyncs& operator=(const FolderSyncs&) = delete;
+
+    /// Syncs each folder. On a failure all are tried, and tried again by the next call.
+    FileError commit();
+
+private:
+    friend class AtomicFile;
+    /// False when none is open: the caller syncs the folder itself.
+    static bool defer(const String& folder);
+
+    FolderSyncs* m_outer;
+    std::set<String> m_folders;
 };
 
 } // namespace Qx

@@ -8,6 +8,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <charconv>
+#include <new>
 #include <optional>
 #include <unistd.h>
 
@@ -50,7 +51,12 @@ bool allOf(std::string_view text, std::string_view set) {
 AtomicFile::AtomicFile(String path) : m_path(std::move(path)) {}
 
 AtomicFile::~AtomicFile() {
-    discard();
+    try {
+        discard();
+    } catch (const std::bad_alloc&) {
+        // Without memory for the tale of a failure the temporary file stays, as after a kill.
+        m_file.reset();
+    }
 }
 
 FileError AtomicFile::openTemporary() {
@@ -163,14 +169,17 @@ FileError AtomicFile::finishTemporary(bool sync) {
 }
 
 FileError AtomicFile::replace(bool durable) {
+    // Memory is asked for before the file is in place.
+    const String folder = folderOf(m_path);
+    const bool isDeferred = durable && FolderSyncs::defer(folder);
     if (auto error = retryInterrupted([&] { return fileSystem().rename(m_temporary, m_path); })) {
         return fail(error);
     }
     m_temporary.clear();
     m_replaced = true;
     m_done = true;
-    if (durable) {
-        m_failed = retryInterrupted([&] { return fileSystem().syncFolder(folderOf(m_path)); });
+    if (durable && !isDeferred) {
+        m_failed = retryInterrupted([&] { return fileSystem().syncFolder(folder); });
     }
     return m_failed;
 }

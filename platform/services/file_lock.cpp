@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <new>
 #include <unistd.h>
 
 namespace Qx {
@@ -58,7 +59,10 @@ FileLock::~FileLock() {
     release();
 }
 
-Status FileLock::take(bool wait) {
+Status FileLock::take(bool wait, bool* isBusy) {
+    if (isBusy != nullptr) {
+        *isBusy = false;
+    }
     if (m_file) {
         return {};
     }
@@ -71,6 +75,9 @@ Status FileLock::take(bool wait) {
         return Status::failure(error.text());
     }
     if (!taken) {
+        if (isBusy != nullptr) {
+            *isBusy = true;
+        }
         const String who = holder(m_path);
         return Status::failure(m_path + " is locked by " + (who.empty() ? String("another process") : who) +
                                "; try again when it has finished");
@@ -82,19 +89,24 @@ Status FileLock::take(bool wait) {
 
 void FileLock::release() {
     if (m_file) {
-        writeHolder(String());
+        writeHolder({});
         m_file.reset();
     }
 }
 
-void FileLock::writeHolder(const String& text) {
-    // A courtesy: the lock holds whether or not the disk has room for the name of its holder.
-    String padded = text.substr(0, kHolderSize - 1);
-    padded.resize(kHolderSize - 1, ' ');
-    padded += '\n';
-    if (!retryInterrupted([&] { return m_file->seek(0); })) {
-        const auto error = writeAll(*m_file, padded.data(), padded.size());
-        static_cast<void>(error);
+void FileLock::writeHolder(std::string_view text) noexcept {
+    std::array<char, kHolderSize> padded{};
+    padded.fill(' ');
+    text.copy(padded.data(), kHolderSize - 1);
+    padded.back() = '\n';
+    // A courtesy: the lock holds whether or not the disk has room for the name of its holder, or memory for
+    // the tale of a failure.
+    try {
+        if (!retryInterrupted([&] { return m_file->seek(0); })) {
+            static_cast<void>(writeAll(*m_file, padded.data(), padded.size()).code);
+        }
+    } catch (const std::bad_alloc&) {
+        return;
     }
 }
 

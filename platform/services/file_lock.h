@@ -15,14 +15,15 @@ class QM_API FileLock {
 public:
     /// Nothing is touched before `take`.
     explicit FileLock(String path);
-    /// Releases the lock.
+    /// Releases the lock, also when memory has run out.
     ~FileLock();
     FileLock(const FileLock&) = delete;
     FileLock& operator=(const FileLock&) = delete;
 
     /// Takes the lock, making the file if it is missing; its folder must exist. Without `wait`, a lock that
-    /// is held elsewhere is a failure that names the holder. A lock that this object holds is a success.
-    Status take(bool wait = true);
+    /// is held elsewhere is a failure that names the holder, and `isBusy` (if given) tells it from the
+    /// others. A lock that this object holds is a success.
+    Status take(bool wait = true, bool* isBusy = nullptr);
     void release();
     [[nodiscard]] bool isHeld() const { return m_file != nullptr; }
 
@@ -31,7 +32,7 @@ public:
     [[nodiscard]] static String holder(const String& path);
 
 private:
-    void writeHolder(const String& text);
+    void writeHolder(std::string_view text) noexcept;
 
     String m_path;
     std::unique_ptr<OpenFile> m_file;

@@ -136,10 +136,12 @@ Status StoreWriter::commit(StoreIdentity& identity, bool& replaced) {
     if (const FileError error = m_file.overwrite(0, bytes.data(), bytes.size())) {
         return Status::failure(error.text());
     }
+    // Memory is asked for before the file is in place.
+    StoreIdentity made{m_path, {}, bytes, true, false};
     const FileError error = m_file.commit();
     replaced = !error || m_file.replaced();
     if (replaced) {
-        identity = {m_path, {}, bytes, true, false};
+        std::swap(identity, made);
         // Within a batch the name still holds the old file.
         if (m_file.replaced()) {
             identity.info = askFile(m_path).info();

@@ -104,6 +104,11 @@ TagBag::OpenResult TagBag::openFile(eEditOpenBehaviour behaviour) {
     StoreVerdict verdict;
     if (const Qx::FileError error = bag.image.read(name, true, verdict)) {
         bag.image.drop();
+        if (error.code == ENOENT) {
+            // It went since it was looked at.
+            bag.openError = name + " does not exist";
+            return Missing;
+        }
         bag.openError = readFailure(error, name);
         return NotOpened;
     }
@@ -270,16 +275,14 @@ void TagBag::lendObject(std::string_view name, const Streamable& object, bool ch
     entry.changed = entry.changed || changed || entry.layer != object.layerName();
 }
 
-void TagBag::releaseLent() {
-    std::vector<String> gone;
-    for (Contents::Entry& entry : m_contents->entries) {
-        if (entry.lent != nullptr && !entry.hasBytes()) {
-            gone.push_back(entry.name);
-        }
+void TagBag::releaseLent() noexcept {
+    for (auto place = m_contents->entries.begin(); place != m_contents->entries.end();) {
+        Contents::Entry& entry = *place++;
+        const bool isOnlyLent = entry.lent != nullptr && !entry.hasBytes();
         entry.lent = nullptr;
-    }
-    for (const String& name : gone) {
-        m_contents->erase(name);
+        if (isOnlyLent) {
+            m_contents->erase(entry.name);
+        }
     }
 }
 

@@ -90,7 +90,7 @@ public:
     /// `changed` true was not followed by a flush that succeeded. An object that was never written goes from
     /// the bag when its loan ends.
     void lendObject(std::string_view name, const Streamable& object, bool changed);
-    void releaseLent();
+    void releaseLent() noexcept;
 
     /// The object under a name, as a live object that the bag owns: unpacked from its bytes on the first
     /// call. Null when there is none or its bytes do not make one; `objectError` then tells which. The

@@ -186,6 +186,7 @@ struct TagBag::Contents::Written {
     Entry* entry;
     StoredPlace place;
     LayerRevision revision;
+    String layer; ///< of one that was packed
     bool packed;
 };
 
@@ -195,6 +196,7 @@ Qx::Status TagBag::Contents::writeEntry(StoreWriter& writer, Entry& entry, Writt
     const bool reachable = entry.inMemory || (entry.onFile && from != nullptr);
     if (live != nullptr && (entry.mustBePacked() || !reachable)) {
         written.revision = currentRevision(*live);
+        written.layer = live->layerName();
         written.packed = true;
         return writer.add({entry.name, live->layerName(), written.revision.major, written.revision.minor},
                           *live, written.place);
@@ -229,7 +231,7 @@ Qx::Status TagBag::Contents::write(bool keepFromSource, bool& retry) {
     std::vector<Written> written;
     written.reserve(entries.size());
     for (Entry& entry : entries) {
-        Written& row = written.emplace_back(Written{&entry, {}, {}, false});
+        Written& row = written.emplace_back(Written{&entry, {}, {}, {}, false});
         bool intact = true;
         if (Qx::Status status = writeEntry(writer, entry, row, from, intact); !status) {
             return status;
@@ -248,24 +250,28 @@ Qx::Status TagBag::Contents::write(bool keepFromSource, bool& retry) {
     return status;
 }
 
-void TagBag::Contents::adopt(const std::vector<Written>& written, const StoreIdentity& identity,
-                             bool durable) {
-    source = identity;
+/// What is known of the objects becomes what the file in place holds. It asks for no memory: the file is
+/// there.
+void TagBag::Contents::adopt(std::vector<Written>& written, StoreIdentity& identity, bool durable) {
+    std::swap(source, identity);
     numPacked = 0;
     numKept = 0;
-    for (const Written& row : written) {
+    for (Written& row : written) {
         Entry& entry = *row.entry;
         ++(row.packed ? numPacked : numKept);
         if (row.packed) {
-            entry.layer = entry.live()->layerName();
+            std::swap(entry.layer, row.layer);
             entry.major = row.revision.major;
             entry.minor = row.revision.minor;
             forgetBytes(entry);
         }
         entry.place = row.place;
-        entry.onFile = true;
-        entry.onFile = identity.known;
+        entry.onFile = source.known;
         entry.changed = entry.changed && !durable;
     }
-    thinImage();
+    try {
+        thinImage();
+    } catch (const std::bad_alloc&) {
+        return; // the image stays as it is
+    }
 }

@@ -92,7 +92,8 @@ Qx::Status TextFile::save(const String& path) const {
 }
 
 const String& TextFile::operator[](unsigned line) const {
-    static const String none;
+    // Never destroyed: files are written while the process ends.
+    static const String& none = *new String;
     return line < m_lines.size() ? m_lines[line] : none;
 }
 

@@ -1,6 +1,7 @@
 #include "support/memory_meter.h"
 
 #include <atomic>
+#include <cstdint>
 #include <cstdlib>
 #include <malloc.h>
 #include <new>
@@ -11,7 +12,24 @@ std::atomic<size_t> held{0};
 std::atomic<size_t> most{0};
 thread_local size_t allocations = 0;
 
+/// How many allocations of this thread succeed until one fails; none does without a plan.
+thread_local size_t untilFailure = SIZE_MAX;
+thread_local bool failsForGood = false;
+thread_local bool hasFailedOnce = false;
+
+bool mustFail() {
+    if (untilFailure == SIZE_MAX || --untilFailure != 0) {
+        return false;
+    }
+    hasFailedOnce = true;
+    untilFailure = failsForGood ? 1 : SIZE_MAX;
+    return true;
+}
+
 void* take(size_t size) noexcept {
+    if (mustFail()) {
+        return nullptr;
+    }
     void* const memory = std::malloc(size == 0 ? 1 : size);
     if (memory == nullptr) {
         return nullptr;
@@ -80,6 +98,20 @@ MemoryMeter::MemoryMeter() : m_before(held), m_allocationsBefore(allocations) {
 
 size_t MemoryMeter::peak() const {
     return most - m_before;
+}
+
+FailingAllocations::FailingAllocations(size_t n, bool andAllAfter) {
+    hasFailedOnce = false;
+    failsForGood = andAllAfter;
+    untilFailure = n;
+}
+
+FailingAllocations::~FailingAllocations() {
+    untilFailure = SIZE_MAX;
+}
+
+bool FailingAllocations::hasFailed() const {
+    return hasFailedOnce;
 }
 
 size_t MemoryMeter::numAllocations() const {

@@ -20,4 +20,15 @@ private:
     size_t m_allocationsBefore;
 };
 
+/// While it lives, allocation `n` of this thread (from 1) fails, and with `andAllAfter` each that follows.
+class FailingAllocations {
+public:
+    explicit FailingAllocations(size_t n, bool andAllAfter = false);
+    ~FailingAllocations();
+    FailingAllocations(const FailingAllocations&) = delete;
+    FailingAllocations& operator=(const FailingAllocations&) = delete;
+    /// True if one has failed.
+    [[nodiscard]] bool hasFailed() const;
+};
+
 } // namespace test

@@ -57,7 +57,7 @@ void ManagerState::put(const cookie& item, EditPtr edit, String path, const Qx::
     entry->item = item;
     entry->edit = std::move(edit);
     entry->path = std::move(path);
-    entry->file = file;
+    entry->know(file);
     put(std::move(entry));
 }
 
@@ -118,10 +118,17 @@ std::unique_ptr<ManagerState::CachedEdit> ManagerState::removeHeld(const cookie&
 }
 
 void ManagerState::noteFile(CachedEdit& entry) {
-    entry.file = Qx::askFile(entry.path).info();
+    entry.know(Qx::askFile(entry.path).info());
 }
 
-bool ManagerState::write(CachedEdit& entry) {
+bool ManagerState::writeLast(CachedEdit& entry, bool waits) {
+    if (entry.isAway() && Qx::askFile(entry.path).isMissing()) {
+        entry.edit->init_dirty();
+    }
+    return write(entry, waits);
+}
+
+bool ManagerState::write(CachedEdit& entry, bool waits) {
     Edit& edit = *entry.edit;
     if (entry.item.type() == Cookie_Type::Transient || !edit.needsToBeWritten()) {
         return true;
@@ -129,23 +136,28 @@ bool ManagerState::write(CachedEdit& entry) {
     // What is moved next must be the file that is written here, also inside a caller's batch.
     const Qx::AtomicBatch::Pause atOnce;
     EditManagerLock writers{Qx::folderOf(entry.path)};
-    if (!takeWritersLock(writers) || !keepForeignFile(entry, backupDepth)) {
+    if (!takeWritersLock(writers, waits) || !keepForeignFile(entry, backupDepth)) {
+        addToDirtyList(entry.item);
         return false;
     }
     if (!edit.write_file(Qx::widen(entry.path))) {
         herc_printf("edit_manager: %s\n", edit.lastFileError().c_str());
         // The file may have been replaced and only not been made durable.
         noteFile(entry);
+        addToDirtyList(entry.item);
         return false;
     }
     noteFile(entry);
     entry.ownDescription.reset();
     removeFromDirtyList(entry.item);
+    if (edit.get_dirty()) {
+        addToDirtyList(entry.item); // changed meanwhile by one who does not hold its section
+    }
     records.put(entry.item, editRecordOf(edit, &entry.file));
     return true;
 }
 
-ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry) {
+ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry, bool waits) {
     if (entry.edit->refCount() > 1) {
         return Unreferenced::InUse;
     }
@@ -153,7 +165,7 @@ ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry) {
     if (!section.owns_lock()) {
         return Unreferenced::InUse;
     }
-    if (!write(entry)) {
+    if (!writeLast(entry, waits)) {
         return Unreferenced::NotWritten;
     }
     return entry.edit->isDirty(true) ? Unreferenced::Unwritten : Unreferenced::Clean;
@@ -169,8 +181,8 @@ void ManagerState::removeFromDirtyList(const cookie& item) {
     dirty.erase(item);
 }
 
-bool takeWritersLock(EditManagerLock& writers) {
-    const Qx::Status status = writers.take(true);
+bool takeWritersLock(EditManagerLock& writers, bool waits) {
+    const Qx::Status status = writers.take(waits);
     if (!status) {
         herc_printf("edit_manager: nothing was written: %s\n", status.reason().c_str());
     }
@@ -189,9 +201,24 @@ String folderOfCached(const cookie& item) {
 
 } // namespace
 
+SectionHold::SectionHold(const EditPtr& edit)
+    : m_section(edit->section()), m_isHeld(m_section.lockUnlessRing()) {
+    if (!m_isHeld) {
+        herc_printf("edit_manager: %s is left as it is: the thread that is changing it waits for this one\n",
+                    edit->get_cookie_str().c_str());
+    }
+}
+
+SectionHold::~SectionHold() {
+    if (m_isHeld) {
+        m_section.unlock();
+    }
+}
+
 CachedEditScope::CachedEditScope(const cookie& item, const EditPtr& edit)
-    : m_section(edit->section()), m_turn(managerState().queue, item), m_writers(folderOfCached(item)),
-      m_isWritable(takeWritersLock(m_writers)), m_lock(managerState().lock), m_entry(nullptr) {
+    : m_section(edit), m_turn(managerState().queue, item), m_writers(folderOfCached(item)),
+      m_isWritable(m_section.isHeld() && takeWritersLock(m_writers)), m_lock(managerState().lock),
+      m_entry(nullptr) {
     ManagerState::CachedEdit* const found = managerState().findCacheEntry(item);
     if (m_isWritable && found != nullptr && found->edit == edit) {
         m_entry = found;

@@ -20,7 +20,7 @@
 ///
 /// Locks, in the order in which they are taken:
 ///
-///   1. the section of an edit
+///   1. the section of an edit, for which a thread waits with `SectionHold`
 ///   2. access to its item on `queue`
 ///   3. the writers' lock of the project, against other processes (`EditManagerLock`)
 ///   4. `lock`, the "edit manager lock": guards everything here but what is said to guard itself
@@ -30,9 +30,16 @@
 /// cached takes `lookup` alone: it waits for nobody who writes a file under 4.
 ///
 /// Who changes an edit holds 1 and may call the manager; so nothing waits for a section while it holds one of
-/// the others. An edit to which the cache has the only reference is nobody's to change, so its section is
-/// tried for, and gets it, under 4; that it is nobody's still is seen when it is taken out of the cache. No
-/// observer is told under 2 to 5.
+/// the others. Threads that are each inside one edit and ask for something that needs the section of the
+/// other's would wait for ever: one of them is refused what it asked for. An edit to which the cache has the
+/// only reference is nobody's to change, so its section is tried for, and gets it, under 4; that it is
+/// nobody's still is seen when it is taken out of the cache. Under 4 the third is only tried for, but where
+/// this process has it already or everything is closed. No observer is told under 2 to 5.
+///
+/// A project is left and another one taken in three steps: `isLeaving` is set, from when on nothing is
+/// opened; what the cache holds is written and dropped; `epoch` rises, and the other project is taken, in one
+/// hold of
+/// 4. What was being opened meanwhile belongs to an epoch that is over and is handed to nobody.
 struct ManagerState {
     /// A cached edit with what is known of its file: another program that replaced the file since is noticed.
     struct CachedEdit : EditCacheEntry {
@@ -40,6 +47,14 @@ struct ManagerState {
         Qx::FileInfo
             file; ///< as this process last read, wrote or moved it; of kind Missing when there is none, of
                   ///< kind Unknown when the system could not tell: it is then no file that anybody knows
+        bool hadFile = false; ///< it had a file since it is in the cache
+        /// Takes what its file is at this moment as known.
+        void know(const Qx::FileInfo& info) {
+            file = info;
+            hadFile = hadFile || info.kind == Qx::FileKind::Regular;
+        }
+        /// Its file became a backup and was not written since: nothing lies under the edit's name.
+        [[nodiscard]] bool isAway() const { return hadFile && file.kind == Qx::FileKind::Missing; }
         /// What the revision that an undo or redo brought back says of itself, until it is changed.
         std::optional<EditModification> ownDescription;
         /// It is about to leave the cache: who asks for it waits for what comes in its place. Guarded by
@@ -54,7 +69,9 @@ struct ManagerState {
     cookie lastOpened; ///< guarded by `lookup`
     size_t cachedAtLastOpen = 0;
     cookie newProject;
-    cookie project; ///< the one whose edits are in the cache; invalid when there is none
+    cookie project;     ///< the one whose edits are in the cache; invalid when there is none
+    unsigned epoch = 0; ///< rises when the cache goes over from one project to another
+    cookie evictFrom;   ///< where the next short search for an edit to evict goes on
     EditPtr projectEdit;
     int backupDepth = 10;
     std::function<void(bool)> uiDelete;
@@ -73,6 +90,8 @@ struct ManagerState {
     ValServer<cookie> record;
     ValServer<bool> mixerBypass;
     std::atomic<edit_manager*> instance{nullptr};
+    std::atomic<bool> wasMade{false};           ///< a manager was there, so none is made unasked
+    std::atomic<bool> isLeaving{false};         ///< changes under `lookup`; see above
     std::atomic<unsigned> projectGeneration{0}; ///< of the current project that `project` was taken from
     static constexpr int kLimitNotRead = -2;
     std::atomic<int> cacheLimit{kLimitNotRead}; ///< read on the first opening; -1 for none
@@ -102,9 +121,12 @@ struct ManagerState {
     void putBack(std::unique_ptr<CachedEdit> entry);
 
     /// Writes an edit if it needs it. What another program put in its file's place since it was read is kept
-    /// as an undo backup first. False if it could not be written; the edit is then still dirty. Under the
+    /// as an undo backup first. False if it could not be written; the edit is then still dirty, and on the
+    /// dirty list. Without `waits`, another process that holds the writers' lock is a failure. Under the
     /// edit's section and the lock.
-    bool write(CachedEdit& entry);
+    bool write(CachedEdit& entry, bool waits = true);
+    /// The same for an edit that is about to leave the cache: one whose file became a backup gets it back.
+    bool writeLast(CachedEdit& entry, bool waits = true);
     /// What became of an edit that nobody but the cache should have.
     enum class Unreferenced {
         Clean,      ///< it holds no changes (any more)
@@ -112,8 +134,13 @@ struct ManagerState {
         NotWritten, ///< its changes could not be written
         InUse
     };
-    /// Writes such an edit. Under the lock.
-    Unreferenced writeUnreferenced(CachedEdit& entry);
+    /// Writes such an edit for the last time. Under the lock.
+    Unreferenced writeUnreferenced(CachedEdit& entry, bool waits);
+    /// Begins to leave the project, or ends it. False if it has begun already.
+    bool setLeaving(bool leaving) {
+        const std::lock_guard hold(lookup);
+        return isLeaving.exchange(leaving) != leaving;
+    }
     void setLeaving(CachedEdit& entry, bool leaving) {
         const std::lock_guard hold(lookup);
         entry.leaving = leaving;
@@ -137,18 +164,34 @@ private:
 /// The state of the process.
 ManagerState& managerState();
 
+/// Holds the section of an edit. Not waited for in a ring of threads that are inside edits: it is refused
+/// then (logged).
+class SectionHold {
+public:
+    explicit SectionHold(const EditPtr& edit);
+    ~SectionHold();
+    SectionHold(const SectionHold&) = delete;
+    SectionHold& operator=(const SectionHold&) = delete;
+    [[nodiscard]] bool isHeld() const { return m_isHeld; }
+
+private:
+    criticalSection& m_section;
+    bool m_isHeld;
+};
+
 /// Holds what a sequence of moves of one cached edit's files needs, locks 1 to 4 in order, and makes sure
 /// that the edit is still the item's.
 class CachedEditScope {
 public:
     CachedEditScope(const cookie& item, const EditPtr& edit);
-    /// Null when the edit left the cache meanwhile, or other processes could not be kept away (logged).
+    /// Null when the edit left the cache meanwhile, or other processes or threads could not be kept away
+    /// (logged).
     [[nodiscard]] ManagerState::CachedEdit* entry() const { return m_entry; }
     /// False in the second case.
     [[nodiscard]] bool isWritable() const { return m_isWritable; }
 
 private:
-    ManagerState::Hold m_section;
+    SectionHold m_section;
     Qx::AccessScope<cookie> m_turn;
     EditManagerLock m_writers;
     bool m_isWritable;
@@ -158,9 +201,14 @@ private:
 
 /// True for what is no item at all: the invalid cookie, or three zero words.
 [[nodiscard]] bool isNoItem(const cookie& item);
-/// Takes the writers' lock of the project that a file belongs to, waiting for other processes; a failure is
-/// logged.
-[[nodiscard]] bool takeWritersLock(EditManagerLock& writers);
+/// Does what `limitEditCache` does as far as it can be done without waiting, looking at a few edits only; the
+/// next call goes on where this one ends.
+void evictOne(int limit);
+/// The manager, made if there was never one; null if there is none (any more).
+[[nodiscard]] edit_manager* managerForOpening();
+/// Takes the writers' lock of the project that a file belongs to, waiting for other processes or not; a
+/// failure is logged.
+[[nodiscard]] bool takeWritersLock(EditManagerLock& writers, bool waits = true);
 /// The message types of the manager.
 struct ManagerMessages {
     NotifyMsgType projectChanged{"editmanProjectChanged"};
@@ -171,8 +219,9 @@ struct ManagerMessages {
 };
 const ManagerMessages& managerMessages();
 /// Writes a cached edit if it needs it and is in the cache still; with a ring, a milestone is made where one
-/// is due. False if it could not be written.
-bool writeCached(const cookie& item, const EditPtr& edit, const MilestoneRing* milestones);
+/// is due. With `isLast` it is about to leave the cache. False if it could not be written.
+bool writeCached(const cookie& item, const EditPtr& edit, const MilestoneRing* milestones,
+                 bool isLast = false);
 /// Brings the records up to date with the edits in memory that changed, and with what was gathered. Not under
 /// the manager's lock.
 void storeRecords();

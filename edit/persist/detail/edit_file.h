@@ -58,12 +58,40 @@ public:
         bool m_before;
     };
 
+    /// A flag of the edit that is set while this lives.
+    class Raised {
+    public:
+        explicit Raised(bool& flag) : m_flag(flag) { flag = true; }
+        ~Raised() { m_flag = false; }
+        Raised(const Raised&) = delete;
+        Raised& operator=(const Raised&) = delete;
+
+    private:
+        bool& m_flag;
+    };
+
+    /// Ends the lending of cels and header to the store, on whatever way they are left.
+    class Lending {
+    public:
+        explicit Lending(Edit& edit) : m_edit(edit) {}
+        ~Lending() { extractCelsFromStore(m_edit, m_isWritten); }
+        void setWritten() { m_isWritten = true; }
+        Lending(const Lending&) = delete;
+        Lending& operator=(const Lending&) = delete;
+
+    private:
+        Edit& m_edit;
+        bool m_isWritten = false;
+    };
+
     /// Records why a read or write failed; always false.
     static bool fail(Edit& edit, String reason);
     /// No channels, no cues, the header of a new edit; the cookie and the store stay.
     static void reset(Edit& edit);
     /// The clean state after a load or a save: nothing is marked as changed.
     static void markWritten(Edit& edit);
+    /// The state after a save that failed: the edit is dirty, and whoever writes dirty edits knows of it.
+    static void markUnwritten(Edit& edit);
     /// The content of a channel that has a cel; null for others.
     [[nodiscard]] static Qx::Ptr<cel> sharedCel(const Edit& edit, const IdStamp& chan);
     /// The number that legacy headers give a channel: 0 the video channel, 1 the first audio channel and so
@@ -119,7 +147,7 @@ public:
     static void updateHeader(const Edit& edit, configb& header, const Vector<IdStamp>& order);
     static void lendCels(Edit& edit);
     /// Ends the lending. Afterwards the edit alone owns its cels.
-    static void extractCelsFromStore(Edit& edit, bool written);
+    static void extractCelsFromStore(Edit& edit, bool written) noexcept;
     /// @}
 
     /// \name Legacy text

@@ -86,7 +86,7 @@ private:
     Qx::Status writeEntry(Qx::detail::StoreWriter& writer, Entry& entry, Written& written,
                           Qx::detail::StoreSource* from, bool& intact);
     void thinImage();
-    void adopt(const std::vector<Written>& written, const Qx::detail::StoreIdentity& identity, bool durable);
+    void adopt(std::vector<Written>& written, Qx::detail::StoreIdentity& identity, bool durable);
 
     std::unordered_map<std::string_view, Entries::iterator> m_index; ///< keys lie in the entries
     size_t m_imageBytesInUse = 0;

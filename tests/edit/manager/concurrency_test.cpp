@@ -1,10 +1,13 @@
 #include "edit/manager/edit_info.h"
+#include "platform/services/config_int.h"
 #include "support/faulty_file_system.h"
 #include "tests/edit/manager/managed_project.h"
 
 #include <gtest/gtest.h>
 
+#include <array>
 #include <atomic>
+#include <barrier>
 #include <chrono>
 #include <cstdlib>
 #include <future>
@@ -142,9 +145,10 @@ private:
 };
 
 TEST(Concurrency, OpeningWhatIsCachedWaitsForNoWriter) {
+    Qx::setConfigInt("edit_cache_size", 1); // with a limit, which no opening waits for either
     const ManagedProject project;
-    ManagedProject::save("before", itemAt(0));
-    ManagedProject::save("other", itemAt(1));
+    const EditPtr held(itemAt(1), eOpenOrCreate);
+    const EditPtr heldToo(itemAt(0), eOpenOrCreate);
     ManagedProject::change("written", itemAt(0));
     StuckDisk disk;
     std::thread writer([] { EXPECT_TRUE(edit_manager::flush_edit(itemAt(0))); });
@@ -159,6 +163,7 @@ TEST(Concurrency, OpeningWhatIsCachedWaitsForNoWriter) {
     disk.letGo();
     EXPECT_TRUE(opened.get());
     writer.join();
+    Qx::clearConfigInt("edit_cache_size");
     EXPECT_EQ(ManagedProject::nameOf(itemAt(0)), "written");
 }
 
@@ -205,6 +210,93 @@ TEST(Concurrency, NoChangeIsLostToADrop) {
     for (int i = 0; i < kItemsDropped; ++i) {
         EXPECT_EQ(EditPtr(itemAt(i), eOpenExisting)->Opts().getInt("COUNT"),
                   kThreads / kItemsDropped * kChanges);
+    }
+}
+
+TEST(Concurrency, ThreadsInsideEditsThatNeedEachOthersGoOn) {
+    const ManagedProject project;
+    const auto needOther = [](int other, unsigned action) {
+        switch (action) {
+        case 0:
+            edit_manager::flush_edit(itemAt(other));
+            break;
+        case 1:
+            edit_manager::backup_edit(itemAt(other));
+            break;
+        case 2:
+            edit_manager::reloadRequest(itemAt(other), true);
+            break;
+        default:
+            edit_manager::flush_changes();
+            break;
+        }
+    };
+    constexpr int kRing = 3;
+    std::array<EditPtr, kRing> edits;
+    std::vector<std::future<void>> ends;
+    std::atomic<int> round{0};
+    std::barrier inside(kRing);
+    for (int i = 0; i < kRing; ++i) {
+        ManagedProject::change("0", itemAt(i));
+        edits[static_cast<size_t>(i)] = EditPtr(itemAt(i), eOpenExisting);
+    }
+    for (int i = 0; i < kRing; ++i) {
+        ends.push_back(std::async(std::launch::async, [&, i] {
+            for (unsigned action = 0; action < 4; ++action) {
+                {
+                    const std::lock_guard<criticalSection> hold(edits[static_cast<size_t>(i)]->section());
+                    inside.arrive_and_wait();
+                    needOther((i + 1) % kRing, action);
+                }
+                inside.arrive_and_wait();
+            }
+        }));
+    }
+    for (std::future<void>& end : ends) {
+        if (end.wait_for(std::chrono::seconds(60)) != std::future_status::ready) {
+            std::fputs("the threads wait for each other for ever\n", stderr);
+            std::abort();
+        }
+    }
+    EXPECT_TRUE(project.log.contains("waits for this one"));
+    EXPECT_TRUE(edit_manager::flush_changes());
+}
+
+TEST(Concurrency, AnEditOfOneProjectIsNeverFoundInAnother) {
+    const ManagedProject project;
+    const cookie projects[] = {cookie("P0001000"), cookie("P0002000")};
+    for (const cookie& each : projects) {
+        ASSERT_EQ(edit_manager::set_current_project(each, eOpenOrCreate), eStatus::Ok);
+        ManagedProject::save(each.asString());
+    }
+    std::atomic<bool> goesOn{true};
+    std::vector<std::thread> openers;
+    for (int t = 0; t < 4; ++t) {
+        openers.emplace_back([&] {
+            for (int i = 0; goesOn; ++i) {
+                const EditPtr edit(test::kEdit, eOpenExisting);
+                if (edit.valid() && i % 4 == 0) {
+                    const std::lock_guard<criticalSection> hold(edit->section());
+                    edit->Opts().setInt("COUNT", i);
+                }
+                edit_manager::limitEditCache(0);
+            }
+        });
+    }
+    for (int i = 0; i < 40; ++i) {
+        const cookie& wanted = projects[i % 2];
+        ASSERT_EQ(edit_manager::set_current_project(wanted, eOpenExisting), eStatus::Ok);
+        for (int look = 0; look < 10; ++look) {
+            EXPECT_EQ(ManagedProject::nameOf(), wanted.asString()) << i;
+        }
+    }
+    goesOn = false;
+    for (std::thread& opener : openers) {
+        opener.join();
+    }
+    for (const cookie& each : projects) {
+        ASSERT_EQ(edit_manager::set_current_project(each, eOpenExisting), eStatus::Ok);
+        EXPECT_EQ(ManagedProject::nameOf(), each.asString());
     }
 }
 

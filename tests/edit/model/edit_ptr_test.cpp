@@ -50,7 +50,7 @@ TEST(Handle, TheLastOneDestroysTheEdit) {
 TEST(Handle, OpensThroughTheRegistryAndReleasesFirst) {
     const cookie item("E0005001");
     cookie other("E0006001");
-    EXPECT_FALSE(EditPtr(item, eOpenExisting).valid()) << "without a registry nothing opens";
+    EXPECT_FALSE(EditPtr(item, eOpenExisting).valid()) << "without a project nothing opens";
     RecordingRegistry registry;
     registry.add(EditBuilder().item(item).build());
 
@@ -69,8 +69,9 @@ TEST(Handle, OpensThroughTheRegistryAndReleasesFirst) {
 }
 
 TEST(Handle, RegistryThatGoesIsNoLongerAsked) {
+    EditRegistry* const before = EditRegistry::current();
     { const RecordingRegistry registry; }
-    EXPECT_EQ(EditRegistry::current(), nullptr);
+    EXPECT_EQ(EditRegistry::current(), before);
 }
 
 TEST(Handle, CountsAreExactOnManyThreads) {
