@@ -9,6 +9,7 @@
 
 #include <functional>
 #include <memory>
+#include <span>
 
 class projdb;
 
@@ -173,8 +174,9 @@ public:
     [[nodiscard]] static Qx::Ed2Support::TVStd getProjectTvStd(const cookie& project);
     /// One line for people: name, rate, number of edits.
     [[nodiscard]] static String getProjectSummary(const cookie& project);
-    /// The next free edit cookie; invalid when none can be had.
-    [[nodiscard]] static cookie new_edit();
+    /// The next free edit cookie; invalid when none can be had. `taken` are cookies that must not be handed
+    /// out, neither here nor later (`CookieAllocator`).
+    [[nodiscard]] static cookie new_edit(std::span<const cookie> taken = {});
     /// @}
 
     /// \name The project's records

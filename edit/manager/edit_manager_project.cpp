@@ -222,7 +222,7 @@ String edit_manager::getProjectSummary(const cookie& project) {
            std::to_string(edits) + (edits == 1 ? " edit" : " edits");
 }
 
-cookie edit_manager::new_edit() {
+cookie edit_manager::new_edit(std::span<const cookie> taken) {
     const String folder = Qx::currentProject().folder();
-    return folder.empty() ? invalid_cookie : CookieAllocator(folder).allocateOne();
+    return folder.empty() ? invalid_cookie : CookieAllocator(folder).allocateOne(taken);
 }

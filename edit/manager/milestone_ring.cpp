@@ -4,6 +4,7 @@
 #include "platform/services/atomic_batch.h"
 #include "platform/services/config_int.h"
 #include "platform/services/current_project.h"
+#include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 
 #include <algorithm>
@@ -43,7 +44,8 @@ String MilestoneRing::getMilestoneFolder(const cookie& project, const cookie& ed
     if (current.rootFolder.empty() || !folder.isStorable() || !edit.isStorable()) {
         return {};
     }
-    const String milestones = Qx::joinPath(Qx::joinPath(current.rootFolder, folder.asString()), "Milestones");
+    const String milestones =
+        Qx::joinPath(Qx::joinPath(current.rootFolder, folder.asString()), kMilestonesFolder);
     return Qx::joinPath(milestones, edit.asString());
 }
 

@@ -4,51 +4,117 @@
 #include "platform/services/edit_filenames.h"
 #include "platform/services/log.h"
 
+#include <algorithm>
+#include <iterator>
+
 using namespace Qx::detail;
 
 namespace {
 
-/// True, in `taken`, if there is anything in the place of an edit's file: also a link or a folder keeps a
-/// number from use, for no edit could be stored there.
-Qx::FileError nameIsTaken(const String& folder, const cookie& edit, bool& taken) {
-    const String path = Qx::joinPath(folder, edit.asString() + getEditFilenameExt());
-    const Qx::FileAnswer found = Qx::askFile(path);
-    taken = !found.isMissing();
-    return found.isUnknown() ? found.obstacle() : Qx::FileError();
+/// Numbers of edits, ascending.
+using Numbers = std::vector<int>;
+
+void sortNumbers(Numbers& numbers) {
+    std::sort(numbers.begin(), numbers.end());
+    numbers.erase(std::unique(numbers.begin(), numbers.end()), numbers.end());
 }
 
-/// Chooses `count` free numbers from `next` on and moves `next` past them. Numbers whose files exist are
-/// counted in `skipped`.
-Qx::Status choose(const String& folder, unsigned count, int& next, std::vector<cookie>& chosen,
-                  int& skipped) {
-    while (chosen.size() < count) {
-        if (next > kLastEditNumber) {
-            return Qx::Status::failure(
-                folder + ": the numbers of the project's edits are used up; go on in a new project");
+/// The number of an edit that can be handed out here; 0 for any other cookie.
+int numberOf(const cookie& edit) {
+    const bool counted = edit.is_valid() && edit.type() == Cookie_Type::Edit && edit.word(1) == 0 &&
+                         edit.word(0) >= 1 && edit.word(0) <= static_cast<unsigned>(kLastEditNumber);
+    return counted ? static_cast<int>(edit.word(0)) : 0;
+}
+
+/// True for what follows the cookie in the name of an edit file, or of what is kept beside one: its backups
+/// and what was set aside.
+bool endsEditName(std::string_view rest) {
+    for (const std::string_view extension : {std::string_view(".ED2"), std::string_view(".ED3")}) {
+        if (rest.starts_with(extension)) {
+            return true;
         }
-        const cookie edit(Cookie_Type::Edit, next++, 0);
-        bool taken = false;
-        if (auto error = nameIsTaken(folder, edit, taken)) {
-            return Qx::Status::failure(error.text());
+    }
+    return rest.starts_with(std::string_view(getEditFilenameExt()));
+}
+
+/// Adds the edits that a folder's names tell of: in `folder` itself, files whatever they are (for no edit
+/// could be stored in the place of a link or a folder), else, with `isMilestones`, a folder an edit. A folder
+/// that is not there has none.
+Qx::FileError addNamed(const String& folder, bool isMilestones, Numbers& taken) {
+    if (isMilestones && Qx::askFile(folder).isMissing()) {
+        return {};
+    }
+    std::vector<String> names;
+    if (auto error = Qx::retryInterrupted([&] { return Qx::fileSystem().list(folder, names); })) {
+        return error;
+    }
+    constexpr size_t kCookieLength = 8;
+    for (const String& name : names) {
+        const std::string_view text(name);
+        if (text.size() < kCookieLength ||
+            (isMilestones ? text.size() > kCookieLength : !endsEditName(text.substr(kCookieLength)))) {
+            continue;
         }
-        if (taken) {
-            ++skipped;
-        } else {
-            chosen.push_back(edit);
+        if (const int number = numberOf(cookie(text.substr(0, kCookieLength))); number != 0) {
+            taken.push_back(number);
         }
     }
     return {};
+}
+
+Qx::Status listNamed(const String& folder, Numbers& named) {
+    for (const bool isMilestones : {false, true}) {
+        const String place = isMilestones ? Qx::joinPath(folder, kMilestonesFolder) : folder;
+        if (auto error = addNamed(place, isMilestones, named)) {
+            return Qx::Status::failure(error.text());
+        }
+    }
+    sortNumbers(named);
+    return {};
+}
+
+/// Where the choice of numbers stands.
+struct Choice {
+    int next = 1;
+    int skipped = 0;
+    std::vector<cookie> chosen;
+};
+
+/// Chooses `count` numbers from `next` on that are not taken, and moves `next` past them.
+Qx::Status choose(const String& folder, unsigned count, const Numbers& taken, Choice& choice) {
+    auto passed = std::lower_bound(taken.begin(), taken.end(), choice.next);
+    for (; choice.chosen.size() < count; ++choice.next) {
+        if (choice.next > kLastEditNumber) {
+            return Qx::Status::failure(
+                folder + ": the numbers of the project's edits are used up; go on in a new project");
+        }
+        if (passed != taken.end() && *passed == choice.next) {
+            ++passed;
+            ++choice.skipped;
+        } else {
+            choice.chosen.emplace_back(Cookie_Type::Edit, choice.next, 0);
+        }
+    }
+    return {};
+}
+
+/// Where to go on when nothing tells what was handed out: behind all that is named, as edits may play what
+/// is there no more; from the start when there is no room behind it.
+int startWithoutCount(const Numbers& named, unsigned count) {
+    const int last = named.empty() ? 0 : named.back();
+    return static_cast<unsigned>(kLastEditNumber - last) < count ? 1 : last + 1;
 }
 
 } // namespace
 
 CookieAllocator::CookieAllocator(String projectFolder) : m_folder(std::move(projectFolder)) {}
 
-Qx::Status CookieAllocator::allocate(unsigned count, std::vector<cookie>& out) {
+Qx::Status CookieAllocator::allocate(unsigned count, std::vector<cookie>& out,
+                                     std::span<const cookie> taken) {
     if (m_folder.empty()) {
         return Qx::Status::failure("there is no project folder to number edits in; open a project first");
     }
-    if (count == 0) {
+    if (count == 0 && taken.empty()) {
         return {};
     }
     Qx::FileLock lock(lockPath(m_folder));
@@ -61,30 +127,49 @@ Qx::Status CookieAllocator::allocate(unsigned count, std::vector<cookie>& out) {
     if (auto status = readStore(path, settings, found); !status) {
         return status;
     }
-    int next = 1;
-    if (auto status = readNextEditNumber(settings, path, next); !status) {
+    Choice choice;
+    Numbers reserved;
+    Numbers named;
+    auto status = readNextEditNumber(settings, path, choice.next);
+    if (status) {
+        status = readTakenNumbers(settings, path, reserved);
+    }
+    if (status) {
+        status = listNamed(m_folder, named);
+    }
+    if (!status) {
         return status;
     }
-    std::vector<cookie> chosen;
-    int skipped = 0;
-    if (auto status = choose(m_folder, count, next, chosen, skipped); !status) {
+    if (!settings.contains(kNextEditKey)) {
+        const int start = startWithoutCount(named, count);
+        choice.skipped = start == 1 ? 0 : static_cast<int>(named.size());
+        choice.next = start;
+    }
+    std::transform(taken.begin(), taken.end(), std::back_inserter(reserved), numberOf);
+    sortNumbers(reserved);
+    Numbers all = named;
+    all.insert(all.end(), reserved.begin(), reserved.end());
+    sortNumbers(all);
+    if (status = choose(m_folder, count, all, choice); !status) {
         return status;
     }
-    settings.setInt(kNextEditKey, next);
-    if (auto status = writeStore(path, settings); !status) {
+    settings.setInt(kNextEditKey, choice.next);
+    reserved.erase(reserved.begin(), std::lower_bound(reserved.begin(), reserved.end(), choice.next));
+    setTakenNumbers(settings, reserved);
+    if (status = writeStore(path, settings); !status) {
         return status;
     }
     lock.release();
-    if (skipped > 0) {
-        herc_printf("new_edit() Skipped %d pre-existing cookies\n", skipped);
+    if (choice.skipped > 0) {
+        herc_printf("new_edit() Skipped %d pre-existing cookies\n", choice.skipped);
     }
-    out.insert(out.end(), chosen.begin(), chosen.end());
+    out.insert(out.end(), choice.chosen.begin(), choice.chosen.end());
     return {};
 }
 
-cookie CookieAllocator::allocateOne() {
+cookie CookieAllocator::allocateOne(std::span<const cookie> taken) {
     std::vector<cookie> chosen;
-    if (auto status = allocate(1, chosen); !status) {
+    if (auto status = allocate(1, chosen, taken); !status) {
         herc_printf("CookieAllocator::allocateOne: %s\n", status.reason().c_str());
         return invalid_cookie;
     }

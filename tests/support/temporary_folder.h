@@ -35,6 +35,7 @@ public:
 
     /// Writes a file's bytes and returns its path.
     String write(const std::string& name, const std::string& bytes) const {
+        std::filesystem::create_directories((m_path / name).parent_path());
         std::ofstream(m_path / name, std::ios::binary) << bytes;
         return path(name);
     }

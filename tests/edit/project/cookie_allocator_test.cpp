@@ -37,30 +37,55 @@ TEST(CookieAllocator, CountsFromOneForOneLockAndOneWrite) {
     EXPECT_EQ(disk.count("sync *.tmp"), 1u) << "durable before it is handed out";
 }
 
-TEST(CookieAllocator, PassesOverWhatExistsAndSaysSo) {
+TEST(CookieAllocator, WhateverNamesAnEditTakesItsNumber) {
+    const struct {
+        const char* name;
+        bool takes;
+    } names[] = {
+        {"E0002000.qme", true},
+        {"E0002000.qme.U7", true},
+        {"E0002000.qme.CORRUPT.1", true},
+        {"E0002000.ED2", true},
+        {"Milestones/E0002000/x", true},
+        {"E0002000.txt", false},
+        {"M0002000.qme", false},
+        {"E0002001.qme", false},
+        {"E0002.qme", false},
+        {"Milestones/E0002000.qme/x", false},
+    };
+    for (const auto& [name, takes] : names) {
+        SCOPED_TRACE(name);
+        const test::TemporaryFolder folder;
+        const test::RecordingLog log;
+        CookieAllocator allocator(folder.path());
+        ASSERT_EQ(allocator.allocateOne(), edit(1));
+        folder.write(name, "");
+        EXPECT_EQ(allocator.allocateOne(), edit(takes ? 3 : 2));
+        EXPECT_EQ(log.log(), takes ? "new_edit() Skipped 1 pre-existing cookies\n" : "");
+        // Without the count nothing is handed out that edits could play.
+        folder.write("E0009000.qme", "");
+        std::filesystem::remove(folder.path("Project.txt").c_str());
+        EXPECT_EQ(allocator.allocateOne(), edit(10));
+        folder.write("EZZZZ000.qme", "");
+        std::filesystem::remove(folder.path("Project.txt").c_str());
+        EXPECT_EQ(allocator.allocateOne(), edit(1)) << "nothing is left behind the last";
+    }
     const test::TemporaryFolder folder;
-    const test::RecordingLog log;
-    folder.write("E0002000.qme", "an edit");
-    std::filesystem::create_symlink("nowhere", folder.path("E0003000.qme").c_str());
-    folder.write("E0005000.txt", "no edit");
-    Cookies out;
-    CookieAllocator allocator(folder.path());
-    ASSERT_TRUE(allocator.allocate(1, out));
-    EXPECT_EQ(log.log(), "");
-    ASSERT_TRUE(allocator.allocate(2, out));
-    EXPECT_EQ(out, (Cookies{edit(1), edit(4), edit(5)}));
-    EXPECT_EQ(log.log(), "new_edit() Skipped 2 pre-existing cookies\n");
+    std::filesystem::create_symlink("nowhere", folder.path("E0001000.qme").c_str());
+    EXPECT_EQ(CookieAllocator(folder.path()).allocateOne(), edit(2));
 }
 
-TEST(CookieAllocator, ALostCountPassesOverTheEditsThatAreThere) {
+TEST(CookieAllocator, WhatACallerSaysToBeTakenStaysTaken) {
     const test::TemporaryFolder folder;
-    const test::RecordingLog log;
-    for (int i = 1; i <= 40; ++i) {
-        folder.write(edit(i).asString() + ".qme", "");
-    }
     Cookies out;
-    ASSERT_TRUE(CookieAllocator(folder.path()).allocate(1, out));
-    EXPECT_EQ(out, Cookies{edit(41)});
+    const Cookies taken{edit(7), edit(2), cookie("EZZZZ000"), edit(4), edit(3), edit(2), cookie("M0001000")};
+    ASSERT_TRUE(CookieAllocator(folder.path()).allocate(1, out, taken));
+    EXPECT_NE(folder.read("Project.txt").find("TAKEN_EDITS:string 2-4 7 1679615"), std::string::npos);
+    ASSERT_TRUE(CookieAllocator(folder.path()).allocate(4, out, Cookies{edit(6)}));
+    EXPECT_EQ(out, (Cookies{edit(1), edit(5), edit(8), edit(9), edit(10)}));
+    EXPECT_NE(folder.read("Project.txt").find("TAKEN_EDITS:string 1679615"), std::string::npos);
+    ASSERT_TRUE(CookieAllocator(folder.path()).allocate(0, out, Cookies{edit(11)}));
+    EXPECT_EQ(CookieAllocator(folder.path()).allocateOne(), edit(12));
 }
 
 TEST(CookieAllocator, NoNumberTwiceForThreadsAndProcesses) {
@@ -164,7 +189,8 @@ TEST(CookieAllocator, RefusesDamageAndTheEndOfTheNumbers) {
     CookieAllocator allocator(folder.path());
     Cookies out;
     for (const char* line : {"NEXT_EDIT:int 0", "NEXT_EDIT:int -4", "NEXT_EDIT:int 1679617",
-                             "NEXT_EDIT:int x", "NEXT_EDIT:string 5"}) {
+                             "NEXT_EDIT:int x", "NEXT_EDIT:string 5", "TAKEN_EDITS:string 5 3",
+                             "TAKEN_EDITS:string 0-1", "TAKEN_EDITS:string 5-9999999"}) {
         setNext(line);
         const auto status = allocator.allocate(1, out);
         ASSERT_FALSE(status) << line;
