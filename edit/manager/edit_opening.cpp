@@ -28,13 +28,12 @@ private:
     [[nodiscard]] EditPtr read(eEditOpenBehaviour behaviour);
     [[nodiscard]] EditPtr readExisting();
     [[nodiscard]] EditPtr readBackups();
-    [[nodiscard]] bool moveAside(const String& name);
+    [[nodiscard]] bool moveAside();
     /// True if the edit's file is there. What is there and no file, or cannot be asked about, is refused.
     [[nodiscard]] bool isThere();
     [[nodiscard]] bool restoreMissing();
     int restoreNewest();
     void refuse(const String& reason);
-    [[nodiscard]] String freeCorruptName(int counter) const;
     EditPtr succeed(EditPtr edit);
 
     cookie m_item;
@@ -124,11 +123,8 @@ EditPtr Opening::read(eEditOpenBehaviour behaviour) {
 
 int Opening::restoreNewest() {
     int restored = 0;
-    const Qx::Status status = m_undo.restoreNewest(restored);
-    if (!status) {
+    if (const Qx::Status status = m_undo.restoreNewest(restored); !status) {
         refuse(status.reason());
-    } else if (restored != 0) {
-        static_cast<void>(m_undo.makeDurable());
     }
     return restored;
 }
@@ -147,13 +143,11 @@ bool Opening::isThere() {
 }
 
 bool Opening::restoreMissing() {
-    // What lies beyond the depth is not brought back, so the folder need not be listed for it: a sequence may
-    // play very many shots that are not there.
-    int newest = 0;
-    if (const Qx::Status status = m_undo.findNewest(newest); !status) {
+    bool hasBackups = false;
+    if (const Qx::Status status = m_undo.exists(hasBackups); !status) {
         refuse(status.reason());
     }
-    if (m_refused || newest == 0) {
+    if (m_refused || !hasBackups) {
         return false;
     }
     if (!takeWritersLock(m_writers)) {
@@ -179,7 +173,7 @@ EditPtr Opening::readExisting() {
         if (m_refused) {
             return {};
         }
-        if (moveAside(m_file + ".CORRUPT")) {
+        if (moveAside()) {
             return readBackups();
         }
         if (Qx::isSameFile(m_read, Qx::askFile(m_file).info())) {
@@ -189,34 +183,28 @@ EditPtr Opening::readExisting() {
     return {};
 }
 
-/// Moves the file that was read last to another name. False if it could not be moved or is another file.
-/// The writers' lock is held afterwards if it was moved.
-bool Opening::moveAside(const String& name) {
+/// Moves the file that was read last to a name for what does not read; none that is there is replaced. False
+/// if it could not be moved or is another file. The writers' lock is held afterwards if it was moved.
+bool Opening::moveAside() {
     if (!takeWritersLock(m_writers)) {
         return false;
     }
-    Qx::FileError error;
     if (Qx::isSameFile(m_read, Qx::askFile(m_file).info())) {
-        error = Qx::fileSystem().rename(m_file, name);
-        if (!error) {
+        String name;
+        Qx::FileMoves moves(Qx::folderOf(m_file));
+        Qx::Status status = findCorruptName(m_file, name);
+        if (status) {
+            status = moves.move(m_file, name);
+        }
+        // Before another file takes the name.
+        if (status && (status = moves.finish())) {
             return true;
         }
-        herc_printf("edit_manager::open( %s ) : %s\n", cookie_string(m_item).c_str(), error.text().c_str());
+        herc_printf("edit_manager::open( %s ) : %s\n", cookie_string(m_item).c_str(),
+                    status.reason().c_str());
     }
     m_writers.release();
     return false;
-}
-
-/// A name beside the edit for a backup that does not read: none that is there is replaced.
-String Opening::freeCorruptName(int counter) const {
-    while (true) {
-        const String name = m_file + String::format(".CORRUPT.%d", counter++);
-        const Qx::FileAnswer found = Qx::askFile(name);
-        if (found.isMissing() || found.isUnknown()) {
-            // Nothing can be moved to no name at all.
-            return found.isMissing() ? name : String();
-        }
-    }
 }
 
 EditPtr Opening::readBackups() {
@@ -235,7 +223,7 @@ EditPtr Opening::readBackups() {
         if (EditPtr edit = read(m_behaviour); edit.valid()) {
             return edit;
         }
-        if (m_refused || !moveAside(freeCorruptName(counter))) {
+        if (m_refused || !moveAside()) {
             break;
         }
     }

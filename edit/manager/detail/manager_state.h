@@ -38,10 +38,14 @@ struct ManagerState {
     struct CachedEdit : EditCacheEntry {
         String path; ///< of its file; empty for an item that has none
         Qx::FileInfo
-            file; ///< as this process last read, wrote or moved it; of kind Missing when there is none, of
-                  ///< kind Unknown when the system could not tell: it is then no file that anybody knows
-        /// What the revision that an undo or redo brought back says of itself, until it is changed.
-        std::optional<EditModification> ownDescription;
+            file; ///< as this process last read, wrote or moved it; of kind Missing when there is none
+        /// What the revision that an undo or redo brought back said of itself, and what is said of the step
+        /// in its place, until it is changed.
+        struct Step {
+            EditModification own;
+            EditModification said;
+        };
+        std::optional<Step> step;
         /// It is about to leave the cache: who asks for it waits for what comes in its place. Guarded by
         /// `lookup`.
         bool leaving = false;
