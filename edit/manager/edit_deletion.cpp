@@ -37,30 +37,44 @@ Vector<String> editFiles(const String& file, const std::vector<String>& names) {
     return files;
 }
 
-/// Removes the file, then the backups from the oldest on. False, with nothing changed, when the file cannot
-/// be removed, and with some backups left when one of them cannot.
-bool removeFiles(const Vector<String>& files, const String& file) {
+Qx::FileError removeFile(const String& path) {
+    return Qx::retryInterrupted([&] { return Qx::fileSystem().remove(path); });
+}
+
+/// Removes the backups, the oldest first, then the file: what a crash leaves of an edit is the edit, never an
+/// older state of it in its place. A backup that cannot be removed keeps the file. Another thread may have
+/// made backups since the files were listed; they have numbers in the depth.
+Qx::Status removeFiles(const Vector<String>& files, const String& file) {
     const Qx::FileAnswer present = Qx::askFile(file);
-    Qx::FileError error = present.obstacle("remove");
-    if (present.isRegular()) {
-        error = Qx::fileSystem().remove(file);
+    if (const Qx::FileError error = present.obstacle("remove")) {
+        return Qx::Status::failure(error.text());
     }
-    if (error) {
-        herc_printf("edit_manager::delete_edit_file: %s\n", error.text().c_str());
-        return false;
-    }
-    bool allRemoved = true;
+    bool anyBackup = false;
     for (auto path = files.rbegin(); path != files.rend(); ++path) {
         if (*path == file) {
             continue;
         }
-        error = Qx::fileSystem().remove(*path);
-        if (error) {
-            herc_printf("edit_manager::delete_edit_file: %s\n", error.text().c_str());
-            allRemoved = false;
+        if (const Qx::FileError error = removeFile(*path)) {
+            return Qx::Status::failure(error.text());
+        }
+        anyBackup = true;
+    }
+    for (const RevisionChain::Kind kind : kChains) {
+        if (Qx::Status status = chainOf(file, kind).deleteTail(0); !status) {
+            return status;
         }
     }
-    return allRemoved;
+    if (present.isMissing()) {
+        return {};
+    }
+    Qx::FileError error;
+    if (anyBackup) {
+        error = Qx::retryInterrupted([&] { return Qx::fileSystem().syncFolder(Qx::folderOf(file)); });
+    }
+    if (!error) {
+        error = removeFile(file);
+    }
+    return error ? Qx::Status::failure(error.text()) : Qx::Status();
 }
 
 /// Asked before anybody is told.
@@ -97,37 +111,39 @@ bool deleteFiles(const cookie& item, bool force, const std::vector<String>& name
     }
     const bool isPresent = dropped != nullptr && dropped->edit.valid();
     const Vector<String> files = editFiles(file, names);
-    if ((files.empty() && !isPresent) || !removeFiles(files, file)) {
-        state.putBack(std::move(dropped));
-        return false;
-    }
-    // Another thread may have made a backup since the folder was listed; it has a number in the depth.
-    bool allGone = true;
-    for (const RevisionChain::Kind kind : kChains) {
-        allGone = chainOf(file, kind).deleteTail(0) && allGone;
-    }
-    if (!allGone) {
+    const Qx::Status removed =
+        files.empty() && !isPresent ? Qx::Status::failure("there is none") : removeFiles(files, file);
+    if (!removed) {
+        herc_printf("edit_manager: %s was not deleted: %s\n", item.asString().c_str(),
+                    removed.reason().c_str());
         state.putBack(std::move(dropped));
     }
-    return allGone;
+    return removed.isOk();
 }
 
-/// Deletes what can be deleted, with one listing and one sync of the folder for all. Returns the items that
-/// are gone.
+/// Deletes what can be deleted, with one listing of the folder for all. Returns the items that are gone.
 CookieVec deleteAllFiles(const CookieVec& items, bool force) {
     CookieVec gone;
     EditManagerLock writers;
     if (items.empty() || !takeWritersLock(writers)) {
         return gone;
     }
-    const RevisionChain any = chainOf(getFilenameForCookie(items.front()), RevisionChain::Undo);
-    const std::vector<String> names = any.namesInFolder();
+    const String folder = Qx::folderOf(getFilenameForCookie(items.front()));
+    std::vector<String> names;
+    if (const Qx::FileError error =
+            Qx::retryInterrupted([&] { return Qx::fileSystem().list(folder, names); })) {
+        herc_printf("edit_manager: nothing was deleted: %s\n", error.text().c_str());
+        return gone;
+    }
     for (const cookie& item : items) {
         if (deleteFiles(item, force, names)) {
             gone.push_back(item);
         }
     }
-    static_cast<void>(any.makeDurable());
+    if (!gone.empty()) {
+        // A deletion that a crash takes back leaves a whole edit.
+        static_cast<void>(Qx::fileSystem().syncFolder(folder).code);
+    }
     return gone;
 }
 
@@ -168,8 +184,10 @@ void edit_manager::issuePreDeletionNotifications(const cookie& item) {
         return;
     }
     if (const EditPtr edit = presentEdit(item); edit.valid()) {
-        const ManagerState::Hold section(edit->section());
-        edit->notifyEditDelete();
+        const SectionHold section(edit);
+        if (section.isHeld()) {
+            edit->notifyEditDelete();
+        }
     }
     managerState().tell(editDeletedMsgType(), item);
 }

@@ -123,25 +123,32 @@ public:
     /// \name Revisions
     /// The code of the backups is `RevisionChain`, of the milestones `MilestoneRing`.
     /// @{
-    /// Makes an undo backup of the edit's present state. The edit stays in memory; its file goes until it is
-    /// written next. An edit whose file is missing because it was not changed since its last backup is
-    /// written first, so that every call leaves one more file. What could be redone is deleted. False for an
-    /// edit that is read-only, does not open, or whose files could not be written or moved; the chain may
-    /// then have moved on by one place, and what could be redone may be gone.
+    /// Makes an undo backup of the edit's present state: what the edit is in memory, also when its file went
+    /// bad or was replaced meanwhile. The edit stays in memory; its file goes until it is written next. An
+    /// edit whose file is missing because it was not changed since its last backup is written first, so that
+    /// every call leaves one more file. What could be redone is deleted, last. False for an edit that is
+    /// read-only, does not open, or whose files could not be written or moved (the log names path and cause):
+    /// the edit is under its name and both chains are as they were, but what could be redone may be gone when
+    /// a deletion or the last sync failed.
     static bool backup_edit(const cookie& item);
-    /// True if there is any undo backup, also one beyond the depth.
+    /// True if there is an undo backup in the depth, or right behind it where a deeper chain was kept before;
+    /// also when that could not be told.
     [[nodiscard]] static bool undoExists(const cookie& item);
-    /// True if there is a redo backup 1 (or a later one in the depth, where a crash has left a hole).
+    /// True if there is a redo backup 1; also when that could not be told.
     [[nodiscard]] static bool redoExists(const cookie& item);
     /// Steps back or forward one revision; the clipboard edit goes with it where the revision used it. The
-    /// edit's file becomes the revision's, byte for byte, and the edit is read again into another object,
-    /// which is clean. Those who watch either object are told; the description of the change that was undone,
-    /// inverted, or of the one that was redone, is published to those who follow the object that is opened.
-    /// False if there is no such revision, the edit is read-only for the user, or a move failed, which is
-    /// taken back.
+    /// edit's file becomes the revision's, byte for byte, and the edit is read again into another object. A
+    /// revision that is damaged is set aside as ".CORRUPT" and the next one taken, if there is one that is
+    /// sound. Observers hear "editmanInvalidateCache" after the moves, and those who watch either object are
+    /// told of the step. The edit then gets the owner that it had and, through
+    /// `Edit::setChangeDescription`, the description of the change that was undone, inverted, or of the one
+    /// that was redone: it is dirty and counts one change more. False, with everything as it was, if there is
+    /// no such revision (for a redo: no backup 1), none is sound, the edit is read-only for the user, a file
+    /// could not be written or moved, or the revision does not open.
     static bool undoRequest(const cookie& item);
     static bool redoRequest(const cookie& item);
-    /// Delete the backups from `keep` + 1 to the depth, the oldest first.
+    /// Delete backup `keep` + 1, `keep` + 2, ... up to the depth, and stop at the first that is not there or
+    /// cannot be deleted.
     static void delete_redo_edits(const cookie& item, int keep);
     static void delete_backup_edits(const cookie& item, int keep);
     [[nodiscard]] static int backupDepth();
@@ -149,9 +156,12 @@ public:
 
     /// \name Deleting
     /// @{
-    /// Deletes an edit's file with all its backups, after the notices. False for one that is read-only or in
-    /// use by others than the cache, unless `force`, whose files could not be removed, and for one that has
-    /// none. Other seats are told. Milestones stay, and what was set aside as ".CORRUPT".
+    /// Deletes an edit's file with all its backups, after the notices: the backups first, so that what is
+    /// left by a crash is the edit or nothing, never an older state in its place. False for one that is
+    /// read-only or in use by others than the cache, unless `force`, for one that has no files, and when a
+    /// file could not be removed: the edit is there still, without those of its backups that could be
+    /// removed. Other seats are told. Milestones stay, and what was set aside as ".CORRUPT"; no new edit gets
+    /// the cookie.
     static bool delete_edit_file_and_backups(const cookie& item, bool force);
     /// The same for many, of which those that can be deleted are: all notices come first, then the folder is
     /// gone through once. True if all were deleted.

@@ -39,9 +39,8 @@ private:
     Search restoreMissing();
     Search lookAgain();
     [[nodiscard]] bool replaceDamaged(int& counter);
-    [[nodiscard]] bool moveAside(const String& name);
+    [[nodiscard]] bool moveAside();
     int restoreNewest();
-    [[nodiscard]] String freeCorruptName(int counter) const;
     void refuse(const String& reason);
     void tell(const String& what) const;
     [[nodiscard]] bool isOfThisProject() const;
@@ -230,28 +229,25 @@ EditPtr Opening::create() {
 
 int Opening::restoreNewest() {
     int restored = 0;
-    const Qx::Status status = m_undo.restoreNewest(restored);
-    if (!status) {
+    if (const Qx::Status status = m_undo.restoreNewest(restored); !status) {
         refuse(status.reason());
-    } else if (restored != 0) {
-        static_cast<void>(m_undo.makeDurable());
     }
     return restored;
 }
 
 /// Looks for what a missing file left, first without keeping others away: a sequence may play very many shots
-/// that are not there. What lies beyond the depth is not brought back, so the folder need not be listed.
+/// that are not there.
 Opening::Search Opening::restoreMissing() {
-    int newest = 0;
-    if (const Qx::Status status = m_undo.findNewest(newest); !status) {
+    bool hasBackups = false;
+    if (const Qx::Status status = m_undo.exists(hasBackups); !status) {
         refuse(status.reason());
         return Search::NotKnown;
     }
     // Nothing is moved where no backup is, so nobody is waited for; but the file may have been on its way
     // between the two names.
     bool isBusy = false;
-    const Qx::Status taken = m_writers.take(newest != 0, &isBusy);
-    if (!taken && newest != 0) {
+    const Qx::Status taken = m_writers.take(hasBackups, &isBusy);
+    if (!taken && hasBackups) {
         refuse("nothing was looked for: " + taken.reason());
         return Search::NotKnown;
     }
@@ -282,12 +278,12 @@ Opening::Search Opening::lookAgain() {
     if (present.isRegular()) {
         return Search::FileIsThere;
     }
-    int newest = 0;
-    if (const Qx::Status status = m_undo.findNewest(newest); !status) {
+    bool hasBackups = false;
+    if (const Qx::Status status = m_undo.exists(hasBackups); !status) {
         refuse(status.reason());
         return Search::NotKnown;
     }
-    if (newest == 0) {
+    if (!hasBackups) {
         return Search::NoneThere;
     }
     if (!m_writers.isHeld()) {
@@ -303,7 +299,7 @@ Opening::Search Opening::lookAgain() {
 /// when another file is there meanwhile. False when there is none, or with `m_refused` when nothing could be
 /// moved.
 bool Opening::replaceDamaged(int& counter) {
-    if (!moveAside(counter == 0 ? m_file + ".CORRUPT" : freeCorruptName(counter))) {
+    if (!moveAside()) {
         return !m_refused;
     }
     bool hasBackups = counter != 0;
@@ -328,34 +324,29 @@ bool Opening::replaceDamaged(int& counter) {
     return restored != 0;
 }
 
-/// Moves the file that was read last to another name. The writers' lock is held afterwards. False, and it is
-/// not, if another file is there meanwhile, or with `m_refused` if it could not be moved.
-bool Opening::moveAside(const String& name) {
+/// Moves the file that was read last to a name for what does not read; none that is there is replaced. The
+/// writers' lock is held afterwards. False, and it is not, if another file is there meanwhile, or with
+/// `m_refused` if it could not be moved.
+bool Opening::moveAside() {
     if (!takeWritersLock(m_writers)) {
         m_refused = true;
         return false;
     }
     if (Qx::isSameFile(m_read, Qx::askFile(m_file).info())) {
-        const Qx::FileError error = Qx::fileSystem().rename(m_file, name);
-        if (!error) {
+        String name;
+        Qx::FileMoves moves(Qx::folderOf(m_file));
+        Qx::Status status = findCorruptName(m_file, name);
+        if (status) {
+            status = moves.move(m_file, name);
+        }
+        // Before another file takes the name.
+        if (status && (status = moves.finish())) {
             return true;
         }
-        refuse(error.text());
+        refuse(status.reason());
     }
     m_writers.release();
     return false;
-}
-
-/// A name beside the edit for a backup that does not read: none that is there is replaced.
-String Opening::freeCorruptName(int counter) const {
-    while (true) {
-        const String name = m_file + String::format(".CORRUPT.%d", counter++);
-        const Qx::FileAnswer found = Qx::askFile(name);
-        if (found.isMissing() || found.isUnknown()) {
-            // Nothing can be moved to no name at all.
-            return found.isMissing() ? name : String();
-        }
-    }
 }
 
 /// Makes the edit, or with a null one the failure, the item's, and returns it. A failure that says nothing of

@@ -19,27 +19,23 @@ RevisionChain chainOf(const cookie& item, RevisionChain::Kind kind) {
     return {item, kind, depth()};
 }
 
-/// Makes the edit's file say what the edit is, also when it went with the last backup and nothing was changed
-/// since. Under the scope of the edit.
-bool writeWhole(ManagerState::CachedEdit& entry) {
-    const Qx::FileAnswer present = Qx::askFile(entry.path);
-    if (const Qx::FileError error = present.obstacle("replace")) {
-        herc_printf("edit_manager: nothing was written: %s\n", error.text().c_str());
-        return false;
-    }
-    if (present.isMissing()) {
-        entry.edit->init_dirty();
-    }
-    return managerState().write(entry) && Qx::askFile(entry.path).isRegular();
+/// True if the edit's file is the one that this process knows, and whole.
+bool fileIsAsKnown(const ManagerState::CachedEdit& entry) {
+    String why;
+    return Qx::isSameFile(entry.file, Qx::askFile(entry.path).info()) &&
+           examineEditFile(entry.path, why) == EditFileState::Sound;
 }
 
-/// The number of the newest backup of a chain; 0 also when that could not be told (logged).
-int newestOf(const RevisionChain& chain) {
-    int newest = 0;
-    if (const Qx::Status status = chain.findNewest(newest); !status) {
-        herc_printf("edit_manager: no revision was looked for: %s\n", status.reason().c_str());
+/// Makes the edit's file say what the edit is, also when nothing was changed since it went with the last
+/// backup, was replaced or went bad. Under the scope of the edit.
+bool writeWhole(ManagerState::CachedEdit& entry) {
+    ManagerState& state = managerState();
+    if (!entry.edit->isDirty(true) && !fileIsAsKnown(entry)) {
+        entry.edit->init_dirty();
+        // Until it is written.
+        state.addToDirtyList(entry.item);
     }
-    return newest;
+    return state.write(entry) && Qx::askFile(entry.path).isRegular();
 }
 
 /// A step of an edit from its present revision to the newest of one chain; the present one goes onto the
@@ -49,14 +45,24 @@ public:
     RevisionStep(const cookie& item, RevisionChain::Kind from)
         : m_item(item), m_from(chainOf(item, from)),
           m_to(chainOf(item, from == RevisionChain::Undo ? RevisionChain::Redo : RevisionChain::Undo)),
+          m_moves(Qx::folderOf(m_from.file())),
           m_code(from == RevisionChain::Undo ? kRevisionUndo : kRevisionRedo) {}
 
     bool run();
 
 private:
+    [[nodiscard]] bool hasRevision() const;
     [[nodiscard]] bool moveFiles();
-    void remember();
-    void putBack();
+    Qx::Status step();
+    Qx::Status findSound(int& number);
+    void moveFilesBack();
+    [[nodiscard]] bool remember();
+    void carryOver();
+    void describe();
+    void report(const String& reason) const {
+        herc_printf("edit_manager: no revision of %s was changed: %s\n", m_item.asString().c_str(),
+                    reason.c_str());
+    }
     [[nodiscard]] bool clipboardFollows(const EditPtr& edit) const {
         return !m_item.isClipboard() && config_int("undo_clipboard", 1) != 0 &&
                edit->Opts().getInt(kClipboardUsed) != 0;
@@ -65,17 +71,20 @@ private:
     cookie m_item;
     RevisionChain m_from;
     RevisionChain m_to;
+    Qx::FileMoves m_moves;
+    Qx::FileInfo m_moved; ///< the file of the revision that the step leads to
     RevisionChangeType m_code;
     EditPtr m_before;
     EditPtr m_after;
     bool m_celCuesLoaded = false;
+    bool m_wasClean = false;
     String m_owner;
     EditModification m_description;
     std::unique_ptr<ManagerState::CachedEdit> m_dropped;
 };
 
 bool RevisionStep::run() {
-    if (newestOf(m_from) == 0) {
+    if (!hasRevision()) {
         return false;
     }
     if (PermissionsManager::getReadOnly(m_item)) {
@@ -87,26 +96,30 @@ bool RevisionStep::run() {
         return false;
     }
     m_before->notifyImpendingRevisionChange(m_code);
-    remember();
+    if (!remember()) {
+        return false;
+    }
     bool takesClipboard = m_code == kRevisionUndo && clipboardFollows(m_before);
     edit_manager::flush_changes();
-    managerState().tell(edit_manager::invalidateCacheMsgType(), m_item);
     if (!moveFiles()) {
         return false;
     }
-    m_dropped.reset();
+    managerState().tell(edit_manager::invalidateCacheMsgType(), m_item);
     m_after = edit_manager::openEdit(m_item, eOpenExisting);
     if (!m_after.valid()) {
+        moveFilesBack();
         return false;
     }
+    m_moves.keep();
+    m_dropped.reset();
     if (m_code == kRevisionRedo) {
         takesClipboard = clipboardFollows(m_after);
     }
-    putBack();
+    carryOver();
     // Those who watch the object that they have, and those who opened the item since.
     m_before->notifyRevisionChange(m_code);
     m_after->notifyRevisionChange(m_code);
-    m_after->getChangeDescriptionServer().setValue(m_description);
+    describe();
     if (takesClipboard) {
         RevisionStep(clipboard_cookie, m_code == kRevisionUndo ? RevisionChain::Undo : RevisionChain::Redo)
             .run();
@@ -114,77 +127,182 @@ bool RevisionStep::run() {
     return true;
 }
 
+/// An undo finds the newest backup, a redo takes backup 1 or none.
+bool RevisionStep::hasRevision() const {
+    int number = 0;
+    const Qx::Status status = m_from.findNewest(number);
+    if (!status) {
+        report(status.reason());
+    }
+    return status && (m_code == kRevisionUndo ? number != 0 : number == 1);
+}
+
 /// What is carried over from the edit before the step.
-void RevisionStep::remember() {
+bool RevisionStep::remember() {
     ManagerState& state = managerState();
-    const ManagerState::Hold section(m_before->section());
+    const SectionHold section(m_before);
+    if (!section.isHeld()) {
+        return false;
+    }
     m_celCuesLoaded = m_before->get_cel_cues_loaded();
     m_owner = m_before->getOwner();
     m_description = m_before->getChangeDescription();
     const ManagerState::Hold hold(state.lock);
     const ManagerState::CachedEdit* const entry = state.findCacheEntry(m_item);
-    // The description in the header of a revision that was brought back is that of bringing it back.
-    if (entry != nullptr && entry->ownDescription && !m_before->isDirty(true)) {
-        m_description = *entry->ownDescription;
+    // The description of a revision that was brought back is that of bringing it back.
+    if (entry != nullptr && entry->step && entry->step->said == m_description) {
+        m_description = entry->step->own;
     }
+    return true;
 }
 
 bool RevisionStep::moveFiles() {
     const CachedEditScope scope(m_item, m_before);
-    if (scope.entry() == nullptr) {
+    // Another project may have become the current one since the step began.
+    if (scope.entry() == nullptr || scope.entry()->path != m_from.file()) {
         return false;
     }
     ManagerState::CachedEdit& entry = *scope.entry();
     // Who asks for the edit from here on gets the revision that comes: a change to this one would be lost.
     managerState().setLeaving(entry, true);
-    if (!writeWhole(entry) || newestOf(m_from) == 0) {
-        managerState().setLeaving(entry, false);
-        return false;
-    }
-    Qx::Status status = m_to.push();
-    int restored = 0;
-    if (status && (status = m_from.restoreNewest(restored)) && restored == 0) {
-        status = Qx::Status::failure("the backup is gone");
-    }
-    if (!status && Qx::askFile(entry.path).isMissing()) {
-        // The present revision comes back.
-        static_cast<void>(m_to.restoreNewest(restored).isOk());
-    }
+    const bool written = writeWhole(entry);
+    const Qx::Status status = written ? step() : Qx::Status::failure(entry.path + " could not be written");
     if (!status) {
-        herc_printf("edit_manager: no revision of %s was changed: %s\n", m_item.asString().c_str(),
-                    status.reason().c_str());
-        managerState().noteFile(entry);
+        m_moves.takeBack();
+        report(status.reason());
+        if (written) {
+            managerState().noteFile(entry);
+        }
         managerState().setLeaving(entry, false);
         return false;
     }
-    static_cast<void>(m_from.makeDurable());
+    m_moved = Qx::askFile(m_from.file()).info();
     m_dropped = managerState().removeCacheEntry(m_item);
     return true;
 }
 
-/// Gives the edit of the restored revision what is carried over. It stays clean, as its file says the same.
-void RevisionStep::putBack() {
+/// Moves the present revision onto one chain and the next of the other into its place. On a failure some
+/// moves are made.
+Qx::Status RevisionStep::step() {
+    int number = 0;
+    Qx::Status status = (m_code == kRevisionUndo ? m_to : m_from).closeHoles();
+    if (status) {
+        status = findSound(number);
+    }
+    if (status) {
+        status = m_to.push(m_moves);
+    }
+    if (status) {
+        status = m_from.pull(m_moves, number);
+    }
+    return status ? m_moves.sync() : status;
+}
+
+/// The newest revision that is sound. Those before it are damaged: they are set aside, as an opening does
+/// with them, when there is a sound one.
+Qx::Status RevisionStep::findSound(int& number) {
+    std::vector<int> damaged;
+    String why = "there is none";
+    for (number = 0;;) {
+        String fault;
+        int next = 0;
+        if (Qx::Status status = m_from.findNewest(next, number); !status || next == 0) {
+            return status ? Qx::Status::failure(why) : status;
+        }
+        number = next;
+        const EditFileState state = examineEditFile(m_from.path(number), fault);
+        if (state == EditFileState::Sound) {
+            break;
+        }
+        if (state == EditFileState::Refused) {
+            return Qx::Status::failure(fault);
+        }
+        why = fault;
+        damaged.push_back(number);
+    }
+    for (const int bad : damaged) {
+        String name;
+        Qx::Status status = findCorruptName(m_from.file(), name);
+        if (status) {
+            status = m_moves.move(m_from.path(bad), name);
+        }
+        if (!status) {
+            return status;
+        }
+        herc_printf("edit_manager: %s is damaged and was set aside as %s\n", m_from.path(bad).c_str(),
+                    name.c_str());
+    }
+    return {};
+}
+
+/// The revision did not open: everything becomes as it was, unless the edit's file is another one by now.
+void RevisionStep::moveFilesBack() {
     ManagerState& state = managerState();
-    const ManagerState::Hold section(m_after->section());
-    const bool wasClean = !m_after->isDirty(true);
-    const EditModification own = m_after->getChangeDescription();
-    m_description = m_code == kRevisionUndo ? m_description.invert() : own;
-    const bool suppressed = m_after->isNetworkNotificationSuppressed();
-    m_after->setNetworkNotificationSuppressed(true);
-    m_after->set_cel_cues_loaded(m_celCuesLoaded);
-    m_after->setOwner(m_owner, false);
-    m_after->setChangeDescription(m_description, false);
-    m_after->setNetworkNotificationSuppressed(suppressed);
-    if (!wasClean) {
+    std::unique_ptr<ManagerState::CachedEdit> failed;
+    const Qx::AccessScope<cookie> turn(state.queue, m_item);
+    EditManagerLock writers(Qx::folderOf(m_from.file()));
+    const bool mayWrite = takeWritersLock(writers);
+    const ManagerState::Hold hold(state.lock);
+    const Qx::FileAnswer present = Qx::askFile(m_from.file());
+    if (!mayWrite || (!present.isMissing() && !Qx::isSameFile(present.info(), m_moved))) {
+        m_moves.keep();
+        herc_printf(
+            "edit_manager: the revision of %s that was stepped to does not open; the one before is %s\n",
+            m_item.asString().c_str(), m_to.path(1).c_str());
         return;
     }
-    m_after->set_dirty(false);
-    state.removeFromDirtyList(m_item);
+    failed = state.removeCacheEntry(m_item);
+    m_moves.takeBack();
+    m_dropped->leaving = false;
+    ManagerState::noteFile(*m_dropped);
+    state.putBack(std::move(m_dropped));
+    report("the revision could not be opened");
+}
+
+/// Gives the edit what is carried over. Left out if its section cannot be had: the step is made.
+void RevisionStep::carryOver() {
+    const SectionHold section(m_after);
+    if (!section.isHeld()) {
+        return;
+    }
+    m_wasClean = !m_after->isDirty(true);
+    m_after->set_cel_cues_loaded(m_celCuesLoaded);
+    m_after->setOwner(m_owner, false);
+}
+
+/// Says of the edit which change was undone or redone. That counts as a change and reaches its file.
+void RevisionStep::describe() {
+    ManagerState& state = managerState();
+    const SectionHold section(m_after);
+    if (!section.isHeld()) {
+        return;
+    }
+    const EditModification own = m_after->getChangeDescription();
+    const EditModification said = m_code == kRevisionUndo ? m_description.invert() : own;
+    if (m_wasClean) {
+        m_after->resetChangeDescription();
+    }
+    m_after->setChangeDescription(said, true);
     const ManagerState::Hold hold(state.lock);
     ManagerState::CachedEdit* const entry = state.findCacheEntry(m_item);
-    if (entry != nullptr && entry->edit == m_after) {
-        entry->ownDescription = own;
+    if (entry != nullptr && entry->edit == m_after && m_wasClean) {
+        entry->step = {own, said};
     }
+}
+
+/// Moves the edit's file, written whole, to undo backup 1 and deletes what could be redone, last.
+Qx::Status keepRevision(ManagerState::CachedEdit& entry) {
+    RevisionChain undo(entry.path, RevisionChain::Undo, depth());
+    RevisionChain redo(entry.path, RevisionChain::Redo, depth());
+    Qx::FileMoves moves(Qx::folderOf(undo.file()));
+    Qx::Status status = redo.closeHoles();
+    if (status) {
+        status = undo.push(moves);
+    }
+    if (status) {
+        status = redo.deleteTail(0);
+    }
+    return status ? moves.finish() : status;
 }
 
 } // namespace
@@ -199,21 +317,18 @@ bool edit_manager::backup_edit(const cookie& item) {
         return false;
     }
     edit->notifyImpendingRevisionChange(kRevisionBackup);
-    RevisionChain undo = chainOf(item, RevisionChain::Undo);
-    RevisionChain redo = chainOf(item, RevisionChain::Redo);
     {
         const CachedEditScope scope(item, edit);
-        if (scope.entry() == nullptr || !writeWhole(*scope.entry()) || !redo.deleteTail(0)) {
+        if (scope.entry() == nullptr || !writeWhole(*scope.entry())) {
             return false;
         }
-        const Qx::Status kept = undo.push();
+        const Qx::Status kept = keepRevision(*scope.entry());
         managerState().noteFile(*scope.entry());
         if (!kept) {
             herc_printf("edit_manager::backup_edit( %s ) : %s\n", cookie_string(item).c_str(),
                         kept.reason().c_str());
             return false;
         }
-        static_cast<void>(undo.makeDurable());
         if (edit->Opts().getInt(kClipboardUsed) != 0) {
             edit->Opts().setInt(kClipboardUsed, 0);
         }
@@ -225,12 +340,11 @@ bool edit_manager::backup_edit(const cookie& item) {
 
 bool edit_manager::undoExists(const cookie& item) {
     bool found = false;
-    return chainOf(item, RevisionChain::Undo).exists(found) && found;
+    return !chainOf(item, RevisionChain::Undo).exists(found) || found;
 }
 
 bool edit_manager::redoExists(const cookie& item) {
-    // Backup 1, but for a chain that a crash has left with a hole.
-    return newestOf(chainOf(item, RevisionChain::Redo)) != 0;
+    return !chainOf(item, RevisionChain::Redo).ask(1).isMissing();
 }
 
 bool edit_manager::undoRequest(const cookie& item) {
@@ -248,7 +362,10 @@ void deleteTail(const cookie& item, RevisionChain::Kind kind, int keep) {
     EditManagerLock writers;
     if (!getFilenameForCookie(item).empty() && takeWritersLock(writers)) {
         const ManagerState::Hold hold(managerState().lock);
-        chain.deleteTail(keep);
+        if (const Qx::Status status = chain.deleteTail(keep); !status) {
+            herc_printf("edit_manager: backups of %s are left: %s\n", item.asString().c_str(),
+                        status.reason().c_str());
+        }
     }
 }
 

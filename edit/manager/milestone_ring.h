@@ -7,7 +7,8 @@
 #include <cstdint>
 
 /// Milestones: copies of an edit's file that are made while it is flushed, once enough changes have come
-/// together, in a ring of slots that are used over and over. They stay when the edit is deleted.
+/// together, in a ring of slots that are used over and over. They stay when the edit is deleted, and keep
+/// its cookie from being handed out again.
 ///
 /// The copies of an edit lie in the projects' root folder under the project's cookie, "Milestones" and the
 /// edit's cookie, and are named by the edit's cookie and the slot: "P0001000/Milestones/E0001000/E0001000.3".

@@ -1,14 +1,24 @@
 #include "edit/manager/revision_chain.h"
 
 #include "platform/services/edit_filenames.h"
+#include "platform/services/files.h"
+#include "platform/store/tag_bag.h"
 
 #include <algorithm>
+#include <cerrno>
+#include <cstdint>
 
 namespace {
 
 Qx::Status asStatus(const Qx::FileError& error) {
     return error ? Qx::Status::failure(error.text()) : Qx::Status();
 }
+
+/// More than any folder holds; leaves room for the numbers behind it.
+constexpr int kGreatestDepth = 1'000'000'000;
+
+/// So many numbers without a backup end a chain.
+constexpr int kLongestHole = 64;
 
 const char* marker(RevisionChain::Kind kind) {
     return kind == RevisionChain::Undo ? "U" : "R";
@@ -20,7 +30,7 @@ RevisionChain::RevisionChain(const cookie& item, Kind kind, int depth)
     : RevisionChain(getFilenameForCookie(item), kind, depth) {}
 
 RevisionChain::RevisionChain(const String& file, Kind kind, int depth)
-    : m_file(file), m_kind(kind), m_depth(std::max(depth, 1)) {}
+    : m_file(file), m_kind(kind), m_depth(std::clamp(depth, 1, kGreatestDepth)) {}
 
 String RevisionChain::extension(Kind kind, int number) {
     return number < 0 ? String::format("%s*", marker(kind)) : String::format("%s%d", marker(kind), number);
@@ -34,17 +44,32 @@ Qx::FileAnswer RevisionChain::ask(int number) const {
     return Qx::askFile(m_file.empty() ? String() : path(number));
 }
 
-Qx::Status RevisionChain::exists(bool& found) const {
-    int newest = 0;
-    Qx::Status status = findNewest(newest);
-    found = newest != 0;
-    if (status && !found && !m_file.empty()) {
-        std::vector<String> names;
-        status = asStatus(
-            Qx::retryInterrupted([&] { return Qx::fileSystem().list(Qx::folderOf(m_file), names); }));
-        found = !numbers(names).empty();
+Qx::Status RevisionChain::findFrom(int first, std::vector<int>& numbers, size_t limit) const {
+    numbers.clear();
+    for (int number = first, missing = 0;
+         !m_file.empty() && number <= m_depth && missing < kLongestHole && numbers.size() < limit; ++number) {
+        const Qx::FileAnswer answer = ask(number);
+        if (const Qx::FileError error = answer.obstacle()) {
+            return asStatus(error);
+        }
+        missing = answer.isRegular() ? 0 : missing + 1;
+        if (answer.isRegular()) {
+            numbers.push_back(number);
+        }
     }
-    return status;
+    return {};
+}
+
+Qx::Status RevisionChain::exists(bool& found) const {
+    int number = 0;
+    const Qx::Status status = findNewest(number);
+    found = number != 0;
+    if (!status || found) {
+        return status;
+    }
+    const Qx::FileAnswer behind = ask(m_depth + 1);
+    found = behind.isRegular();
+    return asStatus(behind.obstacle());
 }
 
 std::vector<String> RevisionChain::namesInFolder() const {
@@ -81,54 +106,48 @@ std::vector<int> RevisionChain::numbers(const std::vector<String>& names) const 
     return found;
 }
 
-Qx::Status RevisionChain::move(int from, int to) const {
-    return asStatus(Qx::fileSystem().rename(path(from), path(to)));
-}
-
-Qx::Status RevisionChain::findFirst(bool there, int from, int& number) const {
-    for (number = from; number <= m_depth; ++number) {
-        const Qx::FileAnswer answer = ask(number);
-        if (const Qx::FileError error = answer.obstacle()) {
-            return asStatus(error);
-        }
-        if (answer.isRegular() == there) {
-            break;
-        }
-    }
-    return {};
-}
-
-Qx::Status RevisionChain::findNewest(int& number) const {
-    const Qx::Status status = findFirst(true, 1, number);
-    if (!status || number > m_depth) {
-        number = 0;
-    }
+Qx::Status RevisionChain::findNewest(int& number, int after) const {
+    std::vector<int> found;
+    Qx::Status status = findFrom(after + 1, found, 1);
+    number = found.empty() ? 0 : found.front();
     return status;
 }
 
-Qx::Status RevisionChain::rotate() {
-    if (m_depth == 1) {
-        return {};
-    }
-    int firstFree = 1;
-    if (Qx::Status status = findFirst(false, 1, firstFree); !status) {
-        return status;
-    }
-    if (firstFree > m_depth) {
-        firstFree = m_depth;
-        if (Qx::Status status = asStatus(Qx::fileSystem().remove(path(m_depth))); !status) {
-            return status;
-        }
-    }
-    for (int number = firstFree - 1; number >= 1; --number) {
-        if (Qx::Status status = move(number, number + 1); !status) {
+/// Moves backups, in the order in which they are given, by so many numbers.
+Qx::Status RevisionChain::shift(Qx::FileMoves& moves, const std::vector<int>& numbers, int by) const {
+    for (const int number : numbers) {
+        if (Qx::Status status = moves.move(path(number), path(number + by)); !status) {
             return status;
         }
     }
     return {};
 }
 
-Qx::Status RevisionChain::push() {
+Qx::Status RevisionChain::rotate(Qx::FileMoves& moves) const {
+    std::vector<int> numbers;
+    if (Qx::Status status = findFrom(1, numbers, SIZE_MAX); !status) {
+        return status;
+    }
+    std::reverse(numbers.begin(), numbers.end());
+    if (!numbers.empty() && numbers.front() == m_depth) {
+        // It goes when everything else is in its place.
+        int free = m_depth;
+        while (!ask(++free).isMissing()) {
+            if (const Qx::FileError error = ask(free).obstacle()) {
+                return asStatus(error);
+            }
+        }
+        if (Qx::Status status = moves.move(path(m_depth), path(free)); !status) {
+            return status;
+        }
+        moves.removeWhenFinished(path(free));
+        numbers.erase(numbers.begin());
+    }
+    Qx::Status status = shift(moves, numbers, 1);
+    return status ? moves.sync() : status;
+}
+
+Qx::Status RevisionChain::push(Qx::FileMoves& moves) {
     const Qx::FileAnswer present = Qx::askFile(m_file);
     if (const Qx::FileError error = present.obstacle("keep")) {
         return asStatus(error);
@@ -136,50 +155,121 @@ Qx::Status RevisionChain::push() {
     if (present.isMissing()) {
         return Qx::Status::failure("there is no file " + m_file + " to keep as a backup");
     }
-    if (const Qx::FileError error = ask(1).obstacle("replace")) {
-        return asStatus(error);
+    Qx::Status status = rotate(moves);
+    return status ? moves.move(m_file, path(1)) : status;
+}
+
+Qx::Status RevisionChain::push() {
+    Qx::FileMoves moves(Qx::folderOf(m_file));
+    Qx::Status status = push(moves);
+    return status ? moves.finish() : status;
+}
+
+Qx::Status RevisionChain::pull(Qx::FileMoves& moves, int number) {
+    Qx::Status status = moves.sync();
+    if (status) {
+        status = moves.move(path(number), m_file);
     }
-    if (Qx::Status status = rotate(); !status) {
-        return status;
+    std::vector<int> numbers;
+    if (status) {
+        status = findFrom(number + 1, numbers, SIZE_MAX);
     }
-    return asStatus(Qx::fileSystem().rename(m_file, path(1)));
+    if (status && !numbers.empty()) {
+        status = moves.sync();
+    }
+    return status ? shift(moves, numbers, -number) : status;
 }
 
 Qx::Status RevisionChain::restoreNewest(int& restored) {
     restored = 0;
     int newest = 0;
-    if (Qx::Status status = findNewest(newest); !status || newest == 0) {
+    Qx::FileMoves restoring(Qx::folderOf(m_file));
+    Qx::Status status = findNewest(newest);
+    if (!status || newest == 0) {
         return status;
     }
-    if (const Qx::FileError error = Qx::askFile(m_file).obstacle("replace")) {
-        return asStatus(error);
-    }
-    if (Qx::Status status = asStatus(Qx::fileSystem().rename(path(newest), m_file)); !status) {
+    if (status = restoring.move(path(newest), m_file); !status) {
         return status;
     }
     restored = newest;
-    for (int number = restored + 1; number <= m_depth; ++number) {
-        const Qx::FileAnswer answer = ask(number);
-        if (answer.obstacle() || (answer.isRegular() && !move(number, number - restored))) {
-            break; // what is left keeps its order; a hole is passed over
-        }
+    const bool durable = restoring.sync().isOk();
+    restoring.keep();
+    // A hole is passed over, so nothing depends on its being closed.
+    Qx::FileMoves closing(Qx::folderOf(m_file));
+    std::vector<int> numbers;
+    if (durable && findFrom(newest + 1, numbers, SIZE_MAX) && shift(closing, numbers, -newest)) {
+        static_cast<void>(closing.finish());
     }
     return {};
 }
 
-bool RevisionChain::deleteTail(int keep) {
-    for (int number = m_depth; number > std::max(keep, 0); --number) {
-        const Qx::FileAnswer answer = ask(number);
-        if (answer.obstacle() || (answer.isRegular() && Qx::fileSystem().remove(path(number)))) {
-            return false;
+Qx::Status RevisionChain::closeHoles() {
+    Qx::FileMoves moves(Qx::folderOf(m_file));
+    std::vector<int> numbers;
+    Qx::Status status = findFrom(1, numbers, SIZE_MAX);
+    for (size_t i = 0; status && i < numbers.size(); ++i) {
+        const int place = static_cast<int>(i) + 1;
+        if (numbers[i] != place) {
+            status = moves.move(path(numbers[i]), path(place));
         }
     }
-    return true;
+    return status ? moves.finish() : status;
 }
 
-Qx::Status RevisionChain::makeDurable() const {
+Qx::Status RevisionChain::deleteTail(int keep) {
+    bool any = false;
+    for (int number = std::max(keep, 0); number < m_depth; any = true) {
+        ++number;
+        const auto error = Qx::retryInterrupted([&] { return Qx::fileSystem().remove(path(number)); });
+        if (error.code == ENOENT) {
+            break;
+        }
+        if (error) {
+            return asStatus(error);
+        }
+    }
+    return any ? syncFolder() : Qx::Status();
+}
+
+Qx::Status RevisionChain::syncFolder() const {
     return asStatus(
         Qx::retryInterrupted([this] { return Qx::fileSystem().syncFolder(Qx::folderOf(m_file)); }));
+}
+
+EditFileState examineEditFile(const String& path, String& why) {
+    constexpr size_t kCookieLength = 8;
+    const String name = Qx::fileNameOf(path);
+    const cookie item(std::string_view(name).substr(0, kCookieLength));
+    if (!item.isStorable()) {
+        why = path + " is not named after an item";
+        return EditFileState::Refused;
+    }
+    TagBag bag;
+    const TagBag::OpenResult result =
+        bag.open(item, Qx::folderOf(path), eOpenExisting, name.substr(kCookieLength));
+    why = bag.openError();
+    switch (result) {
+    case TagBag::Opened:
+        return EditFileState::Sound;
+    case TagBag::Damaged:
+    case TagBag::Foreign:
+        return EditFileState::Damaged;
+    default:
+        return EditFileState::Refused;
+    }
+}
+
+Qx::Status findCorruptName(const String& file, String& name) {
+    for (int number = 0;; ++number) {
+        name = file + (number == 0 ? String(".CORRUPT") : String::format(".CORRUPT.%d", number));
+        const Qx::FileAnswer found = Qx::askFile(name);
+        if (found.isMissing()) {
+            return {};
+        }
+        if (found.isUnknown()) {
+            return asStatus(found.obstacle());
+        }
+    }
 }
 
 String getUndoExtension(int number) {

@@ -41,14 +41,10 @@ bool endsEditName(std::string_view rest) {
 /// could be stored in the place of a link or a folder), else, with `isMilestones`, a folder an edit. A folder
 /// that is not there has none.
 Qx::FileError addNamed(const String& folder, bool isMilestones, Numbers& taken) {
-    Qx::FileInfo info;
-    std::vector<String> names;
-    if (auto error = Qx::retryInterrupted([&] { return Qx::fileSystem().info(folder, info); })) {
-        return error;
-    }
-    if (isMilestones && info.kind == Qx::FileKind::Missing) {
+    if (isMilestones && Qx::askFile(folder).isMissing()) {
         return {};
     }
+    std::vector<String> names;
     if (auto error = Qx::retryInterrupted([&] { return Qx::fileSystem().list(folder, names); })) {
         return error;
     }

@@ -56,7 +56,10 @@ void ProjectDetails::giveTo(configb& settings) const {
     settings.setInt(kRateKey, frameRateCode);
     settings.setBool(kDropFrameKey, dropFrame);
     settings.setInt(kMediumKey, defaultEditMedium);
-    settings.setInt(kNextEditKey, m_nextEditNumber);
+    // A count that nothing was taken from is none: there may be edits whose count was lost.
+    if (m_nextEditNumber > 1 || settings.contains(kNextEditKey)) {
+        settings.setInt(kNextEditKey, m_nextEditNumber);
+    }
 }
 
 Qx::Status ProjectDetails::openOrCreate(const String& rootFolder, const cookie& project,

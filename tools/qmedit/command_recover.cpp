@@ -43,8 +43,10 @@ Qx::Status replaceBy(const cookie& item, const Revision& taken, const Revision* 
         status = undo.push();
         kept = undo.path(1);
     } else if (present != nullptr) {
-        kept = freeCorruptName(file);
-        status = failure(Qx::fileSystem().rename(file, kept));
+        status = findCorruptName(file, kept);
+        if (status) {
+            status = failure(Qx::fileSystem().rename(file, kept));
+        }
     }
     if (status) {
         status = failure(Qx::fileSystem().rename(copy, file));
@@ -59,7 +61,8 @@ Qx::Status replaceBy(const cookie& item, const Revision& taken, const Revision* 
         static_cast<void>(Qx::fileSystem().remove(copy).code);
         return status;
     }
-    return undo.makeDurable();
+    const Qx::FileError error = Qx::fileSystem().syncFolder(Qx::folderOf(file));
+    return failure(error);
 }
 
 /// Says why no state can be taken and what else can be done.

@@ -23,6 +23,7 @@ class FilesBefore {
 public:
     explicit FilesBefore(const cookie& item) : m_undo(chain(item, RevisionChain::Undo)) {
         m_edit = inodeOf(m_undo.file());
+        static_cast<void>(findCorruptName(m_undo.file(), m_corrupt));
         for (const int number : m_undo.numbers()) {
             m_backups.emplace_back(number, inodeOf(m_undo.path(number)));
         }
@@ -38,13 +39,15 @@ public:
         }
         return 0;
     }
-    [[nodiscard]] String corruptName() const { return m_undo.file() + ".CORRUPT"; }
+    /// The name that the file gets if it is moved aside.
+    [[nodiscard]] const String& corruptName() const { return m_corrupt; }
     [[nodiscard]] bool wasMovedAside() const { return m_edit != 0 && inodeOf(corruptName()) == m_edit; }
     [[nodiscard]] bool wasMissing() const { return m_edit == 0; }
     [[nodiscard]] const String& file() const { return m_undo.file(); }
 
 private:
     RevisionChain m_undo;
+    String m_corrupt;
     uint64_t m_edit = 0;
     std::vector<std::pair<int, uint64_t>> m_backups;
 };
@@ -130,8 +133,8 @@ String putFileBack(const cookie& item, EditPtr& edit) {
     edit_manager::invalidateCache(item);
     RevisionChain undo = chain(item, RevisionChain::Undo);
     int restored = 0;
-    if (Qx::askFile(undo.file()).isMissing() && undo.restoreNewest(restored) && restored != 0) {
-        static_cast<void>(undo.makeDurable().isOk());
+    if (Qx::askFile(undo.file()).isMissing()) {
+        static_cast<void>(undo.restoreNewest(restored).isOk());
     }
     return Qx::askFile(undo.file()).isRegular()
                ? String("the edit is as it was")

@@ -136,17 +136,6 @@ String changeText(const EditModification& change) {
     }
 }
 
-String freeCorruptName(const String& file) {
-    String name = file + kCorrupt;
-    Qx::FileAnswer found = Qx::askFile(name);
-    for (int number = 1; !found.isMissing() && !found.isUnknown(); ++number) {
-        name = file + kCorrupt + String::format(".%d", number);
-        found = Qx::askFile(name);
-    }
-    // Nothing can be moved to no name at all.
-    return found.isMissing() ? name : String();
-}
-
 String localTimeText(int64_t seconds) {
     const auto time = static_cast<std::time_t>(seconds);
     std::tm fields{};

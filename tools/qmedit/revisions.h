@@ -45,8 +45,5 @@ struct Revision {
 /// The states as a table, a line each, as `qmedit history` shows them.
 [[nodiscard]] String revisionTable(const std::vector<Revision>& revisions, const Console& console);
 
-/// A name beside a file, ".CORRUPT" or ".CORRUPT.N", that nothing has.
-[[nodiscard]] String freeCorruptName(const String& file);
-
 /// "2026-11-21 13:04" of local time; "-" for a time that has no date.
 [[nodiscard]] String localTimeText(int64_t seconds);

@@ -7,7 +7,23 @@
 
 namespace {
 
-/// Keeps the file of another program as undo backup 1 if it is not the one this process knows.
+/// Keeps a file as undo backup 1, or one that is damaged as what it is.
+Qx::Status keepAside(const String& file, int depth, String& kept) {
+    String why;
+    RevisionChain undo(file, RevisionChain::Undo, depth);
+    if (examineEditFile(file, why) != EditFileState::Damaged) {
+        kept = undo.path(1);
+        return undo.push();
+    }
+    Qx::FileMoves moves(Qx::folderOf(file));
+    Qx::Status status = findCorruptName(file, kept);
+    if (status) {
+        status = moves.move(file, kept);
+    }
+    return status ? moves.finish() : status;
+}
+
+/// Keeps the file of another program aside if it is not the one this process knows.
 bool keepForeignFile(const ManagerState::CachedEdit& entry, int depth) {
     const Qx::FileAnswer present = Qx::askFile(entry.path);
     if (const Qx::FileError error = present.obstacle("replace")) {
@@ -17,17 +33,16 @@ bool keepForeignFile(const ManagerState::CachedEdit& entry, int depth) {
     if (present.isMissing() || Qx::isSameFile(entry.file, present.info())) {
         return true;
     }
-    const Qx::Status kept = RevisionChain(entry.path, RevisionChain::Undo, depth).push();
-    if (!kept) {
-        herc_printf(
-            "edit_manager: %s was changed by another program and could not be kept as a backup, so it "
-            "was not written: %s\n",
-            entry.path.c_str(), kept.reason().c_str());
+    String kept;
+    const Qx::Status status = keepAside(entry.path, depth, kept);
+    if (!status) {
+        herc_printf("edit_manager: %s was changed by another program and could not be kept, so it was not "
+                    "written: %s\n",
+                    entry.path.c_str(), status.reason().c_str());
         return false;
     }
-    herc_printf(
-        "edit_manager: %s was changed by another program; that version is kept as its undo backup 1\n",
-        entry.path.c_str());
+    herc_printf("edit_manager: %s was changed by another program; that version is kept as %s\n",
+                entry.path.c_str(), kept.c_str());
     return true;
 }
 
@@ -148,7 +163,6 @@ bool ManagerState::write(CachedEdit& entry, bool waits) {
         return false;
     }
     noteFile(entry);
-    entry.ownDescription.reset();
     removeFromDirtyList(entry.item);
     if (edit.get_dirty()) {
         addToDirtyList(entry.item); // changed meanwhile by one who does not hold its section

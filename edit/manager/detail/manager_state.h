@@ -55,8 +55,13 @@ struct ManagerState {
         }
         /// Its file became a backup and was not written since: nothing lies under the edit's name.
         [[nodiscard]] bool isAway() const { return hadFile && file.kind == Qx::FileKind::Missing; }
-        /// What the revision that an undo or redo brought back says of itself, until it is changed.
-        std::optional<EditModification> ownDescription;
+        /// What the revision that an undo or redo brought back said of itself, and what is said of the step
+        /// in its place, until it is changed.
+        struct Step {
+            EditModification own;
+            EditModification said;
+        };
+        std::optional<Step> step;
         /// It is about to leave the cache: who asks for it waits for what comes in its place. Guarded by
         /// `lookup`.
         bool leaving = false;

@@ -100,6 +100,22 @@ TEST(Recovery, EveryStateOfTheFilesOpensAsFarAsItCan) {
     }
 }
 
+TEST(Recovery, KeepsTheFirstThatWasSetAside) {
+    ManagedProject project;
+    for (const char* const bytes : {"first", "second", "third"}) {
+        project.write("E0001000.qme", bytes);
+        EXPECT_EQ(ManagedProject::nameOf(), "(null)");
+        edit_manager::invalidateCache(kEdit);
+    }
+    EXPECT_EQ(project.read("E0001000.qme.CORRUPT"), "first");
+    EXPECT_EQ(project.read("E0001000.qme.CORRUPT.1"), "second");
+    EXPECT_EQ(project.read("E0001000.qme.CORRUPT.2"), "third");
+    // Nothing in the depth can be restored, which is told.
+    project.write("E0001000.qme.U11", "behind it");
+    EXPECT_EQ(ManagedProject::nameOf(), "(null)");
+    EXPECT_TRUE(project.log.contains("open( E0001000 ) - missing, trying backup 0 \n"));
+}
+
 TEST(Recovery, TellsOfEachBackupAndToTheUserWhenNoneIsLeft) {
     ManagedProject project;
     for (const char* const name : kNames) {

@@ -2,10 +2,12 @@
 #include "edit/project/permissions_manager.h"
 #include "platform/services/config_int.h"
 #include "tests/edit/manager/managed_project.h"
+#include "tests/support/edit_state.h"
 #include "tests/support/faulty_file_system.h"
 
 #include <gtest/gtest.h>
 
+#include <fstream>
 #include <random>
 
 namespace {
@@ -46,16 +48,19 @@ void randomChange(std::mt19937& random, int number) {
     edit->setName(String::format("revision %d", number));
 }
 
-TEST(Undo, GoesBackToTheStartAndOnToTheEndByteForByte) {
+TEST(Undo, GoesBackToTheStartAndOnToTheEnd) {
     for (unsigned seed = 1; seed <= 3; ++seed) {
         SCOPED_TRACE(testing::Message() << "seed " << seed);
         std::mt19937 random(seed);
         ManagedProject project;
         std::vector<std::string> revisions;
+        std::vector<String> contents;
+        const auto content = [] { return test::contentState(*EditPtr(kEdit, eOpenExisting)); };
         ManagedProject::save("start");
         constexpr int kSteps = 10;
         for (int i = 0; i < kSteps; ++i) {
             revisions.push_back(project.read("E0001000.qme"));
+            contents.push_back(content());
             ASSERT_TRUE(edit_manager::backup_edit(kEdit));
             EXPECT_FALSE(project.has("E0001000.qme"));
             randomChange(random, i);
@@ -64,11 +69,16 @@ TEST(Undo, GoesBackToTheStartAndOnToTheEndByteForByte) {
             EXPECT_EQ(project.read("E0001000.qme.U1"), revisions.back());
         }
         revisions.push_back(project.read("E0001000.qme"));
-        const auto check = [&](int at) {
-            EXPECT_EQ(project.read("E0001000.qme"), revisions[static_cast<size_t>(at)]) << at;
+        contents.push_back(content());
+        const auto check = [&](int at, bool untold) {
+            // The file is the revision's, until what is said of the step is written.
+            if (untold) {
+                EXPECT_EQ(project.read("E0001000.qme"), revisions[static_cast<size_t>(at)]) << at;
+            }
             const EditPtr edit(kEdit, eOpenExisting);
             ASSERT_TRUE(edit.valid());
-            EXPECT_FALSE(edit->isDirty(true));
+            EXPECT_TRUE(edit->isDirty(true));
+            EXPECT_EQ(test::contentState(*edit), contents[static_cast<size_t>(at)]);
             EXPECT_EQ(edit->getName(), at == 0 ? String("start") : String::format("revision %d", at - 1));
             EXPECT_EQ(edit_manager::undoExists(kEdit), at > 0);
             EXPECT_EQ(edit_manager::redoExists(kEdit), at < kSteps);
@@ -76,12 +86,12 @@ TEST(Undo, GoesBackToTheStartAndOnToTheEndByteForByte) {
         for (int round = 0; round < 2; ++round) {
             for (int at = kSteps - 1; at >= 0; --at) {
                 ASSERT_TRUE(edit_manager::undoRequest(kEdit));
-                check(at);
+                check(at, round == 0);
             }
             EXPECT_FALSE(edit_manager::undoRequest(kEdit));
             for (int at = 1; at <= kSteps; ++at) {
                 ASSERT_TRUE(edit_manager::redoRequest(kEdit));
-                check(at);
+                check(at, false);
             }
             EXPECT_FALSE(edit_manager::redoRequest(kEdit));
         }
@@ -132,13 +142,17 @@ TEST(Undo, TellsThoseWhoHoldTheEditAndThoseWhoOpenItAgain) {
     EXPECT_TRUE(reopened->get_cel_cues_loaded());
     EXPECT_EQ(reopened->getOwner(), "bert");
     EXPECT_EQ(reopened->getChangeDescription(), EditModification(kNameChanged).invert());
-    EXPECT_FALSE(reopened->isDirty(true));
-    EXPECT_EQ(edit_manager::numDirty(), 0U);
+    EXPECT_EQ(edit_manager::numDirty(), 1U) << "what is said of the step reaches the file";
+    const uint64_t count = reopened->getModificationCount();
     // What is done to the object that was left behind does not reach the file.
     held->setName("stale");
     EXPECT_TRUE(edit_manager::flush_changes());
     edit_manager::close_all_edits();
     EXPECT_EQ(ManagedProject::nameOf(), "a");
+    const EditPtr stored(kEdit, eOpenExisting);
+    EXPECT_EQ(stored->getOwner(), "bert");
+    EXPECT_EQ(stored->getChangeDescription(), EditModification(kNameChanged).invert());
+    EXPECT_EQ(stored->getModificationCount(), count);
     ASSERT_TRUE(edit_manager::redoRequest(kEdit));
     EXPECT_EQ(EditPtr(kEdit, eOpenExisting)->getChangeDescription(), EditModification(kNameChanged));
 }
@@ -186,30 +200,93 @@ TEST(Undo, KeepsToTheDepthAndToReadOnlyMarks) {
     EXPECT_FALSE(edit_manager::backup_edit(cookie("E0009000"))) << "there is none";
 }
 
-TEST(Undo, AStepThatFailsLeavesTheRevisionsAsTheyWere) {
+TEST(Undo, WhatDoesNotOpenIsNeverSteppedTo) {
+    const std::string bad = "This is not an edit.";
+    for (const bool redo : {false, true}) {
+        for (const bool oneBehindIsSound : {false, true}) {
+            SCOPED_TRACE(testing::Message() << "redo " << redo << ", one behind it " << oneBehindIsSound);
+            ManagedProject project;
+            for (const char* const name : {"a", "b"}) {
+                ManagedProject::save(name);
+                ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+            }
+            ManagedProject::save("c");
+            if (redo) {
+                ASSERT_TRUE(edit_manager::undoRequest(kEdit) && edit_manager::undoRequest(kEdit));
+                ASSERT_TRUE(edit_manager::flush_changes());
+            }
+            const std::string chain = redo ? "E0001000.qme.R" : "E0001000.qme.U";
+            project.write(chain + "1", bad);
+            if (!oneBehindIsSound) {
+                project.write(chain + "2", bad.substr(1));
+            }
+            const std::string file = project.read("E0001000.qme");
+            EXPECT_EQ(redo ? edit_manager::redoRequest(kEdit) : edit_manager::undoRequest(kEdit),
+                      oneBehindIsSound);
+            EXPECT_EQ(ManagedProject::nameOf(), redo == oneBehindIsSound ? "c" : "a");
+            if (oneBehindIsSound) {
+                EXPECT_EQ(project.read("E0001000.qme.CORRUPT"), bad);
+                EXPECT_TRUE(redo ? edit_manager::undoRequest(kEdit) : edit_manager::redoRequest(kEdit));
+                EXPECT_EQ(ManagedProject::nameOf(), redo ? "a" : "c");
+            } else {
+                EXPECT_EQ(project.read("E0001000.qme"), file);
+                EXPECT_EQ(project.read(chain + "1"), bad);
+                EXPECT_EQ(project.read(chain + "2"), bad.substr(1));
+            }
+        }
+    }
+}
+
+TEST(Undo, ABackupIsWhatTheEditIsWhateverBecameOfItsFile) {
+    const std::string theirs = [] {
+        ManagedProject project;
+        ManagedProject::save("theirs");
+        return project.read("E0001000.qme");
+    }();
+    for (const std::string& became : {std::string("This is not an edit."), theirs, std::string()}) {
+        for (const bool unnoticed : {false, true}) {
+            ManagedProject project;
+            ManagedProject::save("mine");
+            const std::filesystem::path file((project.folder() + "/E0001000.qme").c_str());
+            const std::string whole = project.read("E0001000.qme");
+            const auto time = std::filesystem::last_write_time(file);
+            std::string put = became;
+            if (unnoticed) {
+                put = whole;
+                put[put.size() / 2] = static_cast<char>(put[put.size() / 2] ^ 1);
+            }
+            std::ofstream(file, std::ios::binary) << put;
+            if (unnoticed) {
+                std::filesystem::last_write_time(file, time);
+            }
+            ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+            ManagedProject::stopManager();
+            std::filesystem::remove(file);
+            ManagedProject::startManager();
+            EXPECT_EQ(ManagedProject::nameOf(), "mine");
+            EXPECT_EQ(edit_manager::undoExists(kEdit), put == theirs) << "bad bytes are no backup";
+        }
+    }
+}
+
+TEST(Undo, AFullDiskLeavesTheEditUnderItsName) {
     ManagedProject project;
     ManagedProject::save("a");
     ASSERT_TRUE(edit_manager::backup_edit(kEdit));
     ManagedProject::save("b");
-    const std::string file = project.read("E0001000.qme");
-    const std::string undo = project.read("E0001000.qme.U1");
-    for (const char* const fault :
-         {"rename E0001000.qme E0001000.qme.R1", "rename E0001000.qme.U1 E0001000.qme"}) {
+    ASSERT_TRUE(edit_manager::undoRequest(kEdit));
+    ASSERT_TRUE(edit_manager::flush_changes());
+    ManagedProject::change("new");
+    for (const char* const what : {"write", "rename E0001000.qme E0001000.qme.U1", "sync folder"}) {
         test::FaultyFileSystem system;
-        system.failWhere(fault, EIO);
-        EXPECT_FALSE(edit_manager::undoRequest(kEdit));
-        EXPECT_EQ(project.read("E0001000.qme"), file);
-        EXPECT_EQ(project.read("E0001000.qme.U1"), undo);
-        EXPECT_EQ(ManagedProject::nameOf(), "b");
+        system.failWhere(what, ENOSPC);
+        EXPECT_FALSE(edit_manager::backup_edit(kEdit)) << what;
+        EXPECT_TRUE(project.has("E0001000.qme"));
+        EXPECT_TRUE(project.log.contains("E0001000.qme") && project.log.contains("No space left"));
+        EXPECT_TRUE(edit_manager::redoExists(kEdit) || String(what) == "sync folder");
     }
-    {
-        test::FaultyFileSystem system;
-        system.failWhere("rename E0001000.qme E0001000.qme.U1", EIO);
-        EXPECT_FALSE(edit_manager::backup_edit(kEdit));
-        EXPECT_EQ(project.read("E0001000.qme"), file);
-    }
-    EXPECT_TRUE(edit_manager::undoRequest(kEdit));
-    EXPECT_EQ(ManagedProject::nameOf(), "a");
+    EXPECT_TRUE(edit_manager::backup_edit(kEdit));
+    EXPECT_EQ(ManagedProject::nameOf(), "new");
 }
 
 TEST(Milestones, AreDueByCountAndGoRoundTheSlots) {

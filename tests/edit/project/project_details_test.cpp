@@ -72,6 +72,12 @@ TEST(ProjectDetails, SavingNeverSetsTheCountBack) {
     ProjectDetails read;
     ASSERT_TRUE(ProjectDetails::openOrCreate(folder.path(), kProject, ProjectDetails(), read));
     EXPECT_EQ(read.name, "renamed");
+    // Settings that are made anew do not know where the count was.
+    folder.write("P0001000/E000C000.qme.U1", "");
+    std::filesystem::remove(folder.path("P0001000/Project.txt").c_str());
+    ASSERT_TRUE(ProjectDetails::openOrCreate(folder.path(), kProject, feature(), read));
+    ASSERT_TRUE(CookieAllocator(details.folder()).allocate(1, edits));
+    EXPECT_EQ(edits.back(), cookie(Cookie_Type::Edit, 13, 0));
 }
 
 TEST(ProjectDetails, KeepsWhatItDoesNotKnow) {
