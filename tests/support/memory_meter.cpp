@@ -10,13 +10,14 @@ namespace {
 std::atomic<size_t> held{0};
 std::atomic<size_t> most{0};
 thread_local size_t allocations = 0;
+thread_local size_t failing = 0; ///< the number of the allocation that fails; 0 for none
 
 void* take(size_t size) noexcept {
-    void* const memory = std::malloc(size == 0 ? 1 : size);
+    ++allocations;
+    void* const memory = allocations == failing ? nullptr : std::malloc(size == 0 ? 1 : size);
     if (memory == nullptr) {
         return nullptr;
     }
-    ++allocations;
     const size_t now = held += malloc_usable_size(memory);
     size_t before = most;
     while (before < now && !most.compare_exchange_weak(before, now)) {
@@ -84,6 +85,18 @@ size_t MemoryMeter::peak() const {
 
 size_t MemoryMeter::numAllocations() const {
     return allocations - m_allocationsBefore;
+}
+
+FailingAllocation::FailingAllocation(size_t n) : m_at(allocations + n) {
+    failing = m_at;
+}
+
+FailingAllocation::~FailingAllocation() {
+    failing = 0;
+}
+
+bool FailingAllocation::cameToIt() const {
+    return allocations >= m_at;
 }
 
 } // namespace test

@@ -20,4 +20,18 @@ private:
     size_t m_allocationsBefore;
 };
 
+/// While it lives, the `n`-th allocation of this thread from here on fails, as it does when there is no
+/// memory left.
+class FailingAllocation {
+public:
+    explicit FailingAllocation(size_t n);
+    ~FailingAllocation();
+    FailingAllocation(const FailingAllocation&) = delete;
+    FailingAllocation& operator=(const FailingAllocation&) = delete;
+    [[nodiscard]] bool cameToIt() const;
+
+private:
+    size_t m_at;
+};
+
 } // namespace test

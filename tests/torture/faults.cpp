@@ -1,0 +1,259 @@
+// A fault, or a signal, at every call that a command of qmedit makes on the files of a project.
+
+#include "command_runs.h"
+#include "tests/support/temporary_folder.h"
+#include "torture.h"
+
+#include <cerrno>
+#include <csignal>
+#include <cstring>
+#include <filesystem>
+
+namespace torture {
+
+namespace {
+
+struct Command {
+    const char* name;
+    std::vector<std::string> arguments;
+    bool changes;
+    int edit; ///< the edit that must be under its name afterwards; 0 for none
+};
+
+const std::vector<Command> kCommands = {
+    {"import", {"import", "$D/list.edl"}, true, 0},
+    {"apply", {"apply", "remove", "--to", "$1@1s-2s"}, true, 1},
+    {"backup", {"backup", "$1"}, true, 1},
+    {"undo", {"undo", "$1"}, true, 1},
+    {"redo", {"redo", "$1"}, true, 1},
+    {"recover", {"recover", "$3"}, true, 0},
+    {"delete", {"delete", "$2"}, true, 0},
+    {"salvage", {"salvage", "$D/project/P0001000/$3.qme", "--into", "$D/project"}, true, 0},
+    {"flush", {"flush"}, true, 1},
+    {"apply-source", {"apply", "insert", "--from", "$2@1s-3s", "--to", "$1@1s"}, true, 1},
+    {"export", {"export", "$1", "$D/out.edl"}, false, 1},
+    {"list", {"list"}, false, 1},
+    {"show", {"show", "$1", "--json"}, false, 1},
+    {"header", {"header", "$1"}, false, 1},
+    {"history", {"history", "$1", "--json"}, false, 1},
+    {"diff", {"diff", "$1.U1", "$1"}, false, 1},
+    {"verify", {"verify"}, false, 1},
+};
+
+struct Fault {
+    const char* name;
+    int error;
+    const char* mode;
+};
+
+constexpr Fault kFaultKinds[] = {
+    {"EIO", EIO, "one"},          {"ENOSPC", ENOSPC, "one"},      {"EDQUOT", EDQUOT, "one"},
+    {"EACCES", EACCES, "one"},    {"ESTALE", ESTALE, "one"},      {"EINTR", EINTR, "one"},
+    {"ENOMEM", ENOMEM, "one"},    {"EMFILE", EMFILE, "one"},      {"EROFS", EROFS, "one"},
+    {"a dead disk", EIO, "rest"}, {"a full disk", ENOSPC, "full"}};
+constexpr int kSignals[] = {SIGINT, SIGTERM, SIGHUP, SIGKILL};
+
+/// The number of a case: the command, what it meets, and at which call, in decimal places of their own.
+constexpr size_t kCommandPlace = 1000000;
+constexpr size_t kKindPlace = 10000;
+
+/// What a command does when nothing meets it.
+struct Reference {
+    ProjectStates before;
+    ProjectStates after;
+    String out;
+    size_t calls = 0;
+};
+
+Reference referenceOf(const Command& command, const std::string& folder) {
+    const Workplace place(folder);
+    Reference reference;
+    reference.before = place.states();
+    const Met met = place.run(command.arguments);
+    reference.after = place.states();
+    reference.out = met.result.out;
+    reference.calls = met.calls;
+    return reference;
+}
+
+std::vector<size_t> casesWith(size_t kinds) {
+    std::vector<size_t> numbers;
+    for (size_t i = 0; i < kCommands.size(); ++i) {
+        const test::TemporaryFolder folder;
+        const size_t calls = referenceOf(kCommands[i], folder.path("place")).calls;
+        for (size_t kind = 0; kind < kinds; ++kind) {
+            for (size_t at = 1; at <= calls; ++at) {
+                numbers.push_back(kCommandPlace * (i + 1) + kKindPlace * kind + at);
+            }
+        }
+    }
+    return numbers;
+}
+
+/// Compares what a command left with what was there and with what it leaves when all goes well.
+class Judge {
+public:
+    Judge(Case& its, const Command& command, const Workplace& place, const Reference& reference, String what,
+          bool away)
+        : m_case(its), m_command(command), m_place(place), m_reference(reference), m_what(std::move(what)),
+          m_mayBeAway(away) {}
+
+    void judge(const Met& met) {
+        m_words = met.result.err;
+        const ProjectStates found = m_place.states();
+        // What was promised with exit code 0 is there, the rest of the project is as it was.
+        if (met.result.code == 0) {
+            const bool told = !met.result.err.empty();
+            m_case.expect(found == m_reference.after || (!m_command.changes && found == m_reference.before),
+                          kind("says done, and it is not"), differenceOf(m_reference.after, found) + words());
+            if (!m_command.changes && !told) {
+                m_case.expect(met.result.out == m_reference.out, kind("answers wrongly without a word"),
+                              met.result.out.substr(0, 400));
+            }
+            return;
+        }
+        m_case.expect(met.result.code >= 1000 || !met.result.err.empty(), kind("fails without a word"));
+        m_case.expect(met.result.code == 1 || met.result.code >= 1000, kind("has another exit code than 1"),
+                      String::format("%d", met.result.code) + words());
+        m_case.expect(met.result.err.find(".tmp") == String::npos, kind("names a temporary file"), words());
+        if (found != m_reference.after) {
+            judgeUnfinished(found);
+        }
+    }
+
+    /// The same command again, with nothing in its way.
+    void judgeAgain(const ProjectStates& left) {
+        const Met again = m_place.run(m_command.arguments);
+        if (m_command.changes && left == m_reference.before) {
+            const ProjectStates found = m_place.states();
+            m_case.expect(again.result.code == 0 && found == m_reference.after,
+                          kind("does not work afterwards"),
+                          String::format("%d %s", again.result.code, again.result.err.c_str()) +
+                              differenceOf(m_reference.after, found));
+        } else if (!m_command.changes) {
+            m_case.expect(again.result.code == 0 && again.result.out == m_reference.out,
+                          kind("does not work afterwards"), again.result.err);
+        }
+    }
+
+    /// The readers find the edits, wherever their files are at the moment.
+    void judgeReaders() {
+        for (const int edit : {1, 2}) {
+            const bool deleted = String(m_command.name) == "delete" && edit == 2;
+            const Met shown = m_place.run({"show", "$" + std::to_string(edit)});
+            m_case.expect(shown.result.code == 0 || deleted, kind("leaves an edit that is not shown"),
+                          shown.result.err);
+        }
+    }
+
+private:
+    void judgeUnfinished(const ProjectStates& found) {
+        const String difference = differenceOf(m_reference.before, found) + words();
+        for (const auto& [path, digest] : m_reference.before) {
+            const auto there = found.find(path);
+            const auto expected = m_reference.after.find(path);
+            const bool stays = expected != m_reference.after.end();
+            const bool isEdit = path.ends_with(".qme");
+            if (isEdit && stays && there == found.end() && !m_mayBeAway) {
+                m_case.found(kind("leaves no file under the edit's name"), difference);
+            }
+            if (there != found.end() && isEdit && there->second != digest &&
+                !(stays && there->second == expected->second)) {
+                m_case.found(kind("leaves the edit in a state that it never had"), difference);
+            }
+            // A revision may go only when the command got as far as the state in which it is gone.
+            const bool goes = !holds(m_reference.after, digest);
+            const bool got = m_command.edit != 0 && reached(found);
+            if (!holds(found, digest) && digest != kDamaged && !(goes && (got || m_command.edit == 0))) {
+                m_case.found(kind(goes ? "fails and drops what could be redone" : "loses a revision"),
+                             digest + difference);
+            }
+        }
+        for (const auto& [path, digest] : found) {
+            const bool isNew = !m_reference.before.contains(path);
+            if (isNew && digest == kDamaged && m_reference.after.count(path) == 0 &&
+                path.find("CORRUPT") == std::string::npos) {
+                m_case.found(kind("leaves a damaged file"), path + difference);
+            }
+            if (isNew && path.find("CORRUPT") != std::string::npos && digest != kDamaged) {
+                m_case.found(kind("sets a sound file aside"), path + difference);
+            }
+            if (isNew && !m_mayBeAway && path.ends_with(".qme") && !holds(m_reference.before, digest)) {
+                m_case.found(kind("fails and leaves edit files"), path + difference);
+            }
+        }
+    }
+
+    /// True if the edit's file has become what the command makes of it.
+    [[nodiscard]] bool reached(const ProjectStates& found) const {
+        const std::string file = Workplace::fileOf(m_command.edit);
+        const auto there = found.find(file);
+        const auto before = m_reference.before.find(file);
+        return there != found.end() && before != m_reference.before.end() && there->second != before->second;
+    }
+
+    [[nodiscard]] String kind(const char* what) const { return String(m_command.name) + " " + what; }
+    [[nodiscard]] String words() const { return " | " + m_what + " | " + m_words.substr(0, 300); }
+
+    Case& m_case;
+    const Command& m_command;
+    const Workplace& m_place;
+    const Reference& m_reference;
+    String m_what;
+    String m_words;
+    bool m_mayBeAway;
+};
+
+const Command& commandOf(const Case& its) {
+    return kCommands[std::min(its.number() / kCommandPlace, kCommands.size()) - 1];
+}
+
+void runFault(Case& its) {
+    const Command& command = commandOf(its);
+    const Fault& fault =
+        kFaultKinds[std::min(its.number() % kCommandPlace / kKindPlace, std::size(kFaultKinds) - 1)];
+    const Reference reference = referenceOf(command, its.folder() + "/reference");
+    const Workplace place(its.folder() + "/place");
+    const Interference interference{its.number() % kKindPlace, fault.error, 0, fault.mode, false};
+    const Met met = place.run(command.arguments, interference);
+    if (met.call.empty()) {
+        return; // The command came to its end before.
+    }
+    // With a disk that does nothing any more nothing can be put back.
+    const bool dead = fault.mode[0] == 'r';
+    Judge judge(its, command, place, reference, String(fault.name) + " from " + met.call, dead);
+    judge.judge(met);
+    const ProjectStates left = place.states();
+    judge.judgeReaders();
+    judge.judgeAgain(left);
+    const bool cannotClean = dead || met.call.starts_with("unlink");
+    its.expect(cannotClean || numTemporaries(place.folder()) == 0,
+               String(command.name) + " leaves temporary files", met.call);
+}
+
+void runInterrupt(Case& its) {
+    const Command& command = commandOf(its);
+    const int signal = kSignals[std::min(its.number() % kCommandPlace / kKindPlace, std::size(kSignals) - 1)];
+    const Reference reference = referenceOf(command, its.folder() + "/reference");
+    const Workplace place(its.folder() + "/place");
+    const Met met = place.run(command.arguments, {its.number() % kKindPlace, 0, signal, "one", false});
+    if (met.call.empty()) {
+        return;
+    }
+    const bool killed = signal == SIGKILL;
+    Judge judge(its, command, place, reference, String(::strsignal(signal)) + " before " + met.call, killed);
+    judge.judge(met);
+    judge.judgeReaders();
+    its.expect(killed || numTemporaries(place.folder()) == 0,
+               String(command.name) + " leaves temporary files when interrupted", met.call);
+    judge.judgeAgain(place.states());
+}
+
+} // namespace
+
+const Attack kFaults{"faults", "a fault at every call of every command, with every error", runFault,
+                     [] { return casesWith(std::size(kFaultKinds)); }};
+const Attack kInterrupts{"interrupts", "Ctrl-C and its like at every call of every command", runInterrupt,
+                         [] { return casesWith(std::size(kSignals)); }};
+
+} // namespace torture
