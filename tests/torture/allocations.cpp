@@ -67,27 +67,20 @@ void run(Case& its) {
                         revisions.text() + ", after " + after.text();
 
     // A later save must work, and be true.
-    String current = nameOf(kItem);
-    const bool known = current == revisions.current || current == after.current || current == "new";
-    its.expect(known, "the edit in memory is neither old nor new" + where, seen + ", is " + current);
-    if (its.chance(2)) {
-        ManagedProject::change("later", kItem);
-        its.expect(edit_manager::flush_changes(), "a later flush answers false" + where, seen);
-        current = "later";
-    } else if (done) {
-        its.expect(current == after.current, "the edit is not what was answered" + where,
-                   seen + ", is " + current);
-        its.expect(edit_manager::flush_changes(), "a later flush answers false" + where, seen);
-    } else {
-        static_cast<void>(edit_manager::flush_changes());
-        current = nameOf(kItem);
-    }
+    const String held = nameOf(kItem);
+    const bool known = held == revisions.current || held == after.current || held == "new";
+    its.expect(known, "the edit in memory is neither old nor new" + where, seen + ", is " + held);
+    its.expect(!done || held == after.current, "the edit is not what was answered" + where,
+               seen + ", is " + held);
+    const bool later = its.chance(2) && changeName("later");
+    its.expect(edit_manager::flush_changes(), "a later flush answers false" + where, seen);
+    const String current = later ? String("later") : nameOf(kItem);
     const Revisions found = foundAnew();
     its.expect(found.current == current, "what was flushed with the answer true is not on the disk" + where,
                seen + ", in memory " + current + ", found " + found.text());
     const std::set<String> reached = found.all();
     for (const String& name : after.all()) {
-        if (revisions.all().contains(name) && name != revisions.current && !reached.contains(name)) {
+        if (revisions.all().contains(name) && name != held && !reached.contains(name)) {
             its.found("a revision is lost" + where, seen + ", found " + found.text());
         }
     }

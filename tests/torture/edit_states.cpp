@@ -1,6 +1,7 @@
 #include "edit_states.h"
 
 #include "edit/model/edit.h"
+#include "edit/persist/edit_salvage.h"
 #include "platform/services/atomic_file.h"
 
 #include <algorithm>
@@ -18,8 +19,9 @@ String digestOf(const std::string& path) {
     if (!fs::is_regular_file(fs::symlink_status(path, ignored))) {
         return kDamaged;
     }
-    const EditPtr edit(new Edit(WString(path.begin(), path.end()), eOpenExisting));
-    if (edit->isBad()) {
+    EditPtr edit;
+    Vector<String> lost;
+    if (!salvageEdit(path, edit, lost) || !lost.empty()) {
         return kDamaged;
     }
     String content;

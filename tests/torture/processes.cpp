@@ -59,13 +59,9 @@ public:
         }
         const size_t rounds = 12;
         std::vector<std::vector<std::string>> plans[3];
-        static const std::vector<std::vector<std::string>> kReaders = {{"show", "$1"},
-                                                                       {"list"},
-                                                                       {"verify"},
-                                                                       {"history", "$1"},
-                                                                       {"header", "$1"},
-                                                                       {"show", "$2"},
-                                                                       {"export", "$1", "$D/out.edl"}};
+        static const std::vector<std::vector<std::string>> kReaders = {
+            {"show", "$1"},   {"list"},       {"verify", "$1", "$2"},        {"history", "$1"},
+            {"header", "$1"}, {"show", "$2"}, {"export", "$1", "$D/out.edl"}};
         static const std::vector<std::vector<std::string>> kWriters = {
             {"apply", "remove", "--to", "$1@0s-0.04s"},
             {"backup", "$1"},
@@ -141,7 +137,9 @@ private:
                           path + "=" + digest);
         }
         for (const auto& [path, digest] : m_before) {
-            const bool others = path.find(Workplace::cookieOf(1)) == std::string::npos;
+            // The clipboard changes with every operation.
+            const bool others = path.find(Workplace::cookieOf(1)) == std::string::npos &&
+                                path.find("0HZ") == std::string::npos;
             m_case.expect(!others || digest == kDamaged || digestOf(m_place.project() + "/" + path) == digest,
                           "an edit that nobody changes is another", path);
         }

@@ -1,6 +1,7 @@
 // Threads that open and change edits while the current project changes. Every edit carries the mark of its
 // project, and the two projects have edits of the same cookies.
 
+#include "edit_states.h"
 #include "torture.h"
 
 #include "edit/manager/edit_manager.h"
@@ -61,7 +62,7 @@ void run(Case& its) {
     }
     std::atomic<bool> stop{false};
     std::vector<std::thread> threads;
-    for (size_t i = 0; i < 1 + its.below(3); ++i) {
+    for (size_t i = 0, n = 1 + its.below(3); i < n; ++i) {
         threads.emplace_back([&stop, flushes = i % 2 == 0] { change(stop, flushes); });
     }
     const size_t rounds = 12;
@@ -87,17 +88,20 @@ void run(Case& its) {
     }
     ManagedProject::stopManager();
     its.tried(rounds);
-    for (const cookie& each : kFolders) {
-        for (const cookie& item : {kShared, kOwn}) {
-            const std::string path = project.root().path(each.asString() + "/" + item.asString() + ".qme");
-            const EditPtr edit(new Edit(WString(path.begin(), path.end()), eOpenExisting));
-            const String mark = edit->isBad() ? String("(bad)") : edit->Opts().getString(kMark);
-            its.expect(mark == each.asString(), "an edit is written into another project",
-                       each.asString() + " holds " + mark);
-            const String name = edit->getName();
-            its.expect(item != kShared || name == "start" || name.starts_with(each.asString()),
-                       "an edit has the name of another project's", each.asString() + " holds " + name);
+    for (size_t i = 0; i < 2; ++i) {
+        // The shared edit's names, of all its revisions, begin with the mark of the project that it was
+        // opened for.
+        const String folder = kFolders[i].asString();
+        const String strange = kFolders[1 - i].asString();
+        for (const auto& [path, digest] : statesOf(project.root().path(folder))) {
+            its.expect(!digest.starts_with(strange), "an edit is written into another project",
+                       folder + "/" + path + " holds " + digest);
+            its.expect(digest != kDamaged, "a file is damaged", folder + "/" + path);
         }
+        const String own = project.root().path(folder + "/" + kOwn.asString() + ".qme");
+        its.expect(digestOf(own).starts_with(names[i] + "#"),
+                   "a change made before the project was left is lost",
+                   digestOf(own) + " instead of " + names[i]);
     }
 }
 

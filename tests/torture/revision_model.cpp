@@ -2,15 +2,12 @@
 
 #include "edit/manager/edit_manager.h"
 #include "platform/services/atomic_batch.h"
-#include "tests/edit/manager/managed_project.h"
 
 #include <algorithm>
 
 namespace torture {
 
 namespace {
-
-using test::ManagedProject;
 
 bool has(const Revisions& revisions) {
     return !revisions.current.empty();
@@ -34,10 +31,14 @@ bool go(Revisions& revisions, std::vector<String>& from, std::vector<String>& to
     return true;
 }
 
+bool save(const String& fresh, const cookie& item) {
+    return changeName(fresh, item) && edit_manager::flush_edit(item);
+}
+
 bool batch(const String& fresh) {
     Qx::AtomicBatch together;
     for (const cookie& item : kBatch) {
-        if (!ManagedProject::save(fresh, item)) {
+        if (!save(fresh, item)) {
             return false;
         }
     }
@@ -45,25 +46,22 @@ bool batch(const String& fresh) {
 }
 
 bool switchProject(const String& fresh) {
-    ManagedProject::change(fresh, kItem);
+    const bool changed = changeName(fresh);
     edit_manager::exitProject();
-    return edit_manager::set_current_project(cookie("P0001000"), eOpenExisting) == eStatus::Ok;
+    return changed && edit_manager::set_current_project(cookie("P0001000"), eOpenExisting) == eStatus::Ok;
 }
 
 } // namespace
 
 const std::vector<Step> kSteps = {
-    {"save", [](const String& fresh) { return ManagedProject::save(fresh, kItem); },
+    {"save", [](const String& fresh) { return save(fresh, kItem); },
      [](Revisions& its, const String& fresh) { return become(its, fresh, false), true; }},
     {"backup and save",
-     [](const String& fresh) {
-         return edit_manager::backup_edit(kItem) && ManagedProject::save(fresh, kItem);
-     },
+     [](const String& fresh) { return edit_manager::backup_edit(kItem) && save(fresh, kItem); },
      [](Revisions& its, const String& fresh) { return has(its) && (become(its, fresh, true), true); }},
     {"change, backup, flush",
      [](const String& fresh) {
-         ManagedProject::change(fresh, kItem);
-         return edit_manager::backup_edit(kItem) && edit_manager::flush_edit(kItem);
+         return changeName(fresh) && edit_manager::backup_edit(kItem) && edit_manager::flush_edit(kItem);
      },
      [](Revisions& its, const String& fresh) {
          if (!has(its)) {
@@ -73,11 +71,7 @@ const std::vector<Step> kSteps = {
          become(its, fresh, true);
          return true;
      }},
-    {"flush all",
-     [](const String& fresh) {
-         ManagedProject::change(fresh, kItem);
-         return edit_manager::flush_changes();
-     },
+    {"flush all", [](const String& fresh) { return changeName(fresh) && edit_manager::flush_changes(); },
      [](Revisions& its, const String& fresh) { return become(its, fresh, false), true; }},
     {"undo", [](const String&) { return edit_manager::undoRequest(kItem); },
      [](Revisions& its, const String&) { return go(its, its.undo, its.redo); }},
@@ -126,6 +120,16 @@ const Step& stepFor(Case& its, const Revisions& revisions) {
             return step;
         }
     }
+}
+
+bool changeName(const String& fresh, const cookie& item) {
+    const EditPtr edit(item, eOpenOrCreate);
+    if (!edit.valid()) {
+        return false;
+    }
+    const std::lock_guard<criticalSection> hold(edit->section());
+    edit->setName(fresh);
+    return true;
 }
 
 String nameOf(const cookie& item) {

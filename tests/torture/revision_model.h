@@ -43,6 +43,10 @@ extern const std::vector<Step> kSteps;
 /// A step that fits the revisions.
 const Step& stepFor(Case& its, const Revisions& revisions);
 
+/// Changes the edit, made when it is not there, as a user does: its name, under its section. False if it does
+/// not open.
+bool changeName(const String& fresh, const cookie& item = kItem);
+
 /// The name of an edit as it opens; empty when it does not.
 String nameOf(const cookie& item);
 

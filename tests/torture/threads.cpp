@@ -86,7 +86,7 @@ void run(Case& its) {
     }
     // Each other case leaves out what reaches from one edit into another.
     const size_t kinds = its.chance(2) ? 14 : 8;
-    const auto flushing =
+    auto flushing =
         edit_manager::registerNotification(edit_manager::flushChangesMsgType(), [](const NotifyMsg&) {
             const EditPtr edit(itemOf(0), eOpenExisting);
             if (edit.valid()) {
@@ -116,6 +116,7 @@ void run(Case& its) {
         thread.join();
     }
     its.tried(plans.size() * plans[0].size());
+    edit_manager::deregisterNotification(flushing);
     // What is in memory when all have ended is what is on the disk after a flush.
     its.expect(edit_manager::flush_changes(), "a flush after all threads have ended answers false");
     String names[kItems];
@@ -135,6 +136,6 @@ void run(Case& its) {
 
 } // namespace
 
-const Attack kThreads{"threads", "many threads on the edits of a project", run, nullptr};
+const Attack kThreads{"threads", "many threads on the edits of a project", run, nullptr, 10};
 
 } // namespace torture

@@ -127,6 +127,8 @@ public:
             throw std::runtime_error("cannot make a temporary folder");
         }
         m_root = form;
+        // Cases go on as other users.
+        fs::permissions(m_root, fs::perms(0755));
     }
     ~Programme() {
         std::error_code ignored;
@@ -196,7 +198,7 @@ private:
                 seconds += 0.001 + std::chrono::duration<double>(Clock::now() - running.began).count();
             }
         }
-        return seconds;
+        return seconds / progress.attack->parts;
     }
 
     void start(Progress& progress) {

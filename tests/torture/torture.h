@@ -59,6 +59,8 @@ struct Attack {
     std::vector<size_t> (*cases)();
     /// A case that has used no processor time for so many seconds is stuck.
     int patience = 20;
+    /// How much of the time it gets, beside one part for most.
+    int parts = 1;
 };
 
 /// The attacks, each defined in the file of its name.
