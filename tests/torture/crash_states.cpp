@@ -68,19 +68,33 @@ private:
             m_case.expect(done, String(step.name) + " fails although nothing stands in its way",
                           revisions.text());
             step.promise(revisions, fresh);
-            if (revisions.undo.size() > static_cast<size_t>(m_depth)) {
-                revisions.undo.resize(static_cast<size_t>(m_depth));
-            }
             if (std::string_view(step.name) == "batch") {
                 batch = fresh;
             }
-            made.end = m_system->size();
-            made.after = revisions;
-            made.batch = batch;
-            m_made.push_back(made);
+            finish(made, revisions, batch);
+        }
+        // What is left unwritten is written when the manager closes, also after a backup alone.
+        Made last{"a backup and the shut-down", m_system->size(), 0, revisions, revisions, batch};
+        if (!revisions.current.empty()) {
+            m_case.expect(edit_manager::backup_edit(kItem),
+                          "a last backup fails although nothing stands in its way");
+            revisions.undo.insert(revisions.undo.begin(), revisions.current);
+            revisions.redo.clear();
         }
         ManagedProject::stopManager();
-        m_end = m_made.empty() ? 0 : m_made.back().end;
+        m_case.expect(revisions.current.empty() || m_project->has(kItem.asString() + ".qme"),
+                      "a clean exit after a backup leaves no file under the edit's name", revisions.text());
+        finish(last, revisions, batch);
+    }
+
+    void finish(Made& made, Revisions& revisions, const String& batch) {
+        if (revisions.undo.size() > static_cast<size_t>(m_depth)) {
+            revisions.undo.resize(static_cast<size_t>(m_depth));
+        }
+        made.end = m_system->size();
+        made.after = revisions;
+        made.batch = batch;
+        m_made.push_back(made);
     }
 
     /// Opens what a crash after `count` operations leaves, and holds it against what was promised by then.
@@ -110,7 +124,6 @@ private:
                 now = made;
             }
         }
-        // After the last step the shut-down may write; it makes nothing else of the edit.
         static constexpr const char* kKinds[] = {"", " (names in order)", " (any order)"};
         const String suffix = String(" after a crash") + (within ? " in " : " after ") + now.name +
                               kKinds[static_cast<int>(kind)];
@@ -154,7 +167,6 @@ private:
     std::unique_ptr<ManagedProject> m_project;
     std::unique_ptr<test::RecordingFileSystem> m_system;
     std::vector<Made> m_made;
-    size_t m_end = 0;
 };
 
 } // namespace

@@ -7,6 +7,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <set>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -63,12 +64,21 @@ public:
         for (size_t i = 0; i < commands; ++i) {
             const auto& command = m_case.oneOf(kCommands);
             const ProjectStates left = m_place.states();
+            const auto strange = strangeFiles();
             const Met met = m_place.run(command);
             m_case.expect(met.result.code >= 0 && met.result.code <= 2,
                           String(command[0]) + " crashes on damaged files",
                           String::format("code %d ", met.result.code) + m_harm +
                               met.result.err.substr(0, 300));
             judge(command, left, met);
+            if (command[0] != "delete" && command[0] != "flush") {
+                const auto still = strangeFiles();
+                for (const std::string& content : strange) {
+                    m_case.expect(still.contains(content),
+                                  String(command[0]) + " destroys what does not read",
+                                  content.substr(0, 80) + m_harm);
+                }
+            }
         }
         m_case.tried(commands - 1);
         ::chmod((m_place.folder() + "/project/P0001000").c_str(), 0777);
@@ -95,6 +105,25 @@ private:
                           String(command[0]) + " says done and leaves no sound edit",
                           m_harm + differenceOf(before, after));
         }
+    }
+
+    /// What stands under the names of edit files and is no sound edit: the bytes of damaged ones, the targets
+    /// of links.
+    [[nodiscard]] std::set<std::string> strangeFiles() const {
+        std::set<std::string> contents;
+        std::error_code ignored;
+        for (const auto& entry : fs::directory_iterator(m_place.project(), ignored)) {
+            const std::string path = entry.path().string();
+            if (path.find(".qme") == std::string::npos) {
+                continue;
+            }
+            if (entry.is_symlink(ignored)) {
+                contents.insert("a link to " + fs::read_symlink(entry.path(), ignored).string());
+            } else if (entry.is_regular_file(ignored) && digestOf(path) == kDamaged) {
+                contents.insert("bytes " + bytesOf(entry.path()));
+            }
+        }
+        return contents;
     }
 
     /// Does something to one file or folder.

@@ -95,6 +95,9 @@ std::vector<size_t> casesWith(size_t kinds) {
                 numbers.push_back(kCommandPlace * (i + 1) + kKindPlace * kind + at);
             }
         }
+        if (kinds == std::size(kFaultKinds)) {
+            numbers.push_back(kCommandPlace * (i + 1) + kKindPlace * kinds + 1);
+        }
     }
     return numbers;
 }
@@ -129,6 +132,9 @@ public:
         m_case.expect(met.result.err.find(".tmp") == String::npos, kind("names a temporary file"), words());
         if (found != m_reference.after) {
             judgeUnfinished(found);
+        } else if (m_command.edit != 0 && m_reference.after != m_reference.before && met.result.code == 1) {
+            m_case.expect(met.result.err.find(Workplace::cookieOf(m_command.edit)) != String::npos,
+                          kind("fails, and does not say that the edit was changed"), words());
         }
     }
 
@@ -225,18 +231,22 @@ const Command& commandOf(const Case& its) {
 
 void runFault(Case& its) {
     const Command& command = commandOf(its);
-    const Fault& fault =
-        kFaultKinds[std::min(its.number() % kCommandPlace / kKindPlace, std::size(kFaultKinds) - 1)];
+    // The kind after the last is a standard output that takes nothing.
+    const size_t number = its.number() % kCommandPlace / kKindPlace;
+    const bool outputFull = number >= std::size(kFaultKinds);
+    const Fault fault = outputFull ? Fault{"a full standard output", 0, "one"} : kFaultKinds[number];
     const Reference& reference = referenceOf(command);
     const Workplace place(its.folder() + "/place");
-    const Interference interference{its.number() % kKindPlace, fault.error, 0, fault.mode, false};
+    const Interference interference{outputFull ? 0 : its.number() % kKindPlace, fault.error, 0, fault.mode,
+                                    outputFull};
     const Met met = place.run(command.arguments, interference);
-    if (met.call.empty()) {
+    if (met.call.empty() && !outputFull) {
         return; // The command came to its end before.
     }
     // With a disk that does nothing any more nothing can be put back.
     const bool dead = fault.mode[0] == 'r';
-    Judge judge(its, command, place, reference, String(fault.name) + " from " + met.call, fault.error, dead);
+    Judge judge(its, command, place, reference, String(fault.name) + (outputFull ? "" : " from ") + met.call,
+                fault.error, dead);
     judge.judge(met);
     const ProjectStates left = place.states();
     judge.judgeReaders();

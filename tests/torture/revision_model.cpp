@@ -77,6 +77,15 @@ const std::vector<Step> kSteps = {
      [](Revisions& its, const String&) { return go(its, its.undo, its.redo); }},
     {"redo", [](const String&) { return edit_manager::redoRequest(kItem); },
      [](Revisions& its, const String&) { return go(its, its.redo, its.undo); }},
+    {"backup, leave project",
+     [](const String&) {
+         const bool done = edit_manager::backup_edit(kItem);
+         edit_manager::exitProject();
+         return done && edit_manager::set_current_project(cookie("P0001000"), eOpenExisting) == eStatus::Ok;
+     },
+     [](Revisions& its, const String&) {
+         return has(its) && (become(its, String(its.current), true), true);
+     }},
     {"delete", [](const String&) { return edit_manager::delete_edit_file_and_backups(kItem, true); },
      [](Revisions& its, const String&) { return has(its) && (its = {}, true); }},
     {"batch", batch, [](Revisions&, const String&) { return true; }},

@@ -45,10 +45,11 @@ using Clock = std::chrono::steady_clock;
 namespace fs = std::filesystem;
 
 constexpr const Attack* kAttacks[] = {&kCrashStates, &kReorderedCrashStates,
-                                      &kFaults,      &kAllocations,
-                                      &kInterrupts,  &kProcesses,
-                                      &kThreads,     &kProjects,
-                                      &kCels,        &kDamage};
+                                      &kFaults,      &kDisk,
+                                      &kAllocations, &kInterrupts,
+                                      &kProcesses,   &kThreads,
+                                      &kProjects,    &kCels,
+                                      &kDamage};
 
 struct Settings {
     double minutes = 5;

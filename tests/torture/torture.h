@@ -64,7 +64,7 @@ struct Attack {
 };
 
 /// The attacks, each defined in the file of its name.
-extern const Attack kCrashStates, kReorderedCrashStates, kFaults, kAllocations, kInterrupts, kProcesses,
-    kThreads, kProjects, kCels, kDamage;
+extern const Attack kCrashStates, kReorderedCrashStates, kFaults, kDisk, kAllocations, kInterrupts,
+    kProcesses, kThreads, kProjects, kCels, kDamage;
 
 } // namespace torture

@@ -1,11 +1,11 @@
-// Every allocation of a step of the manager fails once.
+// One allocation, or the disk, fails in a step of the manager.
 
 #include "revision_model.h"
 #include "torture.h"
 
 #include "edit/manager/edit_manager.h"
 #include "tests/edit/manager/managed_project.h"
-
+#include "tests/support/faulty_file_system.h"
 #include "tests/support/memory_meter.h"
 
 #include <new>
@@ -16,17 +16,51 @@ namespace {
 
 using test::ManagedProject;
 
-/// Performs a step with an allocation that fails. True if it answered true.
-bool performFailing(const Step& step, const String& fresh, size_t at, bool& ran) {
-    bool done = false;
+/// How a step fared.
+struct Outcome {
+    bool done = false; ///< it answered true
+    bool met = false;  ///< something failed on the way
+    String how;
+};
+
+/// Performs a step with an allocation that fails.
+Outcome withoutMemory(Case& its, const Step& step) {
+    Outcome outcome;
+    const size_t at = 1 + its.below(its.chance(2) ? 400 : 60);
     const test::FailingAllocation failing(at);
     try {
-        done = step.perform(fresh);
+        outcome.done = step.perform("new");
     } catch (const std::bad_alloc&) {
         // May come out; what it leaves is looked at.
     }
-    ran = failing.cameToIt();
-    return done;
+    outcome.met = failing.cameToIt();
+    outcome.how = String::format("allocation %zu", at);
+    return outcome;
+}
+
+/// Performs a step with a file operation that fails, from which on all do, or a disk that fills up.
+Outcome withoutDisk(Case& its, const Step& step) {
+    static constexpr int kErrors[] = {EIO, ENOSPC, EACCES, ESTALE, EINTR, EMFILE};
+    Outcome outcome;
+    test::FaultyFileSystem system;
+    const size_t at = 1 + its.below(60);
+    const int error = its.oneOf(kErrors);
+    const size_t kind = its.below(4);
+    if (kind == 0) {
+        system.failFrom(at, EIO);
+    } else if (kind == 1) {
+        system.fullAfter(its.below(5000));
+    } else {
+        system.failAt(at, error);
+    }
+    outcome.done = step.perform("new");
+    const std::vector<String> operations = system.operations();
+    outcome.met = kind == 1 || operations.size() >= at;
+    outcome.how = kind == 1 ? String("a full disk")
+                            : String(kind == 0 ? "a dead disk" : "a failed operation") +
+                                  String::format(" (%d) at ", error) +
+                                  (outcome.met ? operations[at - 1] : String());
+    return outcome;
 }
 
 /// The edit as a manager finds it that knows nothing of this one.
@@ -36,7 +70,7 @@ Revisions foundAnew() {
     return foundByManager();
 }
 
-void run(Case& its) {
+void run(Case& its, const char* what, Outcome (*perform)(Case&, const Step&)) {
     const ManagedProject project;
     Revisions revisions;
     for (const char* name : {"a", "b", "c"}) {
@@ -56,14 +90,13 @@ void run(Case& its) {
     const Step& step = stepFor(its, revisions);
     Revisions after = revisions;
     step.promise(after, "new");
-    bool ran = false;
-    const size_t at = 1 + its.below(its.chance(2) ? 400 : 60);
-    const bool done = performFailing(step, "new", at, ran);
-    if (!ran) {
+    const Outcome outcome = perform(its, step);
+    if (!outcome.met) {
         return;
     }
-    const String where = String(" after a failed allocation in ") + step.name;
-    const String seen = String::format("allocation %zu, answer %d, before ", at, done ? 1 : 0) +
+    const bool done = outcome.done;
+    const String where = String(" after ") + what + " in " + step.name;
+    const String seen = outcome.how + (done ? ", answer true" : ", answer false") + ", before " +
                         revisions.text() + ", after " + after.text();
 
     // A later save must work, and be true.
@@ -88,6 +121,9 @@ void run(Case& its) {
 
 } // namespace
 
-const Attack kAllocations{"allocations", "a failed allocation in a step of the manager", run, nullptr};
+const Attack kAllocations{"allocations", "a failed allocation in a step of the manager",
+                          [](Case& its) { run(its, "a failed allocation", withoutMemory); }, nullptr};
+const Attack kDisk{"disk", "failing file operations in a step of the manager",
+                   [](Case& its) { run(its, "a failing disk", withoutDisk); }, nullptr};
 
 } // namespace torture
