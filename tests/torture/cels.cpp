@@ -128,9 +128,13 @@ private:
         const bool unchanged =
             done || check(isSame(*m_cel, *before), what + " answers false and has changed the cel", seen);
         const cel& result = made ? *made : *m_cel;
+        const double grain =
+            grainOf({at, to, range.start(), range.end(), before->get_start_time(), before->get_end_time(),
+                     source->get_start_time(), source->get_end_time(), result.get_start_time(),
+                     result.get_end_time()});
         return unchanged &&
                check(result.is_good_cel() != 0, what + " makes a cel that is not consistent", seen) &&
-               check(shortest(result) >= std::min(shortest(*before), shortest(*source)),
+               check(isFine(result, grain) || !isFine(*before, grain) || !isFine(*source, grain),
                      what + " leaves a piece or a gap shorter than the tolerance", seen);
     }
 
@@ -142,19 +146,25 @@ private:
         return holds;
     }
 
-    /// The length of the shortest piece or gap that has a length; the tolerance if none is shorter. A clock
-    /// of huge times cannot tell as finely.
-    static double shortest(const cel& its) {
-        double least = kTolerance;
+    /// True if no piece and no gap that has a length is shorter than the tolerance, as far as rounding lets
+    /// one say.
+    static bool isFine(const cel& its, double grain) {
         for (int i = 1; i < its.numEvents(); ++i) {
-            const double at = its.get_event(i).editTime;
-            const double length = at - its.get_event(i - 1).editTime;
-            const double grain = 8 * std::abs(at) * std::numeric_limits<double>::epsilon();
+            const double length = its.get_event(i).editTime - its.get_event(i - 1).editTime;
             if (length > grain && length < kTolerance - grain) {
-                least = std::min(least, length);
+                return false;
             }
         }
-        return least;
+        return true;
+    }
+
+    /// What rounding makes of times as great as these.
+    static double grainOf(std::initializer_list<double> times) {
+        double greatest = 0;
+        for (const double time : times) {
+            greatest = std::max(greatest, std::isfinite(time) && std::abs(time) < 1e13 ? std::abs(time) : 0);
+        }
+        return 32 * greatest * std::numeric_limits<double>::epsilon();
     }
 
     static bool isSame(const cel& a, const cel& b) {

@@ -94,7 +94,7 @@ void run(Case& its, const char* what, Outcome (*perform)(Case&, const Step&)) {
     if (!outcome.met) {
         return;
     }
-    const bool done = outcome.done;
+    const bool done = outcome.done && step.tells;
     const String where = String(" after ") + what + " in " + step.name;
     const String seen = outcome.how + (done ? ", answer true" : ", answer false") + ", before " +
                         revisions.text() + ", after " + after.text();

@@ -90,7 +90,7 @@ const std::vector<Step> kSteps = {
      [](Revisions& its, const String&) { return has(its) && (its = {}, true); }},
     {"batch", batch, [](Revisions&, const String&) { return true; }},
     {"switch project", switchProject,
-     [](Revisions& its, const String& fresh) { return become(its, fresh, false), true; }},
+     [](Revisions& its, const String& fresh) { return become(its, fresh, false), true; }, false},
 };
 
 std::vector<String> Revisions::inOrder() const {

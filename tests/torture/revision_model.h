@@ -31,6 +31,9 @@ struct Step {
     bool (*perform)(const String& fresh);
     /// What is promised once it has answered true; false if the step does not fit.
     bool (*promise)(Revisions& revisions, const String& fresh);
+    /// False for a step that leaves a project, which has no answer that would tell of what could not be
+    /// written.
+    bool tells = true;
 };
 
 /// The edit that the steps are made on.

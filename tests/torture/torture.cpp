@@ -29,8 +29,11 @@ Case::Case(uint64_t seed, size_t number, std::string folder, int reportTo)
 
 void Case::found(const String& kind, const String& seen) {
     std::string line = kind + '\t' + seen;
-    std::replace(line.begin(), line.end(), '\n', ' ');
-    line = line.substr(0, 2000) + '\n';
+    line.resize(std::min<size_t>(line.size(), 2000));
+    for (char& character : line) {
+        character = character != '\t' && (character < ' ' || character > '~') ? ' ' : character;
+    }
+    line += '\n';
     static_cast<void>(!::write(m_reportTo, line.data(), line.size()));
 }
 
