@@ -1,5 +1,6 @@
-// Reads a cut list of another tool, cuts its first second off, and writes it as a list again: no project, no files of
-// edits. Build it with find_package(quillmarch_edit REQUIRED COMPONENTS interchange) and link quillmarch::interchange.
+// Reads a cut list of another tool, cuts its first second off, and writes it as a list again: no project, no
+// files of edits. Build it with find_package(quillmarch_edit REQUIRED COMPONENTS interchange) and link
+// quillmarch::interchange.
 //
 //     convert_list IN.edl RATE OUT.edl
 
