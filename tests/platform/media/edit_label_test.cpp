@@ -61,7 +61,8 @@ TEST(EditLabel, LeadsFromEditTimeToLabelAndBack) {
         }
     }
     const edit_label kept = make(cases[0].keep);
-    for (const double time : {std::numeric_limits<double>::quiet_NaN(), std::numeric_limits<double>::infinity()}) {
+    for (const double time :
+         {std::numeric_limits<double>::quiet_NaN(), std::numeric_limits<double>::infinity()}) {
         EXPECT_FALSE(kept.labelAt(time).valid());
     }
     EXPECT_TRUE(kept.labelAt(1e300).valid());
