@@ -55,9 +55,18 @@ Editor::Result Editor::applyInternal(const EditModule& source, const EditModule&
         performEdit(op, result);
     }
     result.m_type = edit.getNumChans() == numChans ? m_type : kChansInserted;
-    result.m_notice = m_notice;
+    result.m_notice =
+        m_notice + (m_notice.empty() || m_clipboardNotice.empty() ? "" : "; ") + m_clipboardNotice;
     doPostEditTasks(result);
     return result;
+}
+
+/// The operation goes on without the clipboard, and says so.
+void Editor::tellOfClipboard(const char* what) {
+    const String text =
+        "the clipboard " + clipboard_cookie.asString() + " cannot " + what + " and is left as it is";
+    herc_printf("Editor: %s\n", text.c_str());
+    m_clipboardNotice = text;
 }
 
 /// Finds every reason to refuse, backs up, and adds the channels that are missing.
@@ -100,7 +109,7 @@ bool Editor::backUp() {
     const bool together = config_int("undo_clipboard", 1) != 0;
     if (m_clipboardReady && together && openClipboard().valid() &&
         !edit_manager::backup_edit(clipboard_cookie)) {
-        herc_printf("Editor::backUp() : the clipboard cannot be backed up and is left as it is\n");
+        tellOfClipboard("be backed up");
         m_clipboardReady = false;
     }
     return true;

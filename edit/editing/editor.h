@@ -180,6 +180,7 @@ private:
     void autoAddTracks();
     void autoAddLevels();
     void autoCreateTrackGroups(const EditModule& source);
+    void tellOfClipboard(const char* what);
     void doClipboardEditing(edit_operation op);
     void performEdit(const EditModule& source, edit_operation op, Result& result);
     void performEdit(edit_operation op, Result& result);
@@ -214,4 +215,5 @@ private:
     bool m_clipboardReady = false;
     String m_refusal;
     String m_notice;
+    String m_clipboardNotice;
 };

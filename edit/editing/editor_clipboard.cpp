@@ -51,8 +51,7 @@ void Editor::doClipboardEditing(edit_operation op) {
     const EditPtr clipboard = m_clipboardReady ? openClipboard() : EditPtr();
     if (!clipboard.valid() || !editing_detail::isWritable(*clipboard)) {
         if (m_clipboardReady) {
-            herc_printf("Editor::doClipboardEditing() : the clipboard cannot be %s and is left as it is\n",
-                        clipboard.valid() ? "written" : "opened");
+            tellOfClipboard(clipboard.valid() ? "be written" : "be opened");
         }
         return;
     }

@@ -131,6 +131,11 @@ public:
     /// the edit is under its name and both chains are as they were, but what could be redone may be gone when
     /// a deletion or the last sync failed.
     static bool backup_edit(const cookie& item);
+    /// Takes back what the last `backup_edit` did to the files of an edit that was not written since, because
+    /// it could not be: the edit's file comes back under its name, what could be redone into its chain. The
+    /// edit in memory, with its changes, is dropped. (A backup beyond the depth that went stays away.) False,
+    /// with nothing changed, when there is nothing to take back or the file cannot be moved.
+    static bool takeBackBackup(const cookie& item);
     /// True if there is an undo backup in the depth, or right behind it where a deeper chain was kept before;
     /// also when that could not be told.
     [[nodiscard]] static bool undoExists(const cookie& item);
@@ -145,8 +150,10 @@ public:
     /// that was redone: it is dirty and counts one change more. False, with everything as it was, if there is
     /// no such revision (for a redo: no backup 1), none is sound, the edit is read-only for the user, a file
     /// could not be written or moved, or the revision does not open.
-    static bool undoRequest(const cookie& item);
-    static bool redoRequest(const cookie& item);
+    /// `notice`, when given, receives a sentence when the clipboard edit should have gone with it and could
+    /// not; it is left empty otherwise.
+    static bool undoRequest(const cookie& item, String* notice = nullptr);
+    static bool redoRequest(const cookie& item, String* notice = nullptr);
     /// Delete backup `keep` + 1, `keep` + 2, ... up to the depth, and stop at the first that is not there or
     /// cannot be deleted.
     static void delete_redo_edits(const cookie& item, int keep);

@@ -26,14 +26,19 @@ bool fileIsAsKnown(const ManagerState::CachedEdit& entry) {
            examineEditFile(entry.path, why) == EditFileState::Sound;
 }
 
+/// Has the edit written by the next flush although nothing was changed, as its file is not under its name or
+/// not what the edit is.
+void writeAgain(ManagerState::CachedEdit& entry) {
+    entry.edit->init_dirty();
+    managerState().addToDirtyList(entry.item);
+}
+
 /// Makes the edit's file say what the edit is, also when nothing was changed since it went with the last
 /// backup, was replaced or went bad. Under the scope of the edit.
 bool writeWhole(ManagerState::CachedEdit& entry) {
     ManagerState& state = managerState();
     if (!entry.edit->isDirty(true) && !fileIsAsKnown(entry)) {
-        entry.edit->init_dirty();
-        // Until it is written.
-        state.addToDirtyList(entry.item);
+        writeAgain(entry);
     }
     return state.write(entry) && Qx::askFile(entry.path).isRegular();
 }
@@ -48,7 +53,7 @@ public:
           m_moves(Qx::folderOf(m_from.file())),
           m_code(from == RevisionChain::Undo ? kRevisionUndo : kRevisionRedo) {}
 
-    bool run();
+    bool run(String* notice = nullptr);
 
 private:
     [[nodiscard]] bool hasRevision() const;
@@ -83,7 +88,7 @@ private:
     std::unique_ptr<ManagerState::CachedEdit> m_dropped;
 };
 
-bool RevisionStep::run() {
+bool RevisionStep::run(String* notice) {
     if (!hasRevision()) {
         return false;
     }
@@ -120,9 +125,14 @@ bool RevisionStep::run() {
     m_before->notifyRevisionChange(m_code);
     m_after->notifyRevisionChange(m_code);
     describe();
-    if (takesClipboard) {
-        RevisionStep(clipboard_cookie, m_code == kRevisionUndo ? RevisionChain::Undo : RevisionChain::Redo)
-            .run();
+    const RevisionChain::Kind kind = m_code == kRevisionUndo ? RevisionChain::Undo : RevisionChain::Redo;
+    if (takesClipboard && !RevisionStep(clipboard_cookie, kind).run()) {
+        const String text = "the clipboard " + clipboard_cookie.asString() +
+                            " went with the change and could not be taken along; it is as it was";
+        herc_printf("edit_manager: %s\n", text.c_str());
+        if (notice != nullptr) {
+            *notice = text;
+        }
     }
     return true;
 }
@@ -168,10 +178,13 @@ bool RevisionStep::moveFiles() {
     const bool written = writeWhole(entry);
     const Qx::Status status = written ? step() : Qx::Status::failure(entry.path + " could not be written");
     if (!status) {
-        m_moves.takeBack();
+        const bool isBack = m_moves.takeBack();
         report(status.reason());
         if (written) {
             managerState().noteFile(entry);
+        }
+        if (!isBack) {
+            writeAgain(entry);
         }
         managerState().setLeaving(entry, false);
         return false;
@@ -252,7 +265,9 @@ void RevisionStep::moveFilesBack() {
         return;
     }
     failed = state.removeCacheEntry(m_item);
-    m_moves.takeBack();
+    if (!m_moves.takeBack()) {
+        writeAgain(*m_dropped);
+    }
     m_dropped->leaving = false;
     ManagerState::noteFile(*m_dropped);
     state.putBack(std::move(m_dropped));
@@ -290,19 +305,26 @@ void RevisionStep::describe() {
     }
 }
 
-/// Moves the edit's file, written whole, to undo backup 1 and deletes what could be redone, last.
+/// Moves the edit's file, written whole, to undo backup 1, and what could be redone out of its chain.
 Qx::Status keepRevision(ManagerState::CachedEdit& entry) {
     RevisionChain undo(entry.path, RevisionChain::Undo, depth());
     RevisionChain redo(entry.path, RevisionChain::Redo, depth());
     Qx::FileMoves moves(Qx::folderOf(undo.file()));
+    auto ended = std::make_unique<Qx::FileMoves>(Qx::folderOf(redo.file()));
     Qx::Status status = redo.closeHoles();
     if (status) {
         status = undo.push(moves);
     }
     if (status) {
-        status = redo.deleteTail(0);
+        status = redo.park(*ended);
     }
-    return status ? moves.finish() : status;
+    if (status) {
+        status = moves.finish();
+    }
+    if (status) {
+        entry.endedRedo = std::move(ended);
+    }
+    return status;
 }
 
 } // namespace
@@ -338,6 +360,34 @@ bool edit_manager::backup_edit(const cookie& item) {
     return true;
 }
 
+bool edit_manager::takeBackBackup(const cookie& item) {
+    EditPtr edit;
+    {
+        const ManagerState::Hold hold(managerState().lock);
+        const ManagerState::CachedEdit* const found = managerState().findCacheEntry(item);
+        edit = found == nullptr ? EditPtr() : found->edit;
+    }
+    if (!edit.valid()) {
+        return false;
+    }
+    managerState().tell(invalidateCacheMsgType(), item);
+    std::unique_ptr<ManagerState::CachedEdit> dropped;
+    const CachedEditScope scope(item, edit);
+    if (scope.entry() == nullptr || scope.entry()->endedRedo == nullptr || !scope.entry()->isAway()) {
+        return false;
+    }
+    int restored = 0;
+    RevisionChain undo(scope.entry()->path, RevisionChain::Undo, depth());
+    if (const Qx::Status status = undo.restoreNewest(restored); !status || restored != 1) {
+        herc_printf("edit_manager: the last backup of %s stays: %s\n", item.asString().c_str(),
+                    status.reason().c_str());
+        return false;
+    }
+    dropped = managerState().removeCacheEntry(item);
+    static_cast<void>(dropped->endedRedo->takeBack());
+    return true;
+}
+
 bool edit_manager::undoExists(const cookie& item) {
     bool found = false;
     return !chainOf(item, RevisionChain::Undo).exists(found) || found;
@@ -347,12 +397,12 @@ bool edit_manager::redoExists(const cookie& item) {
     return !chainOf(item, RevisionChain::Redo).ask(1).isMissing();
 }
 
-bool edit_manager::undoRequest(const cookie& item) {
-    return RevisionStep(item, RevisionChain::Undo).run();
+bool edit_manager::undoRequest(const cookie& item, String* notice) {
+    return RevisionStep(item, RevisionChain::Undo).run(notice);
 }
 
-bool edit_manager::redoRequest(const cookie& item) {
-    return RevisionStep(item, RevisionChain::Redo).run();
+bool edit_manager::redoRequest(const cookie& item, String* notice) {
+    return RevisionStep(item, RevisionChain::Redo).run(notice);
 }
 
 namespace {

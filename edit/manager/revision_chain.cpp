@@ -1,5 +1,6 @@
 #include "edit/manager/revision_chain.h"
 
+#include "platform/services/atomic_file.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 #include "platform/store/tag_bag.h"
@@ -201,6 +202,17 @@ Qx::Status RevisionChain::restoreNewest(int& restored) {
         static_cast<void>(closing.finish());
     }
     return {};
+}
+
+Qx::Status RevisionChain::park(Qx::FileMoves& moves) const {
+    std::vector<int> numbers;
+    Qx::Status status = findFrom(1, numbers, static_cast<size_t>(m_depth));
+    for (size_t i = 0; status && i < numbers.size() && numbers[i] <= m_depth; ++i) {
+        String parked = Qx::temporaryNameFor(path(numbers[i]));
+        status = moves.move(path(numbers[i]), parked);
+        moves.removeWhenFinished(std::move(parked));
+    }
+    return status;
 }
 
 Qx::Status RevisionChain::closeHoles() {

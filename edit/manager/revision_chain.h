@@ -66,6 +66,9 @@ public:
     /// nothing changed, when that could not be told or it could not be moved, because there is an edit file
     /// for instance. A gap that cannot be closed stays.
     Qx::Status restoreNewest(int& restored);
+    /// Moves every backup of the depth out of the chain, to temporary names that go when the moves are
+    /// finished.
+    Qx::Status park(Qx::FileMoves& moves) const;
     /// Closes the holes that an interrupted operation left, so that the backups are 1, 2, 3, ...
     Qx::Status closeHoles();
     /// Deletes backup `keep` + 1, `keep` + 2, ... up to the depth and stops at the first that is not there or

@@ -26,7 +26,17 @@ constexpr uint64_t kSyncAhead = uint64_t{2} << 20;
 /// How many temporary names are tried before giving up.
 constexpr int kTries = 100;
 
-String temporaryFor(const String& path) {
+bool failed(const std::from_chars_result& result) {
+    return result.ec != std::errc();
+}
+
+bool allOf(std::string_view text, std::string_view set) {
+    return !text.empty() && text.find_first_not_of(set) == std::string_view::npos;
+}
+
+} // namespace
+
+String temporaryNameFor(const String& path) {
     // A stamp differs on every thread and after every fork, so two writers do not wait for each other's
     // names.
     const IdStamp stamp = IdStamp::fresh(IdStampMagic::EffectNode);
@@ -37,16 +47,6 @@ String temporaryFor(const String& path) {
                        origin.machine, origin.run, stamp.word(0) ^ stamp.word(1), stamp.word(2));
     return path.find('/') == String::npos ? temporary : joinPath(folderOf(path), temporary);
 }
-
-bool failed(const std::from_chars_result& result) {
-    return result.ec != std::errc();
-}
-
-bool allOf(std::string_view text, std::string_view set) {
-    return !text.empty() && text.find_first_not_of(set) == std::string_view::npos;
-}
-
-} // namespace
 
 AtomicFile::AtomicFile(String path) : m_path(std::move(path)) {}
 
@@ -72,7 +72,7 @@ FileError AtomicFile::openTemporary() {
     }
     FileError error;
     for (int i = 0; i < kTries; ++i) {
-        const String temporary = temporaryFor(m_path);
+        const String temporary = temporaryNameFor(m_path);
         error = retryInterrupted([&] { return fileSystem().open(temporary, OpenMode::CreateNew, m_file); });
         if (!error) {
             m_temporary = temporary;

@@ -60,7 +60,11 @@ private:
     FileError m_failed;  ///< the first failure; later calls repeat it
 };
 
-/// True for the names that `AtomicFile` gives its temporary files; a listing of a folder passes them over.
+/// A fresh name beside a file for something that is to lie there for a while only, as `AtomicFile` takes
+/// them.
+QM_API String temporaryNameFor(const String& path);
+
+/// True for such a name; a listing of a folder passes them over.
 QM_API bool isTemporaryName(std::string_view fileName);
 
 /// True for a temporary file that nobody is going to finish: the process that made it has ended, as far as

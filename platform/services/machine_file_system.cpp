@@ -155,6 +155,9 @@ public:
         auto opened = std::make_unique<MachineFile>(descriptor, path);
         FileInfo status;
         if (auto error = opened->info(status)) {
+            if (mode == OpenMode::CreateNew) {
+                ::unlink(path.c_str()); // made a moment ago, and nobody's
+            }
             return error;
         }
         if (status.kind != FileKind::Regular) {

@@ -174,8 +174,13 @@ bool configb::put(std::string_view key, Value value, String foreignType) {
     }
     const auto found = m_index.find(key);
     if (found == m_index.end()) {
-        m_index.emplace(String(key), m_order.size());
         m_order.push_back(Entry{String(key), std::move(value), std::move(foreignType)});
+        try {
+            m_index.emplace(String(key), m_order.size() - 1);
+        } catch (...) {
+            m_order.pop_back();
+            throw;
+        }
         changed();
         return true;
     }

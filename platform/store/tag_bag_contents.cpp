@@ -40,10 +40,12 @@ TagBag::Contents::Entry& TagBag::Contents::findOrAdd(std::string_view name) {
     if (Entry* there = find(name)) {
         return *there;
     }
-    Entry& added = entries.emplace_back();
-    added.name = String(name);
-    m_index.emplace(added.name, std::prev(entries.end()));
-    return added;
+    // Beside the list until it is in the index too: memory may run out on the way.
+    Entries added;
+    added.emplace_back().name = String(name);
+    m_index.emplace(added.front().name, added.begin());
+    entries.splice(entries.end(), added);
+    return entries.back();
 }
 
 void TagBag::Contents::erase(std::string_view name) {
@@ -69,10 +71,12 @@ bool TagBag::Contents::rename(std::string_view name, std::string_view newName) {
     if (found == m_index.end() || find(newName) != nullptr) {
         return false;
     }
-    const Entries::iterator entry = found->second;
-    m_index.erase(found);
-    entry->name = String(newName);
-    m_index.emplace(entry->name, entry);
+    String taken(newName);
+    auto node = m_index.extract(found);
+    Entry& entry = *node.mapped();
+    std::swap(entry.name, taken);
+    node.key() = entry.name;
+    m_index.insert(std::move(node));
     return true;
 }
 

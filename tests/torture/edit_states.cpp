@@ -35,9 +35,7 @@ String digestOf(const std::string& path) {
         }
     }
     content += String::format("%zu", edit->get_cues().get_num_cue_points(0));
-    return String::format("%s#%llu:%04zx", edit->getName().c_str(),
-                          static_cast<unsigned long long>(edit->getModificationCount()),
-                          std::hash<std::string>()(content) & 0xffff);
+    return String::format("%s:%04zx", edit->getName().c_str(), std::hash<std::string>()(content) & 0xffff);
 }
 
 ProjectStates statesOf(const std::string& projectFolder) {

@@ -11,7 +11,8 @@ namespace torture {
 
 inline constexpr const char* kDamaged = "(damaged)";
 
-/// The digest of an edit file: its name, its count of changes and a hash of what its channels and cues hold.
+/// The digest of an edit file: its name and a hash of what its channels and cues hold. Its count of
+/// changes and their description are left out: an undo and a redo raise and write them.
 /// `kDamaged` for one that does not read, empty for one that is missing.
 String digestOf(const std::string& path);
 

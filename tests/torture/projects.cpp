@@ -99,7 +99,7 @@ void run(Case& its) {
             its.expect(digest != kDamaged, "a file is damaged", folder + "/" + path);
         }
         const String own = project.root().path(folder + "/" + kOwn.asString() + ".qme");
-        its.expect(digestOf(own).starts_with(names[i] + "#"),
+        its.expect(digestOf(own).starts_with(names[i] + ":"),
                    "a change made before the project was left is lost",
                    digestOf(own) + " instead of " + names[i]);
     }

@@ -130,7 +130,9 @@ bool openManaged(const cookie& item, EditPtr& edit, bool& wasRestored) {
 
 String putFileBack(const cookie& item, EditPtr& edit) {
     edit.invalidate();
-    edit_manager::invalidateCache(item);
+    if (!edit_manager::takeBackBackup(item)) {
+        edit_manager::invalidateCache(item);
+    }
     RevisionChain undo = chain(item, RevisionChain::Undo);
     int restored = 0;
     if (Qx::askFile(undo.file()).isMissing()) {
@@ -183,10 +185,14 @@ int stepRevision(const EditArguments& arguments, bool redo) {
     }
     String change = changeText(edit->getChangeDescription());
     edit.invalidate();
-    if (!(redo ? edit_manager::redoRequest(item) : edit_manager::undoRequest(item))) {
+    String notice;
+    if (!(redo ? edit_manager::redoRequest(item, &notice) : edit_manager::undoRequest(item, &notice))) {
         return failed(Qx::Status::failure(item.asString() +
                                           " is as it was: its files could not be moved; see "
                                           "whether the project can be written (QMEDIT_LOG=1 tells more)"));
+    }
+    if (!notice.empty()) {
+        reportWarning(notice);
     }
     edit = edit_manager::openEdit(item, eOpenExisting);
     if (redo && edit.valid()) {

@@ -163,6 +163,7 @@ bool ManagerState::write(CachedEdit& entry, bool waits) {
         return false;
     }
     noteFile(entry);
+    entry.forgetRedo();
     removeFromDirtyList(entry.item);
     if (edit.get_dirty()) {
         addToDirtyList(entry.item); // changed meanwhile by one who does not hold its section

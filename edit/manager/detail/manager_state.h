@@ -7,7 +7,7 @@
 #include "edit/manager/multiple_access_queue.h"
 #include "platform/base/critical_section.h"
 #include "platform/base/spin_lock.h"
-#include "platform/services/files.h"
+#include "platform/services/file_moves.h"
 
 #include <atomic>
 #include <map>
@@ -62,6 +62,19 @@ struct ManagerState {
             EditModification said;
         };
         std::optional<Step> step;
+        /// What could be redone before the last backup. It goes for good when the edit is written or dropped,
+        /// and comes back when the backup is taken back.
+        std::unique_ptr<Qx::FileMoves> endedRedo;
+        void forgetRedo() {
+            if (endedRedo != nullptr) {
+                endedRedo->keep();
+                endedRedo.reset();
+            }
+        }
+        CachedEdit() = default;
+        CachedEdit(const CachedEdit&) = delete;
+        CachedEdit& operator=(const CachedEdit&) = delete;
+        ~CachedEdit() { forgetRedo(); }
         /// It is about to leave the cache: who asks for it waits for what comes in its place. Guarded by
         /// `lookup`.
         bool leaving = false;
