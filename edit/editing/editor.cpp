@@ -107,10 +107,12 @@ bool Editor::backUp() {
         return false;
     }
     const bool together = config_int("undo_clipboard", 1) != 0;
-    if (m_clipboardReady && together && openClipboard().valid() &&
-        !edit_manager::backup_edit(clipboard_cookie)) {
-        tellOfClipboard("be backed up");
-        m_clipboardReady = false;
+    if (m_clipboardReady && together) {
+        const bool opens = openClipboard().valid();
+        if (!opens || !edit_manager::backup_edit(clipboard_cookie)) {
+            tellOfClipboard(opens ? "be backed up" : "be opened");
+            m_clipboardReady = false;
+        }
     }
     return true;
 }

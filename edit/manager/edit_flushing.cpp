@@ -125,13 +125,18 @@ bool edit_manager::flush_changes() {
     {
         // Taken once for all; an edit that cannot be written without it says so itself.
         EditManagerLock writers;
-        const Vector<cookie> items = dirtyItems();
-        if (!items.empty()) {
+        Vector<cookie> items = dirtyItems();
+        const bool withClipboard = std::erase(items, clipboard_cookie) != 0;
+        if (!items.empty() || withClipboard) {
             static_cast<void>(writers.take(true).isOk());
         }
         for (size_t from = 0; from < items.size(); from += kTogether) {
             const size_t count = std::min(kTogether, items.size() - from);
             allWritten = writeTogether({items.data() + from, count}, milestones) && allWritten;
+        }
+        // It holds what was taken out of the others, so it changes on the disk when they have.
+        if (withClipboard && allWritten) {
+            allWritten = writeTogether({&clipboard_cookie, 1}, milestones);
         }
         const cookie project = get_current_project_cookie();
         if (const EditPtr edit = cachedEdit(project); edit.valid()) {

@@ -108,7 +108,8 @@ public:
     static bool flush_edit(const cookie& item);
     /// Sends "editmanFlushChanges", so that editors push what they hold back into their edits, and then
     /// writes every changed edit, with milestones where they are due, and the project edit. Edits that could
-    /// not be written stay on the dirty list. True if all were written.
+    /// not be written stay on the dirty list. The clipboard edit goes last, and waits while another edit
+    /// could not be written. True if all were written.
     static bool flush_changes();
     void addToDirtyList(const cookie& item) override;
     /// How many edits wait to be written.
