@@ -1,8 +1,8 @@
 #include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
-#include "tools/qmedit/content_diff.h"
 #include "tools/qmedit/edit_diff_json.h"
+#include "tools/qmedit/edit_diff_text.h"
 #include "tools/qmedit/project_session.h"
 
 #include "platform/services/edit_filenames.h"
