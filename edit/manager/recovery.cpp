@@ -11,6 +11,10 @@ Qx::Status asStatus(const Qx::FileError& error) {
     return error ? Qx::Status::failure(error.text()) : Qx::Status();
 }
 
+Qx::FileError moveFile(const String& from, const String& to) {
+    return Qx::retryInterrupted([&] { return Qx::fileSystem().rename(from, to); });
+}
+
 /// One recovery, with other processes and threads kept away.
 class Recovering {
 public:
@@ -63,7 +67,7 @@ Qx::Status Recovering::keepPresent(String& kept) {
         return status;
     }
     Qx::Status status = findCorruptName(m_undo.file(), kept);
-    return status ? asStatus(Qx::fileSystem().rename(m_undo.file(), kept)) : status;
+    return status ? asStatus(moveFile(m_undo.file(), kept)) : status;
 }
 
 /// A failure is told of by the caller, who looks where the file is.
@@ -75,7 +79,7 @@ void Recovering::putPresentBack(const String& kept) {
         int restored = 0;
         static_cast<void>(m_undo.restoreNewest(restored).isOk());
     } else {
-        static_cast<void>(Qx::fileSystem().rename(kept, m_undo.file()).code);
+        static_cast<void>(moveFile(kept, m_undo.file()).code);
     }
 }
 
@@ -88,14 +92,14 @@ Qx::Status Recovering::run(String& kept) {
     }
     Qx::Status status = keepPresent(kept);
     if (status) {
-        status = asStatus(Qx::fileSystem().rename(copy, file));
+        status = asStatus(moveFile(copy, file));
     }
     if (!status) {
         putPresentBack(kept);
         static_cast<void>(Qx::fileSystem().remove(copy).code);
         return status;
     }
-    return asStatus(Qx::fileSystem().syncFolder(Qx::folderOf(file)));
+    return asStatus(Qx::retryInterrupted([&] { return Qx::fileSystem().syncFolder(Qx::folderOf(file)); }));
 }
 
 /// `dropped` gets the edit that was in the cache, to go when no lock is held.
