@@ -1,10 +1,10 @@
 #include "interchange/import.h"
 
 #include "edit/manager/edit_manager_lock.h"
+#include "edit/manager/import_note.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_registry.h"
 #include "edit/project/cookie_allocator.h"
-#include "interchange/import_note.h"
 #include "platform/services/atomic_batch.h"
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"

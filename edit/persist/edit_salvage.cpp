@@ -187,6 +187,7 @@ static Qx::Status openDamaged(TagBag& store, const String& path, EditFile::Salva
         return {};
     }
     const String why = store.openError();
+    salvaging.setRefused(result == TagBag::NotOpened || result == TagBag::Newer);
     if (result != TagBag::Damaged || !salvaging.mayScan()) {
         return Qx::Status::failure(why);
     }
@@ -243,10 +244,14 @@ Qx::Status EditFile::salvage(Edit& edit, const String& path, Salvaging& salvagin
     return {};
 }
 
-static Qx::Status salvageInto(const String& path, EditPtr& edit, std::vector<String>& lost, bool mayScan) {
+static Qx::Status salvageInto(const String& path, EditPtr& edit, std::vector<String>& lost, bool mayScan,
+                              bool* isRefused = nullptr) {
     EditPtr read(new Edit);
     EditFile::Salvaging salvaging(lost, mayScan);
     if (Qx::Status status = EditFile::salvage(*read, path, salvaging); !status) {
+        if (isRefused != nullptr) {
+            *isRefused = salvaging.isRefused();
+        }
         return status;
     }
     EditFile::convert(*read, lost);
@@ -277,14 +282,15 @@ void EditFile::convert(Edit& edit, std::vector<String>& lost) {
     }
 }
 
-void verifyEditFile(const String& path, std::vector<String>& faults) {
+bool verifyEditFile(const String& path, std::vector<String>& faults) {
     EditPtr edit;
     std::vector<String> found;
-    const Qx::Status status = salvageInto(path, edit, found, false);
+    bool isRefused = false;
+    const Qx::Status status = salvageInto(path, edit, found, false, &isRefused);
     faults.insert(faults.end(), found.begin(), found.end());
     if (!status) {
         faults.push_back(status.reason());
-        return;
+        return !isRefused;
     }
     // Objects that nothing above reads are sound unless their class is known and refuses them.
     TagBag& store = edit->objectStore();
@@ -296,6 +302,7 @@ void verifyEditFile(const String& path, std::vector<String>& faults) {
             faults.push_back(store.objectError());
         }
     }
+    return true;
 }
 
 Qx::Status salvageEdit(const String& path, EditPtr& edit, std::vector<String>& lost) {

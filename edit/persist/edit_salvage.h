@@ -11,8 +11,11 @@
 /// Reads everything that is in an edit file: the whole of its bytes against their checksums, then every
 /// object of it. `faults` gets one sentence for each thing that is wrong with it; none means that
 /// `Edit::readFile` takes the whole of it. Objects of classes that this program does not know are sound when
-/// their bytes are. A file that cannot be read at all is a fault, too. Safe on any thread.
-QM_API void verifyEditFile(const String& path, std::vector<String>& faults);
+/// their bytes are.
+///
+/// A file that could not be read at all, or was written by a later version, has that as its fault, and the
+/// result is false: it may be sound. Safe on any thread.
+QM_API bool verifyEditFile(const String& path, std::vector<String>& faults);
 
 /// Makes an edit of all that is sound of a damaged object store. One damaged object costs that object: a
 /// channel, the levels of a channel, the cues, the groups. Without its header the edit has the properties of

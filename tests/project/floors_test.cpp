@@ -24,8 +24,8 @@ const std::map<std::string, int> rooms = {
     {"platform/base", 10},     {"platform/services", 20}, {"platform/notify", 21},  {"platform/store", 22},
     {"platform/database", 23}, {"platform/media", 24},    {"platform/effects", 25}, {"edit/project", 30},
     {"edit/model", 40},        {"edit/persist", 50},      {"edit/graph", 50},       {"edit/material", 50},
-    {"edit/manager", 60},      {"edit/effects", 60},      {"edit/editing", 70},     {"interchange", 70},
-    {"tools/qmedit", 80},
+    {"edit/manager", 60},      {"edit/effects", 60},      {"edit/editing", 70},     {"edit/inspect", 70},
+    {"interchange", 70},       {"tools/qmedit", 80},
 };
 
 std::string roomOf(const std::string& file) {

@@ -1,7 +1,7 @@
 #include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
-#include "tools/qmedit/edit_diff.h"
+#include "tools/qmedit/edit_diff_text.h"
 #include "tools/qmedit/edit_place.h"
 #include "tools/qmedit/managed_edit.h"
 #include "tools/qmedit/project_session.h"

@@ -2,7 +2,7 @@
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/managed_edit.h"
-#include "tools/qmedit/revisions.h"
+#include "tools/qmedit/revision_text.h"
 #include "tools/qmedit/spare_room.h"
 
 #include "platform/services/edit_filenames.h"

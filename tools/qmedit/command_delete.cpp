@@ -3,12 +3,12 @@
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/interrupts.h"
 #include "tools/qmedit/managed_edit.h"
-#include "tools/qmedit/revisions.h"
+#include "tools/qmedit/revision_text.h"
 
+#include "edit/inspect/usage.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 
-#include <algorithm>
 #include <memory>
 
 namespace {
@@ -17,44 +17,36 @@ struct DeleteArguments : EditArguments {
     bool force = false;
 };
 
-bool plays(const ProjectSession& session, const cookie& sequence, const cookie& item) {
-    EditPtr edit;
-    if (!session.readEdit(sequence, edit)) {
-        return false;
-    }
-    const EditReport report = reportOf(*edit, {});
-    return std::any_of(report.sources.begin(), report.sources.end(),
-                       [&](const SourceReport& source) { return source.strip == item; });
-}
-
 /// Why an edit is still wanted: another one plays it, or may play it as nobody can read that. Empty if none
 /// does.
 Qx::Status findPlayers(ProjectSession& session, const cookie& item, String& players) {
-    std::vector<ListedEdit> edits;
+    std::vector<ListedEdit> listed;
     std::vector<String> others;
-    if (Qx::Status listed = session.list(edits, others); !listed) {
-        return listed;
+    if (Qx::Status status = session.list(listed, others); !status) {
+        return status;
     }
-    for (const ListedEdit& edit : edits) {
-        if (interrupts::noted()) {
-            return Qx::Status::failure("nothing was deleted");
-        }
+    std::vector<cookie> edits;
+    for (const ListedEdit& edit : listed) {
         // A shot plays its own media, nothing of the project.
-        if (edit.item == item || edit.type == "shot") {
-            continue;
-        }
-        const bool unknown = !edit.damage.empty();
-        if (unknown || plays(session, edit.item, item)) {
-            players += (players.empty() ? "" : ", ") + edit.item.asString() +
-                       (unknown ? " (which cannot be read, so that it may play it)" : "");
+        if (edit.type != "shot") {
+            edits.push_back(edit.item);
         }
     }
-    return {};
+    bool isCancelled = false;
+    const auto cancelled = [&isCancelled] { return isCancelled = interrupts::noted(); };
+    const auto read = [&session](const cookie& edit, EditPtr& to) { return session.readEdit(edit, to); };
+    for (const ItemUser& user : findUsers(item, edits, read, cancelled)) {
+        players += (players.empty() ? "" : ", ") + user.edit.asString() +
+                   (user.problem.empty() ? "" : " (which cannot be read, so that it may play it)");
+    }
+    return isCancelled ? Qx::Status::failure("nothing was deleted") : Qx::Status();
 }
 
 /// Tells of what the deletion leaves.
 void reportRest(const cookie& item) {
-    const std::vector<Revision> rest = revisionsOf(item);
+    const RevisionList list = revisionsOf(item);
+    const std::vector<Revision>& rest = list.revisions;
+    reportUnanswered(list);
     if (!rest.empty()) {
         reportProgress(String::format("left in place (milestones and files set aside): %zu; 'qmedit history ",
                                       rest.size()) +

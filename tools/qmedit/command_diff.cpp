@@ -1,8 +1,8 @@
 #include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
-#include "tools/qmedit/content_diff.h"
 #include "tools/qmedit/edit_diff_json.h"
+#include "tools/qmedit/edit_diff_text.h"
 #include "tools/qmedit/project_session.h"
 
 #include "platform/services/edit_filenames.h"
@@ -58,9 +58,22 @@ Qx::Status readItem(const ProjectSession& session, const String& name, bool hasP
     return {};
 }
 
+/// Warns of the shots that are there and whose names are not known; one that is missing is told of as such
+/// where it is played.
+void reportUnreadable(const EditReport& report) {
+    for (const SourceReport& source : report.sources) {
+        if (!source.problem.empty() && !Qx::askFile(ProjectSession::fileOf(source.strip)).isMissing()) {
+            reportWarning("the shot " + source.strip.asString() + " could not be read: " + source.problem);
+        }
+    }
+}
+
 int runDiff(const DiffOptions& options) {
     ProjectSession session(options.project);
     const bool hasProject = session.exists();
+    if (const Qx::FileAnswer folder = Qx::askFile(session.folder() + "/."); folder.isUnknown()) {
+        return failed(Qx::Status::failure(folder.obstacle("look at").text()));
+    }
     if (hasProject) {
         if (const Qx::Status opened = session.openExisting(); !opened) {
             return failed(opened);
@@ -76,6 +89,7 @@ int runDiff(const DiffOptions& options) {
             return failed(read);
         }
         reports[i] = reportOf(*edits[i], hasProject ? session.sourceNamer() : SourceNamer());
+        reportUnreadable(reports[i]);
         contents[i] = contentOf(*edits[i], reports[i]);
         const Qx::Status added = store.empty() ? Qx::Status() : addObjects(contents[i], reports[i], store);
         if (!added) {

@@ -1,10 +1,9 @@
-#include "tools/qmedit/column_table.h"
 #include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/managed_edit.h"
-#include "tools/qmedit/revisions.h"
+#include "tools/qmedit/revision_text.h"
 
 #include <memory>
 
@@ -13,13 +12,6 @@ namespace {
 struct HistoryArguments : EditArguments {
     bool json = false;
 };
-
-std::vector<String> cells(const Revision& revision, const Console& console) {
-    return {console.safe(revision.which), localTimeText(revision.time), String(std::to_string(revision.size)),
-            revision.isSound() ? String(std::to_string(revision.modifications)) : String("-"),
-            revision.isSound() ? (revision.change.empty() ? String("-") : console.safe(revision.change))
-                               : "damaged: " + console.safe(revision.damage)};
-}
 
 int runHistory(const HistoryArguments& arguments) {
     cookie item;
@@ -31,28 +23,21 @@ int runHistory(const HistoryArguments& arguments) {
         return failed(opened);
     }
     session.manage();
-    const std::vector<Revision> revisions = revisionsOf(item);
+    const RevisionList list = revisionsOf(item);
+    const bool isWhole = !reportUnanswered(list);
+    const std::vector<Revision>& revisions = list.revisions;
     if (revisions.empty()) {
-        return failed(Qx::Status::failure("there is no edit " + item.asString() + " in the project " +
-                                          session.root() + "; 'qmedit list' shows those there are"));
+        return !isWhole
+                   ? kFailed
+                   : failed(Qx::Status::failure("there is no edit " + item.asString() + " in the project " +
+                                                session.root() + "; 'qmedit list' shows those there are"));
     }
     writeOut(arguments.json ? historyJson(item, revisions)
                             : revisionTable(revisions, Console::forStandardOutput()));
-    return kDone;
+    return isWhole ? kDone : kFailed;
 }
 
 } // namespace
-
-String revisionTable(const std::vector<Revision>& revisions, const Console& console) {
-    constexpr bool rightAligned[] = {false, false, true, true, false};
-    ColumnTable table({"which", "changed", "bytes", "count", "last change"}, rightAligned);
-    for (const Revision& revision : revisions) {
-        table.add(cells(revision, console), !revision.isSound()                 ? Console::Ink::Warning
-                                            : revision.kind == Revision::Itself ? Console::Ink::Bold
-                                                                                : Console::Ink::None);
-    }
-    return table.text(console, false);
-}
 
 Command historyCommand() {
     const auto arguments = std::make_shared<HistoryArguments>();

@@ -4,7 +4,7 @@
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/project_session.h"
-#include "tools/qmedit/revisions.h"
+#include "tools/qmedit/revision_text.h"
 
 #include "platform/media/timecode.h"
 #include "platform/services/files.h"

@@ -2,9 +2,9 @@
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/managed_edit.h"
-#include "tools/qmedit/revisions.h"
+#include "tools/qmedit/revision_text.h"
 
-#include "edit/manager/revision_chain.h"
+#include "edit/manager/recovery.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 
@@ -17,63 +17,14 @@ struct RecoverArguments : EditArguments {
     std::string from;
 };
 
-const Revision* itself(const std::vector<Revision>& revisions) {
-    const auto place = std::find_if(revisions.begin(), revisions.end(),
-                                    [](const Revision& r) { return r.kind == Revision::Itself; });
-    return place == revisions.end() ? nullptr : &*place;
-}
-
-Qx::Status failure(const Qx::FileError& error) {
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
-}
-
-/// Puts a copy of one state in the edit's place. What is there becomes an undo backup, or a file set aside
-/// when it is damaged; `kept` is its name afterwards, empty when there was none. On a failure the edit is as
-/// it was, or kept under that name.
-Qx::Status replaceBy(const cookie& item, const Revision& taken, const Revision* present, String& kept) {
-    RevisionChain undo(item, RevisionChain::Undo, edit_manager::backupDepth());
-    const String& file = undo.file();
-    // Copied first: keeping the present state may move the one that is taken to another name.
-    const String copy = file + kRecoveryCopy;
-    if (Qx::Status copied = failure(Qx::copyFile(taken.path, copy)); !copied) {
-        return copied;
-    }
-    Qx::Status status;
-    if (present != nullptr && present->isSound()) {
-        status = undo.push();
-        kept = undo.path(1);
-    } else if (present != nullptr) {
-        status = findCorruptName(file, kept);
-        if (status) {
-            status = failure(Qx::fileSystem().rename(file, kept));
-        }
-    }
-    if (status) {
-        status = failure(Qx::fileSystem().rename(copy, file));
-    }
-    if (!status && !kept.empty() && Qx::askFile(file).isMissing()) {
-        // What was there comes back. A failure is told of by the caller, who looks where it is.
-        int restored = 0;
-        static_cast<void>(present->isSound() ? undo.restoreNewest(restored).isOk()
-                                             : !Qx::fileSystem().rename(kept, file));
-    }
-    if (!status) {
-        static_cast<void>(Qx::fileSystem().remove(copy).code);
-        return status;
-    }
-    const Qx::FileError error = Qx::fileSystem().syncFolder(Qx::folderOf(file));
-    return failure(error);
-}
-
 /// Says why no state can be taken and what else can be done.
-int reportNoneSound(const cookie& item, const std::vector<Revision>& revisions,
-                    const ProjectSession& session) {
-    if (revisions.empty()) {
+int reportNoneSound(const cookie& item, const RevisionList& list, const ProjectSession& session) {
+    if (list.revisions.empty()) {
         return failed(Qx::Status::failure("there is nothing of " + item.asString() + " in the project " +
                                           session.root() + "; 'qmedit list' shows the edits there are"));
     }
-    const Revision* const present = itself(revisions);
-    const String& file = present != nullptr ? present->path : revisions.front().path;
+    const Revision* const present = list.itself();
+    const String& file = present != nullptr ? present->path : list.revisions.front().path;
     return failed(Qx::Status::failure("no state of " + item.asString() +
                                       " is sound, so nothing was changed; 'qmedit salvage " + file +
                                       " --into DIR' saves what is sound of a damaged file"));
@@ -110,25 +61,30 @@ int runRecover(const RecoverArguments& arguments) {
         return code;
     }
     const cookie& item = managed.item();
-    const std::vector<Revision> revisions = revisionsOf(item);
-    const Revision* const present = itself(revisions);
+    const RevisionList list = revisionsOf(item);
+    const bool isWhole = !reportUnanswered(list);
+    const Revision* const present = list.itself();
     if (present != nullptr && present->refused) {
         return failed(Qx::Status::failure("nothing was changed: " + present->path +
                                           " may be sound, but cannot be read here: " + present->damage));
     }
     const Revision* taken = nullptr;
     if (!arguments.from.empty()) {
-        taken = asked(arguments.from, item, revisions);
+        taken = asked(arguments.from, item, list.revisions);
         if (taken == nullptr) {
             return kFailed;
         }
     } else {
-        taken = newestSound(revisions);
+        taken = list.newestSound();
         const bool presentIsSound = present != nullptr && present->isSound();
         if (taken == nullptr && !presentIsSound) {
-            return reportNoneSound(item, revisions, managed.session());
+            return !isWhole ? kFailed : reportNoneSound(item, list, managed.session());
         }
-        showCandidates(revisions);
+        showCandidates(list.revisions);
+        if (!isWhole) {
+            return failed(Qx::Status::failure("nothing was changed, as there may be a newer state; --from "
+                                              "takes one of these"));
+        }
         if (presentIsSound) {
             reportProgress("the edit is sound, so nothing was changed; --from takes another of these states");
             return kDone;
@@ -139,7 +95,7 @@ int runRecover(const RecoverArguments& arguments) {
         return kDone;
     }
     String kept;
-    if (const Qx::Status replaced = replaceBy(item, *taken, present, kept); !replaced) {
+    if (const Qx::Status replaced = recoverEdit(item, list, *taken, kept); !replaced) {
         return failed(Qx::Status::failure(item.asString() + " was not recovered: " + replaced.reason() +
                                           (kept.empty() || !Qx::askFile(kept).isRegular() ||
                                                    Qx::askFile(getFilenameForCookie(item)).isRegular()

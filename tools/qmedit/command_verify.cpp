@@ -2,11 +2,11 @@
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
-#include "tools/qmedit/leftovers.h"
 #include "tools/qmedit/project_session.h"
 
-#include "edit/persist/edit_salvage.h"
-#include "platform/services/edit_filenames.h"
+#include "edit/inspect/usage.h"
+#include "edit/inspect/verification.h"
+#include "edit/manager/leftovers.h"
 #include "platform/services/files.h"
 
 #include <algorithm>
@@ -23,106 +23,19 @@ struct VerifyArguments {
     bool clean = false;
 };
 
-constexpr const char* kMilestones = "Milestones";
-
-/// ".U1", ".R12".
-bool isBackupExtension(const String& extension) {
-    return extension.size() > 2 && (extension[1] == 'U' || extension[1] == 'R') &&
-           extension.find_first_not_of("0123456789", 2) == String::npos;
-}
-
-/// The item that a file of the project's folder belongs to; false for a file that is none of an edit's. A
-/// file with an edit's extension that is named after no item gives the invalid cookie.
-bool itemOfFile(const String& name, cookie& item) {
-    const String file = isBackupExtension(Qx::extensionOf(name)) ? Qx::withoutExtension(name) : name;
-    if (Qx::extensionOf(file) != getEditFilenameExt()) {
-        return false;
+/// For a person.
+const char* leftoverText(Leftover::Kind kind) {
+    switch (kind) {
+    case Leftover::Temporary:
+        return "a temporary file";
+    case Leftover::RecoveryCopy:
+        return "the copy of a recovery that did not come to its end";
+    case Leftover::ImportedShot:
+        return "a shot of an import that did not come to its end";
+    case Leftover::ImportNote:
+        return "the note of an import that did not come to its end";
     }
-    item = cookie(std::string_view(Qx::withoutExtension(file)));
-    item = item.isStorable() ? item : invalid_cookie;
-    return true;
-}
-
-/// The names of a folder; none of one that is not there or is a link.
-Qx::Status namesIn(const String& folder, std::vector<String>& names) {
-    names.clear();
-    const Qx::FileAnswer found = Qx::askFile(folder);
-    if (found.isUnknown()) {
-        return Qx::Status::failure(found.obstacle().text());
-    }
-    if (!found.isFolder()) {
-        return {};
-    }
-    const Qx::FileError error = Qx::fileSystem().list(folder, names);
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
-}
-
-class Verifying {
-public:
-    Verifying(String folder, const std::vector<cookie>& items)
-        : m_folder(std::move(folder)), m_items(items) {}
-
-    Qx::Status run();
-    [[nodiscard]] const std::vector<VerifiedFile>& files() const { return m_files; }
-    [[nodiscard]] bool found(const cookie& item) const {
-        return std::find(m_found.begin(), m_found.end(), item) != m_found.end();
-    }
-
-private:
-    Qx::Status addMilestones();
-    void add(const cookie& item, const String& name, bool needsItem);
-
-    String m_folder;
-    const std::vector<cookie>& m_items;
-    std::vector<cookie> m_found;
-    std::vector<VerifiedFile> m_files;
-};
-
-void Verifying::add(const cookie& item, const String& name, bool needsItem) {
-    if (!m_items.empty() && std::find(m_items.begin(), m_items.end(), item) == m_items.end()) {
-        return;
-    }
-    m_found.push_back(item);
-    VerifiedFile& file = m_files.emplace_back();
-    file.name = name;
-    verifyEditFile(Qx::joinPath(m_folder, name), file.faults);
-    if (needsItem && !item.is_valid()) {
-        file.faults.push_back("its name is not that of an item, so nothing opens it; rename it to a cookie");
-    }
-}
-
-Qx::Status Verifying::addMilestones() {
-    std::vector<String> items;
-    if (Qx::Status listed = namesIn(Qx::joinPath(m_folder, kMilestones), items); !listed) {
-        return listed;
-    }
-    for (const String& name : items) {
-        const cookie item = cookie(std::string_view(name));
-        const String folder = Qx::joinPath(kMilestones, name);
-        std::vector<String> copies;
-        if (Qx::Status listed = namesIn(Qx::joinPath(m_folder, folder), copies); !listed) {
-            return listed;
-        }
-        for (const String& copy : copies) {
-            if (item.isStorable() && copy.starts_with(name + ".")) {
-                add(item, Qx::joinPath(folder, copy), false);
-            }
-        }
-    }
-    return {};
-}
-
-Qx::Status Verifying::run() {
-    std::vector<String> names;
-    if (const Qx::FileError error = Qx::fileSystem().list(m_folder, names); error) {
-        return Qx::Status::failure(error.text());
-    }
-    for (const String& name : names) {
-        if (cookie item; itemOfFile(name, item)) {
-            add(item, name, true);
-        }
-    }
-    return addMilestones();
+    return "";
 }
 
 /// One line a file.
@@ -161,16 +74,15 @@ Qx::Status findPlayed(ProjectSession& session, std::unordered_set<cookie>& playe
         if (Qx::Status read = session.readEdit(listed.item, edit); !read) {
             return read;
         }
-        for (const SourceReport& source : reportOf(*edit, {}).sources) {
-            played.insert(source.strip);
-        }
+        addPlayed(*edit, played);
     }
     return {};
 }
 
 /// Tells of what killed programs left, and with `clean` removes it.
 Qx::Status tellLeftovers(ProjectSession& session, bool clean) {
-    const std::vector<Leftover> leftovers = findLeftovers(session.folder());
+    std::vector<Leftover> leftovers;
+    const Qx::Status found = findLeftovers(session.folder(), leftovers);
     const size_t start = session.folder().size() + 1;
     if (clean) {
         if (Qx::Status locked = session.lockForWriting(); !locked) {
@@ -184,21 +96,21 @@ Qx::Status tellLeftovers(ProjectSession& session, bool clean) {
             }
             return !*looked || played.contains(shot);
         };
-        static_cast<void>(removeAllLeftovers(session.folder(), isPlayed));
+        removeAllLeftovers(session.folder(), isPlayed);
     }
     size_t left = 0;
     for (const Leftover& leftover : leftovers) {
         const bool isGone = clean && Qx::askFile(leftover.path).isMissing();
         left += isGone ? 0 : 1;
         reportProgress((isGone ? "removed: " : "left over: ") + leftover.path.substr(start) + ", " +
-                       leftover.what);
+                       leftoverText(leftover.kind));
     }
     if (left > 0 && !clean) {
         reportProgress(String::format("%zu file%s left over by programs that were killed; 'qmedit verify "
                                       "--clean' removes what nothing refers to",
                                       left, left == 1 ? "" : "s"));
     }
-    return {};
+    return found;
 }
 
 int runVerify(const VerifyArguments& arguments) {
@@ -212,14 +124,14 @@ int runVerify(const VerifyArguments& arguments) {
     if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
     }
-    Verifying verifying(session.folder(), items);
-    if (const Qx::Status ran = verifying.run(); !ran) {
-        return failed(ran);
+    std::vector<VerifiedFile> files;
+    if (const Qx::Status verified = verifyProject(session.folder(), items, files); !verified) {
+        return failed(verified);
     }
     if (arguments.json) {
-        writeOut(verifyJson(verifying.files()));
+        writeOut(verifyJson(files));
     } else {
-        writeOut(verifyTable(verifying.files(), Console::forStandardOutput()));
+        writeOut(verifyTable(files, Console::forStandardOutput()));
     }
     if (items.empty() || arguments.clean) {
         if (const Qx::Status told = tellLeftovers(session, arguments.clean); !told) {
@@ -227,11 +139,12 @@ int runVerify(const VerifyArguments& arguments) {
         }
     }
     int code = kDone;
-    for (const VerifiedFile& file : verifying.files()) {
+    for (const VerifiedFile& file : files) {
         code = file.faults.empty() ? code : static_cast<int>(kFailed);
     }
     for (const cookie& item : items) {
-        if (!verifying.found(item)) {
+        if (std::none_of(files.begin(), files.end(),
+                         [&](const VerifiedFile& file) { return file.item == item; })) {
             code = failed(Qx::Status::failure("there is no edit " + item.asString() + " in the project " +
                                               session.root() + "; 'qmedit list' shows those there are"));
         }

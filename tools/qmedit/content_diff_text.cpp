@@ -1,4 +1,4 @@
-#include "tools/qmedit/content_diff.h"
+#include "tools/qmedit/edit_diff_text.h"
 
 #include "edit/model/channel_group.h"
 #include "tools/qmedit/console.h"

@@ -1,5 +1,6 @@
 #include "tools/qmedit/edit_diff_json.h"
 
+#include "tools/qmedit/edit_diff_text.h"
 #include "tools/qmedit/edit_json.h"
 
 #include <nlohmann/json.hpp>

@@ -1,5 +1,6 @@
+#include "tools/qmedit/edit_diff_text.h"
+
 #include "platform/base/num_range.h"
-#include "tools/qmedit/edit_diff.h"
 #include "tools/qmedit/event_table.h"
 #include "tools/qmedit/track_picture.h"
 
@@ -7,10 +8,6 @@
 #include <cmath>
 
 using Qx::kTimeTolerance;
-
-DiffKind diffKind(bool wasThere, bool isThere) {
-    return !wasThere ? DiffKind::Added : isThere ? DiffKind::Changed : DiffKind::Removed;
-}
 
 const char* diffKindText(DiffKind kind) {
     return kind == DiffKind::Added ? "added" : kind == DiffKind::Removed ? "removed" : "changed";

@@ -242,7 +242,7 @@ String historyJson(const cookie& item, const std::vector<Revision>& revisions) {
         json["file"] = revision.path;
         json["name"] = textOrNull(revision.name, sound);
         json["changed"] = textOrNull(isoTime(revision.time), revision.time > 0);
-        json["size"] = revision.size;
+        json["size"] = revision.file.size;
         json["modifications"] = sound ? Json(revision.modifications) : Json();
         json["change"] = textOrNull(revision.change, sound && !revision.change.empty());
         json["damaged"] = textOrNull(revision.damage, !sound);

@@ -1,8 +1,9 @@
 #pragma once
 
-#include "tools/qmedit/edit_report.h"
+#include "edit/inspect/edit_report.h"
+#include "edit/inspect/verification.h"
+#include "edit/manager/revisions.h"
 #include "tools/qmedit/project_session.h"
-#include "tools/qmedit/revisions.h"
 
 #include <vector>
 
@@ -24,12 +25,6 @@
 
 /// One pair of an edit: the object that `show --json` gives for it, without a line end.
 [[nodiscard]] String pairJsonText(const EditReport& report, const PairReport& pair);
-
-/// A file that `qmedit verify` checked.
-struct VerifiedFile {
-    String name;                ///< below the project's folder
-    std::vector<String> faults; ///< empty for a sound one
-};
 
 /// Checked files: an array of objects.
 [[nodiscard]] String verifyJson(const std::vector<VerifiedFile>& files);

@@ -1,7 +1,7 @@
 #pragma once
 
+#include "edit/inspect/edit_report.h"
 #include "platform/base/status.h"
-#include "tools/qmedit/edit_report.h"
 
 /// A place in an edit as users write it: "COOKIE", "COOKIE@IN" or "COOKIE@IN-OUT".
 struct EditPlace {

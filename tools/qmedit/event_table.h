@@ -1,7 +1,7 @@
 #pragma once
 
+#include "edit/inspect/edit_report.h"
 #include "tools/qmedit/console.h"
-#include "tools/qmedit/edit_report.h"
 
 /// How much of the table is written.
 struct EventTableOptions {

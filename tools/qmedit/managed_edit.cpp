@@ -1,7 +1,7 @@
 #include "tools/qmedit/managed_edit.h"
 
 #include "tools/qmedit/console.h"
-#include "tools/qmedit/revisions.h"
+#include "tools/qmedit/revision_text.h"
 
 #include "edit/manager/revision_chain.h"
 #include "edit/project/permissions_manager.h"

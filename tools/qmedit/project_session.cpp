@@ -1,6 +1,7 @@
 #include "tools/qmedit/project_session.h"
 
 #include "edit/manager/edit_record.h"
+#include "edit/manager/leftovers.h"
 #include "edit/manager/revision_chain.h"
 #include "edit/persist/edit_init.h"
 #include "edit/persist/edit_salvage.h"
@@ -10,7 +11,6 @@
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 #include "tools/qmedit/console.h"
-#include "tools/qmedit/leftovers.h"
 
 #include <chrono>
 #include <cstdlib>

@@ -1,11 +1,11 @@
 #pragma once
 
+#include "edit/inspect/edit_report.h"
 #include "edit/manager/edit_manager.h"
 #include "edit/manager/edit_manager_lock.h"
 #include "edit/model/edit.h"
 #include "edit/project/projdb.h"
 #include "platform/base/status.h"
-#include "tools/qmedit/edit_report.h"
 #include "tools/qmedit/interrupts.h"
 
 #include <memory>

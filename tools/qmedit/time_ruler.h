@@ -1,6 +1,6 @@
 #pragma once
 
-#include "tools/qmedit/edit_report.h"
+#include "edit/inspect/edit_report.h"
 
 /// One mark of a timecode ruler.
 struct RulerMark {

@@ -1,7 +1,7 @@
 #pragma once
 
+#include "edit/inspect/edit_report.h"
 #include "tools/qmedit/console.h"
-#include "tools/qmedit/edit_report.h"
 
 /// The tracks of an edit drawn to scale in the columns of a console: a timecode ruler, a row of markers where
 /// there are any, and for each channel one row of pairs between two rules.

@@ -12,6 +12,9 @@ public:
 
     /// True if a file without a whole table is searched for objects.
     [[nodiscard]] bool mayScan() const { return m_mayScan; }
+    /// The file could not be read here, or is of a later version.
+    [[nodiscard]] bool isRefused() const { return m_isRefused; }
+    void setRefused(bool refused) { m_isRefused = refused; }
     /// The objects of the table that are not sound: told of when the part that they belong to is read.
     void setUnsound(const std::vector<StoredObjectInfo>& objects);
     /// The store and header are those of this edit. Called when the header was read or is known to be lost.
@@ -45,6 +48,7 @@ private:
 
     std::vector<String>& m_lost;
     bool m_mayScan;
+    bool m_isRefused = false;
     Edit* m_edit = nullptr;
     bool m_headerLost = false;
     bool m_audioSeen = false;

@@ -1,6 +1,5 @@
-#include "tools/qmedit/edit_report.h"
+#include "edit/inspect/edit_report.h"
 
-#include "interchange/edl/edl_records.h"
 #include "platform/media/timecode.h"
 #include "platform/services/current_project.h"
 
@@ -10,6 +9,10 @@
 #include <unordered_map>
 
 namespace {
+
+/// Header keys of an imported edit: the timecode of edit time 0 in frames, and whether it is in drop frame.
+constexpr const char* kStartTimecode = "EDIT_START";
+constexpr const char* kDropFrame = "DROP_FRAME";
 
 SourceKind kindOf(const cookie& strip) {
     if (strip.isBlack()) {
@@ -136,11 +139,10 @@ std::vector<String> placesOf(const Edit& edit) {
 /// The timecode of edit time 0: what an import found, else the elapsed time's origin.
 void takeTimecode(const Edit& edit, EditReport& report) {
     const configb& header = edit.Opts();
-    report.dropFrame = header.getBool(interchange::EdlKey::kDropFrame, Qx::currentProject().dropFrame) &&
-                       report.rate.hasDropFrame();
-    report.origin = header.contains(interchange::EdlKey::kStart)
-                        ? report.rate.toSeconds(header.getInt64(interchange::EdlKey::kStart))
-                        : edit.get_elapsed_time_origin();
+    report.dropFrame =
+        header.getBool(kDropFrame, Qx::currentProject().dropFrame) && report.rate.hasDropFrame();
+    report.origin = header.contains(kStartTimecode) ? report.rate.toSeconds(header.getInt64(kStartTimecode))
+                                                    : edit.get_elapsed_time_origin();
 }
 
 void takeCues(const Edit& edit, std::vector<CueReport>& cues) {

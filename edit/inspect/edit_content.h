@@ -1,6 +1,6 @@
 #pragma once
 
-#include "tools/qmedit/edit_report.h"
+#include "edit/inspect/edit_report.h"
 
 #include "platform/base/status.h"
 #include "platform/media/level_store.h"
@@ -12,7 +12,8 @@
 /// What an edit keeps beside the pairs and markers of its report, taken out of it once as plain values.
 /// Channels are told by their places (`ChannelReport::place`).
 
-/// The properties of a channel that are not those of a new one, under the keys that docs/qmedit.md lists.
+/// The properties of a channel that are not those of a new one: "name", "material", "resolution_s",
+/// "sync_loss_s", "output" and "cross_fades"; those that end in "_s" are seconds.
 struct ChannelContent {
     String place;
     configb properties;
@@ -29,7 +30,7 @@ struct GroupContent {
     auto operator<=>(const GroupContent&) const = default;
 };
 
-/// An object of the file that is no part of the edit as this program knows it.
+/// An object of the file that is no part of the edit as this library knows it.
 struct ObjectContent {
     String name;
     String layer; ///< any bytes, as the name
@@ -48,7 +49,8 @@ struct EditContent {
 };
 
 /// Takes out everything but the objects, which `addObjects` reads. `report` is the edit's.
-[[nodiscard]] EditContent contentOf(const Edit& edit, const EditReport& report);
+[[nodiscard]] QM_API EditContent contentOf(const Edit& edit, const EditReport& report);
 
-/// Adds the objects of the edit's file, an object store, that are no part of the edit.
-Qx::Status addObjects(EditContent& content, const EditReport& report, const String& path);
+/// Adds the objects of the edit's file, an object store, that are no part of the edit. A failure names the
+/// object or the file that cannot be read; some objects may have been added then.
+QM_API Qx::Status addObjects(EditContent& content, const EditReport& report, const String& path);

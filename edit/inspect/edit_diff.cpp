@@ -1,7 +1,7 @@
-#include "tools/qmedit/edit_diff.h"
+#include "edit/inspect/edit_diff.h"
 
+#include "edit/inspect/detail/diff_walk.h"
 #include "platform/base/num_range.h"
-#include "tools/qmedit/diff_walk.h"
 
 #include <algorithm>
 #include <cmath>
@@ -126,33 +126,37 @@ bool sameCues(const EditReport& before, const EditReport& after) {
 
 } // namespace
 
+DiffKind diffKind(bool wasThere, bool isThere) {
+    return !wasThere ? DiffKind::Added : isThere ? DiffKind::Changed : DiffKind::Removed;
+}
+
 EditDiff diffOf(const EditReport& before, const EditReport& after) {
     EditDiff diff;
     const auto old = placesOf(before);
     const auto now = placesOf(after);
     for (const auto& [name, channel] : now) {
         const ChannelReport* const was = find(old, name);
-        ChannelDiff its;
-        its.name = name;
-        its.kind = diffKind(was != nullptr, true);
-        its.endAfter = endOf(*channel);
-        comparePairs(before, was, after, channel, its);
+        ChannelDiff found;
+        found.name = name;
+        found.kind = diffKind(was != nullptr, true);
+        found.endAfter = endOf(*channel);
+        comparePairs(before, was, after, channel, found);
         if (was != nullptr) {
-            its.spans = spansOf(before, *was, after, *channel);
-            its.endBefore = endOf(*was);
+            found.spans = spansOf(before, *was, after, *channel);
+            found.endBefore = endOf(*was);
         }
-        if (was == nullptr || !its.spans.empty() || !its.removed.empty() || !its.added.empty()) {
-            diff.channels.push_back(std::move(its));
+        if (was == nullptr || !found.spans.empty() || !found.removed.empty() || !found.added.empty()) {
+            diff.channels.push_back(std::move(found));
         }
     }
     for (const auto& [name, channel] : old) {
         if (find(now, name) == nullptr) {
-            ChannelDiff its;
-            its.name = name;
-            its.kind = DiffKind::Removed;
-            its.endBefore = endOf(*channel);
-            comparePairs(before, channel, after, nullptr, its);
-            diff.channels.push_back(std::move(its));
+            ChannelDiff found;
+            found.name = name;
+            found.kind = DiffKind::Removed;
+            found.endBefore = endOf(*channel);
+            comparePairs(before, channel, after, nullptr, found);
+            diff.channels.push_back(std::move(found));
         }
     }
     diff.cuesBefore = before.cues.size();

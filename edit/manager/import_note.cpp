@@ -1,12 +1,10 @@
-#include "interchange/import_note.h"
+#include "edit/manager/import_note.h"
 
 #include "platform/services/atomic_batch.h"
 #include "platform/services/atomic_file.h"
 #include "platform/services/edit_filenames.h"
 
 #include <algorithm>
-
-namespace interchange {
 
 namespace {
 
@@ -20,12 +18,12 @@ String fileOf(const String& folder, const cookie& item) {
     return Qx::joinPath(folder, item.asString() + getEditFilenameExt());
 }
 
+Qx::Status asStatus(const Qx::FileError& error) {
+    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+}
+
 /// The edits that a note names; none for a text that is no whole note.
-std::vector<cookie> editsOf(const String& path) {
-    String text;
-    if (Qx::readWholeFile(path, text, kSizeLimit)) {
-        return {};
-    }
+std::vector<cookie> editsOf(const String& text) {
     const std::vector<String> lines = text.split('\n', true);
     std::vector<cookie> edits;
     if (lines.empty() || lines.front() != kFirstLine) {
@@ -47,18 +45,31 @@ bool isThere(const std::vector<String>& names, const cookie& item) {
     return place != names.end() && place->starts_with(start);
 }
 
-UnfinishedImport examine(const String& folder, const std::vector<String>& names, const String& note) {
-    UnfinishedImport import;
-    import.note = note;
-    std::vector<cookie> edits = editsOf(note);
-    const Qx::FileAnswer written = Qx::askFile(note);
-    if (edits.empty() || !written.isRegular() || isThere(names, edits.back())) {
-        return import;
+/// Fills in what is left of the import of which `import.note` tells. A failure when that is not known.
+Qx::Status examine(const String& folder, const std::vector<String>& names, UnfinishedImport& import) {
+    const Qx::FileAnswer written = Qx::askFile(import.note);
+    if (written.isUnknown()) {
+        return asStatus(written.obstacle());
+    }
+    String text;
+    if (written.isRegular()) {
+        const Qx::FileError error = Qx::readWholeFile(import.note, text, kSizeLimit);
+        // It may have come to its end meanwhile.
+        if (error && !Qx::askFile(import.note).isMissing()) {
+            return asStatus(error);
+        }
+    }
+    std::vector<cookie> edits = editsOf(text);
+    if (edits.empty() || isThere(names, edits.back())) {
+        return {};
     }
     edits.pop_back();
     for (const cookie& shot : edits) {
         const String path = fileOf(folder, shot);
         const Qx::FileAnswer found = Qx::askFile(path);
+        if (found.isUnknown()) {
+            return asStatus(found.obstacle());
+        }
         if (found.isRegular() && found.info().modifiedNs <= written.info().modifiedNs) {
             import.files.push_back(path);
         }
@@ -70,7 +81,7 @@ UnfinishedImport examine(const String& folder, const std::vector<String>& names,
                                  (found.isRegular() && found.info().modifiedNs > written.info().modifiedNs);
         }
     }
-    return import;
+    return {};
 }
 
 } // namespace
@@ -87,22 +98,26 @@ Qx::Status writeImportNote(const String& folder, const std::vector<cookie>& edit
     if (!error) {
         error = file.commit();
     }
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+    return asStatus(error);
 }
 
-std::vector<UnfinishedImport> unfinishedImports(const String& folder) {
-    std::vector<UnfinishedImport> imports;
+Qx::Status unfinishedImports(const String& folder, std::vector<UnfinishedImport>& imports) {
     std::vector<String> names;
-    if (Qx::fileSystem().list(folder, names)) {
-        return imports;
-    }
+    Qx::Status status = asStatus(Qx::retryInterrupted([&] { return Qx::fileSystem().list(folder, names); }));
     for (auto name = std::lower_bound(names.begin(), names.end(), kNameStart);
          name != names.end() && name->starts_with(kNameStart); ++name) {
-        if (name->ends_with(kNameEnd)) {
-            imports.push_back(examine(folder, names, Qx::joinPath(folder, *name)));
+        if (!name->ends_with(kNameEnd)) {
+            continue;
+        }
+        UnfinishedImport import;
+        import.note = Qx::joinPath(folder, *name);
+        if (Qx::Status examined = examine(folder, names, import)) {
+            imports.push_back(std::move(import));
+        } else {
+            status = examined;
         }
     }
-    return imports;
+    return status;
 }
 
 size_t takeBackImport(const UnfinishedImport& import) {
@@ -118,5 +133,3 @@ size_t takeBackImport(const UnfinishedImport& import) {
     }
     return removed;
 }
-
-} // namespace interchange

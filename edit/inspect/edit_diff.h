@@ -1,10 +1,8 @@
 #pragma once
 
-#include "tools/qmedit/edit_report.h"
+#include "edit/inspect/edit_report.h"
 
 #include <vector>
-
-class Console;
 
 /// What differs between two edits, taken from their reports. Channels correspond by kind and by their place
 /// among those of the kind: V2 is compared with V2, whatever they are called.
@@ -12,9 +10,7 @@ class Console;
 enum class DiffKind { Changed, Added, Removed };
 
 /// For a thing that at least one of the two edits has.
-[[nodiscard]] DiffKind diffKind(bool wasThere, bool isThere);
-/// "changed", "added", "removed".
-[[nodiscard]] const char* diffKindText(DiffKind kind);
+[[nodiscard]] QM_API DiffKind diffKind(bool wasThere, bool isThere);
 
 /// How one channel differs.
 struct ChannelDiff {
@@ -39,13 +35,6 @@ struct EditDiff {
     [[nodiscard]] bool same() const { return channels.empty() && !cuesDiffer; }
 };
 
-[[nodiscard]] EditDiff diffOf(const EditReport& before, const EditReport& after);
-
-/// A line for each thing that differs, with record timecodes of the second edit.
-[[nodiscard]] String diffText(const EditDiff& diff, const EditReport& after);
-/// The same with a line for each pair below its channel: '-' before one that is gone, '+' before one that
-/// came.
-[[nodiscard]] String diffPairsText(const EditDiff& diff, const EditReport& before, const EditReport& after,
-                                   const Console& console);
-/// The shortest decimal text of a level that reads back as the same.
-[[nodiscard]] String levelText(float level);
+/// Compares two edits, of one project or of two. Sources are told apart by their cookies alone: neither names
+/// nor what lies in the files of the sources count.
+[[nodiscard]] QM_API EditDiff diffOf(const EditReport& before, const EditReport& after);

@@ -1,7 +1,7 @@
-#include "tools/qmedit/content_diff.h"
+#include "edit/inspect/content_diff.h"
 
+#include "edit/inspect/detail/diff_walk.h"
 #include "platform/base/num_range.h"
-#include "tools/qmedit/diff_walk.h"
 
 #include <algorithm>
 #include <bit>
@@ -15,7 +15,7 @@ namespace {
 
 using Aud::DynamicLevelControl::Node;
 
-/// The header keys that are no content of their own; docs/qmedit.md lists them.
+/// The header keys that are no content of their own.
 bool isBookkeeping(const String& key) {
     static constexpr const char* kKeys[] = {
         // Every save or change writes them.
@@ -114,16 +114,16 @@ std::vector<LevelsDiff> levelsDiff(const EditContent& before, const EditContent&
     const auto compare = [&](const LevelsContent* was, const LevelsContent* now) {
         const std::vector<Node>& old = was != nullptr ? was->nodes : none;
         const std::vector<Node>& young = now != nullptr ? now->nodes : none;
-        LevelsDiff its{now != nullptr ? now->place : was->place,
-                       diffKind(was != nullptr, now != nullptr),
-                       old.size(),
-                       young.size(),
-                       {},
-                       {}};
+        LevelsDiff found{now != nullptr ? now->place : was->place,
+                         diffKind(was != nullptr, now != nullptr),
+                         old.size(),
+                         young.size(),
+                         {},
+                         {}};
         walkDifference(
-            old, young, sameNode, [](const Node& node) { return node.time; }, its.removed, its.added);
-        if (its.kind != DiffKind::Changed || !its.removed.empty() || !its.added.empty()) {
-            diffs.push_back(std::move(its));
+            old, young, sameNode, [](const Node& node) { return node.time; }, found.removed, found.added);
+        if (found.kind != DiffKind::Changed || !found.removed.empty() || !found.added.empty()) {
+            diffs.push_back(std::move(found));
         }
     };
     forEachPair(before.levels, after.levels, kPlaceOf, compare);

@@ -1,4 +1,4 @@
-#include "tools/qmedit/edit_content.h"
+#include "edit/inspect/edit_content.h"
 
 #include "edit/model/channel_group_list.h"
 #include "platform/services/files.h"

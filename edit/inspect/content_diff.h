@@ -1,7 +1,7 @@
 #pragma once
 
-#include "tools/qmedit/edit_content.h"
-#include "tools/qmedit/edit_diff.h"
+#include "edit/inspect/edit_content.h"
+#include "edit/inspect/edit_diff.h"
 
 #include <optional>
 #include <vector>
@@ -42,7 +42,7 @@ struct ObjectDiff {
     DiffKind kind = DiffKind::Changed;
 };
 
-struct ContentDiff {
+struct QM_API ContentDiff {
     std::vector<ValueDiff> header;
     std::vector<PropertiesDiff> properties; ///< of the channels that differ
     std::vector<LevelsDiff> levels;
@@ -52,9 +52,6 @@ struct ContentDiff {
     [[nodiscard]] bool same() const;
 };
 
-[[nodiscard]] ContentDiff contentDiffOf(const EditContent& before, const EditContent& after);
-
-/// A line for each part that differs, and below it one for each thing that is gone ('-') or came ('+'), of
-/// which the first few are written and the others counted. Each time is of the edit that has it.
-[[nodiscard]] String contentDiffText(const ContentDiff& diff, const EditReport& before,
-                                     const EditReport& after, const Console& console);
+/// Compares what two edits keep beside their pairs and markers. Header keys that every save or change writes,
+/// and those that say which of its states an edit is, are left out.
+[[nodiscard]] QM_API ContentDiff contentDiffOf(const EditContent& before, const EditContent& after);

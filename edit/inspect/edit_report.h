@@ -6,8 +6,8 @@
 #include <functional>
 #include <vector>
 
-/// What one edit shows, taken out of it once as plain values: the picture, the table and the JSON text are
-/// all drawn from this. Times are seconds.
+/// What one edit shows, taken out of it once as plain values, from which pictures, tables and texts are made.
+/// The values do not change when the edit does. Times are seconds.
 
 /// What a pair plays.
 enum class SourceKind {
@@ -52,7 +52,7 @@ struct PairReport {
     End end;
 };
 
-struct ChannelReport {
+struct QM_API ChannelReport {
     IdStamp id;
     String name;  ///< any bytes
     String place; ///< kind and place among those of the kind: "V1", "FX1"; "A2 levels" for A2's levels
@@ -79,7 +79,7 @@ struct GroupReport {
     std::vector<IdStamp> channels;
 };
 
-struct EditReport {
+struct QM_API EditReport {
     cookie item;
     String name; ///< any bytes
     edit_log_type_t type = kLogNone;
@@ -107,8 +107,9 @@ struct EditReport {
 /// source.
 using SourceNamer = std::function<void(SourceReport&)>;
 
-/// Takes out everything. `namer` may be empty: then no name is looked up.
-[[nodiscard]] EditReport reportOf(const Edit& edit, const SourceNamer& namer);
+/// Takes out everything. `namer` may be empty: then no name is looked up. The edit is not changed; who shares
+/// it with other threads holds its section.
+[[nodiscard]] QM_API EditReport reportOf(const Edit& edit, const SourceNamer& namer);
 
-/// A word for the kind, as the JSON text and the table write it: "shot", "black", "effect", ...
-[[nodiscard]] const char* sourceKindText(SourceKind kind);
+/// A word for the kind: "shot", "media", "black", "effect", "alias", "input", "magic".
+[[nodiscard]] QM_API const char* sourceKindText(SourceKind kind);

@@ -1,0 +1,100 @@
+#include "edit/inspect/verification.h"
+
+#include "edit/manager/folder_names.h"
+#include "edit/persist/edit_salvage.h"
+#include "platform/services/edit_filenames.h"
+#include "platform/services/files.h"
+
+#include <algorithm>
+
+namespace {
+
+/// ".U1", ".R12".
+bool isBackupExtension(const String& extension) {
+    return extension.size() > 2 && (extension[1] == 'U' || extension[1] == 'R') &&
+           extension.find_first_not_of("0123456789", 2) == String::npos;
+}
+
+/// The item that a file of the project's folder belongs to; false for a file that is none of an edit's. A
+/// file with an edit's extension that is named after no item gives the invalid cookie.
+bool itemOfFile(const String& name, cookie& item) {
+    const String file = isBackupExtension(Qx::extensionOf(name)) ? Qx::withoutExtension(name) : name;
+    if (Qx::extensionOf(file) != getEditFilenameExt()) {
+        return false;
+    }
+    item = cookie(std::string_view(Qx::withoutExtension(file)));
+    item = item.isStorable() ? item : invalid_cookie;
+    return true;
+}
+
+class Verifier {
+public:
+    Verifier(const String& folder, const std::vector<cookie>& items, std::vector<VerifiedFile>& files)
+        : m_folder(folder), m_items(items), m_files(files) {}
+
+    Qx::Status addEdits();
+    Qx::Status addMilestones();
+
+private:
+    void add(const cookie& item, const String& name);
+
+    const String& m_folder;
+    const std::vector<cookie>& m_items;
+    std::vector<VerifiedFile>& m_files;
+};
+
+void Verifier::add(const cookie& item, const String& name) {
+    if (!m_items.empty() && std::find(m_items.begin(), m_items.end(), item) == m_items.end()) {
+        return;
+    }
+    VerifiedFile& file = m_files.emplace_back();
+    file.name = name;
+    file.item = item;
+    verifyEditFile(Qx::joinPath(m_folder, name), file.faults);
+    if (!item.is_valid()) {
+        file.faults.push_back("its name is not that of an item, so nothing opens it; rename it to a cookie");
+    }
+}
+
+Qx::Status Verifier::addEdits() {
+    std::vector<String> names;
+    const Qx::FileError error = Qx::retryInterrupted([&] { return Qx::fileSystem().list(m_folder, names); });
+    for (const String& name : names) {
+        if (cookie item; itemOfFile(name, item)) {
+            add(item, name);
+        }
+    }
+    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+}
+
+Qx::Status Verifier::addMilestones() {
+    const String milestones = Qx::joinPath(m_folder, kMilestonesFolder);
+    std::vector<String> items;
+    if (Qx::Status listed = namesOfFolder(milestones, FolderLink::NotFollowed, items); !listed) {
+        return listed;
+    }
+    for (const String& name : items) {
+        const cookie item = cookie(std::string_view(name));
+        std::vector<String> copies;
+        if (Qx::Status listed =
+                namesOfFolder(Qx::joinPath(milestones, name), FolderLink::NotFollowed, copies);
+            !listed) {
+            return listed;
+        }
+        for (const String& copy : copies) {
+            if (item.isStorable() && copy.starts_with(name + ".")) {
+                add(item, Qx::joinPath(Qx::joinPath(kMilestonesFolder, name), copy));
+            }
+        }
+    }
+    return {};
+}
+
+} // namespace
+
+Qx::Status verifyProject(const String& folder, const std::vector<cookie>& items,
+                         std::vector<VerifiedFile>& files) {
+    Verifier verifier(folder, items, files);
+    Qx::Status status = verifier.addEdits();
+    return status ? verifier.addMilestones() : status;
+}

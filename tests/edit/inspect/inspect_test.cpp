@@ -1,0 +1,86 @@
+#include "edit/inspect/content_diff.h"
+#include "edit/inspect/usage.h"
+#include "edit/inspect/verification.h"
+#include "edit/manager/edit_manager.h"
+#include "tests/edit/manager/managed_project.h"
+#include "tests/support/edit_builder.h"
+
+#include <algorithm>
+#include <gtest/gtest.h>
+
+// What an application asks of edits without the command line.
+
+namespace {
+
+/// A channel of the difference in one line: "V1 changed [1, 4] -1 +2".
+std::string lineOf(const ChannelDiff& channel) {
+    static constexpr const char* kKinds[] = {"changed", "added", "removed"};
+    String line = channel.name + " " + kKinds[static_cast<size_t>(channel.kind)];
+    for (const ChannelDiff::Span& span : channel.spans) {
+        line += String::format(" [%g, %g]", span.from, span.to);
+    }
+    return line + String::format(" -%zu +%zu", channel.removed.size(), channel.added.size());
+}
+
+TEST(Inspect, TellsWhereTwoEditsDiffer) {
+    const test::EditBuilder builder = test::EditBuilder().video(2).audio(1).levels(1).clips({4, -1, 5});
+    const EditPtr before = builder.build();
+    const EditPtr after = before->copy();
+    after->setName("Reel 2");
+    cel& picture = *after->get_edit_cel_p(0);
+    channel_event other = *picture.getChanEventPtr(4);
+    other.strip = cookie("M000A000");
+    ASSERT_TRUE(picture.setEvent(4, other));
+    static_cast<void>(after->addChan(VideoChan));
+    const EditReport reports[] = {reportOf(*before, {}), reportOf(*after, {})};
+    const EditContent contents[] = {contentOf(*before, reports[0]), contentOf(*after, reports[1])};
+
+    std::vector<std::string> lines;
+    const EditDiff diff = diffOf(reports[0], reports[1]);
+    std::transform(diff.channels.begin(), diff.channels.end(), std::back_inserter(lines), lineOf);
+    EXPECT_EQ(lines, (std::vector<std::string>{"V1 changed [5, 10] -1 +1", "V3 added -0 +0"}));
+    const ContentDiff content = contentDiffOf(contents[0], contents[1]);
+    ASSERT_EQ(content.header.size(), 1U);
+    EXPECT_EQ(content.header[0].key, "NAME");
+    EXPECT_TRUE(content.levels.empty() && !content.groups.changed);
+
+    EXPECT_TRUE(diffOf(reports[0], reports[0]).same());
+    EXPECT_TRUE(contentDiffOf(contents[1], contents[1]).same());
+}
+
+TEST(Inspect, VerifiesAProjectAndTellsWhoPlaysWhat) {
+    const test::ManagedProject project;
+    const cookie items[] = {cookie("E0001000"), cookie("E0002000"), cookie("E0003000")};
+    for (const cookie& item : items) {
+        ASSERT_TRUE(test::ManagedProject::save("cut", item));
+    }
+    const EditPtr edit(items[1], eOpenExisting);
+    edit->get_edit_cel_p(edit->addChan(VideoChan))->appendEventPair(items[0], 0, 0, 2);
+    edit->init_dirty();
+    ASSERT_TRUE(edit_manager::flush_edit(items[1]));
+    std::string bytes = project.read("E0003000.qme");
+    bytes[bytes.size() / 2] = static_cast<char>(bytes[bytes.size() / 2] ^ 1);
+    project.write("E0003000.qme", bytes);
+    project.write("reel.qme", project.read("E0001000.qme"));
+
+    std::vector<VerifiedFile> files;
+    ASSERT_TRUE(verifyProject(project.folder(), {}, files));
+    std::vector<std::string> found;
+    for (const VerifiedFile& file : files) {
+        found.push_back(file.name + (file.faults.empty() ? " sound" : " not sound"));
+    }
+    EXPECT_EQ(found, (std::vector<std::string>{"E0001000.qme sound", "E0002000.qme sound",
+                                               "E0003000.qme not sound", "reel.qme not sound"}));
+
+    const auto read = [](const cookie& item, EditPtr& to) {
+        to = EditPtr(new Edit);
+        return to->read_file(item, eOpenExisting) == Edit::kReadOk ? Qx::Status()
+                                                                   : Qx::Status::failure(to->lastFileError());
+    };
+    const auto users = findUsers(items[0], {items, items + 3}, read);
+    ASSERT_EQ(users.size(), 2U); // one plays it, one may
+    EXPECT_TRUE(users[0].edit == items[1] && users[0].problem.empty());
+    EXPECT_TRUE(users[1].edit == items[2] && !users[1].problem.empty());
+}
+
+} // namespace
