@@ -51,6 +51,10 @@ void Verifier::add(const cookie& item, const String& name) {
     file.name = name;
     file.item = item;
     verifyEditFile(Qx::joinPath(m_folder, name), file.faults);
+    if (!file.faults.empty() && Qx::askFile(Qx::joinPath(m_folder, name)).isMissing()) {
+        m_files.pop_back(); // moved or deleted by a writer since its name was read
+        return;
+    }
     if (!item.is_valid()) {
         file.faults.push_back("its name is not that of an item, so nothing opens it; rename it to a cookie");
     }
