@@ -87,7 +87,7 @@ Qx::Status writeImportNote(const String& folder, const std::vector<cookie>& edit
     if (!error) {
         error = file.commit();
     }
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+    return error.status();
 }
 
 std::vector<UnfinishedImport> unfinishedImports(const String& folder) {

@@ -245,8 +245,8 @@ Opening::Search Opening::restoreMissing() {
     }
     // Nothing is moved where no backup is, so nobody is waited for; but the file may have been on its way
     // between the two names.
-    bool isBusy = false;
-    const Qx::Status taken = m_writers.take(hasBackups, &isBusy);
+    const Qx::Status taken = m_writers.take(hasBackups);
+    const bool isBusy = taken.code() == Qx::StatusCode::Locked;
     if (!taken && hasBackups) {
         refuse("nothing was looked for: " + taken.reason());
         return Search::NotKnown;
