@@ -33,7 +33,7 @@ struct OpenReport {
     /// `Newer`, what the system said, `BadArgument` for an item that has no file, `Cancelled` while the
     /// project is being left and when the manager was shut down.
     Qx::Status status;
-    /// What kept a backup, or a fresh edit that was asked for, from taking the place of a file that is missing
-    /// or damaged; a success when nothing did, or there is no backup.
+    /// What kept a backup, or a fresh edit that was asked for, from taking the place of a file that is
+    /// missing or damaged; a success when nothing did, or there is no backup.
     Qx::Status recovery;
 };
