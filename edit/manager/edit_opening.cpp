@@ -495,7 +495,9 @@ bool findCached(const cookie& item, eEditOpenBehaviour behaviour, CacheAnswer& a
     const bool counts = found != nullptr && !found->leaving && (found->edit.valid() || behaviour != eOpenNew);
     if (counts) {
         answer.edit = found->edit;
-        answer.failure = found->failure;
+        if (!answer.edit.valid()) {
+            answer.failure = found->failure;
+        }
     }
     return counts;
 }
@@ -526,7 +528,7 @@ EditPtr openReported(const cookie& item, eEditOpenBehaviour behaviour, OpenRepor
             if (report != nullptr) {
                 reportCached(cached, *report);
             }
-            return cached.edit;
+            return std::move(cached.edit);
         }
         Opening opening(item, behaviour);
         EditPtr edit = opening.run();
