@@ -121,7 +121,7 @@ Qx::Status putInPlace(Qx::AtomicBatch& batch, const std::vector<cookie>& cookies
     if (!unfinished.note.empty() || !unfinished.files.empty()) {
         takeBackImport(unfinished);
     }
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+    return error.status();
 }
 
 Qx::Status writeAll(const std::vector<Edit*>& edits, const std::vector<cookie>& cookies,
@@ -133,11 +133,12 @@ Qx::Status writeAll(const std::vector<Edit*>& edits, const std::vector<cookie>& 
             break;
         }
         if (!edit->write_file()) {
-            return Qx::Status::failure(edit->lastFileError());
+            return edit->lastFileStatus();
         }
     }
-    return isCancelled() ? Qx::Status::failure("nothing was imported, as it was interrupted")
-                         : putInPlace(batch, cookies);
+    return isCancelled()
+               ? Qx::Status::failure(Qx::StatusCode::Cancelled, "nothing was imported, as it was interrupted")
+               : putInPlace(batch, cookies);
 }
 
 } // namespace
@@ -148,7 +149,7 @@ cookie provisionalCookie(size_t index) {
 
 Qx::Status saveImport(Import& result, const std::function<bool()>& cancelled) {
     if (!result.sequence.valid()) {
-        return Qx::Status::failure("there is no imported sequence to save");
+        return Qx::Status::failure(Qx::StatusCode::BadArgument, "there is no imported sequence to save");
     }
     const std::vector<Edit*> edits = editsOf(result);
     std::vector<cookie> before;

@@ -68,7 +68,7 @@ Qx::Status exportLegacyText(Edit& edit, bool strict, const String& path, LossRep
                            losses == 1 ? "" : "es"));
     }
     if (!edit.writeToLegacyFile(Qx::widen(path))) {
-        return Qx::Status::failure(edit.lastFileError());
+        return edit.lastFileStatus();
     }
     return {};
 }
@@ -80,7 +80,7 @@ Qx::Status importLegacyText(const String& path, Import& result) {
     }
     EditPtr read(new Edit(wide, eOpenExisting));
     if (read->isBad()) {
-        return Qx::Status::failure(read->lastFileError());
+        return read->lastFileStatus();
     }
     // An item of its own in the project that it comes to.
     read->set_cookie(provisionalCookie(0));

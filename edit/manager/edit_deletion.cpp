@@ -47,7 +47,7 @@ Qx::FileError removeFile(const String& path) {
 Qx::Status removeFiles(const Vector<String>& files, const String& file) {
     const Qx::FileAnswer present = Qx::askFile(file);
     if (const Qx::FileError error = present.obstacle("remove")) {
-        return Qx::Status::failure(error.text());
+        return error.status();
     }
     bool anyBackup = false;
     for (auto path = files.rbegin(); path != files.rend(); ++path) {
@@ -55,7 +55,7 @@ Qx::Status removeFiles(const Vector<String>& files, const String& file) {
             continue;
         }
         if (const Qx::FileError error = removeFile(*path)) {
-            return Qx::Status::failure(error.text());
+            return error.status();
         }
         anyBackup = true;
     }
@@ -74,7 +74,7 @@ Qx::Status removeFiles(const Vector<String>& files, const String& file) {
     if (!error) {
         error = removeFile(file);
     }
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+    return error.status();
 }
 
 /// Asked before anybody is told.

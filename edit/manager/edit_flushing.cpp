@@ -79,7 +79,11 @@ bool writeTogether(std::span<const cookie> items, const MilestoneRing& milestone
         for (const EditPtr& edit : written) {
             const SectionHold section(edit);
             edit->init_dirty();
+            const ManagerState::Hold hold(state.lock);
             state.addToDirtyList(edit->get_cookie());
+            if (ManagerState::CachedEdit* const entry = state.findCacheEntry(edit->get_cookie())) {
+                entry->written = error.status();
+            }
         }
     }
     return allWritten;
@@ -160,16 +164,31 @@ size_t edit_manager::numDirty() {
     return state.dirty.size();
 }
 
+Vector<UnwrittenEdit> edit_manager::unwrittenEdits() {
+    ManagerState& state = managerState();
+    Vector<UnwrittenEdit> unwritten;
+    const Vector<cookie> items = dirtyItems();
+    const ManagerState::Hold hold(state.lock);
+    for (const cookie& item : items) {
+        const ManagerState::CachedEdit* const entry = state.findCacheEntry(item);
+        if (entry != nullptr && entry->edit.valid()) {
+            unwritten.push_back({item, entry->written});
+        }
+    }
+    return unwritten;
+}
+
 namespace {
 
-void reportLost(const cookie& item) {
+void reportLost(const cookie& item, const Qx::Status& why, Vector<UnwrittenEdit>& lost) {
+    lost.push_back({item, why});
     LogBoth("edit_manager::close_all_edits(): edit %s was closed with changes that could not be written\n",
             cookie_string(item).c_str());
 }
 
 /// Writes and drops an edit that nobody else holds, or forgets one that could not be opened. False if
 /// somebody holds it.
-bool closeUnreferenced(const cookie& item, ManagerState::CachedEdit& entry) {
+bool closeUnreferenced(const cookie& item, ManagerState::CachedEdit& entry, Vector<UnwrittenEdit>& lost) {
     ManagerState& state = managerState();
     while (entry.edit.valid()) {
         const ManagerState::Unreferenced outcome = state.writeUnreferenced(entry, true);
@@ -177,9 +196,9 @@ bool closeUnreferenced(const cookie& item, ManagerState::CachedEdit& entry) {
             return false;
         }
         const bool clean = outcome == ManagerState::Unreferenced::Clean;
-        if (state.removeUnreferenced(item, clean) != nullptr) {
+        if (const auto closed = state.removeUnreferenced(item, clean); closed != nullptr) {
             if (outcome == ManagerState::Unreferenced::NotWritten) {
-                reportLost(item);
+                reportLost(item, closed->written, lost);
             }
             return true;
         }
@@ -201,7 +220,7 @@ String folderOfCache() {
 }
 
 /// Closes all that nobody else holds. Appends the items that others hold.
-void closeUnreferenced(Vector<cookie>& held) {
+void closeUnreferenced(Vector<cookie>& held, Vector<UnwrittenEdit>& lost) {
     ManagerState& state = managerState();
     EditManagerLock writers(folderOfCache());
     static_cast<void>(writers.take(true).isOk()); // waited for before the lock is held
@@ -210,17 +229,18 @@ void closeUnreferenced(Vector<cookie>& held) {
     for (auto place = state.cache.begin(); place != state.cache.end();) {
         const cookie item = place->first;
         ManagerState::CachedEdit& entry = *place++->second;
-        if (!inMemory([&] { return closeUnreferenced(item, entry); })) {
+        if (!inMemory([&] { return closeUnreferenced(item, entry, lost); })) {
             held.push_back(item);
         }
     }
 }
 
 /// Writes an edit that others hold and drops it.
-void closeHeld(const cookie& item, const EditPtr& edit) {
+void closeHeld(const cookie& item, const EditPtr& edit, Vector<UnwrittenEdit>& lost) {
     ManagerState& state = managerState();
     std::unique_ptr<ManagerState::CachedEdit> dropped;
     bool written = true;
+    Qx::Status why;
     // Who held it may have changed it and let it go since it was written.
     constexpr int kTries = 3;
     for (int tries = 1; dropped == nullptr; ++tries) {
@@ -230,16 +250,22 @@ void closeHeld(const cookie& item, const EditPtr& edit) {
         if (found == nullptr || found->edit != edit) {
             break;
         }
+        why = found->written;
         dropped = state.removeHeld(item, written && tries < kTries);
     }
     if (!written) {
-        reportLost(item);
+        reportLost(item, why, lost);
     }
 }
 
 } // namespace
 
 void edit_manager::close_all_edits() {
+    Vector<UnwrittenEdit> lost;
+    closeAllEdits(lost);
+}
+
+void closeAllEdits(Vector<UnwrittenEdit>& lost) {
     ManagerState& state = managerState();
     EditPtr projectEdit; // opened again when it is asked for
     {
@@ -248,7 +274,7 @@ void edit_manager::close_all_edits() {
     }
     projectEdit.invalidate();
     Vector<cookie> held;
-    closeUnreferenced(held);
+    closeUnreferenced(held, lost);
     for (const cookie& item : held) {
         const EditPtr edit = cachedEdit(item);
         if (!edit.valid()) {
@@ -259,7 +285,7 @@ void edit_manager::close_all_edits() {
             herc_printf("edit_manager::close_all_edits(): edit %s has %d references\n",
                         cookie_string(item).c_str(), references);
         }
-        closeHeld(item, edit);
+        closeHeld(item, edit, lost);
     }
     storeRecords();
 }

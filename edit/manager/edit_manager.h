@@ -1,5 +1,6 @@
 #pragma once
 
+#include "edit/manager/open_report.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_registry.h"
 #include "platform/base/vector.h"
@@ -17,6 +18,13 @@ using CookieVec = Vector<cookie>;
 
 /// The outcome of the project operations.
 enum class eStatus { Ok = 0, NoProject = 1, NotFound = 2, NotWritable = 3 };
+
+/// An edit with changes that are not on the disk, and why the last attempt to write it failed; a success when
+/// none was made.
+struct UnwrittenEdit {
+    cookie item;
+    Qx::Status why;
+};
 
 /// One place of the cache: an item and its edit. A null edit remembers that the item could not be opened.
 struct EditCacheEntry {
@@ -82,6 +90,10 @@ public:
     [[nodiscard]] EditPtr open(const cookie& item, eEditOpenBehaviour behaviour) override;
     /// The same without an instance at hand.
     [[nodiscard]] static EditPtr openEdit(const cookie& item, eEditOpenBehaviour behaviour);
+    /// The same, and `report` tells what was done. For a failure that is remembered it is the report of the
+    /// opening that failed.
+    [[nodiscard]] static EditPtr openEdit(const cookie& item, eEditOpenBehaviour behaviour,
+                                          OpenReport& report);
     /// True if the edit is in memory.
     [[nodiscard]] static bool get_present(const cookie& item);
     /// How many items the cache has, remembered failures included.
@@ -114,6 +126,8 @@ public:
     void addToDirtyList(const cookie& item) override;
     /// How many edits wait to be written.
     [[nodiscard]] static size_t numDirty();
+    /// The edits that wait to be written, in the order of their cookies, with what kept them from it.
+    [[nodiscard]] static Vector<UnwrittenEdit> unwrittenEdits();
     /// Writes every edit and empties the cache; one whose file became a backup and was not written since gets
     /// its file back. Edits that others hold are logged with their references, and
     /// changes to them are not written any more. One that could not be written is told of on standard output
@@ -197,6 +211,8 @@ public:
     /// Flushes, tells observers of "editmanExitProject", closes every edit and the project's records. Nothing
     /// when another thread is leaving the project.
     static void exitProject();
+    /// The same; `lost` gets the edits that could not be written.
+    static void exitProject(Vector<UnwrittenEdit>& lost);
     /// The edit of the project's own cookie, opened or made when it is first asked for; null without a
     /// project. Valid until the edits are closed.
     [[nodiscard]] static Edit* get_current_project();

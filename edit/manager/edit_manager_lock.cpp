@@ -41,32 +41,27 @@ EditManagerLock::~EditManagerLock() {
     release();
 }
 
-Qx::Status EditManagerLock::take(bool wait, bool* isBusy) {
+Qx::Status EditManagerLock::take(bool wait) {
     using Clock = std::chrono::steady_clock;
     constexpr std::chrono::milliseconds kLongestPause{16};
     constexpr std::chrono::seconds kPatience{1};
     const Clock::time_point start = Clock::now();
     std::chrono::milliseconds pause{1};
     bool isTold = false;
-    bool busy = false;
-    Qx::Status status = tryToTake(busy);
-    while (wait && busy) {
+    Qx::Status status = tryToTake();
+    while (wait && status.code() == Qx::StatusCode::Locked) {
         if (!isTold && Clock::now() - start >= kPatience) {
             isTold = true;
             herc_printf("edit_manager: waiting to write: %s\n", status.reason().c_str());
         }
         std::this_thread::sleep_for(pause);
         pause = std::min(pause * 2, kLongestPause);
-        status = tryToTake(busy);
-    }
-    if (isBusy != nullptr) {
-        *isBusy = busy;
+        status = tryToTake();
     }
     return status;
 }
 
-Qx::Status EditManagerLock::tryToTake(bool& isBusy) {
-    isBusy = false;
+Qx::Status EditManagerLock::tryToTake() {
     if (m_isHeld || m_folder.empty()) {
         return {};
     }
@@ -74,7 +69,7 @@ Qx::Status EditManagerLock::tryToTake(bool& isBusy) {
     const std::lock_guard hold(locks.mutex);
     const auto place = locks.byFolder.try_emplace(m_folder, m_folder).first;
     if (place->second.count == 0) {
-        if (Qx::Status status = place->second.file.take(false, &isBusy); !status) {
+        if (Qx::Status status = place->second.file.take(false); !status) {
             locks.byFolder.erase(place);
             return status;
         }

@@ -26,18 +26,18 @@ public:
     EditManagerLock(const EditManagerLock&) = delete;
     EditManagerLock& operator=(const EditManagerLock&) = delete;
 
-    /// Takes the lock. Without `wait`, one that another process holds is a failure that names the holder, and
-    /// `isBusy` tells it from the others; waiting for longer than a moment is told on the log. Fails too when
-    /// the folder is not there or cannot be written. Without a project folder there is nothing to lock, which
-    /// is a success. Taking what this object holds is a success.
-    Qx::Status take(bool wait = false, bool* isBusy = nullptr);
+    /// Takes the lock. Without `wait`, one that another process holds is a failure of kind `Locked` that
+    /// names the holder; no other failure is of that kind. Waiting for longer than a moment is told on the
+    /// log. Fails too when the folder is not there or cannot be written. Without a project folder there is
+    /// nothing to lock, which is a success. Taking what this object holds is a success.
+    Qx::Status take(bool wait = false);
     void release();
     [[nodiscard]] bool isHeld() const { return m_isHeld; }
 
     static constexpr const char* kFileName = "Edits.lock";
 
 private:
-    Qx::Status tryToTake(bool& isBusy);
+    Qx::Status tryToTake();
 
     String m_folder;
     bool m_isHeld = false;

@@ -60,9 +60,9 @@ eStatus adoptProject(const Qx::CurrentProject* wanted, Leaving& leaving) {
 }
 
 /// Writes and drops what belongs to the project. Nothing is opened until another one is adopted.
-void dropProject() {
+void dropProject(Vector<UnwrittenEdit>& lost) {
     ManagerState& state = managerState();
-    edit_manager::close_all_edits();
+    closeAllEdits(lost);
     state.records.close();
     const ManagerState::Hold hold(state.lock);
     ++state.epoch;
@@ -131,7 +131,8 @@ eStatus edit_manager::check_current_project(eEditOpenBehaviour) {
     if (left.is_valid()) {
         state.tell(projExitMsgType(), left);
     }
-    dropProject();
+    Vector<UnwrittenEdit> lost; // told of on the log
+    dropProject(lost);
     return adoptProject(nullptr, leaving);
 }
 
@@ -181,14 +182,20 @@ eStatus edit_manager::set_current_project(const cookie& project, eEditOpenBehavi
         std::this_thread::sleep_for(std::chrono::milliseconds(1));
     }
     Leaving leaving;
-    dropProject();
+    Vector<UnwrittenEdit> lost; // told of on the log
+    dropProject(lost);
     return adoptProject(&wanted, leaving);
 }
 
 void edit_manager::exitProject() {
+    Vector<UnwrittenEdit> lost;
+    exitProject(lost);
+}
+
+void edit_manager::exitProject(Vector<UnwrittenEdit>& lost) {
     if (beginToLeave()) {
         const Leaving leaving;
-        dropProject();
+        dropProject(lost);
     }
 }
 

@@ -7,6 +7,7 @@
 #include "platform/services/log.h"
 #include "platform/services/timed_task.h"
 
+#include <cerrno>
 #include <chrono>
 #include <exception>
 #include <new>
@@ -22,6 +23,8 @@ public:
     Opening(const cookie& item, eEditOpenBehaviour behaviour);
 
     EditPtr run();
+    /// What was done; complete after `run`.
+    [[nodiscard]] const OpenReport& report() const { return m_report; }
     /// The project that the item was to be opened from is left meanwhile: there is no answer for another one.
     [[nodiscard]] bool isOver() const { return m_isOver; }
 
@@ -41,11 +44,15 @@ private:
     [[nodiscard]] bool replaceDamaged(int& counter);
     [[nodiscard]] bool moveAside();
     int restoreNewest();
-    void refuse(const String& reason);
-    void tell(const String& what) const;
+    /// Takes notice of why the file does not open, or what keeps it from being replaced, and logs it.
+    void complain(const Qx::Status& why);
+    void refuse(const Qx::Status& why);
+    void foundMissing();
     [[nodiscard]] bool isOfThisProject() const;
     [[nodiscard]] EditPtr cache(EditPtr edit);
     EditPtr succeed(EditPtr edit);
+    [[nodiscard]] EditPtr fromCache(const ManagerState::CachedEdit& entry);
+    EditPtr cancelled();
 
     cookie m_item;
     eEditOpenBehaviour m_behaviour;
@@ -58,6 +65,10 @@ private:
     Qx::FileInfo m_read;    ///< the file as it was before it was read last
     bool m_refused = false; ///< there may be a sound file or backup, but it could not be had here
     bool m_isOver = false;
+    OpenReport m_report;
+    Qx::Status m_fault;         ///< of the file that was read last
+    std::vector<int> m_backups; ///< the numbers of the undo backups before any was moved
+    size_t m_numRestored = 0;
 };
 
 int depthAndEpoch(unsigned& epoch, unsigned& generation) {
@@ -73,13 +84,47 @@ Opening::Opening(const cookie& item, eEditOpenBehaviour behaviour)
       m_undo(m_file, RevisionChain::Undo, depthAndEpoch(m_epoch, m_generation)),
       m_redo(m_file, RevisionChain::Redo, m_undo.depth()), m_writers(Qx::folderOf(m_file)) {}
 
-void Opening::tell(const String& what) const {
-    herc_printf("edit_manager::open( %s ) : %s\n", cookie_string(m_item).c_str(), what.c_str());
+void Opening::complain(const Qx::Status& why) {
+    m_fault = why;
+    if (m_report.status) {
+        m_report.status = why;
+    }
+    herc_printf("edit_manager::open( %s ) : %s\n", cookie_string(m_item).c_str(), why.reason().c_str());
 }
 
-void Opening::refuse(const String& reason) {
+void Opening::refuse(const Qx::Status& why) {
     m_refused = true;
-    tell(reason);
+    if (!m_report.status) {
+        m_report.recovery = why;
+    }
+    complain(why);
+}
+
+void Opening::foundMissing() {
+    m_report.wasMissing = true;
+    if (m_report.status) {
+        m_report.status = Qx::Status::failure(Qx::StatusCode::NotFound, m_file + " does not exist");
+    }
+}
+
+EditPtr Opening::fromCache(const ManagerState::CachedEdit& entry) {
+    if (entry.failure != nullptr) {
+        m_report = *entry.failure;
+    } else {
+        m_report.source = OpenReport::Source::Cache;
+    }
+    return entry.edit;
+}
+
+Qx::Status isBeingLeft() {
+    return Qx::Status::failure(Qx::StatusCode::Cancelled,
+                               "the project is being left, or the edits were closed; open a project first");
+}
+
+EditPtr Opening::cancelled() {
+    m_report = {};
+    m_report.status = isBeingLeft();
+    return {};
 }
 
 /// Under the lock: the file that was named when this began is that of the project whose edits are cached.
@@ -99,27 +144,35 @@ EditPtr Opening::run() {
         m_isOver = !isOfThisProject();
         const ManagerState::CachedEdit* const found = state.findCacheEntry(m_item);
         if (m_isOver) {
-            return {};
+            return cancelled();
         }
         if (found != nullptr && (found->edit.valid() || m_behaviour != eOpenNew)) {
             if (found->edit.valid() && found->edit->get_cookie() != m_item) {
                 herc_printf("edit_manager::open: handles do not match\n");
             }
-            return found->edit;
+            return fromCache(*found);
         }
     }
     herc_printf(5, "edit_manager::open(%s)\n", cookie_string(m_item).c_str());
 
     EditPtr edit;
     if (m_file.empty()) {
-        tell("no file can be named after it; set a project folder");
+        complain(Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                     "no file can be named after it; set a project folder"));
     } else if (m_behaviour == eOpenNew) {
         edit = makeNew();
     } else if (m_behaviour == eOpenExisting || m_behaviour == eOpenOrCreate) {
         edit = openFile();
     }
     m_writers.release();
-    return edit.valid() ? succeed(std::move(edit)) : cache({});
+    if (edit.valid()) {
+        return succeed(std::move(edit));
+    }
+    if (m_report.status) {
+        m_report.status =
+            Qx::Status::failure(Qx::StatusCode::BadArgument, "there is no such way to open an edit");
+    }
+    return cache({});
 }
 
 EditPtr Opening::makeNew() {
@@ -131,6 +184,7 @@ EditPtr Opening::makeNew() {
     }
     // Nothing was read: a file that is there is kept as a backup when the edit is written over it.
     m_read = {};
+    m_report.source = OpenReport::Source::Fresh;
     return edit;
 }
 
@@ -144,6 +198,7 @@ EditPtr Opening::openFile() {
         EditPtr edit;
         switch (read(edit)) {
         case Outcome::Sound:
+            m_report.source = m_report.backup != 0 ? OpenReport::Source::Backup : OpenReport::Source::File;
             return edit;
         case Outcome::Refused:
             return {};
@@ -158,22 +213,29 @@ EditPtr Opening::openFile() {
                 m_refused = true;
                 return {};
             case Search::NoneThere:
+                foundMissing();
                 return m_behaviour == eOpenOrCreate ? create() : EditPtr();
             case Search::Restored:
+                foundMissing();
+                break;
             case Search::FileIsThere:
                 break;
             }
             break;
         }
     }
-    refuse("its files are being moved all the time; try again");
+    refuse(Qx::Status::failure(Qx::StatusCode::Locked, "its files are being moved all the time; try again"));
     return {};
+}
+
+Qx::Status noMemory(const String& what) {
+    return Qx::Status::failure(Qx::StatusCode::Refused, what, ENOMEM);
 }
 
 Opening::Outcome Opening::read(EditPtr& edit) {
     const Qx::FileAnswer present = Qx::askFile(m_file);
     if (const Qx::FileError error = present.obstacle("open")) {
-        refuse(error.text());
+        refuse(error.status());
         return Outcome::Refused;
     }
     m_read = present.info();
@@ -189,14 +251,14 @@ Opening::Outcome Opening::read(EditPtr& edit) {
         if (result == TagBag::Missing) {
             return Outcome::Missing;
         }
-        tell(edit->lastFileError());
+        complain(edit->lastFileStatus());
         // What the system refuses (no permission, too many open files), and what a later version of this
         // program wrote, is not damaged: it stays where it is.
         m_refused = result == TagBag::NotOpened || result == TagBag::Newer;
     } catch (const std::bad_alloc&) {
-        refuse("there is not enough memory to read it");
+        refuse(noMemory("there is not enough memory to read it"));
     } catch (const std::exception& error) {
-        tell(String("reading failed: ") + error.what());
+        complain(Qx::Status::failure(Qx::StatusCode::Damaged, String("reading failed: ") + error.what()));
     }
     edit.invalidate();
     return m_refused ? Outcome::Refused : Outcome::Damaged;
@@ -209,28 +271,40 @@ EditPtr Opening::create() {
         const Qx::Status status = chain->exists(found);
         if (!status || found) {
             // Its file may not be there, but it is: the first write of a fresh one would be the end of it.
-            refuse(status
-                       ? "no edit was made, as there are backups of one; recover it from them, or delete them"
-                       : status.reason());
+            refuse(!status
+                       ? status
+                       : Qx::Status::failure(
+                             Qx::StatusCode::Refused,
+                             "no edit was made, as there are backups of one; recover it from them, or delete "
+                             "them"));
             return {};
         }
     }
     try {
         EditPtr edit(new Edit);
         if (edit->readFile(Qx::widen(m_file), eOpenOrCreate) == Edit::kReadOk) {
+            m_report.source = OpenReport::Source::Fresh;
             return edit;
         }
-        refuse(edit->lastFileError());
+        refuse(edit->lastFileStatus());
     } catch (const std::exception& error) {
-        refuse(String("no edit could be made: ") + error.what());
+        refuse(noMemory(String("no edit could be made: ") + error.what()));
     }
     return {};
 }
 
 int Opening::restoreNewest() {
+    if (m_numRestored == 0) {
+        m_backups = m_undo.numbers();
+    }
     int restored = 0;
     if (const Qx::Status status = m_undo.restoreNewest(restored); !status) {
-        refuse(status.reason());
+        refuse(status);
+    }
+    if (restored != 0) {
+        // Those behind it have moved up: it is the next of those that there were.
+        m_report.backup = m_numRestored < m_backups.size() ? m_backups[m_numRestored] : restored;
+        ++m_numRestored;
     }
     return restored;
 }
@@ -240,15 +314,15 @@ int Opening::restoreNewest() {
 Opening::Search Opening::restoreMissing() {
     bool hasBackups = false;
     if (const Qx::Status status = m_undo.exists(hasBackups); !status) {
-        refuse(status.reason());
+        refuse(status);
         return Search::NotKnown;
     }
     // Nothing is moved where no backup is, so nobody is waited for; but the file may have been on its way
     // between the two names.
-    bool isBusy = false;
-    const Qx::Status taken = m_writers.take(hasBackups, &isBusy);
+    const Qx::Status taken = m_writers.take(hasBackups);
+    const bool isBusy = taken.code() == Qx::StatusCode::Locked;
     if (!taken && hasBackups) {
-        refuse("nothing was looked for: " + taken.reason());
+        refuse(taken.retold("nothing was looked for: " + taken.reason()));
         return Search::NotKnown;
     }
     Search found = lookAgain();
@@ -257,7 +331,8 @@ Opening::Search Opening::restoreMissing() {
         return found;
     }
     if (m_behaviour != eOpenOrCreate) {
-        return Search::NotKnown; // others may be moving it: nothing is remembered
+        m_report.status = taken; // others may be moving it: nothing is remembered
+        return Search::NotKnown;
     }
     // A move takes an instant; what is not seen again and again is not there.
     constexpr int kLooks = 3;
@@ -272,7 +347,7 @@ Opening::Search Opening::restoreMissing() {
 Opening::Search Opening::lookAgain() {
     const Qx::FileAnswer present = Qx::askFile(m_file);
     if (const Qx::FileError error = present.obstacle("open")) {
-        refuse(error.text());
+        refuse(error.status());
         return Search::NotKnown;
     }
     if (present.isRegular()) {
@@ -280,7 +355,7 @@ Opening::Search Opening::lookAgain() {
     }
     bool hasBackups = false;
     if (const Qx::Status status = m_undo.exists(hasBackups); !status) {
-        refuse(status.reason());
+        refuse(status);
         return Search::NotKnown;
     }
     if (!hasBackups) {
@@ -305,7 +380,7 @@ bool Opening::replaceDamaged(int& counter) {
     bool hasBackups = counter != 0;
     if (!hasBackups) {
         if (const Qx::Status status = m_undo.exists(hasBackups); !status) {
-            refuse(status.reason());
+            refuse(status);
             return false;
         }
     }
@@ -328,8 +403,9 @@ bool Opening::replaceDamaged(int& counter) {
 /// writers' lock is held afterwards. False, and it is not, if another file is there meanwhile, or with
 /// `m_refused` if it could not be moved.
 bool Opening::moveAside() {
-    if (!takeWritersLock(m_writers)) {
+    if (Qx::Status taken = takeWritersLock(m_writers); !taken) {
         m_refused = true;
+        m_report.recovery = std::move(taken);
         return false;
     }
     if (Qx::isSameFile(m_read, Qx::askFile(m_file).info())) {
@@ -341,9 +417,10 @@ bool Opening::moveAside() {
         }
         // Before another file takes the name.
         if (status && (status = moves.finish())) {
+            m_report.setAside.push_back({name, m_fault});
             return true;
         }
-        refuse(status.reason());
+        refuse(status);
     }
     m_writers.release();
     return false;
@@ -358,10 +435,11 @@ EditPtr Opening::cache(EditPtr edit) {
     const ManagerState::Hold hold(state.lock);
     m_isOver = !isOfThisProject();
     if (m_isOver) {
-        return {};
+        return cancelled();
     }
     if (edit.valid() || !m_refused) {
-        state.put(m_item, edit, m_file, edit.valid() ? m_read : Qx::FileInfo());
+        state.put(m_item, edit, m_file, edit.valid() ? m_read : Qx::FileInfo(),
+                  edit.valid() ? nullptr : std::make_shared<const OpenReport>(m_report));
     }
     if (edit.valid()) {
         state.cachedAtLastOpen = state.cache.size();
@@ -379,6 +457,8 @@ EditPtr Opening::succeed(EditPtr edit) {
     }
     // Before others can find it, so that no change of theirs is taken for clean.
     edit->set_dirty(false);
+    m_report.status = {};
+    m_report.recovery = {};
     return cache(std::move(edit));
 }
 
@@ -395,46 +475,96 @@ void limitCache() {
     }
 }
 
+/// What the cache says of an item.
+struct CacheAnswer {
+    EditPtr edit;
+    std::shared_ptr<const OpenReport> failure;
+    bool isLeaving = false;
+};
+
 /// Answers from the cache. False if it does not know the item.
-bool findCached(const cookie& item, eEditOpenBehaviour behaviour, EditPtr& edit) {
+bool findCached(const cookie& item, eEditOpenBehaviour behaviour, CacheAnswer& answer) {
     ManagerState& state = managerState();
     const std::lock_guard hold(state.lookup);
     state.lastOpened = item;
     if (state.isLeaving.load(std::memory_order_relaxed)) {
+        answer.isLeaving = true;
         return true;
     }
     const ManagerState::CachedEdit* const found = state.findCacheEntry(item);
     const bool counts = found != nullptr && !found->leaving && (found->edit.valid() || behaviour != eOpenNew);
     if (counts) {
-        edit = found->edit;
+        answer.edit = found->edit;
+        if (!answer.edit.valid()) {
+            answer.failure = found->failure;
+        }
     }
     return counts;
+}
+
+/// What the cache answered, as a report.
+void reportCached(const CacheAnswer& answer, OpenReport& report) {
+    if (answer.isLeaving) {
+        report.status = isBeingLeft();
+    } else if (answer.failure != nullptr) {
+        report = *answer.failure;
+    } else {
+        report.source = OpenReport::Source::Cache;
+    }
+}
+
+/// Opens an edit. `report`, which may be null, is a fresh one.
+EditPtr openReported(const cookie& item, eEditOpenBehaviour behaviour, OpenReport* report) {
+    ManagerState& state = managerState();
+    // Another project may become the current one on the way.
+    constexpr int kMostProjects = 3;
+    for (int attempt = 0; attempt < kMostProjects && state.instance.load() != nullptr; ++attempt) {
+        if (state.projectGeneration.load() != Qx::currentProjectGeneration()) {
+            static_cast<void>(edit_manager::check_current_project(behaviour));
+        }
+        limitCache();
+        CacheAnswer cached;
+        if (findCached(item, behaviour, cached)) {
+            if (report != nullptr) {
+                reportCached(cached, *report);
+            }
+            return std::move(cached.edit);
+        }
+        Opening opening(item, behaviour);
+        EditPtr edit = opening.run();
+        if (!opening.isOver()) {
+            if (report != nullptr) {
+                *report = opening.report();
+            }
+            return edit;
+        }
+    }
+    if (report != nullptr) {
+        report->status = isBeingLeft();
+    }
+    return {};
+}
+
+/// True for an item of which there can be an edit.
+bool canBeOpened(const cookie& item) {
+    return !item.isBlack() && !isNoItem(item) && managerForOpening() != nullptr;
 }
 
 } // namespace
 
 EditPtr edit_manager::openEdit(const cookie& item, eEditOpenBehaviour behaviour) {
-    ManagerState& state = managerState();
-    if (item.isBlack() || isNoItem(item) || managerForOpening() == nullptr) {
-        return {};
+    return canBeOpened(item) ? openReported(item, behaviour, nullptr) : EditPtr();
+}
+
+EditPtr edit_manager::openEdit(const cookie& item, eEditOpenBehaviour behaviour, OpenReport& report) {
+    report = {};
+    if (canBeOpened(item)) {
+        return openReported(item, behaviour, &report);
     }
-    // Another project may become the current one on the way.
-    constexpr int kMostProjects = 3;
-    for (int attempt = 0; attempt < kMostProjects && state.instance.load() != nullptr; ++attempt) {
-        if (state.projectGeneration.load() != Qx::currentProjectGeneration()) {
-            static_cast<void>(check_current_project(behaviour));
-        }
-        limitCache();
-        EditPtr edit;
-        if (findCached(item, behaviour, edit)) {
-            return edit;
-        }
-        Opening opening(item, behaviour);
-        edit = opening.run();
-        if (!opening.isOver()) {
-            return edit;
-        }
-    }
+    report.status = item.isBlack() || isNoItem(item)
+                        ? Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                              item.asString() + " names nothing that can be opened")
+                        : isBeingLeft();
     return {};
 }
 

@@ -50,7 +50,11 @@ EditPtr readRevision(const String& path, bool isBackup, String& why, bool& refus
         if (isBackup) {
             std::vector<String> lost;
             const Qx::Status status = salvageEdit(path, edit, lost);
-            why = !status ? status.reason() : (lost.empty() ? String() : path + ": " + lost.front());
+            if (!status) {
+                why = status.reason();
+            } else if (!lost.empty()) {
+                why = path + ": " + lost.front();
+            }
             return why.empty() ? edit : EditPtr();
         }
         edit = EditPtr(new Edit);
@@ -133,7 +137,7 @@ bool refreshRecord(projdb& records, const cookie& item, projdb::Record& record) 
 Qx::Status listItems(std::set<cookie>& items) {
     std::vector<String> names;
     if (const Qx::FileError error = Qx::fileSystem().list(Qx::currentProject().folder(), names)) {
-        return Qx::Status::failure(error.text());
+        return error.status();
     }
     constexpr size_t kTextSize = 8;
     for (const String& name : names) {

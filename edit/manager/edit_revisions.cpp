@@ -254,7 +254,7 @@ void RevisionStep::moveFilesBack() {
     std::unique_ptr<ManagerState::CachedEdit> failed;
     const Qx::AccessScope<cookie> turn(state.queue, m_item);
     EditManagerLock writers(Qx::folderOf(m_from.file()));
-    const bool mayWrite = takeWritersLock(writers);
+    const bool mayWrite = takeWritersLock(writers).isOk();
     const ManagerState::Hold hold(state.lock);
     const Qx::FileAnswer present = Qx::askFile(m_from.file());
     if (!mayWrite || (!present.isMissing() && !Qx::isSameFile(present.info(), m_moved))) {

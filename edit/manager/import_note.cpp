@@ -98,7 +98,7 @@ Qx::Status writeImportNote(const String& folder, const std::vector<cookie>& edit
     if (!error) {
         error = file.commit();
     }
-    return asStatus(error);
+    return error.status();
 }
 
 Qx::Status unfinishedImports(const String& folder, std::vector<UnfinishedImport>& imports) {

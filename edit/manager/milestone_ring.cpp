@@ -55,7 +55,7 @@ Qx::Status MilestoneRing::makeMilestoneFolder(const cookie& edit) {
         return Qx::Status::failure("there is no folder for milestones of " + edit.asString());
     }
     const Qx::FileError error = Qx::makeFolders(folder);
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+    return error.status();
 }
 
 Qx::Status MilestoneRing::makeMilestoneBackup(const EditPtr& edit, const String& file) const {
@@ -70,5 +70,5 @@ Qx::Status MilestoneRing::makeMilestoneBackup(const EditPtr& edit, const String&
     const String name = item.asString() + "." + std::to_string(slot(edit->getModificationCount()));
     const Qx::FileError error =
         Qx::copyFile(file, Qx::joinPath(getMilestoneFolder(invalid_cookie, item), name));
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+    return error.status();
 }

@@ -11,10 +11,6 @@
 
 namespace {
 
-Qx::Status asStatus(const Qx::FileError& error) {
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
-}
-
 /// More than any folder holds; leaves room for the numbers behind it.
 constexpr int kGreatestDepth = 1'000'000'000;
 
@@ -51,7 +47,7 @@ Qx::Status RevisionChain::findFrom(int first, std::vector<int>& numbers, size_t 
          !m_file.empty() && number <= m_depth && missing < kLongestHole && numbers.size() < limit; ++number) {
         const Qx::FileAnswer answer = ask(number);
         if (const Qx::FileError error = answer.obstacle()) {
-            return asStatus(error);
+            return error.status();
         }
         missing = answer.isRegular() ? 0 : missing + 1;
         if (answer.isRegular()) {
@@ -70,7 +66,7 @@ Qx::Status RevisionChain::exists(bool& found) const {
     }
     const Qx::FileAnswer behind = ask(m_depth + 1);
     found = behind.isRegular();
-    return asStatus(behind.obstacle());
+    return behind.obstacle().status();
 }
 
 std::vector<String> RevisionChain::namesInFolder() const {
@@ -135,7 +131,7 @@ Qx::Status RevisionChain::rotate(Qx::FileMoves& moves) const {
         int free = m_depth;
         while (!ask(++free).isMissing()) {
             if (const Qx::FileError error = ask(free).obstacle()) {
-                return asStatus(error);
+                return error.status();
             }
         }
         if (Qx::Status status = moves.move(path(m_depth), path(free)); !status) {
@@ -151,10 +147,11 @@ Qx::Status RevisionChain::rotate(Qx::FileMoves& moves) const {
 Qx::Status RevisionChain::push(Qx::FileMoves& moves) {
     const Qx::FileAnswer present = Qx::askFile(m_file);
     if (const Qx::FileError error = present.obstacle("keep")) {
-        return asStatus(error);
+        return error.status();
     }
     if (present.isMissing()) {
-        return Qx::Status::failure("there is no file " + m_file + " to keep as a backup");
+        return Qx::Status::failure(Qx::StatusCode::NotFound,
+                                   "there is no file " + m_file + " to keep as a backup");
     }
     Qx::Status status = rotate(moves);
     return status ? moves.move(m_file, path(1)) : status;
@@ -237,15 +234,15 @@ Qx::Status RevisionChain::deleteTail(int keep) {
             break;
         }
         if (error) {
-            return asStatus(error);
+            return error.status();
         }
     }
     return any ? syncFolder() : Qx::Status();
 }
 
 Qx::Status RevisionChain::syncFolder() const {
-    return asStatus(
-        Qx::retryInterrupted([this] { return Qx::fileSystem().syncFolder(Qx::folderOf(m_file)); }));
+    return Qx::retryInterrupted([this] { return Qx::fileSystem().syncFolder(Qx::folderOf(m_file)); })
+        .status();
 }
 
 EditFileState examineEditFile(const String& path, String& why) {
@@ -279,7 +276,7 @@ Qx::Status findCorruptName(const String& file, String& name) {
             return {};
         }
         if (found.isUnknown()) {
-            return asStatus(found.obstacle());
+            return found.obstacle().status();
         }
     }
 }

@@ -462,7 +462,9 @@ public:
     ReadFileRC read_file(const cookie& item, eEditOpenBehaviour behaviour);
     ReadFileRC readFile(const WString& path, eEditOpenBehaviour behaviour);
     /// Why the last read or write failed: one sentence with the path, empty after a success.
-    [[nodiscard]] const String& lastFileError() const { return m_fileError; }
+    [[nodiscard]] const String& lastFileError() const { return m_fileStatus.reason(); }
+    /// The same with its kind.
+    [[nodiscard]] const Qx::Status& lastFileStatus() const { return m_fileStatus; }
     /// Writes the edit to the file of its cookie, or to a path that is named after it. True only when the
     /// file was stored; its marks of change are cleared then. False, with the old file whole and the edit as
     /// dirty as before, when nothing is to be written, a write is running, the edit could not be read again
@@ -706,6 +708,6 @@ private:
     mutable std::atomic<ChannelGroupList*> m_groups{nullptr};
     mutable std::atomic<uint64_t> m_groupsFoundAt{kNeverFound}; ///< the store's departures at the time
     ValServer<EditModification> m_changes;
-    String m_fileError;
+    Qx::Status m_fileStatus;
     mutable criticalSection m_section;
 };

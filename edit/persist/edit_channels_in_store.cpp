@@ -51,9 +51,10 @@ static Qx::Status findKind(const configb& header, int number, EditFile::LoadedCe
         return {};
     }
     if (subType != Edit::subTypeText(Edit_Chan_SubType::NONE) || (type != VideoChan && type != AudioChan)) {
-        return Qx::Status::failure("object " + object +
-                                   " is the content of no channel that an edit holds (\"" + text + "\", \"" +
-                                   subType + "\")");
+        return Qx::Status::failure(Qx::StatusCode::Damaged,
+                                   "object " + object +
+                                       " is the content of no channel that an edit holds (\"" + text +
+                                       "\", \"" + subType + "\")");
     }
     loaded.type = {type, Edit_Chan_SubType::NONE};
     return {};
@@ -65,7 +66,8 @@ static Qx::Status loadCel(TagBag& store, const configb& header, int number, Edit
     if (!store.readObject(object, *content)) {
         const String kind = header.getString(EditKeys::numbered(EditKeys::kCelKind, number));
         loaded.type.type = kind.empty() ? NoChan : Edit::edit_chan_type_from_name(kind.front());
-        return Qx::Status::failure("object " + object + " is not a cel that reads (" + whyNot(store) + ")");
+        return Qx::Status::failure(Qx::StatusCode::Damaged,
+                                   "object " + object + " is not a cel that reads (" + whyNot(store) + ")");
     }
     loaded.content = std::move(content);
     return findKind(header, number, loaded);
@@ -172,7 +174,7 @@ Qx::Status EditFile::setupChannels(Edit& edit, std::vector<LoadedCel>& cels, std
         }
         channel.id = edit.setupEditChannel(loaded.type, loaded.content);
         if (!channel.id.valid()) {
-            return Qx::Status::failure("channel " + name + " could not be added");
+            return Qx::Status::failure(Qx::StatusCode::Damaged, "channel " + name + " could not be added");
         }
         if (channel.id != wanted) {
             herc_printf(
@@ -260,10 +262,10 @@ Qx::Status EditFile::readCels(Edit& edit, Salvaging* salvaging) {
                                          [](const LoadedLevels& loaded) { return loaded.levels.valid(); });
     if (const String message = limitMessage(audio, static_cast<int>(numLevels), video); !message.empty()) {
         LogBoth("%s\n", message.c_str());
-        return Qx::Status::failure(message);
+        return Qx::Status::failure(Qx::StatusCode::Damaged, message);
     }
     if (std::none_of(cels.begin(), cels.end(), [](const LoadedCel& cel) { return cel.content != nullptr; })) {
-        return Qx::Status::failure("it has no channels");
+        return Qx::Status::failure(Qx::StatusCode::Damaged, "it has no channels");
     }
     // The cues' channel numbers are those of the whole file: they do not move as its channels are added.
     const cue_list cues = edit.m_cues;

@@ -99,10 +99,10 @@ bool Edit::readFromLegacyFile(const WString& path) {
     if (!status) {
         EditFile::reset(*this);
         m_bad = true;
-        return EditFile::fail(*this, status.reason());
+        return EditFile::fail(*this, status);
     }
     m_bad = false;
-    m_fileError.clear();
+    m_fileStatus = {};
     return true;
 }
 
@@ -113,7 +113,7 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
     }
     const String refused = "cannot read " + path + ": ";
     if (file.numLines() == 0) {
-        return Qx::Status::failure(refused + "it is empty; export the edit again");
+        return Qx::Status::failure(Qx::StatusCode::Damaged, refused + "it is empty; export the edit again");
     }
     const Quiet quiet(edit);
     reset(edit);
@@ -122,7 +122,8 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
     putFrameRateBack(file);
     unsigned after = 0;
     if (Qx::Status header = edit.m_header.buildFrom(file, 0, after); !header) {
-        return Qx::Status::failure(refused + "its header does not read, " + header.reason());
+        return Qx::Status::failure(Qx::StatusCode::Damaged,
+                                   refused + "its header does not read, " + header.reason());
     }
     edit.clear_cache_flags();
     edit.redetermineLogType();
@@ -133,7 +134,8 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
     Qx::Status status;
     if (!named.known()) {
         status =
-            Qx::Status::failure(refused + "its tvtype names no television standard; write one such as pal "
+            Qx::Status::failure(Qx::StatusCode::Damaged,
+                                refused + "its tvtype names no television standard; write one such as pal "
                                           "in that line");
     } else {
         edit.readED2Cues(file);
@@ -145,9 +147,9 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
         edit.m_cues = cues;
         renumber(edit, sections);
         if (!status) {
-            status = Qx::Status::failure(refused + status.reason());
+            status = status.retold(refused + status.reason());
         } else if (edit.getNumChans() == 0) {
-            status = Qx::Status::failure(refused + "it has no channels");
+            status = Qx::Status::failure(Qx::StatusCode::Damaged, refused + "it has no channels");
         } else {
             LegacyUpgrades::updateLegacyFrameRate(edit, named);
             edit.set_cookie(cookie(std::string_view(Qx::withoutExtension(Qx::fileNameOf(path)))));
@@ -204,7 +206,7 @@ Qx::Status EditFile::readLegacyChannels(Edit& edit, const TextFile& file,
             return built;
         }
         if (Qx::Status added = addLegacyChannel(edit, type, fields, std::move(content), section.id); !added) {
-            return Qx::Status::failure(atLine(found, added.reason()));
+            return added.retold(atLine(found, added.reason()));
         }
         section.isAudio = type == AudioChan;
     }
@@ -215,11 +217,12 @@ Qx::Status EditFile::addLegacyChannel(Edit& edit, Edit_Chan_Type type, const std
                                       std::unique_ptr<cel> content, IdStamp& added) {
     if (type == VideoChan &&
         edit.getNumChans(VideoChan, Edit_Chan_SubType::NONE) >= static_cast<int>(kMaxVideoChans)) {
-        return Qx::Status::failure("too many video channels; remove that section");
+        return Qx::Status::failure(Qx::StatusCode::Damaged, "too many video channels; remove that section");
     }
     const int index = edit.addChan(type, content.get(), false);
     if (index == NO_CHAN) {
-        return Qx::Status::failure("the channel cannot be added; remove that section");
+        return Qx::Status::failure(Qx::StatusCode::Damaged,
+                                   "the channel cannot be added; remove that section");
     }
     const String material = content.release()->editChannelMaterialInfo();
     if (fields.size() == kFieldsWithStamp) {

@@ -78,14 +78,16 @@ bool Edit::writeToLegacyFile(const WString& path) {
     writeED2Cues(file);
     const unsigned written = writeED2Cels(file, standard);
     if (written == 0 && m_cookie != Qx::currentProject().project) {
-        return EditFile::fail(*this, "cannot write " + name + ": edit " + get_cookie_str() +
-                                         " has no video channel, which a legacy text needs");
+        return EditFile::fail(*this,
+                              Qx::Status::failure(Qx::StatusCode::Unsupported,
+                                                  "cannot write " + name + ": edit " + get_cookie_str() +
+                                                      " has no video channel, which a legacy text needs"));
     }
     const Qx::Status status = file.save(name);
     if (!status) {
-        return EditFile::fail(*this, status.reason());
+        return EditFile::fail(*this, status);
     }
-    m_fileError.clear();
+    m_fileStatus = {};
     return true;
 }
 

@@ -63,8 +63,10 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
         m_loading = true;
         // The reference stays held and the edit stays flagged as loading: whoever asked for such a name must
         // not find the edit usable or see it go.
-        EditFile::fail(*this, "cannot read an edit from \"" + file +
-                                  "\": its name is not that of an item; rename the file to its cookie");
+        EditFile::fail(*this, Qx::Status::failure(
+                                  Qx::StatusCode::BadArgument,
+                                  "cannot read an edit from \"" + file +
+                                      "\": its name is not that of an item; rename the file to its cookie"));
         return kReadFailed;
     }
     const Reading reading(*this);
@@ -89,7 +91,9 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
                 throw; // says nothing of the file
             } catch (const std::exception& error) {
                 m_bad = true;
-                EditFile::fail(*this, file + " was read, but bringing it up to date failed: " + error.what());
+                EditFile::fail(*this,
+                               Qx::Status::failure(
+                                   file + " was read, but bringing it up to date failed: " + error.what()));
             }
         }
         break;
@@ -103,14 +107,14 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
     }
     default:
         herc_printf("Edit::readFile( %s ) : Failed to open store\n", cookie_string(item).c_str());
-        EditFile::fail(*this, m_store.openError());
+        EditFile::fail(*this, m_store.openStatus());
         EditFile::reset(*this);
         m_bad = true;
         break;
     }
     if (result == kReadOk) {
         m_bad = false;
-        m_fileError.clear();
+        m_fileStatus = {};
     }
     return result;
 }
@@ -135,8 +139,8 @@ bool Edit::retrieve() {
         EditFile::reset(*this);
         m_store.close();
         m_bad = true;
-        return EditFile::fail(*this, "cannot read " + path + ": " + status.reason() +
-                                         "; restore a backup of the edit");
+        return EditFile::fail(*this, status.retold("cannot read " + path + ": " + status.reason() +
+                                                   "; restore a backup of the edit"));
     }
     EditFile::markWritten(*this);
     return true;
@@ -150,8 +154,8 @@ Qx::Status EditFile::readHeader(Edit& edit) {
     }
     if (!read) {
         const String why = edit.m_store.objectError();
-        return Qx::Status::failure("it has no header that reads" +
-                                   (why.empty() ? String() : " (" + why + ")"));
+        return Qx::Status::failure(Qx::StatusCode::Damaged, "it has no header that reads" +
+                                                                (why.empty() ? String() : " (" + why + ")"));
     }
     edit.m_header = header.header();
     edit.clear_cache_flags();

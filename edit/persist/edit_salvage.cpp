@@ -186,13 +186,14 @@ static Qx::Status openDamaged(TagBag& store, const String& path, EditFile::Salva
         salvaging.setUnsound(objects);
         return {};
     }
-    const String why = store.openError();
     salvaging.setRefused(result == TagBag::NotOpened || result == TagBag::Newer);
+    const Qx::Status damage = store.openStatus();
     if (result != TagBag::Damaged || !salvaging.mayScan()) {
-        return Qx::Status::failure(why);
+        return damage;
     }
+    const String& why = damage.reason();
     if (store.openScanning(path, labelOf, objects) != TagBag::Opened) {
-        return Qx::Status::failure(why + "; no object could be found in it either");
+        return damage.retold(why + "; no object could be found in it either");
     }
     salvaging.lose("the table of the objects: " + why);
     for (const StoredObjectInfo& object : objects) {
@@ -298,7 +299,7 @@ bool verifyEditFile(const String& path, std::vector<String>& faults) {
         const bool known = name == EditKeys::kCues || name == EditHeaderProxy::EditHeaderId ||
                            name.ends_with(EditKeys::kUnread);
         if (!known && store.openObject(name) == nullptr &&
-            store.objectError().find("does not know") == String::npos) {
+            store.objectStatus().code() != Qx::StatusCode::Unsupported) {
             faults.push_back(store.objectError());
         }
     }

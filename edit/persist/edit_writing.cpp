@@ -27,8 +27,8 @@ void removeNumbered(configb& header, const char* name, int from) {
 
 } // namespace EditKeys
 
-bool EditFile::fail(Edit& edit, String reason) {
-    edit.m_fileError = std::move(reason);
+bool EditFile::fail(Edit& edit, Qx::Status why) {
+    edit.m_fileStatus = std::move(why);
     return false;
 }
 
@@ -38,11 +38,14 @@ bool Edit::write_file() {
 
 bool Edit::write_file(const WString& path) {
     if (m_writing) {
-        return EditFile::fail(*this, get_cookie_str() + " is being written already");
+        return EditFile::fail(*this, Qx::Status::failure(Qx::StatusCode::Locked,
+                                                         get_cookie_str() + " is being written already"));
     }
     if (!needsToBeWritten()) {
-        return EditFile::fail(*this, get_cookie_str() +
-                                         " needs no writing: it is unchanged, read-only or temporary");
+        return EditFile::fail(
+            *this, Qx::Status::failure(Qx::StatusCode::ReadOnly,
+                                       get_cookie_str() +
+                                           " needs no writing: it is unchanged, read-only or temporary"));
     }
     bool stored = false;
     try {
@@ -74,30 +77,36 @@ bool Edit::writeToFile(const WString& path, QxEditFileType type) {
     case kObjectStoreFile:
         // There is nothing to do for the file that the edit is from.
         if (!isDirty(true) && !m_bad && m_store.isOpen() && m_store.path() == Qx::narrow(path)) {
-            m_fileError.clear();
+            m_fileStatus = {};
             return true;
         }
         return write_file(path);
     case kLegacyTextFile:
         return writeToLegacyFile(path);
     default:
-        return EditFile::fail(*this, "cannot write " + Qx::narrow(path) +
-                                         ": an edit is written as an object store or as legacy text");
+        return EditFile::fail(
+            *this, Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                       "cannot write " + Qx::narrow(path) +
+                                           ": an edit is written as an object store or as legacy text"));
     }
 }
 
 bool Edit::store(const WString& path) {
     if (m_cookie.type() == Cookie_Type::Transient) {
-        return EditFile::fail(*this, get_cookie_str() + " is a transient edit, which is never stored");
+        return EditFile::fail(
+            *this, Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                       get_cookie_str() + " is a transient edit, which is never stored"));
     }
     if (isDirty(true)) {
         const EditFile::Quiet quiet(*this);
         setModificationDetails();
     }
     if (path.empty()) {
-        return EditFile::fail(*this,
-                              "cannot write edit " + get_cookie_str() +
-                                  ": no file name can be formed for it; give it a cookie of a project");
+        return EditFile::fail(
+            *this,
+            Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                "cannot write edit " + get_cookie_str() +
+                                    ": no file name can be formed for it; give it a cookie of a project"));
     }
     const String file = Qx::narrow(path);
     Qx::Status status = EditFile::checkStorable(*this);
@@ -105,7 +114,7 @@ bool Edit::store(const WString& path) {
         status = EditFile::openStore(*this, file);
     }
     if (!status) {
-        return EditFile::fail(*this, "cannot write " + file + ": " + status.reason());
+        return EditFile::fail(*this, status.retold("cannot write " + file + ": " + status.reason()));
     }
     {
         const EditFile::Quiet quiet(*this);
@@ -128,10 +137,10 @@ bool Edit::store(const WString& path) {
         }
     }
     if (!status) {
-        return EditFile::fail(*this, status.reason());
+        return EditFile::fail(*this, status);
     }
     EditFile::markWritten(*this);
-    m_fileError.clear();
+    m_fileStatus = {};
     return true;
 }
 
@@ -151,12 +160,15 @@ Qx::Status EditFile::checkStorable(const Edit& edit) {
     };
     for (const auto& [count, limit, kind] : limits) {
         if (count > static_cast<int>(limit)) {
-            return Qx::Status::failure(String::format(
-                "the edit has %d %s channels and a file holds %u; remove some", count, kind, limit));
+            return Qx::Status::failure(
+                Qx::StatusCode::Unsupported,
+                String::format("the edit has %d %s channels and a file holds %u; remove some", count, kind,
+                               limit));
         }
     }
     if (edit.getNumChans(AnyChan) == 0) {
-        return Qx::Status::failure("the edit has no channels and could not be read again; add one");
+        return Qx::Status::failure(Qx::StatusCode::Unsupported,
+                                   "the edit has no channels and could not be read again; add one");
     }
     return {};
 }
@@ -168,8 +180,9 @@ Qx::Status EditFile::openStore(Edit& edit, const String& path) {
     const String extension = Qx::extensionOf(name);
     if (!edit.m_cookie.isStorable() || Qx::withoutExtension(name) != edit.get_cookie_str()) {
         return Qx::Status::failure(
+            Qx::StatusCode::BadArgument,
             "the file of edit " + edit.get_cookie_str() +
-            " must be named after it; choose that name or give the edit another cookie");
+                " must be named after it; choose that name or give the edit another cookie");
     }
     if (store.isOpen()) {
         store.setId(edit.m_cookie);
@@ -190,7 +203,7 @@ Qx::Status EditFile::openStore(Edit& edit, const String& path) {
     }
     edit.m_storedCels.reset();
     if (result != TagBag::NewStore && result != TagBag::Opened) {
-        return Qx::Status::failure(store.openError());
+        return store.openStatus();
     }
     return {};
 }

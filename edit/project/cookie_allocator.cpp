@@ -66,7 +66,7 @@ Qx::Status listNamed(const String& folder, Numbers& named) {
     for (const bool isMilestones : {false, true}) {
         const String place = isMilestones ? Qx::joinPath(folder, kMilestonesFolder) : folder;
         if (auto error = addNamed(place, isMilestones, named)) {
-            return Qx::Status::failure(error.text());
+            return error.status();
         }
     }
     sortNumbers(named);
@@ -86,6 +86,7 @@ Qx::Status choose(const String& folder, unsigned count, const Numbers& taken, Ch
     for (; choice.chosen.size() < count; ++choice.next) {
         if (choice.next > kLastEditNumber) {
             return Qx::Status::failure(
+                Qx::StatusCode::Full,
                 folder + ": the numbers of the project's edits are used up; go on in a new project");
         }
         if (passed != taken.end() && *passed == choice.next) {
@@ -112,7 +113,8 @@ CookieAllocator::CookieAllocator(String projectFolder) : m_folder(std::move(proj
 Qx::Status CookieAllocator::allocate(unsigned count, std::vector<cookie>& out,
                                      std::span<const cookie> taken) {
     if (m_folder.empty()) {
-        return Qx::Status::failure("there is no project folder to number edits in; open a project first");
+        return Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                   "there is no project folder to number edits in; open a project first");
     }
     if (count == 0 && taken.empty()) {
         return {};

@@ -142,7 +142,7 @@ Records& records() {
 }
 
 Qx::Status noItem() {
-    return Qx::Status::failure("the invalid cookie has no owner or permissions");
+    return Qx::Status::failure(Qx::StatusCode::BadArgument, "the invalid cookie has no owner or permissions");
 }
 
 } // namespace
@@ -172,7 +172,8 @@ Qx::Status PermissionsManager::setOwner(const cookie& item, const String& user, 
         return noItem();
     }
     if (!Qx::isUtf8(user)) {
-        return Qx::Status::failure("the owner of " + item.asString() + " is not UTF-8 text");
+        return Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                   "the owner of " + item.asString() + " is not UTF-8 text");
     }
     const String key = keyFor(kOwnerPrefix, item);
     const std::lock_guard hold(records().mutex);

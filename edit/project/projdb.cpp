@@ -27,7 +27,7 @@ projdb::Record recordOf(const std::vector<String>& fields) {
 /// Moves a damaged file out of the way, and what the table keeps beside it.
 Qx::Status setAside(const String& path) {
     if (const Qx::FileError error = Qx::fileSystem().rename(path, path + ".DAMAGED")) {
-        return Qx::Status::failure(error.text());
+        return error.status();
     }
     for (const char* const beside : {"-wal", "-shm", "-journal"}) {
         const Qx::FileAnswer found = Qx::askFile(path + beside);
@@ -36,7 +36,7 @@ Qx::Status setAside(const String& path) {
             error = Qx::fileSystem().remove(path + beside);
         }
         if (error) {
-            return Qx::Status::failure(error.text());
+            return error.status();
         }
     }
     return {};

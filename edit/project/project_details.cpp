@@ -19,18 +19,21 @@ constexpr const char* kMediumKey = "DEFAULT_MEDIUM";
 
 Qx::Status ProjectDetails::check() const {
     if (!Qx::isUtf8(name)) {
-        return Qx::Status::failure("the project's name is not UTF-8 text");
+        return Qx::Status::failure(Qx::StatusCode::BadArgument, "the project's name is not UTF-8 text");
     }
     const Qx::FrameRate rate(frameRateCode);
     if (!rate.valid()) {
-        return Qx::Status::failure(String::format("%d is not the code of a frame rate", frameRateCode));
+        return Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                   String::format("%d is not the code of a frame rate", frameRateCode));
     }
     if (dropFrame && !rate.hasDropFrame()) {
-        return Qx::Status::failure("there is no drop frame at " + rate.asString() +
-                                   " frames a second; use 29.97 or 59.94, or no drop frame");
+        return Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                   "there is no drop frame at " + rate.asString() +
+                                       " frames a second; use 29.97 or 59.94, or no drop frame");
     }
     if (defaultEditMedium < 0) {
-        return Qx::Status::failure(String::format("%d is not the code of a medium", defaultEditMedium));
+        return Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                   String::format("%d is not the code of a medium", defaultEditMedium));
     }
     return {};
 }
@@ -45,7 +48,7 @@ Qx::Status ProjectDetails::takeFrom(const configb& settings, const String& path)
         return status;
     }
     if (auto status = read.check(); !status) {
-        return Qx::Status::failure(path + ": " + status.reason());
+        return Qx::Status::failure(Qx::StatusCode::Damaged, path + ": " + status.reason());
     }
     *this = read;
     return {};
@@ -65,10 +68,11 @@ void ProjectDetails::giveTo(configb& settings) const {
 Qx::Status ProjectDetails::openOrCreate(const String& rootFolder, const cookie& project,
                                         const ProjectDetails& defaultsForNew, ProjectDetails& out) {
     if (rootFolder.empty()) {
-        return Qx::Status::failure("no folder is given for the projects");
+        return Qx::Status::failure(Qx::StatusCode::BadArgument, "no folder is given for the projects");
     }
     if (project.type() != Cookie_Type::Project || !project.isStorable()) {
-        return Qx::Status::failure(project.asString() + " does not name a project (as P0001000 does)");
+        return Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                   project.asString() + " does not name a project (as P0001000 does)");
     }
     ProjectDetails details = defaultsForNew;
     details.m_rootFolder = rootFolder;
@@ -92,7 +96,7 @@ Qx::Status ProjectDetails::openOrCreate(const String& rootFolder, const cookie& 
         return status;
     }
     if (auto error = Qx::makeFolders(details.folder())) {
-        return Qx::Status::failure(error.text());
+        return error.status();
     }
     auto status = details.save();
     if (status) {
@@ -103,7 +107,8 @@ Qx::Status ProjectDetails::openOrCreate(const String& rootFolder, const cookie& 
 
 Qx::Status ProjectDetails::save() {
     if (m_rootFolder.empty()) {
-        return Qx::Status::failure("the project was not opened, so there is no file to save its settings in");
+        return Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                   "the project was not opened, so there is no file to save its settings in");
     }
     if (auto status = check(); !status) {
         return status;

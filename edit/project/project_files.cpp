@@ -21,7 +21,7 @@ Status readStore(const String& path, configb& store, bool& found) {
     found = false;
     const FileAnswer present = askFile(path);
     if (auto error = present.obstacle("read")) {
-        return Status::failure(error.text());
+        return error.status();
     }
     if (present.isMissing()) {
         return {};
@@ -32,7 +32,7 @@ Status readStore(const String& path, configb& store, bool& found) {
     }
     unsigned after = 0;
     if (auto built = store.buildFrom(file, 0, after); !built) {
-        return Status::failure(path + ": " + built.reason());
+        return built.retold(path + ": " + built.reason());
     }
     found = true;
     return {};
@@ -48,9 +48,11 @@ Status writeStore(const String& path, const configb& store) {
 Status readNextEditNumber(const configb& settings, const String& path, int& number) {
     const int next = settings.getInt(kNextEditKey, settings.contains(kNextEditKey) ? 0 : 1);
     if (next < 1 || next > kLastEditNumber + 1) {
-        return Status::failure(String::format(
-            "%s: %s must be a whole number from 1 to %d; set it above every edit of the project",
-            path.c_str(), kNextEditKey, kLastEditNumber + 1));
+        return Status::failure(
+            StatusCode::Damaged,
+            String::format(
+                "%s: %s must be a whole number from 1 to %d; set it above every edit of the project",
+                path.c_str(), kNextEditKey, kLastEditNumber + 1));
     }
     number = next;
     return {};
@@ -82,9 +84,11 @@ Status readTakenNumbers(const configb& settings, const String& path, std::vector
     for (std::string_view rest(text); !rest.empty();) {
         const size_t end = rest.find(' ');
         if (!appendRange(rest.substr(0, end), read)) {
-            return Status::failure(path + ": " + kTakenEditsKey +
-                                   " must be numbers of edits and ranges of them in ascending order, such "
-                                   "as \"12 15-17\"; correct it");
+            return Status::failure(
+                StatusCode::Damaged,
+                path + ": " + kTakenEditsKey +
+                    " must be numbers of edits and ranges of them in ascending order, such "
+                    "as \"12 15-17\"; correct it");
         }
         rest = end == std::string_view::npos ? std::string_view() : rest.substr(end + 1);
     }

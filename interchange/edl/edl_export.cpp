@@ -520,7 +520,7 @@ Qx::Status exportEdlFile(const Edit& edit, const EdlExportOptions& options, cons
     if (!error) {
         error = file.commit();
     }
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+    return error.status();
 }
 
 } // namespace interchange

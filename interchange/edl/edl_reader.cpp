@@ -50,7 +50,7 @@ Qx::Status readEdlFile(const String& path, Qx::FrameRate rate, EdlList& list, Lo
                                        ": larger than 64 MiB, which no edit list is; check that this is "
                                        "the right file");
         }
-        return Qx::Status::failure(error.text());
+        return error.status();
     }
     return readEdl(text, rate, list, report);
 }
@@ -231,7 +231,7 @@ Qx::Status EdlReading::readTime(std::string_view text, Qx::TimecodeFields& field
                                                 " has more than nine digits; correct it");
     }
     if (Qx::Status status = Qx::parseTimecode(text, m_list.rate, fields); !status) {
-        const bool frame = status.reason().starts_with("frame");
+        const bool frame = status.code() == Qx::StatusCode::Unsupported;
         return failure(m_line, status.reason() + (frame ? "; give the frame rate that the list was made at"
                                                         : "; correct it"));
     }

@@ -103,7 +103,8 @@ Status readFields(std::string_view text, TimecodeFields& fields) {
         }
     }
     if (!good || at != text.size()) {
-        return Status::failure(quoted(text) + " is not a timecode of the form hh:mm:ss:ff");
+        return Status::failure(StatusCode::BadArgument,
+                               quoted(text) + " is not a timecode of the form hh:mm:ss:ff");
     }
     return {};
 }
@@ -133,8 +134,8 @@ Status parseTimecode(std::string_view text, FrameRate rate, TimecodeFields& fiel
     if (Status status = readFields(text, read); !status) {
         return status;
     }
-    const auto outOfRange = [text](const String& what) {
-        return Status::failure(what + " in timecode " + quoted(text));
+    const auto outOfRange = [text](const String& what, StatusCode code = StatusCode::BadArgument) {
+        return Status::failure(code, what + " in timecode " + quoted(text));
     };
     if (read.hours > 23) {
         return outOfRange(String::format("hour %d above 23", read.hours));
@@ -147,7 +148,8 @@ Status parseTimecode(std::string_view text, FrameRate rate, TimecodeFields& fiel
     }
     if (read.frames >= rate.nominal()) {
         return outOfRange(String::format("frame %d at %s frames a second", read.frames,
-                                         rate.valid() ? rate.asString().c_str() : "an unknown number of"));
+                                         rate.valid() ? rate.asString().c_str() : "an unknown number of"),
+                          StatusCode::Unsupported);
     }
     fields = read;
     return {};
@@ -162,7 +164,8 @@ Status parseDuration(std::string_view text, FrameRate rate, bool dropFrame, int6
     int count = 0;
     if (hours.size() == label.size() || hours.starts_with('-') || !textToInt(hours, count) ||
         count > mostHours) {
-        return Status::failure(quoted(text) + " is not a length of the form hh:mm:ss:ff");
+        return Status::failure(StatusCode::BadArgument,
+                               quoted(text) + " is not a length of the form hh:mm:ss:ff");
     }
     if (Status status = parseTimecode("00" + String(label.substr(hours.size())), rate, fields); !status) {
         return status;

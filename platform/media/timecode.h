@@ -24,7 +24,8 @@ struct TimecodeFields {
 };
 
 /// Reads "hh:mm:ss:ff" (also with ';', ',' and '.' as separators). A failure names what is wrong with the
-/// text: its form, or a field out of range for the rate ("frame 25 at 25 frames a second").
+/// text: its form, or a field out of range for the rate ("frame 25 at 25 frames a second"), which alone is of
+/// kind `Unsupported`: another rate may have that frame.
 QM_API Status parseTimecode(std::string_view text, FrameRate rate, TimecodeFields& fields);
 
 /// Reads what `durationText` writes, in which the hours have any number of digits and a '-' may stand in

@@ -59,28 +59,23 @@ FileLock::~FileLock() {
     release();
 }
 
-Status FileLock::take(bool wait, bool* isBusy) {
-    if (isBusy != nullptr) {
-        *isBusy = false;
-    }
+Status FileLock::take(bool wait) {
     if (m_file) {
         return {};
     }
     std::unique_ptr<OpenFile> file;
     if (auto error = openLockFile(m_path, file)) {
-        return Status::failure(error.text());
+        return error.status();
     }
     bool taken = false;
     if (auto error = retryInterrupted([&] { return file->lock(wait, taken); })) {
-        return Status::failure(error.text());
+        return error.status();
     }
     if (!taken) {
-        if (isBusy != nullptr) {
-            *isBusy = true;
-        }
         const String who = holder(m_path);
-        return Status::failure(m_path + " is locked by " + (who.empty() ? String("another process") : who) +
-                               "; try again when it has finished");
+        return Status::failure(StatusCode::Locked, m_path + " is locked by " +
+                                                       (who.empty() ? String("another process") : who) +
+                                                       "; try again when it has finished");
     }
     m_file = std::move(file);
     writeHolder(thisProcess());

@@ -21,9 +21,9 @@ public:
     FileLock& operator=(const FileLock&) = delete;
 
     /// Takes the lock, making the file if it is missing; its folder must exist. Without `wait`, a lock that
-    /// is held elsewhere is a failure that names the holder, and `isBusy` (if given) tells it from the
-    /// others. A lock that this object holds is a success.
-    Status take(bool wait = true, bool* isBusy = nullptr);
+    /// is held elsewhere is a failure of kind `Locked` that names the holder; no other failure is of that
+    /// kind. A lock that this object holds is a success.
+    Status take(bool wait = true);
     void release();
     [[nodiscard]] bool isHeld() const { return m_file != nullptr; }
 

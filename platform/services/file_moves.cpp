@@ -8,10 +8,6 @@ namespace Qx {
 
 namespace {
 
-Status asStatus(const FileError& error) {
-    return error ? Status::failure(error.text()) : Status();
-}
-
 FileError rename(const String& from, const String& to) {
     return retryInterrupted([&] { return fileSystem().rename(from, to); });
 }
@@ -29,10 +25,11 @@ FileMoves::~FileMoves() {
 Status FileMoves::move(const String& from, const String& to) {
     const FileAnswer there = askFile(to);
     if (there.isUnknown()) {
-        return asStatus(there.obstacle());
+        return there.obstacle().status();
     }
     if (!there.isMissing()) {
-        return Status::failure("cannot move " + from + " to " + to + ": there is something of that name");
+        return Status::failure(StatusCode::Refused,
+                               "cannot move " + from + " to " + to + ": there is something of that name");
     }
     // Noted first, as noting may run out of memory.
     m_moves.push_back({from, to});
@@ -42,7 +39,7 @@ Status FileMoves::move(const String& from, const String& to) {
     } else {
         m_synced = false;
     }
-    return asStatus(error);
+    return error.status();
 }
 
 Status FileMoves::sync() {
@@ -51,7 +48,7 @@ Status FileMoves::sync() {
     }
     const FileError error = retryInterrupted([&] { return fileSystem().syncFolder(m_folder); });
     m_synced = !error;
-    return asStatus(error);
+    return error.status();
 }
 
 Status FileMoves::finish() {

@@ -37,6 +37,20 @@ String reasonFor(int code) {
     return std::generic_category().message(code);
 }
 
+StatusCode kindOf(int code) {
+    switch (code) {
+    case ENOENT:
+        return StatusCode::NotFound;
+    case ENOSPC:
+    case EDQUOT:
+        return StatusCode::Full;
+    case EROFS:
+        return StatusCode::ReadOnly;
+    default:
+        return StatusCode::Refused;
+    }
+}
+
 /// Why something of a kind is no regular file.
 int codeFor(FileKind kind) {
     switch (kind) {
@@ -119,6 +133,10 @@ OpenFile::~OpenFile() = default;
 
 void OpenFile::beginSync() {}
 FileSystem::~FileSystem() = default;
+
+Status FileError::status() const {
+    return code == 0 ? Status() : Status::failure(kindOf(code), text(), code);
+}
 
 String FileError::text() const {
     if (code == 0) {

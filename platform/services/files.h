@@ -2,6 +2,7 @@
 
 #include "platform/base/export.h"
 #include "platform/base/qx_string.h"
+#include "platform/base/status.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -23,6 +24,10 @@ struct [[nodiscard]] QM_API FileError {
     explicit operator bool() const { return code != 0; }
     /// For a person: "cannot write /a/b.qme: No space left on device".
     [[nodiscard]] String text() const;
+    /// The same as an outcome, with `text` for its sentence: ENOENT is `NotFound`; ENOSPC and EDQUOT are
+    /// `Full`; EROFS is `ReadOnly`; every other number is `Refused`. The number is kept. Success without an
+    /// error.
+    [[nodiscard]] Status status() const;
 };
 
 /// What kind of thing a name stands for. Links are never followed in finding out. `Unknown` is what the

@@ -5,6 +5,7 @@
 #include <atomic>
 #include <cstdarg>
 #include <cstdio>
+#include <cstdlib>
 #include <mutex>
 #include <utility>
 
@@ -13,7 +14,7 @@ namespace {
 /// The two outlets and the lock that guards them. Never destroyed: statics may log while the process ends.
 struct Outlets {
     std::mutex mutex;
-    Qx::LogSink log;      ///< empty: standard error
+    Qx::LogSink log;      ///< empty: standard error, for grave news only
     Qx::LogSink standard; ///< empty: standard output
 };
 
@@ -36,17 +37,37 @@ public:
     InsideSink& operator=(const InsideSink&) = delete;
 };
 
+void put(std::FILE* stream, std::string_view line) {
+    std::fwrite(line.data(), 1, line.size(), stream);
+    std::fflush(stream);
+}
+
 void hand(const Qx::LogSink& sink, std::FILE* otherwise, const String& line) {
     if (sink) {
         sink(line);
     } else {
-        std::fwrite(line.data(), 1, line.size(), otherwise);
-        std::fflush(otherwise);
+        put(otherwise, line);
     }
 }
 
-void write(bool alsoStandardOutput, const char* form, va_list arguments) {
-    if (insideSink) {
+/// True if the environment asks for every line.
+bool isAskedFor() {
+    static const bool asked = [] {
+        const char* const value = std::getenv("QUILLMARCH_LOG");
+        return value != nullptr && *value != '\0' && std::string_view(value) != "0";
+    }();
+    return asked;
+}
+
+/// True if a line that is not grave goes nowhere.
+bool isUnheard() {
+    Outlets& to = outlets();
+    const std::lock_guard hold(to.mutex);
+    return !to.log && !isAskedFor();
+}
+
+void write(bool isGrave, const char* form, va_list arguments) {
+    if (insideSink || (!isGrave && isUnheard())) {
         return;
     }
     String line = String::vformat(form, arguments);
@@ -57,7 +78,7 @@ void write(bool alsoStandardOutput, const char* form, va_list arguments) {
     const std::lock_guard hold(to.mutex);
     const InsideSink inside;
     hand(to.log, stderr, line);
-    if (alsoStandardOutput) {
+    if (isGrave) {
         hand(to.standard, stdout, line);
     }
 }
@@ -98,6 +119,10 @@ LogSink setLogSink(LogSink sink) {
 LogSink setStandardOutputSink(LogSink sink) {
     const std::lock_guard hold(outlets().mutex);
     return std::exchange(outlets().standard, std::move(sink));
+}
+
+LogSink standardErrorSink() {
+    return [](std::string_view line) { put(stderr, line); };
 }
 
 int logLevel() {

@@ -73,7 +73,8 @@ bool isLine(const String& line, const String& expected) {
 
 Qx::Status complain(const TextFile& file, size_t line, const String& what) {
     const String place = file.path().empty() ? String() : file.path() + ", ";
-    return Qx::Status::failure(place + "line " + std::to_string(line + 1) + ": " + what);
+    return Qx::Status::failure(Qx::StatusCode::Damaged,
+                               place + "line " + std::to_string(line + 1) + ": " + what);
 }
 
 } // namespace

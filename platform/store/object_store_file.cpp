@@ -82,6 +82,19 @@ uint64_t firstNonZero(std::span<const std::byte> file, uint64_t from, uint64_t t
 
 } // namespace
 
+Status StoreVerdict::status(const String& path) const {
+    switch (state) {
+    case StoreState::Sound:
+        return {};
+    case StoreState::Newer:
+        return Status::failure(StatusCode::Newer, sentence(path));
+    case StoreState::Foreign:
+    case StoreState::Damaged:
+        break;
+    }
+    return Status::failure(StatusCode::Damaged, sentence(path));
+}
+
 String StoreVerdict::sentence(const String& path) const {
     switch (state) {
     case StoreState::Sound:

@@ -8,13 +8,13 @@ using namespace Qx::detail;
 Qx::Status Qx::detail::salvageStore(const String& path, StoreImage& image, std::vector<StoredObject>& objects,
                                     std::vector<String>& complaints, StoreVerdict& verdict) {
     if (const FileError error = image.read(path, false, verdict)) {
-        return Status::failure(error.text());
+        return error.status();
     }
     const StoreVerdict table = readStoreTable(image.bytes(), objects);
     // A file of another kind has no table either; what it is says more.
     if (!table.isSound() || verdict.state == StoreState::Foreign || verdict.state == StoreState::Newer) {
         objects.clear();
-        return Status::failure((verdict.isSound() ? table : verdict).sentence(path));
+        return (verdict.isSound() ? table : verdict).status(path);
     }
     if (verdict.isSound()) {
         verdict = judgeStorePlaces(image.bytes(), objects);

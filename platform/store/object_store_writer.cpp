@@ -16,10 +16,11 @@ constexpr size_t kWriteSize = size_t{1} << 20;
 
 Status StoreWriter::write(std::span<const std::byte> bytes) {
     if (bytes.size() > kMaxStoreSize || m_file.size() > kMaxStoreSize - bytes.size()) {
-        return Status::failure(m_path + " would be larger than 4 GiB, the greatest size of an object store");
+        return Status::failure(StatusCode::Unsupported,
+                               m_path + " would be larger than 4 GiB, the greatest size of an object store");
     }
     if (const FileError error = m_file.write(bytes.data(), bytes.size())) {
-        return Status::failure(error.text());
+        return error.status();
     }
     return {};
 }
@@ -105,8 +106,8 @@ Status StoreWriter::add(const StoredLabel& label, StoreSource& source, const Sto
 
 Status StoreWriter::endObject(const StoredLabel& label, uint64_t start, uint64_t sum, StoredPlace& place) {
     if (++m_count > kMaxStoredObjects) {
-        return Status::failure(m_path + " would hold more than " + std::to_string(kMaxStoredObjects) +
-                               " objects");
+        return Status::failure(StatusCode::Unsupported, m_path + " would hold more than " +
+                                                            std::to_string(kMaxStoredObjects) + " objects");
     }
     place = {start, position() - start, sum};
     m_table.setString(label.name);
@@ -134,7 +135,7 @@ Status StoreWriter::commit(StoreIdentity& identity, bool& replaced) {
     }
     const StoreHeaderBytes bytes = encodeStoreHeader(header);
     if (const FileError error = m_file.overwrite(0, bytes.data(), bytes.size())) {
-        return Status::failure(error.text());
+        return error.status();
     }
     // Memory is asked for before the file is in place.
     StoreIdentity made{m_path, {}, bytes, true, false};
@@ -148,7 +149,7 @@ Status StoreWriter::commit(StoreIdentity& identity, bool& replaced) {
             identity.infoKnown = identity.info.kind != FileKind::Unknown;
         }
     }
-    return error ? Status::failure(error.text()) : Status();
+    return error.status();
 }
 
 } // namespace Qx::detail

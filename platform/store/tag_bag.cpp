@@ -25,12 +25,17 @@ String refusal(const String& path, Qx::FileKind kind) {
     }
 }
 
-String readFailure(const Qx::FileError& error, const String& path) {
+Qx::Status readFailure(const Qx::FileError& error, const String& path) {
     if (error.code == EFBIG) {
-        return path + " is larger than 4 GiB, the greatest size of an object store; check that this is the "
-                      "file you mean";
+        return error.status().retold(path +
+                                     " is larger than 4 GiB, the greatest size of an object store; check "
+                                     "that this is the file you mean");
     }
-    return error.text();
+    return error.status();
+}
+
+Qx::Status doesNotExist(const String& path) {
+    return Qx::Status::failure(Qx::StatusCode::NotFound, path + " does not exist");
 }
 
 TagBag::OpenResult resultOf(StoreState state) {
@@ -47,15 +52,20 @@ TagBag::OpenResult resultOf(StoreState state) {
     return TagBag::Damaged;
 }
 
+Qx::Status noObject(std::string_view name) {
+    return Qx::Status::failure(Qx::StatusCode::NotFound, "there is no object " + quoted(name));
+}
+
 /// What a name stands for, as far as it decides the result of opening; Opened for a regular file.
-TagBag::OpenResult lookAt(const String& path, String& complaint) {
+TagBag::OpenResult lookAt(const String& path, Qx::Status& complaint) {
     const Qx::FileAnswer found = Qx::askFile(path);
     if (found.isMissing()) {
-        complaint = path + " does not exist";
+        complaint = doesNotExist(path);
         return TagBag::Missing;
     }
     if (!found.isRegular()) {
-        complaint = found.isUnknown() ? found.obstacle().text() : refusal(path, found.kind());
+        const Qx::Status obstacle = found.obstacle().status();
+        complaint = found.isUnknown() ? obstacle : obstacle.retold(refusal(path, found.kind()));
         return TagBag::NotOpened;
     }
     return TagBag::Opened;
@@ -75,7 +85,8 @@ TagBag::OpenResult TagBag::open(const cookie& item, const String& inFolder, eEdi
     m_contents->extension = extension;
     OpenResult result = NewStore;
     if (extension.find('/') != String::npos || extension.find('\0') != String::npos) {
-        m_contents->openError = quoted(extension) + " cannot end a file name";
+        m_contents->openStatus =
+            Qx::Status::failure(Qx::StatusCode::BadArgument, quoted(extension) + " cannot end a file name");
         result = NotOpened;
     } else if (behaviour != eOpenNew) {
         result = openFile(behaviour);
@@ -89,13 +100,14 @@ TagBag::OpenResult TagBag::openFile(eEditOpenBehaviour behaviour) {
     Contents& bag = *m_contents;
     const String name = bag.path();
     if (name.empty()) {
-        bag.openError =
-            "the item " + quoted(bag.id.asString()) + " has no file: its identity cannot form a name";
+        bag.openStatus = Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                             "the item " + quoted(bag.id.asString()) +
+                                                 " has no file: its identity cannot form a name");
         return NotOpened;
     }
-    const OpenResult seen = lookAt(name, bag.openError);
+    const OpenResult seen = lookAt(name, bag.openStatus);
     if (seen == Missing && behaviour == eOpenOrCreate) {
-        bag.openError.clear();
+        bag.openStatus = {};
         return NewStore;
     }
     if (seen != Opened) {
@@ -106,10 +118,10 @@ TagBag::OpenResult TagBag::openFile(eEditOpenBehaviour behaviour) {
         bag.image.drop();
         if (error.code == ENOENT) {
             // It went since it was looked at.
-            bag.openError = name + " does not exist";
+            bag.openStatus = doesNotExist(name);
             return Missing;
         }
-        bag.openError = readFailure(error, name);
+        bag.openStatus = readFailure(error, name);
         return NotOpened;
     }
     std::vector<StoredObject> objects;
@@ -118,7 +130,7 @@ TagBag::OpenResult TagBag::openFile(eEditOpenBehaviour behaviour) {
     }
     if (!verdict.isSound()) {
         bag.image.drop();
-        bag.openError = verdict.sentence(name);
+        bag.openStatus = verdict.status(name);
         return resultOf(verdict.state);
     }
     bag.source = bag.image.identity();
@@ -130,7 +142,7 @@ TagBag::OpenResult TagBag::openSalvaging(const String& file, std::vector<StoredO
     close();
     lost.clear();
     Contents& bag = *m_contents;
-    const OpenResult seen = lookAt(file, bag.openError);
+    const OpenResult seen = lookAt(file, bag.openStatus);
     if (seen != Opened) {
         return seen;
     }
@@ -139,7 +151,7 @@ TagBag::OpenResult TagBag::openSalvaging(const String& file, std::vector<StoredO
     StoreVerdict verdict;
     if (const Qx::Status status = salvageStore(file, bag.image, objects, complaints, verdict); !status) {
         bag.image.drop();
-        bag.openError = status.reason();
+        bag.openStatus = status;
         return verdict.isSound() ? (bag.image.identity().known ? Damaged : NotOpened)
                                  : resultOf(verdict.state);
     }
@@ -160,14 +172,14 @@ TagBag::OpenResult TagBag::openScanning(const String& file, const ScanNamer& nam
     close();
     unchecked.clear();
     Contents& bag = *m_contents;
-    const OpenResult seen = lookAt(file, bag.openError);
+    const OpenResult seen = lookAt(file, bag.openStatus);
     if (seen != Opened) {
         return seen;
     }
     StoreVerdict verdict;
     if (const Qx::FileError error = bag.image.read(file, false, verdict)) {
         bag.image.drop();
-        bag.openError = readFailure(error, file);
+        bag.openStatus = readFailure(error, file);
         return NotOpened;
     }
     std::vector<StoredObject> objects;
@@ -194,7 +206,7 @@ TagBag::OpenResult TagBag::openScanning(const String& file, const ScanNamer& nam
         if (verdict.isSound()) {
             verdict = StoreVerdict::damaged("no object can be found in it");
         }
-        bag.openError = verdict.sentence(file);
+        bag.openStatus = verdict.status(file);
         return resultOf(verdict.state);
     }
     std::set<std::string_view> taken;
@@ -207,7 +219,11 @@ TagBag::OpenResult TagBag::openScanning(const String& file, const ScanNamer& nam
 }
 
 const String& TagBag::openError() const {
-    return m_contents->openError;
+    return m_contents->openStatus.reason();
+}
+
+const Qx::Status& TagBag::openStatus() const {
+    return m_contents->openStatus;
 }
 
 TagBag::OpenResult TagBag::lastOpenResult() const {
@@ -287,11 +303,13 @@ void TagBag::releaseLent() noexcept {
 }
 
 Streamable* TagBag::openObject(std::string_view name) {
-    m_contents->objectError.clear();
+    m_contents->objectStatus = {};
     Contents::Entry* entry = m_contents->find(name);
     if (entry == nullptr || entry->lent != nullptr) {
-        m_contents->objectError =
-            entry == nullptr ? "there is no object " + quoted(name) : "object " + quoted(name) + " is lent";
+        m_contents->objectStatus =
+            entry == nullptr
+                ? noObject(name)
+                : Qx::Status::failure(Qx::StatusCode::Locked, "object " + quoted(name) + " is lent");
         return nullptr;
     }
     if (entry->owned == nullptr) {
@@ -310,7 +328,8 @@ uint64_t TagBag::numDepartures() const {
 std::unique_ptr<Streamable> TagBag::extractObject(std::string_view name) {
     Contents::Entry* entry = m_contents->find(name);
     if (entry != nullptr && entry->lent != nullptr) {
-        m_contents->objectError = "object " + quoted(name) + " was lent; it is its lender's again";
+        m_contents->objectStatus = Qx::Status::failure(
+            Qx::StatusCode::Locked, "object " + quoted(name) + " was lent; it is its lender's again");
         entry->lent = nullptr;
         if (!entry->hasBytes()) {
             m_contents->erase(name);
@@ -328,10 +347,10 @@ std::unique_ptr<Streamable> TagBag::extractObject(std::string_view name) {
 }
 
 bool TagBag::readObject(std::string_view name, Streamable& object) {
-    m_contents->objectError.clear();
+    m_contents->objectStatus = {};
     Contents::Entry* entry = m_contents->find(name);
     if (entry == nullptr) {
-        m_contents->objectError = "there is no object " + quoted(name);
+        m_contents->objectStatus = noObject(name);
         return false;
     }
     if (!m_contents->unpack(*entry, object)) {
@@ -342,7 +361,11 @@ bool TagBag::readObject(std::string_view name, Streamable& object) {
 }
 
 const String& TagBag::objectError() const {
-    return m_contents->objectError;
+    return m_contents->objectStatus.reason();
+}
+
+const Qx::Status& TagBag::objectStatus() const {
+    return m_contents->objectStatus;
 }
 
 void TagBag::markChanged(std::string_view name) {
@@ -381,11 +404,13 @@ std::vector<String> TagBag::names() const {
 
 Qx::Status TagBag::flush() {
     if (!m_contents->isOpen) {
-        return Qx::Status::failure("the object store is not open; open it before it is written");
+        return Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                   "the object store is not open; open it before it is written");
     }
     if (m_contents->path().empty()) {
-        return Qx::Status::failure("the item " + quoted(m_contents->id.asString()) +
-                                   " cannot be written: its identity cannot form a file name");
+        return Qx::Status::failure(Qx::StatusCode::BadArgument,
+                                   "the item " + quoted(m_contents->id.asString()) +
+                                       " cannot be written: its identity cannot form a file name");
     }
     bool retry = false;
     Qx::Status status = m_contents->write(true, retry);

@@ -68,6 +68,9 @@ public:
                             std::vector<StoredObjectInfo>& unchecked);
     /// One sentence for a person: the path, what is wrong and what can be done. Empty after a success.
     [[nodiscard]] const String& openError() const;
+    /// The same with its kind: `NotFound` for Missing, `Damaged` for Damaged and Foreign, `Newer`; what the
+    /// system said, or `BadArgument`, for NotOpened.
+    [[nodiscard]] const Qx::Status& openStatus() const;
     /// The result of the last `open`, also after the bag was closed; `Missing` before the first.
     [[nodiscard]] OpenResult lastOpenResult() const;
     [[nodiscard]] bool isOpen() const;
@@ -108,7 +111,12 @@ public:
     /// False when there are none or they
     /// do not fit; the object is then as its `unpack` promises.
     [[nodiscard]] bool readObject(std::string_view name, Streamable& object);
+    /// Why the last call of `openObject`, `extractObject` or `readObject` yielded nothing: a sentence, empty
+    /// after a success.
     [[nodiscard]] const String& objectError() const;
+    /// The same with its kind: `NotFound` when there is none, `Unsupported` for one of a class that this
+    /// program does not know, `Newer`, `Damaged`, `Locked` while it is lent.
+    [[nodiscard]] const Qx::Status& objectStatus() const;
 
     /// Declares a held object changed, so that the next flush packs it.
     void markChanged(std::string_view name);

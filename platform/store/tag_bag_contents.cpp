@@ -20,8 +20,8 @@ void TagBag::Contents::clear() {
     image.drop();
     source = {};
     m_imageBytesInUse = 0;
-    openError.clear();
-    objectError.clear();
+    openStatus = {};
+    objectStatus = {};
     numPacked = 0;
     numKept = 0;
 }
@@ -109,7 +109,7 @@ bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
     std::span<const std::byte> bytes = entry.memory;
     std::vector<std::byte> reread;
     if (!entry.hasBytes()) {
-        objectError = who + " was never written";
+        objectStatus = Qx::Status::failure(Qx::StatusCode::NotFound, who + " was never written");
         return false;
     }
     if (!entry.inMemory) {
@@ -117,7 +117,9 @@ bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
         const bool opened = file.open(source);
         reread.resize(opened ? entry.place.length : 0);
         if (!opened || !file.read(entry.place.offset, reread) || checksum(reread) != entry.place.checksum) {
-            objectError = who + " cannot be read again: the file was replaced, moved or damaged";
+            objectStatus =
+                Qx::Status::failure(Qx::StatusCode::Damaged,
+                                    who + " cannot be read again: the file was replaced, moved or damaged");
             return false;
         }
         bytes = reread;
@@ -128,11 +130,15 @@ bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
     }
     const LayerRevision current = currentRevision(object);
     if (entry.layer == object.layerName() && entry.major > current.major) {
-        objectError = who + " was written by a newer version of this program: it has revision " +
-                      std::to_string(entry.major) + ", this version reads " + std::to_string(current.major);
+        objectStatus = Qx::Status::failure(
+            Qx::StatusCode::Newer, who + " was written by a newer version of this program: it has revision " +
+                                       std::to_string(entry.major) + ", this version reads " +
+                                       std::to_string(current.major));
     } else {
-        objectError = who + " does not hold what an object of class " + quoted(object.layerName()) +
-                      " is made of; it was written by another program or another class";
+        objectStatus =
+            Qx::Status::failure(Qx::StatusCode::Damaged,
+                                who + " does not hold what an object of class " + quoted(object.layerName()) +
+                                    " is made of; it was written by another program or another class");
     }
     return false;
 }
@@ -140,8 +146,10 @@ bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
 std::unique_ptr<Streamable> TagBag::Contents::build(const Entry& entry) {
     std::unique_ptr<Streamable> object = Streamable::build(entry.layer);
     if (object == nullptr) {
-        objectError = "object " + quoted(entry.name) + " of " + path() + " is of class " +
-                      quoted(entry.layer) + ", which this program does not know; it is kept as it is";
+        objectStatus = Qx::Status::failure(Qx::StatusCode::Unsupported,
+                                           "object " + quoted(entry.name) + " of " + path() +
+                                               " is of class " + quoted(entry.layer) +
+                                               ", which this program does not know; it is kept as it is");
         return nullptr;
     }
     return unpack(entry, *object) ? std::move(object) : nullptr;

@@ -42,13 +42,14 @@ std::vector<String> linesOf(std::string_view text, size_t count) {
 Qx::Status TextFile::load(const String& path, uint64_t limit) {
     String text;
     if (const Qx::FileError error = Qx::readWholeFile(path, text, limit)) {
-        return Qx::Status::failure(error.text());
+        return error.status();
     }
     const std::string_view content = withoutMark(text);
     const size_t count = countLines(content);
     if (count > kMaxLines) {
-        return Qx::Status::failure(path + " has more than " + std::to_string(kMaxLines) +
-                                   " lines; it is no text file of this program");
+        return Qx::Status::failure(Qx::StatusCode::Damaged, path + " has more than " +
+                                                                std::to_string(kMaxLines) +
+                                                                " lines; it is no text file of this program");
     }
     m_lines = linesOf(content, count);
     m_path = path;
@@ -88,7 +89,7 @@ Qx::Status TextFile::save(const String& path) const {
     if (!error) {
         error = file.commit();
     }
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
+    return error.status();
 }
 
 const String& TextFile::operator[](unsigned line) const {

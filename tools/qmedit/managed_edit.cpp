@@ -14,71 +14,28 @@ RevisionChain chain(const cookie& item, RevisionChain::Kind kind) {
     return {item, kind, edit_manager::backupDepth()};
 }
 
-uint64_t inodeOf(const String& path) {
-    return Qx::askFile(path).info().inode;
-}
-
-/// What lies at the names of an edit before it is opened, by which its files are known afterwards.
-class FilesBefore {
-public:
-    explicit FilesBefore(const cookie& item) : m_undo(chain(item, RevisionChain::Undo)) {
-        m_edit = inodeOf(m_undo.file());
-        static_cast<void>(findCorruptName(m_undo.file(), m_corrupt));
-        for (const int number : m_undo.numbers()) {
-            m_backups.emplace_back(number, inodeOf(m_undo.path(number)));
-        }
-    }
-
-    /// The number of the backup that is the edit's file, as it was numbered before; 0 when none is.
-    [[nodiscard]] int restored() const {
-        const uint64_t present = inodeOf(m_undo.file());
-        for (const auto& [number, inode] : m_backups) {
-            if (inode == present && present != 0) {
-                return number;
-            }
-        }
-        return 0;
-    }
-    /// The name that the file gets if it is moved aside.
-    [[nodiscard]] const String& corruptName() const { return m_corrupt; }
-    [[nodiscard]] bool wasMovedAside() const { return m_edit != 0 && inodeOf(corruptName()) == m_edit; }
-    [[nodiscard]] bool wasMissing() const { return m_edit == 0; }
-    [[nodiscard]] const String& file() const { return m_undo.file(); }
-
-private:
-    RevisionChain m_undo;
-    String m_corrupt;
-    uint64_t m_edit = 0;
-    std::vector<std::pair<int, uint64_t>> m_backups;
-};
-
-/// Why a file does not read, for the end of a sentence.
-String faultOf(const String& path) {
-    EditPtr edit(new Edit);
-    return edit->readFile(Qx::widen(path), eOpenExisting) == Edit::kReadOk ? String() : edit->lastFileError();
-}
-
-void reportRestored(const FilesBefore& before, int number) {
-    const String backup = String::format("undo backup %d was opened in its place", number);
-    if (before.wasMovedAside()) {
-        reportWarning(before.file() + " could not be read and was moved aside to " + before.corruptName() +
-                      "; " + backup + ". 'qmedit salvage " + before.corruptName() +
-                      " --into DIR' saves what is sound of the damaged file");
-    } else {
-        reportWarning(before.file() + " was missing; " + backup);
-    }
-}
-
-void reportNotOpened(const cookie& item, const FilesBefore& before) {
-    if (before.wasMovedAside()) {
-        reportError(before.file() + " could not be read and was moved aside to " + before.corruptName() +
-                    "; no undo backup of it can be read. 'qmedit recover " + item.asString() +
-                    "' looks for milestones, 'qmedit salvage " + before.corruptName() +
-                    " --into DIR' saves what is sound of the file");
+/// Tells of a backup that was opened in the place of an edit's file.
+void reportRestored(const String& file, const OpenReport& report) {
+    const String backup = String::format("undo backup %d was opened in its place", report.backup);
+    if (report.wasMissing) {
+        reportWarning(file + " was missing; " + backup);
         return;
     }
-    const String fault = faultOf(before.file());
-    reportError(fault.empty() ? String(before.file() + " could not be opened") : fault);
+    const String& aside = report.setAside.front().path;
+    reportWarning(file + " could not be read and was moved aside to " + aside + "; " + backup +
+                  ". 'qmedit salvage " + aside + " --into DIR' saves what is sound of the damaged file");
+}
+
+void reportNotOpened(const cookie& item, const String& file, const OpenReport& report) {
+    if (report.wasMissing || report.setAside.empty()) {
+        reportError(report.status ? String(file + " could not be opened") : report.status.reason());
+        return;
+    }
+    const String& aside = report.setAside.front().path;
+    reportError(file + " could not be read and was moved aside to " + aside +
+                "; no undo backup of it can be read. 'qmedit recover " + item.asString() +
+                "' looks for milestones, 'qmedit salvage " + aside +
+                " --into DIR' saves what is sound of the file");
 }
 
 String quotedChange(const String& change) {
@@ -114,15 +71,16 @@ int ManagedEdit::prepare(bool mayBeGone) {
 }
 
 bool openManaged(const cookie& item, EditPtr& edit, bool& wasRestored) {
-    const FilesBefore before(item);
-    const EditPtr opened = edit_manager::openEdit(item, eOpenExisting);
+    const String file = getFilenameForCookie(item);
+    OpenReport report;
+    const EditPtr opened = edit_manager::openEdit(item, eOpenExisting, report);
     if (!opened.valid()) {
-        reportNotOpened(item, before);
+        reportNotOpened(item, file, report);
         return false;
     }
-    if (const int number = before.restored(); number != 0) {
+    if (report.source == OpenReport::Source::Backup) {
         wasRestored = true;
-        reportRestored(before, number);
+        reportRestored(file, report);
     }
     edit = opened;
     return true;

@@ -12,50 +12,28 @@
 #include "platform/services/files.h"
 #include "tools/qmedit/console.h"
 
-#include <chrono>
 #include <cstdlib>
 #include <map>
-#include <thread>
 
 namespace {
 
-constexpr cookie kUsualProject{Cookie_Type::Project, 1, 0};
-
-/// A folder named by a project's cookie, with settings in it.
-cookie projectOfFolder(const String& folder) {
-    const cookie project(std::string_view(Qx::fileNameOf(folder)));
-    const bool isProject = project.isStorable() && project.type() == Cookie_Type::Project &&
-                           Qx::askFile(Qx::joinPath(folder, "Project.txt")).isRegular();
-    return isProject ? project : invalid_cookie;
-}
-
-/// The project in a folder of projects: the usual one if it is there, else the only one.
-cookie projectIn(const String& root) {
-    std::vector<String> names;
-    if (!Qx::askFile(Qx::joinPath(root, kUsualProject.asString())).isMissing() ||
-        Qx::fileSystem().list(root, names)) {
-        return kUsualProject;
+/// The folder that a --project option, or in its place the environment, means.
+String folderOfOption(const String& option) {
+    if (!option.empty()) {
+        return option;
     }
-    cookie found;
-    for (const String& name : names) {
-        if (const cookie project = projectOfFolder(Qx::joinPath(root, name)); project.is_valid()) {
-            if (found.is_valid()) {
-                return kUsualProject;
-            }
-            found = project;
-        }
-    }
-    return found.is_valid() ? found : kUsualProject;
+    const char* environment = std::getenv("QMEDIT_PROJECT");
+    return environment != nullptr && *environment != '\0' ? environment : "./quillmarch-project";
 }
 
 /// Why an edit file cannot be read, and where its newest backup is if it has one.
-Qx::Status damage(const String& path, const String& reason) {
-    String text = (reason.find(path) == String::npos ? path + ": " : String()) + reason;
+Qx::Status damage(const String& path, const Qx::Status& why) {
+    String text = why.reason();
     const String backup = path + ".U1";
     if (Qx::askFile(backup).isRegular()) {
         text += "; its newest backup is " + backup;
     }
-    return Qx::Status::failure(std::move(text));
+    return why.retold(std::move(text));
 }
 
 /// The name of the edit file that a backup, or a file that was set aside, belongs to; empty for other names.
@@ -133,21 +111,7 @@ void storeRecords(projdb& records, const std::unordered_map<cookie, projdb::Reco
 
 } // namespace
 
-ProjectSession::ProjectSession(const String& option) : m_root(option), m_project(kUsualProject) {
-    const char* environment = std::getenv("QMEDIT_PROJECT");
-    if (m_root.empty()) {
-        m_root = environment != nullptr && *environment != '\0' ? environment : "./quillmarch-project";
-    }
-    while (m_root.size() > 1 && m_root.back() == '/') {
-        m_root.pop_back();
-    }
-    if (const cookie itself = projectOfFolder(m_root); itself.is_valid()) {
-        m_project = itself;
-        m_root = Qx::folderOf(m_root);
-    } else {
-        m_project = projectIn(m_root);
-    }
-}
+ProjectSession::ProjectSession(const String& option) : m_session(folderOfOption(option)) {}
 
 String ProjectSession::fileOf(const cookie& item) {
     const RevisionChain undo(item, RevisionChain::Undo, edit_manager::backupDepth());
@@ -156,41 +120,25 @@ String ProjectSession::fileOf(const cookie& item) {
     return hasBackup ? undo.path(number) : undo.file();
 }
 
-String ProjectSession::folder() const {
-    return Qx::joinPath(m_root, m_project.asString());
-}
-
-bool ProjectSession::exists() const {
-    return Qx::askFile(folder() + "/.").isFolder();
-}
-
-void ProjectSession::makeCurrentUnwritten(Qx::FrameRate rate) const {
-    Qx::CurrentProject current = Qx::currentProject();
-    current.project = m_project;
-    current.rootFolder = m_root;
-    current.frameRateCode = rate.valid() ? rate.code() : static_cast<int>(Qx::FrameRate::Fps25);
-    Qx::setCurrentProject(current);
+void ProjectSession::useUnwritten(Qx::FrameRate rate) {
+    ProjectDetails usual;
+    if (rate.valid()) {
+        usual.frameRateCode = rate.code();
+    }
+    m_session.useUnwritten(usual);
 }
 
 Qx::Status ProjectSession::openExisting() {
-    if (!exists()) {
-        return Qx::Status::failure(
-            "there is no project in " + m_root +
-            "; name another with --project DIR, or make one with 'qmedit import FILE'");
+    Qx::Status used = m_session.useExisting();
+    if (used.code() == Qx::StatusCode::NotFound) {
+        return used.retold(used.reason() +
+                           "; name another with --project DIR, or make one with 'qmedit import FILE'");
     }
-    // Settings that are not there are not written by reading.
-    if (Qx::askFile(Qx::joinPath(folder(), "Project.txt")).isMissing()) {
-        makeCurrentUnwritten({});
-        return {};
-    }
-    ProjectDetails details;
-    if (const Qx::Status opened = ProjectDetails::openOrCreate(m_root, m_project, {}, details); !opened) {
+    if (!used) {
         // The edits are there all the same. What writes asks again, and fails, in `create`.
-        reportWarning(opened.reason() + "; the usual settings are taken");
-        makeCurrentUnwritten({});
-        return {};
+        reportWarning(used.reason() + "; the usual settings are taken");
+        useUnwritten({});
     }
-    details.makeCurrent();
     return {};
 }
 
@@ -199,25 +147,19 @@ Qx::Status ProjectSession::prepare(Qx::FrameRate rateOfFresh) {
         return openExisting();
     }
     m_rateOfFresh = rateOfFresh;
-    makeCurrentUnwritten(rateOfFresh);
+    useUnwritten(rateOfFresh);
     return {};
 }
 
 Qx::Status ProjectSession::create() {
     const interrupts::Hold hold(false);
     ProjectDetails defaults;
-    defaults.name = Qx::fileNameOf(m_root);
-    if (!Qx::isUtf8(defaults.name)) {
-        defaults.name.clear();
-    }
     if (m_rateOfFresh.valid()) {
         defaults.frameRateCode = m_rateOfFresh.code();
     }
-    ProjectDetails details;
-    if (Qx::Status opened = ProjectDetails::openOrCreate(m_root, m_project, defaults, details); !opened) {
-        return opened;
+    if (Qx::Status made = m_session.make(defaults); !made) {
+        return made;
     }
-    details.makeCurrent();
     if (const Qx::Status started = edit_init(); !started) {
         reportWarning(started.reason());
     }
@@ -272,8 +214,9 @@ Qx::Status ProjectSession::readRevision(const String& path, EditPtr& edit) {
         return status;
     }
     if (!lost.empty()) {
-        return Qx::Status::failure(path + " is damaged: " + lost.front() +
-                                   "; 'qmedit salvage' saves what is sound of it");
+        return Qx::Status::failure(Qx::StatusCode::Damaged,
+                                   path + " is damaged: " + lost.front() +
+                                       "; 'qmedit salvage' saves what is sound of it");
     }
     edit = read;
     return {};
@@ -292,7 +235,7 @@ Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
                 return {};
             }
             if (!Qx::askFile(path).isMissing()) {
-                return damage(path, read->lastFileError());
+                return damage(path, read->lastFileStatus());
             }
         }
         if (readBackup(item, edit, status)) {
@@ -303,30 +246,16 @@ Qx::Status ProjectSession::readEdit(const cookie& item, EditPtr& edit) const {
         }
     }
     if (isListed(item)) {
-        return Qx::Status::failure(path + ": " + missingText(item));
+        return Qx::Status::failure(Qx::StatusCode::NotFound, path + ": " + missingText(item));
     }
-    return Qx::Status::failure("there is no edit " + item.asString() + " in the project " + m_root +
-                               "; 'qmedit list' shows those there are");
-}
-
-void ProjectSession::manage() {
-    if (m_manager == nullptr) {
-        m_manager = std::make_unique<edit_manager>();
-    }
+    return Qx::Status::failure(Qx::StatusCode::NotFound, "there is no edit " + item.asString() +
+                                                             " in the project " + root() +
+                                                             "; 'qmedit list' shows those there are");
 }
 
 Qx::Status ProjectSession::lockForWriting() {
-    using Clock = std::chrono::steady_clock;
-    const Clock::time_point end = Clock::now() + std::chrono::seconds(kLockPatience);
-    m_writers = std::make_unique<EditManagerLock>(folder());
-    Qx::Status taken = m_writers->take();
-    // A folder that cannot be written is not waited for.
-    while (!taken && taken.reason().find(" is locked by ") != String::npos && Clock::now() < end) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(20));
-        taken = m_writers->take();
-    }
-    if (!taken) {
-        return Qx::Status::failure("nothing was changed: " + taken.reason());
+    if (Qx::Status taken = m_session.lockForWriting(std::chrono::seconds(kLockPatience)); !taken) {
+        return taken.retold("nothing was changed: " + taken.reason());
     }
     m_uninterrupted.emplace(true);
     cleanUp();
@@ -397,7 +326,7 @@ ListedEdit ProjectSession::listedAway(const cookie& item) const {
 Qx::Status ProjectSession::list(std::vector<ListedEdit>& edits, std::vector<String>& others) {
     std::vector<String> names;
     if (const Qx::FileError error = Qx::fileSystem().list(folder(), names); error) {
-        return Qx::Status::failure(error.text());
+        return error.status();
     }
     projdb* const records = openRecords();
     Records known;

@@ -1,8 +1,7 @@
 #pragma once
 
 #include "edit/inspect/edit_report.h"
-#include "edit/manager/edit_manager.h"
-#include "edit/manager/edit_manager_lock.h"
+#include "edit/manager/session.h"
 #include "edit/model/edit.h"
 #include "edit/project/projdb.h"
 #include "platform/base/status.h"
@@ -35,11 +34,11 @@ public:
     /// The folder that a command works on, from the text of its --project option.
     explicit ProjectSession(const String& option);
 
-    [[nodiscard]] const String& root() const { return m_root; }
+    [[nodiscard]] const String& root() const { return m_session.root(); }
     /// The folder with the edit files.
-    [[nodiscard]] String folder() const;
+    [[nodiscard]] String folder() const { return m_session.folder(); }
     /// True if the project is there.
-    [[nodiscard]] bool exists() const;
+    [[nodiscard]] bool exists() const { return m_session.exists(); }
 
     /// Opens the project that is there. Settings that cannot be read draw a warning and the usual ones are
     /// taken, so that the edits can be looked at. A failure says that there is no project and what makes one.
@@ -51,7 +50,7 @@ public:
     Qx::Status create();
 
     /// Makes the edit manager, for the commands that work through it. It lives as long as the session.
-    void manage();
+    void manage() { m_session.manage(); }
     /// Takes the project's writers' lock for the rest of the session: a command that opens, changes and
     /// writes takes it before it opens. Another process that holds it is waited for `kLockPatience` seconds;
     /// a failure then names it.
@@ -87,7 +86,7 @@ private:
 
     using Records = std::unordered_map<cookie, projdb::Record>;
 
-    void makeCurrentUnwritten(Qx::FrameRate rate) const;
+    void useUnwritten(Qx::FrameRate rate);
     /// The project's record; null when it has none or it cannot be used.
     [[nodiscard]] projdb* openRecords();
     [[nodiscard]] projdb::Record recordOf(const cookie& item, const Records& known, Records& fresh);
@@ -100,8 +99,6 @@ private:
     [[nodiscard]] bool readBackup(const cookie& item, EditPtr& edit, Qx::Status& status) const;
     [[nodiscard]] ListedEdit listedAway(const cookie& item) const;
 
-    String m_root;
-    cookie m_project;
     Qx::FrameRate m_rateOfFresh;
     std::unordered_map<cookie, Known> m_known;
     mutable std::optional<std::unordered_set<cookie>> m_listed; ///< when an item was first missing
@@ -109,6 +106,5 @@ private:
     size_t m_numRead = 0;
     bool m_isClean = false;
     std::optional<interrupts::Hold> m_uninterrupted; ///< goes last: from the lock until all is closed
-    std::unique_ptr<EditManagerLock> m_writers;
-    std::unique_ptr<edit_manager> m_manager; ///< goes first: what it writes at its end is written locked
+    Session m_session; ///< goes first: what it writes at its end is written locked
 };

@@ -24,14 +24,14 @@ Qx::Status keepAside(const String& file, int depth, String& kept) {
 }
 
 /// Keeps the file of another program aside if it is not the one this process knows.
-bool keepForeignFile(const ManagerState::CachedEdit& entry, int depth) {
+Qx::Status keepForeignFile(const ManagerState::CachedEdit& entry, int depth) {
     const Qx::FileAnswer present = Qx::askFile(entry.path);
     if (const Qx::FileError error = present.obstacle("replace")) {
         herc_printf("edit_manager: nothing was written: %s\n", error.text().c_str());
-        return false;
+        return error.status();
     }
     if (present.isMissing() || Qx::isSameFile(entry.file, present.info())) {
-        return true;
+        return {};
     }
     String kept;
     const Qx::Status status = keepAside(entry.path, depth, kept);
@@ -39,11 +39,11 @@ bool keepForeignFile(const ManagerState::CachedEdit& entry, int depth) {
         herc_printf("edit_manager: %s was changed by another program and could not be kept, so it was not "
                     "written: %s\n",
                     entry.path.c_str(), status.reason().c_str());
-        return false;
+        return status;
     }
     herc_printf("edit_manager: %s was changed by another program; that version is kept as %s\n",
                 entry.path.c_str(), kept.c_str());
-    return true;
+    return {};
 }
 
 } // namespace
@@ -67,11 +67,13 @@ namespace {
 [[maybe_unused]] const ManagerMessages& internedAtLoad = managerMessages();
 } // namespace
 
-void ManagerState::put(const cookie& item, EditPtr edit, String path, const Qx::FileInfo& file) {
+void ManagerState::put(const cookie& item, EditPtr edit, String path, const Qx::FileInfo& file,
+                       std::shared_ptr<const OpenReport> failure) {
     auto entry = std::make_unique<CachedEdit>();
     entry->item = item;
     entry->edit = std::move(edit);
     entry->path = std::move(path);
+    entry->failure = std::move(failure);
     entry->know(file);
     put(std::move(entry));
 }
@@ -144,23 +146,32 @@ bool ManagerState::writeLast(CachedEdit& entry, bool waits) {
 }
 
 bool ManagerState::write(CachedEdit& entry, bool waits) {
-    Edit& edit = *entry.edit;
-    if (entry.item.type() == Cookie_Type::Transient || !edit.needsToBeWritten()) {
+    if (entry.item.type() == Cookie_Type::Transient || !entry.edit->needsToBeWritten()) {
         return true;
     }
+    entry.written = writeFile(entry, waits);
+    return entry.written.isOk();
+}
+
+Qx::Status ManagerState::writeFile(CachedEdit& entry, bool waits) {
+    Edit& edit = *entry.edit;
     // What is moved next must be the file that is written here, also inside a caller's batch.
     const Qx::AtomicBatch::Pause atOnce;
     EditManagerLock writers{Qx::folderOf(entry.path)};
-    if (!takeWritersLock(writers, waits) || !keepForeignFile(entry, backupDepth)) {
+    Qx::Status status = takeWritersLock(writers, waits);
+    if (status) {
+        status = keepForeignFile(entry, backupDepth);
+    }
+    if (!status) {
         addToDirtyList(entry.item);
-        return false;
+        return status;
     }
     if (!edit.write_file(Qx::widen(entry.path))) {
         herc_printf("edit_manager: %s\n", edit.lastFileError().c_str());
         // The file may have been replaced and only not been made durable.
         noteFile(entry);
         addToDirtyList(entry.item);
-        return false;
+        return edit.lastFileStatus();
     }
     noteFile(entry);
     entry.forgetRedo();
@@ -169,7 +180,7 @@ bool ManagerState::write(CachedEdit& entry, bool waits) {
         addToDirtyList(entry.item); // changed meanwhile by one who does not hold its section
     }
     records.put(entry.item, editRecordOf(edit, &entry.file));
-    return true;
+    return {};
 }
 
 ManagerState::Unreferenced ManagerState::writeUnreferenced(CachedEdit& entry, bool waits) {
@@ -196,12 +207,12 @@ void ManagerState::removeFromDirtyList(const cookie& item) {
     dirty.erase(item);
 }
 
-bool takeWritersLock(EditManagerLock& writers, bool waits) {
-    const Qx::Status status = writers.take(waits);
+Qx::Status takeWritersLock(EditManagerLock& writers, bool waits) {
+    Qx::Status status = writers.take(waits);
     if (!status) {
         herc_printf("edit_manager: nothing was written: %s\n", status.reason().c_str());
     }
-    return status.isOk();
+    return status;
 }
 
 namespace {

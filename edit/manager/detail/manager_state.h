@@ -47,6 +47,9 @@ struct ManagerState {
         Qx::FileInfo
             file; ///< as this process last read, wrote or moved it; of kind Missing when there is none, of
                   ///< kind Unknown when the system could not tell: it is then no file that anybody knows
+        Qx::Status written; ///< how the last attempt to write it went
+        /// For a remembered failure: what the opening did.
+        std::shared_ptr<const OpenReport> failure;
         bool hadFile = false; ///< it had a file since it is in the cache
         /// Takes what its file is at this moment as known.
         void know(const Qx::FileInfo& info) {
@@ -123,7 +126,8 @@ struct ManagerState {
         return place == cache.end() ? nullptr : place->second.get();
     }
     /// Puts an edit (or, with a null one, a remembered failure) in an item's place. Under the lock.
-    void put(const cookie& item, EditPtr edit, String path, const Qx::FileInfo& file);
+    void put(const cookie& item, EditPtr edit, String path, const Qx::FileInfo& file,
+             std::shared_ptr<const OpenReport> failure = nullptr);
     /// Takes an entry out, unwritten, and returns it. Under the lock; the entry is to be destroyed after it.
     [[nodiscard]] std::unique_ptr<CachedEdit> removeCacheEntry(const cookie& item);
     /// The same if nobody but the cache has the edit and, with `onlyClean`, it has no changes; null
@@ -174,6 +178,8 @@ struct ManagerState {
     }
 
 private:
+    /// `write`, with the outcome for the entry to keep.
+    [[nodiscard]] Qx::Status writeFile(CachedEdit& entry, bool waits);
     /// Takes an entry out if `may` allows it, which is asked under `lookup`.
     template <typename May>
     std::unique_ptr<CachedEdit> takeOut(const cookie& item, May&& may);
@@ -226,7 +232,7 @@ void evictOne(int limit);
 [[nodiscard]] edit_manager* managerForOpening();
 /// Takes the writers' lock of the project that a file belongs to, waiting for other processes or not; a
 /// failure is logged.
-[[nodiscard]] bool takeWritersLock(EditManagerLock& writers, bool waits = true);
+Qx::Status takeWritersLock(EditManagerLock& writers, bool waits = true);
 /// The message types of the manager.
 struct ManagerMessages {
     NotifyMsgType projectChanged{"editmanProjectChanged"};
@@ -240,6 +246,8 @@ const ManagerMessages& managerMessages();
 /// is due. With `isLast` it is about to leave the cache. False if it could not be written.
 bool writeCached(const cookie& item, const EditPtr& edit, const MilestoneRing* milestones,
                  bool isLast = false);
+/// `edit_manager::close_all_edits`; `lost` gets the edits that could not be written.
+void closeAllEdits(Vector<UnwrittenEdit>& lost);
 /// Brings the records up to date with the edits in memory that changed, and with what was gathered. Not under
 /// the manager's lock.
 void storeRecords();

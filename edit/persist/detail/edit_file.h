@@ -85,7 +85,7 @@ public:
     };
 
     /// Records why a read or write failed; always false.
-    static bool fail(Edit& edit, String reason);
+    static bool fail(Edit& edit, Qx::Status why);
     /// No channels, no cues, the header of a new edit; the cookie and the store stay.
     static void reset(Edit& edit);
     /// The clean state after a load or a save: nothing is marked as changed.

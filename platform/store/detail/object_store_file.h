@@ -59,6 +59,8 @@ struct [[nodiscard]] StoreVerdict {
     [[nodiscard]] static StoreVerdict damaged(String what) { return {StoreState::Damaged, std::move(what)}; }
     /// One sentence for a person: the path, what is wrong and what can be done.
     [[nodiscard]] String sentence(const String& path) const;
+    /// The same as an outcome; a success for a sound store.
+    [[nodiscard]] Status status(const String& path) const;
 };
 
 /// True for a name that may stand in the table: 1 to 1024 bytes of UTF-8 without control characters.

@@ -51,9 +51,9 @@ public:
     void takeImage(std::span<const Qx::detail::StoredObject> objects, std::span<const String> complaints,
                    bool onFile);
 
-    /// Unpacks an object's bytes. False with `objectError` set.
+    /// Unpacks an object's bytes. False with `objectStatus` set.
     bool unpack(const Entry& entry, Streamable& object);
-    /// A live object from an object's bytes; null with `objectError` set.
+    /// A live object from an object's bytes; null with `objectStatus` set.
     std::unique_ptr<Streamable> build(const Entry& entry);
     /// Forgets an object's bytes in memory if the file has them.
     void dropMemory(Entry& entry);
@@ -71,9 +71,9 @@ public:
     String folder;
     String extension;
     bool isOpen = false;
-    String openError;
+    Qx::Status openStatus;
     OpenResult lastResult = Missing;
-    String objectError;
+    Qx::Status objectStatus;
     size_t numPacked = 0;
     size_t numKept = 0;
     uint64_t numDepartures = 0;

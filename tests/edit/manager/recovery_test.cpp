@@ -75,7 +75,33 @@ TEST(Recovery, EveryStateOfTheFilesOpensAsFarAsItCan) {
                 project.write(kNames[i], bytes[i]);
             }
         }
-        EXPECT_EQ(ManagedProject::nameOf(), opened == nullptr ? "(null)" : opened);
+        // The report, by where the letter that opens stands in the drawing.
+        using Source = OpenReport::Source;
+        const size_t from = opened == nullptr ? 0 : std::string_view(files).find(*opened);
+        const bool isDamaged = opened == nullptr && corrupt > 0;
+        for (const bool again : {false, true}) {
+            OpenReport report;
+            const EditPtr edit = edit_manager::openEdit(kEdit, eOpenExisting, report);
+            EXPECT_EQ(edit.valid() ? edit->getName() : String("(null)"),
+                      opened == nullptr ? "(null)" : opened);
+            EXPECT_EQ(report.status.code(), isDamaged           ? Qx::StatusCode::Damaged
+                                            : opened == nullptr ? Qx::StatusCode::NotFound
+                                                                : Qx::StatusCode::Ok);
+            if (again && opened != nullptr) {
+                EXPECT_EQ(report.source, Source::Cache);
+                break;
+            }
+            EXPECT_EQ(report.source, opened == nullptr ? Source::None
+                                     : from == 0       ? Source::File
+                                                       : Source::Backup);
+            EXPECT_EQ(report.backup, opened == nullptr && corrupt > 1 ? corrupt - 1 : static_cast<int>(from));
+            EXPECT_EQ(report.wasMissing, files[0] == '-');
+            EXPECT_EQ(static_cast<int>(report.setAside.size()), corrupt);
+            for (const OpenReport::SetAside& aside : report.setAside) {
+                EXPECT_TRUE(std::filesystem::exists(aside.path.c_str()));
+                EXPECT_EQ(aside.why.code(), Qx::StatusCode::Damaged);
+            }
+        }
         EXPECT_TRUE(project.log.contains(logged)) << project.log.log();
         std::string found;
         for (size_t i = 0; i < 5; ++i) {

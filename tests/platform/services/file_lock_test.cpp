@@ -18,6 +18,7 @@ TEST(FileLock, ARefusalSaysWhoHoldsIt) {
     Qx::FileLock other(folder.path("lock"));
     const Qx::Status refused = other.take(false);
     ASSERT_FALSE(refused);
+    EXPECT_EQ(refused.code(), Qx::StatusCode::Locked);
     EXPECT_FALSE(other.isHeld());
     const String process =
         String::format("platform_services_test, process %ld", static_cast<long>(::getpid()));

@@ -122,6 +122,25 @@ TEST(MachineFileSystem, ListsInOrderOfBytes) {
     EXPECT_EQ(names, (std::vector<String>{".h", "B", "a", "b"}));
 }
 
+TEST(FileErrors, AreOutcomesOfAKindThatKeepTheNumber) {
+    using Code = Qx::StatusCode;
+    const std::pair<int, Code> cases[] = {
+        {0, Code::Ok},           {ENOENT, Code::NotFound}, {ENOSPC, Code::Full},   {EDQUOT, Code::Full},
+        {EROFS, Code::ReadOnly}, {EACCES, Code::Refused},  {EBUSY, Code::Refused}, {EIO, Code::Refused},
+    };
+    for (const auto& [number, kind] : cases) {
+        const Qx::FileError error{number, "write", "/a"};
+        const Qx::Status status = error.status();
+        EXPECT_EQ(status.code(), kind) << number;
+        EXPECT_EQ(status.systemError(), number);
+        EXPECT_EQ(status.reason(), number == 0 ? String() : error.text());
+        const Qx::Status retold = status.retold("otherwise");
+        EXPECT_EQ(retold.code(), kind);
+        EXPECT_EQ(retold.systemError(), number);
+        EXPECT_EQ(retold.reason(), number == 0 ? "" : "otherwise");
+    }
+}
+
 TEST(WholeFile, ReadsThroughShortAndInterruptedReads) {
     const test::TemporaryFolder folder;
     const std::string text = "some bytes\0 and more" + std::string(100, 'z');

@@ -27,6 +27,26 @@ TEST(Log, WritesWholeLinesToTheRightOutlets) {
     EXPECT_EQ(log.standardOutput(), "grave: news\n");
 }
 
+TEST(Log, NothingButGraveNewsReachesStandardErrorUnasked) {
+    const auto before = Qx::setLogSink({});
+    const auto outBefore = Qx::setStandardOutputSink([](std::string_view) {});
+    testing::internal::CaptureStderr();
+    herc_printf("chatter\n");
+    LogBoth("an edit was lost\n");
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "an edit was lost\n");
+    testing::internal::CaptureStderr();
+    Qx::setLogSink(Qx::standardErrorSink());
+    herc_printf("asked for\n");
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "asked for\n");
+    // In a program without a sink the environment asks, when it starts.
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    ::setenv("QUILLMARCH_LOG", "1", 1);
+    EXPECT_EXIT(Qx::setLogSink({}); herc_printf("told"); std::exit(0), testing::ExitedWithCode(0), "told");
+    ::unsetenv("QUILLMARCH_LOG");
+    Qx::setLogSink(before);
+    Qx::setStandardOutputSink(outBefore);
+}
+
 TEST(Log, ASinkThatLogsDoesNotWaitForItself) {
     String taken;
     const auto before = Qx::setLogSink([&](std::string_view line) {

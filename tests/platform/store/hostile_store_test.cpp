@@ -90,6 +90,9 @@ protected:
         const auto took = std::chrono::steady_clock::now() - start;
         EXPECT_LT(took, std::chrono::seconds(1));
         EXPECT_EQ(m_bag.openError().empty(), result == TagBag::Opened);
+        EXPECT_EQ(m_bag.openStatus().code(), result == TagBag::Opened  ? Qx::StatusCode::Ok
+                                             : result == TagBag::Newer ? Qx::StatusCode::Newer
+                                                                       : Qx::StatusCode::Damaged);
         return result;
     }
     TagBag m_bag;
@@ -206,6 +209,7 @@ TEST_F(HostileStore, ObjectThatIsNoneIsRefusedAndKept) {
     ASSERT_EQ(openBytes(file), TagBag::Opened);
     EXPECT_EQ(m_bag.openObject("object1"), nullptr);
     EXPECT_NE(m_bag.objectError().find("object1"), String::npos);
+    EXPECT_EQ(m_bag.objectStatus().code(), Qx::StatusCode::Damaged);
     ASSERT_TRUE(m_bag.flush());
     EXPECT_EQ(bytes(), file);
 }

@@ -23,8 +23,10 @@ TEST_F(StoreTest, ObjectsComeBackInTheirOrder) {
 
     EXPECT_EQ(bag.openObject("absent"), nullptr);
     EXPECT_NE(bag.objectError().find("absent"), String::npos);
+    EXPECT_EQ(bag.objectStatus().code(), Qx::StatusCode::NotFound);
     EXPECT_EQ(bag.openObject("strange"), nullptr);
     EXPECT_NE(bag.objectError().find("Stranger"), String::npos);
+    EXPECT_EQ(bag.objectStatus().code(), Qx::StatusCode::Unsupported);
     Stranger stranger;
     EXPECT_TRUE(bag.readObject("strange", stranger));
     EXPECT_EQ(stranger.values, (Values{7}));
