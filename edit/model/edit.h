@@ -190,6 +190,16 @@ public:
     /// "ELAPSED_ORIGIN", seconds; 0.
     [[nodiscard]] double get_elapsed_time_origin() const;
     void set_elapsed_time_origin(double seconds);
+    /// "EDIT_START", the timecode of edit time 0 in frames of the edit's rate from midnight; that of the
+    /// elapsed time's origin.
+    [[nodiscard]] int64_t getStartTimecode() const;
+    void setStartTimecode(int64_t frames);
+    /// The same in seconds, where an origin need not lie on a frame.
+    [[nodiscard]] double getTimecodeOrigin() const;
+    /// "DROP_FRAME", whether timecodes are counted in drop frame; `otherwise`, for a sequence the project's
+    /// setting. False at a rate that has none.
+    [[nodiscard]] bool isDropFrame(bool otherwise) const;
+    void setDropFrame(bool dropFrame);
     /// "OWNER", the name of the user who made the edit, UTF-8; empty. With `notify` another owner records a
     /// change of type `kPropertiesChanged`.
     [[nodiscard]] String getOwner() const;

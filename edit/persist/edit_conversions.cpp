@@ -25,7 +25,7 @@ bool Edit::doEditConversions() {
     }
     clear_cache_flags();
     Qx::Ed2Support::TVStd standard = LegacyUpgrades::getTvStandard(m_header);
-    if (m_header.getInt(EditKeys::kTransferAudioMedium) == kPlainAudioMedium &&
+    if (EditKeys::kTransferAudioMedium.get(m_header) == kPlainAudioMedium &&
         standard.mediumCode == kMediumFilm24) {
         standard.mediumCode = kMediumFilm23;
     }

@@ -178,7 +178,7 @@ Qx::Status Edit::readED2Cels(const TextFile& file) {
 
 Qx::Status EditFile::readLegacyChannels(Edit& edit, const TextFile& file,
                                         std::vector<FileChannel>& sections) {
-    const int count = edit.m_header.getInt(EditKeys::kNumChans);
+    const int count = EditKeys::kNumChans.get(edit.m_header);
     unsigned next = readCueSection(file).after;
     while (std::ssize(sections) < count) {
         const int found = file.find(kChannelLine, next);

@@ -87,11 +87,11 @@ void scaleTimes(Edit& edit, double factor, double frame) {
 namespace LegacyUpgrades {
 
 Qx::Ed2Support::TVStd getTvStandard(const configb& header) {
-    const Qx::Ed2Support::TVStd named = Qx::Ed2Support::tvStdFromText(header.getString(EditKeys::kTvType));
+    const Qx::Ed2Support::TVStd named = Qx::Ed2Support::tvStdFromText(EditKeys::kTvType.get(header));
     if (named.known()) {
         return named;
     }
-    switch (header.getInt(EditKeys::kFrameRate)) {
+    switch (EditKeys::kFrameRate.get(header)) {
     case Qx::FrameRate::Fps24:
         return Qx::Ed2Support::tvStdFromText("pal_24");
     case Qx::FrameRate::Fps25:
@@ -100,7 +100,7 @@ Qx::Ed2Support::TVStd getTvStandard(const configb& header) {
         return Qx::Ed2Support::tvStdFromText("ntsc");
     default: {
         Qx::Ed2Support::TVStd other;
-        other.frameRateCode = Qx::FrameRate(header.getInt(EditKeys::kFrameRate)).code();
+        other.frameRateCode = Qx::FrameRate(EditKeys::kFrameRate.get(header)).code();
         return other;
     }
     }
@@ -115,10 +115,10 @@ Qx::Ed2Support::TVStd getNamedStandard(const TextFile& file) {
                                    : String();
     };
     configb header;
-    header.setString(EditKeys::kTvType, valueOf(String(EditKeys::kTvType) + ":textdata "));
+    EditKeys::kTvType.set(header, valueOf(String(EditKeys::kTvType) + ":textdata "));
     int code = 0;
     if (Qx::textToInt(valueOf(String(EditKeys::kFrameRate) + ":int "), code)) {
-        header.setInt(EditKeys::kFrameRate, code);
+        EditKeys::kFrameRate.set(header, code);
     }
     return getTvStandard(header);
 }
@@ -127,12 +127,11 @@ RememberedFlags::RememberedFlags(const Edit& edit)
     : m_hadSequence(edit.Opts().contains(EditKeys::kSequence)),
       m_hadFrameBased(edit.Opts().contains(EditKeys::kFrameBased)),
       m_hadTransfer(edit.Opts().contains(EditKeys::kTransfer)),
-      m_sequence(edit.Opts().getInt(EditKeys::kSequence)),
-      m_frameBased(edit.Opts().getInt(EditKeys::kFrameBased)),
-      m_transfer(edit.Opts().getInt(EditKeys::kTransfer)) {}
+      m_sequence(EditKeys::kSequence.get(edit.Opts())), m_frameBased(EditKeys::kFrameBased.get(edit.Opts())),
+      m_transfer(EditKeys::kTransfer.get(edit.Opts())) {}
 
 void RememberedFlags::restore(Edit& edit) const {
-    const auto put = [&edit](bool had, const char* key, int value) {
+    const auto put = [&edit](bool had, std::string_view key, int value) {
         if (had) {
             edit.Opts().setInt(key, value);
         } else {
@@ -237,7 +236,8 @@ void initialiseAudioVarispeeds(Edit& edit) {
 }
 
 void updateLegacyFileLabels(Edit& edit) {
-    if (edit.Opts().contains("numLabels_") || edit.Opts().contains("LABEL0")) {
+    if (edit.Opts().contains(EditKeys::kNumLabels) ||
+        edit.Opts().contains(EditKeys::numbered(EditKeys::kLabel, 0))) {
         notDone(edit, "updateLegacyFileLabels", "labels are kept as the texts that they are");
     }
 }

@@ -135,12 +135,8 @@ std::vector<String> placesOf(const Edit& edit) {
 
 /// The timecode of edit time 0: what an import found, else the elapsed time's origin.
 void takeTimecode(const Edit& edit, EditReport& report) {
-    const configb& header = edit.Opts();
-    report.dropFrame = header.getBool(interchange::EdlKey::kDropFrame, Qx::currentProject().dropFrame) &&
-                       report.rate.hasDropFrame();
-    report.origin = header.contains(interchange::EdlKey::kStart)
-                        ? report.rate.toSeconds(header.getInt64(interchange::EdlKey::kStart))
-                        : edit.get_elapsed_time_origin();
+    report.dropFrame = edit.isDropFrame(Qx::currentProject().dropFrame);
+    report.origin = edit.getTimecodeOrigin();
 }
 
 void takeCues(const Edit& edit, std::vector<CueReport>& cues) {

@@ -1,39 +1,7 @@
 #pragma once
 
 #include "edit/model/edit.h"
-
-/// Names in edit files. They live in files: do not change them.
-namespace EditKeys {
-inline constexpr const char* kNumChans = "NUM_CHANS";
-inline constexpr const char* kCurrentTime = "CURRENT_TIME";
-inline constexpr const char* kMarkTime = "MARK_TIME";
-inline constexpr const char* kSyncLoss = "SyncLoss";                   ///< followed by the channel index
-inline constexpr const char* kSyncError = "SYNC_ERROR";                ///< followed by the old index
-inline constexpr const char* kSoundOutput = "SOUND_OUTPUT_FLAG";       ///< followed by the old index
-inline constexpr const char* kSoundOutputXFade = "SOUND_OUTPUT_XFADE"; ///< followed by the old index
-inline constexpr const char* kEntireMedium = "ENTIRE_MEDIUM";
-inline constexpr const char* kLevels = "Levels";             ///< followed by a counter
-inline constexpr const char* kLevelsName = "LevelsName";     ///< followed by the counter of a Levels key
-inline constexpr const char* kLevelsPlace = "LevelsPlace";   ///< followed by the counter of a Levels key
-inline constexpr const char* kLevelsUnread = "LevelsUnread"; ///< followed by a counter
-inline constexpr const char* kCelKind = "CelKind";           ///< followed by the counter of a Celid object
-inline constexpr const char* kCelid = "Celid";               ///< name of a cel object, followed by a counter
-inline constexpr const char* kUnread = ".unread"; ///< ends the name of an object that was set aside
-inline constexpr const char* kCues = "CueId";     ///< name of the cue object
-inline constexpr const char* kTvType = "tvtype";
-inline constexpr const char* kFrameRate = "FRAME_RATE";
-inline constexpr const char* kRevision = "ED2_REVISION";
-inline constexpr const char* kFrameBased = "FRAME_BASED";
-inline constexpr const char* kTransfer = "TRANSFER";
-inline constexpr const char* kSequence = "SEQUENCE";
-inline constexpr const char* kTransferAudioMedium = "TRANSFER_AUDIO_MEDIUM";
-inline constexpr const char* kHeaderEnd = "END_EDIT_HEADER";
-
-/// A name followed by a number.
-[[nodiscard]] String numbered(const char* name, int number);
-/// Removes every key that is `name` followed by a number of at least `from`.
-void removeNumbered(configb& header, const char* name, int from);
-} // namespace EditKeys
+#include "edit/model/edit_keys.h"
 
 /// What reading and writing do inside an edit. The steps are called in the order in which they are declared;
 /// a step that fails says why in one sentence.
