@@ -130,7 +130,7 @@ void Editor::perform(edit_operation op, Result& result) {
     simplifyBlack();
     m_destination.getEdit()->get_cues().update_edit_time();
     verifyTracks();
-    verifyAudioNodes();
+    m_destination.getEdit()->verifyAudioNodes();
     result.m_syncLoss = recordInterTrackSyncLosses();
     result.m_curTime = m_plan->current;
     result.m_markValid = !editOpAffectsTrackSync(op);

@@ -40,7 +40,8 @@ private:
     Search lookAgain();
     [[nodiscard]] bool replaceDamaged(int& counter);
     [[nodiscard]] bool moveAside();
-    int restoreNewest();
+    /// Puts the newest undo backup in the place of the item's file. Its number; 0 when none was restored.
+    int shuffleUndoChain();
     void refuse(const String& reason);
     void tell(const String& what) const;
     [[nodiscard]] bool isOfThisProject() const;
@@ -227,7 +228,7 @@ EditPtr Opening::create() {
     return {};
 }
 
-int Opening::restoreNewest() {
+int Opening::shuffleUndoChain() {
     int restored = 0;
     if (const Qx::Status status = m_undo.restoreNewest(restored); !status) {
         refuse(status.reason());
@@ -289,7 +290,7 @@ Opening::Search Opening::lookAgain() {
     if (!m_writers.isHeld()) {
         return Search::FileIsThere; // or was a moment ago: to be looked at again from the start
     }
-    const int restored = restoreNewest();
+    const int restored = shuffleUndoChain();
     herc_printf("edit_manager::open( %s ) - missing, trying backup %d \n", cookie_string(m_item).c_str(),
                 restored);
     return restored != 0 ? Search::Restored : Search::NotKnown;
@@ -316,7 +317,7 @@ bool Opening::replaceDamaged(int& counter) {
     ++counter;
     herc_printf("edit_manager::open( %s ) - edit::read_file() failed, trying backup %d\n",
                 cookie_string(m_item).c_str(), counter);
-    const int restored = restoreNewest();
+    const int restored = shuffleUndoChain();
     m_writers.release();
     if (restored == 0 && !m_refused) {
         LogBoth("edit_manager::open( %s ) - No usable backups found\n", cookie_string(m_item).c_str());

@@ -233,6 +233,12 @@ bool Edit::setAudCel(const AudCel& audio, bool notify) {
     return true;
 }
 
+void Edit::verifyAudioNodes() {
+    for (const AudCel& audio : m_channels->audio()) {
+        getLevelsCel(audio.getLevelsChanID()).checkNodesRevision(audio);
+    }
+}
+
 String Edit::getChanName(const IdStamp& chan) const {
     const ChannelSet::Entry* const known = m_channels->entry(chan);
     return known != nullptr ? known->name : String();

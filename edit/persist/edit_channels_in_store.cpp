@@ -420,11 +420,11 @@ void EditFile::lendCels(Edit& edit) {
     edit.m_storedCels = std::move(lent);
 }
 
-void EditFile::extractCelsFromStore(Edit& edit, bool written) noexcept {
-    edit.m_store.releaseLent();
+void Edit::extractCelsFromStore(bool written) noexcept {
+    m_store.releaseLent();
     if (!written) {
         // What the store holds under each name is not known after a failure: the next save packs every cel.
-        edit.m_storedCels.reset();
+        m_storedCels.reset();
     }
 }
 

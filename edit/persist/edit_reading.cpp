@@ -1,5 +1,4 @@
 #include "edit/persist/detail/edit_file.h"
-#include "edit/persist/detail/legacy_upgrades.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 #include "platform/services/log.h"
@@ -40,9 +39,9 @@ Edit::Edit(const WString& path, eEditOpenBehaviour behaviour) : Edit() {
             return;
         }
         m_bad = false;
-        LegacyUpgrades::removeShotSoundRamps(*this);
-        LegacyUpgrades::initialiseAudioVarispeeds(*this);
-        LegacyUpgrades::updateLegacyFileLabels(*this);
+        removeShotSoundRamps();
+        initialiseAudioVarispeeds();
+        updateLegacyFileLabels();
         set_dirty(true);
         return;
     }

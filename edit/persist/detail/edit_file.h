@@ -42,7 +42,7 @@ public:
     class Lending {
     public:
         explicit Lending(Edit& edit) : m_edit(edit) {}
-        ~Lending() { extractCelsFromStore(m_edit, m_isWritten); }
+        ~Lending() { m_edit.extractCelsFromStore(m_isWritten); }
         void setWritten() { m_isWritten = true; }
         Lending(const Lending&) = delete;
         Lending& operator=(const Lending&) = delete;
@@ -114,8 +114,6 @@ public:
     /// What the header says of channels, times and flags, for a file that has the channels `order`.
     static void updateHeader(const Edit& edit, configb& header, const Vector<IdStamp>& order);
     static void lendCels(Edit& edit);
-    /// Ends the lending. Afterwards the edit alone owns its cels.
-    static void extractCelsFromStore(Edit& edit, bool written) noexcept;
     /// @}
 
     /// \name Legacy text
