@@ -58,7 +58,7 @@ EditPtr Edit::copy() const {
     twin->m_markTime = m_markTime;
     twin->clear_cache_flags();
     for (const String& name : m_store.names()) {
-        const ChannelSet::Entry* const channel = m_channels->entry(IdStamp(name));
+        const ChannelSet::Channel* const channel = m_channels->find(IdStamp(name));
         if (name == EditHeaderProxy::EditHeaderId || name == EditKeys::kCues ||
             name.starts_with(EditKeys::kCelid) ||
             (channel != nullptr && channel->list == ChannelSet::Levels)) {
@@ -74,8 +74,8 @@ EditPtr Edit::copy() const {
     twin->m_cues = m_cues;
     twin->m_celCuesLoaded = m_celCuesLoaded;
     for (int i = 0; i < getNumChans(); ++i) {
-        if (const cel* const its = get_edit_cel_p(i)) {
-            twin->m_cues.rebindCel(its, twin->get_edit_cel_p(i));
+        if (const cel* const content = get_edit_cel_p(i)) {
+            twin->m_cues.rebindCel(content, twin->get_edit_cel_p(i));
         }
     }
     twin->m_changes.setValueSilently(m_changes.getValue());

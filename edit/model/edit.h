@@ -270,6 +270,8 @@ public:
     [[nodiscard]] cel* getCel(const IdStamp& chan) const;
     [[nodiscard]] cel* get_edit_cel_p(int index) const;
     [[nodiscard]] cel* get_play_cel_p(int index) const { return get_edit_cel_p(index); }
+    /// The channel's own cel, shared; null for a levels channel or no channel.
+    [[nodiscard]] Qx::Ptr<cel> contentOf(const IdStamp& chan) const;
     /// True if both are channels, of one type.
     [[nodiscard]] bool sameType(const IdStamp& a, const IdStamp& b) const;
     /// True if the channel holds nothing but black, a levels channel no node; also for no channel.

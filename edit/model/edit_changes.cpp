@@ -111,12 +111,7 @@ bool Edit::isDirty(bool deep) const {
     if (get_dirty()) {
         return true;
     }
-    const auto changed = [](const auto& channel) { return channel.getCel()->changed(); };
-    return deep && (std::any_of(m_channels->effects().begin(), m_channels->effects().end(), changed) ||
-                    std::any_of(m_channels->video().begin(), m_channels->video().end(), changed) ||
-                    std::any_of(m_channels->audio().begin(), m_channels->audio().end(), changed) ||
-                    std::any_of(m_channels->levels().begin(), m_channels->levels().end(),
-                                [](const AudLevelsCel& levels) { return levels.changed(); }));
+    return deep && m_channels->any([](const ChannelSet::Channel& channel) { return channel.changed(); });
 }
 
 bool Edit::needsToBeWritten() {

@@ -320,18 +320,6 @@ void EditFile::setAside(Edit& edit, const String& object, const String& why) {
 
 // ---- writing
 
-Qx::Ptr<cel> EditFile::sharedCel(const Edit& edit, const IdStamp& chan) {
-    const Edit::ChanType type = edit.getChanTypeAndSubType(chan);
-    if (type.type == AudioChan) {
-        return edit.getAudCel(chan).sharedCel();
-    }
-    if (type.type != VideoChan) {
-        return nullptr;
-    }
-    return type.subtype == Edit_Chan_SubType::ALIAS ? edit.getVFXCel(chan).sharedCel()
-                                                    : edit.getVidCel(chan).sharedCel();
-}
-
 namespace {
 
 /// Levels channels with their audio channels, in the order of these.
@@ -385,7 +373,7 @@ void EditFile::lendCels(Edit& edit) {
     }
     for (int i = 0; i < edit.getNumChans(); ++i) {
         const IdStamp id = edit.getId(i);
-        const Qx::Ptr<cel> content = sharedCel(edit, id);
+        const Qx::Ptr<cel> content = edit.contentOf(id);
         if (content == nullptr) {
             continue;
         }
@@ -443,7 +431,7 @@ void EditFile::reset(Edit& edit) {
 void EditFile::markWritten(Edit& edit) {
     for (int i = 0; i < edit.getNumChans(); ++i) {
         const IdStamp id = edit.getId(i);
-        if (const Qx::Ptr<cel> content = sharedCel(edit, id)) {
+        if (const Qx::Ptr<cel> content = edit.contentOf(id)) {
             content->setChanged(false);
         } else if (AudLevelsCel levels = edit.getLevelsCel(id); levels.valid()) {
             levels.setChanged(false);

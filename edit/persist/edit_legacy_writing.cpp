@@ -143,7 +143,7 @@ unsigned Edit::writeED2Cels(TextFile& file, Qx::Ed2Support::TVStd standard) cons
     const Vector<IdStamp> chans = EditFile::legacyChannels(*this);
     unsigned written = 0;
     for (const IdStamp& chan : chans) {
-        const Qx::Ptr<cel> content = EditFile::sharedCel(*this, chan);
+        const Qx::Ptr<cel> content = contentOf(chan);
         if (content == nullptr) {
             continue;
         }

@@ -60,8 +60,6 @@ public:
     static void markWritten(Edit& edit);
     /// The state after a save that failed: the edit is dirty, and whoever writes dirty edits knows of it.
     static void markUnwritten(Edit& edit);
-    /// The content of a channel that has a cel; null for others.
-    [[nodiscard]] static Qx::Ptr<cel> sharedCel(const Edit& edit, const IdStamp& chan);
     /// The number that legacy headers give a channel: 0 the video channel, 1 the first audio channel and so
     /// on.
     [[nodiscard]] static int oldIndex(const Edit& edit, const IdStamp& audio);
