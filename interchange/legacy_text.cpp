@@ -1,6 +1,7 @@
 #include "interchange/legacy_text.h"
 
 #include "edit/model/edit.h"
+#include "edit/model/edit_keys.h"
 #include "platform/media/tv_standard.h"
 #include "platform/services/current_project.h"
 #include "platform/services/files.h"
@@ -85,10 +86,10 @@ Qx::Status importLegacyText(const String& path, Import& result) {
     // An item of its own in the project that it comes to.
     read->set_cookie(provisionalCookie(0));
     configb& header = read->Opts();
-    header.setInt("IS_BACKUP", 0);
-    header.setCookie("UNDO_COOKIE", invalid_cookie);
-    header.setCookie("REDO_COOKIE", invalid_cookie);
-    header.setCookie("PROJECT_COOKIE", Qx::currentProject().project);
+    EditKeys::kBackup.set(header, 0);
+    EditKeys::kUndoCookie.set(header, invalid_cookie);
+    EditKeys::kRedoCookie.set(header, invalid_cookie);
+    EditKeys::kProjectCookie.set(header, Qx::currentProject().project);
     read->init_dirty();
     Import made;
     made.report.setFile(Qx::fileNameOf(path));

@@ -2,6 +2,7 @@
 
 #include "edit/editing/detail/cue_follower.h"
 #include "edit/manager/edit_manager.h"
+#include "edit/model/edit_keys.h"
 #include "platform/services/config_int.h"
 #include "platform/services/log.h"
 
@@ -30,7 +31,7 @@ Editor::Result Editor::apply(const EditModule& source, const EditModule& destina
 }
 
 bool Editor::wasClipboardUsed(const EditPtr& edit) {
-    return edit.valid() && edit->Opts().getInt("CLIPBOARD_USED", 0) != 0;
+    return edit.valid() && EditKeys::kClipboardUsed.get(edit->Opts()) != 0;
 }
 
 Editor::Result Editor::applyInternal(const EditModule& source, const EditModule& destination,
@@ -140,7 +141,7 @@ void Editor::perform(edit_operation op, Result& result) {
     simplifyBlack();
     m_destination.getEdit()->get_cues().update_edit_time();
     verifyTracks();
-    verifyAudioNodes();
+    m_destination.getEdit()->verifyAudioNodes();
     result.m_syncLoss = recordInterTrackSyncLosses();
     result.m_curTime = m_plan->current;
     result.m_markValid = !editOpAffectsTrackSync(op);

@@ -191,7 +191,6 @@ private:
     void simplifyBlack();
     void noteTouched(const IdStamp& chan, const cel::Range& span);
     void verifyTracks();
-    void verifyAudioNodes();
     [[nodiscard]] bool recordInterTrackSyncLosses();
     [[nodiscard]] static bool stereoscopicExpansionRequired(const EditModule& source,
                                                             const EditModule& destination, edit_operation op);

@@ -1,5 +1,6 @@
 #include "edit/editing/detail/edit_plan.h"
 #include "edit/manager/edit_manager.h"
+#include "edit/model/edit_keys.h"
 #include "platform/services/log.h"
 
 #include <algorithm>
@@ -95,6 +96,6 @@ void Editor::doClipboardEditing(edit_operation op) {
         // Nothing was there; an edit without channels cannot be stored.
         setCel(*clipboard, {VideoChan, Edit_Chan_SubType::NONE}, nullptr);
     }
-    edit.Opts().setInt("CLIPBOARD_USED", 1);
+    EditKeys::kClipboardUsed.set(edit.Opts(), 1);
     clipboard->setChangeDescription(editModificationOf(op), true);
 }

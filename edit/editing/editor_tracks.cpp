@@ -178,15 +178,6 @@ void Editor::verifyTracks() {
     }
 }
 
-/// Brings the levels of the audio channels that were changed up to the revision of their content.
-void Editor::verifyAudioNodes() {
-    const Edit& edit = *m_destination.getEdit();
-    for (const Target& target : m_plan->targets) {
-        AudLevelsCel levels = edit.getLevelsCel(target.levels);
-        levels.checkNodesRevision(edit.getAudCel(target.chan));
-    }
-}
-
 bool Editor::stereoscopicExpansionRequired(const EditModule& source, const EditModule& destination,
                                            edit_operation op) {
     if (!editOpRequiresSourceAndDest(op)) {

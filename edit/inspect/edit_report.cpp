@@ -10,10 +10,6 @@
 
 namespace {
 
-/// Header keys of an imported edit: the timecode of edit time 0 in frames, and whether it is in drop frame.
-constexpr const char* kStartTimecode = "EDIT_START";
-constexpr const char* kDropFrame = "DROP_FRAME";
-
 SourceKind kindOf(const cookie& strip) {
     if (strip.isBlack()) {
         return SourceKind::Black;
@@ -138,11 +134,8 @@ std::vector<String> placesOf(const Edit& edit) {
 
 /// The timecode of edit time 0: what an import found, else the elapsed time's origin.
 void takeTimecode(const Edit& edit, EditReport& report) {
-    const configb& header = edit.Opts();
-    report.dropFrame =
-        header.getBool(kDropFrame, Qx::currentProject().dropFrame) && report.rate.hasDropFrame();
-    report.origin = header.contains(kStartTimecode) ? report.rate.toSeconds(header.getInt64(kStartTimecode))
-                                                    : edit.get_elapsed_time_origin();
+    report.dropFrame = edit.isDropFrame(Qx::currentProject().dropFrame);
+    report.origin = edit.getTimecodeOrigin();
 }
 
 void takeCues(const Edit& edit, std::vector<CueReport>& cues) {

@@ -1,5 +1,6 @@
 #include "edit/manager/detail/manager_state.h"
 #include "edit/manager/milestone_ring.h"
+#include "edit/model/edit_keys.h"
 #include "platform/media/frame_rate.h"
 #include "platform/services/atomic_batch.h"
 #include "platform/services/current_project.h"
@@ -15,16 +16,16 @@ namespace {
 bool writeWithMilestone(ManagerState::CachedEdit& entry, const MilestoneRing& milestones) {
     ManagerState& state = managerState();
     Edit& edit = *entry.edit;
-    const int64_t before = edit.Opts().getInt64(MilestoneRing::kHeaderKey);
-    edit.Opts().setInt64(MilestoneRing::kHeaderKey, static_cast<int64_t>(edit.getModificationCount()));
+    const int64_t before = EditKeys::kMilestone.get(edit.Opts());
+    EditKeys::kMilestone.set(edit.Opts(), static_cast<int64_t>(edit.getModificationCount()));
     if (!state.write(entry)) {
-        edit.Opts().setInt64(MilestoneRing::kHeaderKey, before);
+        EditKeys::kMilestone.set(edit.Opts(), before);
         return false;
     }
     if (const Qx::Status status = milestones.makeMilestoneBackup(entry.edit, entry.path); !status) {
         herc_printf("edit_manager::flush_changes: no milestone of %s was made: %s\n",
                     entry.item.asString().c_str(), status.reason().c_str());
-        edit.Opts().setInt64(MilestoneRing::kHeaderKey, before);
+        EditKeys::kMilestone.set(edit.Opts(), before);
     }
     return state.write(entry);
 }

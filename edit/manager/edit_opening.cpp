@@ -43,7 +43,8 @@ private:
     Search lookAgain();
     [[nodiscard]] bool replaceDamaged(int& counter);
     [[nodiscard]] bool moveAside();
-    int restoreNewest();
+    /// Puts the newest undo backup in the place of the item's file. Its number; 0 when none was restored.
+    int shuffleUndoChain();
     /// Takes notice of why the file does not open, or what keeps it from being replaced, and logs it.
     void complain(const Qx::Status& why);
     void refuse(const Qx::Status& why);
@@ -293,7 +294,7 @@ EditPtr Opening::create() {
     return {};
 }
 
-int Opening::restoreNewest() {
+int Opening::shuffleUndoChain() {
     if (m_numRestored == 0) {
         m_backups = m_undo.numbers();
     }
@@ -364,7 +365,7 @@ Opening::Search Opening::lookAgain() {
     if (!m_writers.isHeld()) {
         return Search::FileIsThere; // or was a moment ago: to be looked at again from the start
     }
-    const int restored = restoreNewest();
+    const int restored = shuffleUndoChain();
     herc_printf("edit_manager::open( %s ) - missing, trying backup %d \n", cookie_string(m_item).c_str(),
                 restored);
     return restored != 0 ? Search::Restored : Search::NotKnown;
@@ -391,7 +392,7 @@ bool Opening::replaceDamaged(int& counter) {
     ++counter;
     herc_printf("edit_manager::open( %s ) - edit::read_file() failed, trying backup %d\n",
                 cookie_string(m_item).c_str(), counter);
-    const int restored = restoreNewest();
+    const int restored = shuffleUndoChain();
     m_writers.release();
     if (restored == 0 && !m_refused) {
         LogBoth("edit_manager::open( %s ) - No usable backups found\n", cookie_string(m_item).c_str());

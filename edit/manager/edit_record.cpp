@@ -1,6 +1,6 @@
 #include "edit/manager/edit_record.h"
 
-#include "platform/media/timecode.h"
+#include "platform/media/time_def.h"
 #include "platform/services/current_project.h"
 
 namespace {
@@ -42,11 +42,10 @@ String chansOf(const Edit& edit) {
     return text;
 }
 
-String timeText(double seconds) {
+/// The form of times in the records of the current project.
+time_def recordTimes() {
     const Qx::CurrentProject project = Qx::currentProject();
-    const Qx::FrameRate rate(project.frameRateCode);
-    const int64_t frames = rate.toFrames(seconds);
-    return Qx::durationText(frames, rate, project.dropFrame);
+    return {Qx::FrameRate(project.frameRateCode), project.dropFrame};
 }
 
 } // namespace
@@ -59,8 +58,8 @@ projdb::Record editRecordOf(const Edit& edit, const Qx::FileInfo* file) {
     record[projdb::Type] = Edit::log_type_string_get_ms(type);
     record[projdb::Flags] = std::to_string(flagsOf(edit, type));
     record[projdb::Chans] = chansOf(edit);
-    record[projdb::StartTime] = timeText(start);
-    record[projdb::EndTime] = timeText(end);
+    record[projdb::StartTime] = recordTimes().asString(start);
+    record[projdb::EndTime] = recordTimes().asString(end);
     record[projdb::Name] = edit.getName();
     record[projdb::Rate] = edit.getFrameRate().asString();
     record[projdb::Duration] = Qx::doubleToText(end - start);
@@ -85,10 +84,5 @@ bool isRecordOfFile(const projdb::Record& record, const Qx::FileInfo& file) {
 }
 
 double recordTime(const String& text) {
-    const Qx::CurrentProject project = Qx::currentProject();
-    const Qx::FrameRate rate(project.frameRateCode);
-    int64_t frames = 0;
-    const bool read =
-        !text.empty() && rate.valid() && Qx::parseDuration(text, rate, project.dropFrame, frames).isOk();
-    return read ? rate.toSeconds(frames) : Qx::kNoTime;
+    return recordTimes().seconds(text);
 }

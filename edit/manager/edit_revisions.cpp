@@ -1,13 +1,12 @@
 #include "edit/manager/detail/manager_state.h"
 #include "edit/manager/revision_chain.h"
+#include "edit/model/edit_keys.h"
 #include "edit/project/permissions_manager.h"
 #include "platform/services/config_int.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/log.h"
 
 namespace {
-
-constexpr const char* kClipboardUsed = "CLIPBOARD_USED";
 
 int depth() {
     ManagerState& state = managerState();
@@ -70,7 +69,7 @@ private:
     }
     [[nodiscard]] bool clipboardFollows(const EditPtr& edit) const {
         return !m_item.isClipboard() && config_int("undo_clipboard", 1) != 0 &&
-               edit->Opts().getInt(kClipboardUsed) != 0;
+               EditKeys::kClipboardUsed.get(edit->Opts()) != 0;
     }
 
     cookie m_item;
@@ -351,8 +350,8 @@ bool edit_manager::backup_edit(const cookie& item) {
                         kept.reason().c_str());
             return false;
         }
-        if (edit->Opts().getInt(kClipboardUsed) != 0) {
-            edit->Opts().setInt(kClipboardUsed, 0);
+        if (EditKeys::kClipboardUsed.get(edit->Opts()) != 0) {
+            EditKeys::kClipboardUsed.set(edit->Opts(), 0);
         }
         edit->resetChangeDescription();
     }

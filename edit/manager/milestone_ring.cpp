@@ -1,6 +1,7 @@
 #include "edit/manager/milestone_ring.h"
 
 #include "edit/model/edit.h"
+#include "edit/model/edit_keys.h"
 #include "platform/services/atomic_batch.h"
 #include "platform/services/config_int.h"
 #include "platform/services/current_project.h"
@@ -27,7 +28,7 @@ bool MilestoneRing::isMilestoneBackupRequired(const EditPtr& edit) const {
     if (!edit.valid() || edit->get_cookie().isClipboard() || m_modsPerMilestone * m_milestonesPerEdit == 0) {
         return false;
     }
-    const auto last = static_cast<uint64_t>(std::max<int64_t>(edit->Opts().getInt64(kHeaderKey), 0));
+    const auto last = static_cast<uint64_t>(std::max<int64_t>(EditKeys::kMilestone.get(edit->Opts()), 0));
     return edit->getModificationCount() >= last + m_modsPerMilestone;
 }
 

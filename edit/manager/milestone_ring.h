@@ -35,9 +35,6 @@ public:
     /// Makes the missing levels of the folder in the current project.
     static Qx::Status makeMilestoneFolder(const cookie& edit);
 
-    /// Where an edit's header keeps its count of modifications at the last milestone.
-    static constexpr const char* kHeaderKey = "MILESTONE";
-
 private:
     uint64_t m_modsPerMilestone;
     uint64_t m_milestonesPerEdit;

@@ -30,7 +30,7 @@ public:
         const auto [place, isFree] = m_accessed.try_emplace(key);
         if (isFree) {
             try {
-                place->second = std::make_shared<AccessedObjectInfo>();
+                place->second = std::make_shared<AccessedObjectInfo>(key);
             } catch (...) {
                 m_accessed.erase(place);
                 throw;
@@ -84,6 +84,8 @@ private:
         bool signalled = false;
     };
     struct AccessedObjectInfo {
+        explicit AccessedObjectInfo(const Key& accessed) : key(accessed) {}
+        Key key; ///< what access is held to
         std::queue<Waiter*> waiters;
     };
 

@@ -1,5 +1,7 @@
 #include "edit/material/log_attributes.h"
 
+#include "edit/model/edit_keys.h"
+
 namespace {
 
 using Attribute = LogAttributes::LogAttribute;
@@ -14,8 +16,8 @@ struct AttributeRow {
 /// By number, from 1.
 constexpr AttributeRow kRows[] = {
     {"name", "slate/take", nullptr, "Name"},
-    {"date", "CREATION_TIME", nullptr, "Date"},
-    {nullptr, "MODIFICATION_TIME", "ModificationDate", "Modified"},
+    {"date", EditKeys::kCreationTime.name().data(), nullptr, "Date"},
+    {nullptr, EditKeys::kModificationTime.name().data(), "ModificationDate", "Modified"},
     {"scene", "scene", nullptr, "Scene"},
     {"shot", "shot", nullptr, "Shot"},
     {"who", "who", nullptr, "Who"},

@@ -1,6 +1,7 @@
 #include "edit/model/edit.h"
 
 #include "edit/model/detail/channel_set.h"
+#include "edit/model/edit_keys.h"
 #include "platform/services/log.h"
 #include "platform/store/edit_header_proxy.h"
 
@@ -11,7 +12,9 @@ std::atomic<bool> defaultDebugMode{false};
 
 } // namespace
 
-Edit::Edit() : m_header("EDIT", "END_EDIT_HEADER", this), m_channels(std::make_unique<ChannelSet>()) {
+Edit::Edit()
+    : m_header(EditKeys::kHeaderName, EditKeys::kHeaderEnd, this),
+      m_channels(std::make_unique<ChannelSet>()) {
     constructed.fetch_add(1);
     m_debug = defaultDebugMode.load();
     init();
@@ -55,8 +58,9 @@ EditPtr Edit::copy() const {
     twin->m_markTime = m_markTime;
     twin->clear_cache_flags();
     for (const String& name : m_store.names()) {
-        const ChannelSet::Entry* const channel = m_channels->entry(IdStamp(name));
-        if (name == EditHeaderProxy::EditHeaderId || name == "CueId" || name.starts_with("Celid") ||
+        const ChannelSet::Channel* const channel = m_channels->find(IdStamp(name));
+        if (name == EditHeaderProxy::EditHeaderId || name == EditKeys::kCues ||
+            name.starts_with(EditKeys::kCelid) ||
             (channel != nullptr && channel->list == ChannelSet::Levels)) {
             continue; // what a save puts there of the edit itself
         }
@@ -70,8 +74,8 @@ EditPtr Edit::copy() const {
     twin->m_cues = m_cues;
     twin->m_celCuesLoaded = m_celCuesLoaded;
     for (int i = 0; i < getNumChans(); ++i) {
-        if (const cel* const its = get_edit_cel_p(i)) {
-            twin->m_cues.rebindCel(its, twin->get_edit_cel_p(i));
+        if (const cel* const content = get_edit_cel_p(i)) {
+            twin->m_cues.rebindCel(content, twin->get_edit_cel_p(i));
         }
     }
     twin->m_changes.setValueSilently(m_changes.getValue());

@@ -190,6 +190,16 @@ public:
     /// "ELAPSED_ORIGIN", seconds; 0.
     [[nodiscard]] double get_elapsed_time_origin() const;
     void set_elapsed_time_origin(double seconds);
+    /// "EDIT_START", the timecode of edit time 0 in frames of the edit's rate from midnight; that of the
+    /// elapsed time's origin.
+    [[nodiscard]] int64_t getStartTimecode() const;
+    void setStartTimecode(int64_t frames);
+    /// The same in seconds, where an origin need not lie on a frame.
+    [[nodiscard]] double getTimecodeOrigin() const;
+    /// "DROP_FRAME", whether timecodes are counted in drop frame; `otherwise`, for a sequence the project's
+    /// setting. False at a rate that has none.
+    [[nodiscard]] bool isDropFrame(bool otherwise) const;
+    void setDropFrame(bool dropFrame);
     /// "OWNER", the name of the user who made the edit, UTF-8; empty. With `notify` another owner records a
     /// change of type `kPropertiesChanged`.
     [[nodiscard]] String getOwner() const;
@@ -260,6 +270,8 @@ public:
     [[nodiscard]] cel* getCel(const IdStamp& chan) const;
     [[nodiscard]] cel* get_edit_cel_p(int index) const;
     [[nodiscard]] cel* get_play_cel_p(int index) const { return get_edit_cel_p(index); }
+    /// The channel's own cel, shared; null for a levels channel or no channel.
+    [[nodiscard]] Qx::Ptr<cel> contentOf(const IdStamp& chan) const;
     /// True if both are channels, of one type.
     [[nodiscard]] bool sameType(const IdStamp& a, const IdStamp& b) const;
     /// True if the channel holds nothing but black, a levels channel no node; also for no channel.
@@ -278,6 +290,10 @@ public:
     /// the edit's, shares another cel than the channel's, or names a levels channel that is not there or is
     /// another audio channel's. A levels channel that is let go stays.
     bool setAudCel(const AudCel& audio, bool notify = true);
+
+    /// Brings the levels of every audio channel up to the revision of their content
+    /// (`AudLevelsCel::checkNodesRevision`). Records no change.
+    void verifyAudioNodes();
 
     /// The channel's own name (UTF-8, may be empty), and the name shown: its own, else "FX1", "V1", "A2",
     /// "L1" by its place in its list.
@@ -602,7 +618,45 @@ private:
     void updateHeaderBeforeWrite();
     void m_load_edit_bits_from_header();
     void getInfoFromHeader();
+    /// Ends the lending of the cels to the object store. Afterwards the edit alone owns them.
+    void extractCelsFromStore(bool written) noexcept;
+
+    /// \name Upgrades
+    /// The steps that bring an edit of an older revision, or one from a legacy text, to the current model.
+    /// Each repairs what it can and none fails the read; a step that cannot act on what it finds logs one
+    /// line.
+    /// @{
+    /// Runs the steps that the edit's revision asks for. False if it is current.
     bool doEditConversions();
+    /// For a shot: the picture format that its standard had would become its shot video metadata. The table
+    /// of output formats is not part of this library, so a shot keeps the metadata that it has.
+    void updateLegacyFormat(const Qx::Ed2Support::TVStd& standard);
+    /// Removes effects channels in which nothing but black lies; they were hidden and carried no effect.
+    /// Effects channels with content stay.
+    void removeHiddenFXTracks();
+    /// Gives channel stamps, levels channels included, the magic type of a channel; the other bits stay
+    /// unless that stamp is taken. Events that show such a channel follow.
+    void utilizeMagicIdStampsForChannelIds();
+    /// Material nodes of effect graphs would become transient. Effect graphs are not read here; they stay in
+    /// the file as they are.
+    void makeMaterialNodesTransient();
+    /// Every event gets an identity of its own; a log line tells how many were given.
+    void validateUTRIDs();
+    /// Turns level ramps of clips into nodes of a levels channel, in an edit without levels channels.
+    void removeShotSoundRamps();
+    /// Every audio event plays at speed 1.
+    void initialiseAudioVarispeeds();
+    /// Labels of older revisions would move to the rolls of current ones. Labels are carried along as the
+    /// header texts that they are.
+    void updateLegacyFileLabels();
+    /// Maps times from the rate that a standard named to the one that it stands for, and sets the source
+    /// medium. The duration of a shot's source is its end time as it is: no translation between media is
+    /// made, and no film-sync playback factor is derived.
+    void updateLegacyFrameRate(const Qx::Ed2Support::TVStd& standard);
+    /// Effects of older revisions would be replaced. They stay as they are.
+    void replaceLegacyEffects();
+    /// @}
+
     [[nodiscard]] bool isReadOnlyForUser() const;
     /// Read-only for the user or by its header.
     [[nodiscard]] bool isReadOnly() const;

@@ -1,5 +1,6 @@
 #include "edit/model/detail/channel_set.h"
 #include "edit/model/edit.h"
+#include "edit/model/edit_keys.h"
 #include "edit/model/edit_registry.h"
 #include "edit/project/permissions_manager.h"
 #include "platform/services/log.h"
@@ -110,12 +111,7 @@ bool Edit::isDirty(bool deep) const {
     if (get_dirty()) {
         return true;
     }
-    const auto changed = [](const auto& channel) { return channel.getCel()->changed(); };
-    return deep && (std::any_of(m_channels->effects().begin(), m_channels->effects().end(), changed) ||
-                    std::any_of(m_channels->video().begin(), m_channels->video().end(), changed) ||
-                    std::any_of(m_channels->audio().begin(), m_channels->audio().end(), changed) ||
-                    std::any_of(m_channels->levels().begin(), m_channels->levels().end(),
-                                [](const AudLevelsCel& levels) { return levels.changed(); }));
+    return deep && m_channels->any([](const ChannelSet::Channel& channel) { return channel.changed(); });
 }
 
 bool Edit::needsToBeWritten() {
@@ -175,14 +171,14 @@ void Edit::setChangeDescription(const EditModification& modification, bool notif
 void Edit::writeDescription() {
     const QuietHeader quiet(*this);
     const bool wasDirty = m_header.isDirty();
-    m_header.setString("CHANGE_DESCRIPTION", m_changes.getValue().asString());
+    EditKeys::kChangeDescription.set(m_header, m_changes.getValue().asString());
     incModificationCount();
     m_header.setDirty(wasDirty);
 }
 
 EditModification Edit::getChangeDescription() const {
-    return m_header.contains("CHANGE_DESCRIPTION")
-               ? EditModification::fromString(m_header.getString("CHANGE_DESCRIPTION"))
+    return m_header.contains(EditKeys::kChangeDescription)
+               ? EditModification::fromString(EditKeys::kChangeDescription.get(m_header))
                : EditModification(kNotDescribed);
 }
 
@@ -190,7 +186,7 @@ void Edit::resetChangeDescription() {
     const QuietHeader quiet(*this);
     const bool wasDirty = m_header.isDirty();
     m_changes.setValueSilently(kInitial);
-    m_header.remove("CHANGE_DESCRIPTION");
+    m_header.remove(EditKeys::kChangeDescription);
     m_header.setDirty(wasDirty);
 }
 

@@ -7,10 +7,16 @@
 namespace {
 
 using List = Edit::ChannelSet::List;
-using Place = Edit::ChannelSet::Place;
+using Channel = Edit::ChannelSet::Channel;
 
 /// The new cels are filled to the end of the edit.
 constexpr double kFillToEdit = -1.0;
+
+/// A channel that was taken out, and its index before.
+struct Removed {
+    std::unique_ptr<Channel> channel;
+    int index = NO_CHAN;
+};
 
 /// Prints why `count` more channels do not fit into a list, if they do not: for its own limit, or because an
 /// index would reach `NO_CHAN`.
@@ -37,10 +43,10 @@ size_t Edit::insertionPosition(Edit_Chan_Type type, Edit_Chan_SubType subtype, i
         return end;
     }
     const int beforeWhich = before ? at : at + 1;
-    const Place place = m_channels->find(beforeWhich);
-    const bool asAsked = before ? place.list == list
+    const Channel* const behind = m_channels->find(beforeWhich);
+    const bool asAsked = before ? behind != nullptr && behind->list == list
                                 : getChanType(beforeWhich) == type && getChanSubtype(beforeWhich) == subtype;
-    return asAsked ? place.position : end;
+    return asAsked ? static_cast<size_t>(m_channels->position(behind)) : end;
 }
 
 bool Edit::insertChans(Edit_Chan_Type type, Edit_Chan_SubType subtype, int at, unsigned count, bool before,
@@ -56,18 +62,18 @@ IdStamp Edit::insertChannels(ChanType type, int at, unsigned count, bool before,
         return {};
     }
     const double fillTo = time == kFillToEdit ? get_start_or_end_time(false, false) : time;
-    const Place first{list, insertionPosition(type.type, type.subtype, at, before)};
+    const size_t first = insertionPosition(type.type, type.subtype, at, before);
     IdStamp firstId;
     for (unsigned i = 0; i < count; ++i) {
         const IdStamp id = usableStamp(IdStamp());
         firstId = i == 0 ? id : firstId;
-        const Qx::Ptr<cel> its = content != nullptr ? Qx::Ptr<cel>(content) : std::make_shared<cel>();
-        m_channels->insert(list, first.position + i, its, id);
+        const Qx::Ptr<cel> placed = content != nullptr ? Qx::Ptr<cel>(content) : std::make_shared<cel>();
+        m_channels->insert(list, first + i, placed, id);
         if (fillTo > 0 && content == nullptr) {
-            its->fillToTime(fillTo);
+            placed->fillToTime(fillTo);
         }
     }
-    const int index = m_channels->index(first);
+    const int index = static_cast<int>(m_channels->first(list) + first);
     shuffleCueChans(index, static_cast<int>(count));
     dropDerivedValues();
 
@@ -93,16 +99,16 @@ int Edit::addChan(Edit_Chan_Type type, cel* content, bool notify, Edit_Chan_SubT
 }
 
 IdStamp Edit::addLevelsChan(const IdStamp& audio, const AudLevelsCel& levels, bool notify) {
-    const Place place = m_channels->find(audio);
-    if (place.list != ChannelSet::Audio || !levels.valid() ||
-        m_channels->audio()[place.position].getLevelsChanID().valid() || refusesChange() ||
+    Channel* const known = m_channels->find(audio);
+    if (known == nullptr || known->list != ChannelSet::Audio || !levels.valid() ||
+        known->sound.getLevelsChanID().valid() || refusesChange() ||
         !fits(ChannelSet::Levels, *m_channels, 1, m_cookie)) {
         return {};
     }
-    const IdStamp owner = audio;
+    const IdStamp owner = known->id;
     const IdStamp id = usableStamp(levels.id());
     const int index = getNumChans();
-    m_channels->insertLevels(levels, id, place.position);
+    m_channels->insertLevels(levels, id, *known);
     shuffleCueChans(index, 1);
     dropDerivedValues();
     soundChanged(kLevelsChanged, owner, notify);
@@ -114,20 +120,20 @@ bool Edit::isGivenCel(const cel* content) {
 }
 
 bool Edit::removeChan(const IdStamp& chan, bool notify) {
-    const Place place = m_channels->find(chan);
-    if (!place || refusesChange()) {
+    const Channel* const known = m_channels->find(chan);
+    if (known == nullptr || refusesChange()) {
         return false;
     }
-    const IdStamp levels =
-        place.list == ChannelSet::Audio ? m_channels->audio()[place.position].getLevelsChanID() : IdStamp();
-    std::vector<ChannelSet::Removed> removed;
     // The levels first: they lie behind, so both indices are those from before the removal.
-    if (const Place levelsPlace = m_channels->find(levels)) {
-        channelRemoved(levels, m_channels->index(levelsPlace));
-        removed.push_back(m_channels->remove(levelsPlace));
+    std::vector<Removed> removed; // kept until everybody was told
+    if (const Channel* const levels = m_channels->find(known->sound.getLevelsChanID())) {
+        removed.push_back({nullptr, m_channels->index(levels)});
+        channelRemoved(levels->id, removed.back().index);
+        removed.back().channel = m_channels->remove(*levels);
     }
-    channelRemoved(m_channels->id(place), m_channels->index(place));
-    removed.push_back(m_channels->remove(place));
+    removed.push_back({nullptr, m_channels->index(known)});
+    channelRemoved(known->id, removed.back().index);
+    removed.back().channel = m_channels->remove(*known);
     dropDerivedValues();
 
     if (!notify) {
@@ -135,11 +141,12 @@ bool Edit::removeChan(const IdStamp& chan, bool notify) {
         return true;
     }
     const KeepAlive keep(*this);
-    const ChannelSet::Removed& main = removed.back();
-    const EditModification change = EditModification(kChansRemoved).setChan(main.id).setChans(main.index, 1);
+    const Removed& main = removed.back();
+    const EditModification change =
+        EditModification(kChansRemoved).setChan(main.channel->id).setChans(main.index, 1);
     recordChange(change, false);
-    for (const ChannelSet::Removed& gone : removed) {
-        sendChannelMessage(getChanDeletedNotifyMsgType(), ChannelSet::typeOf(gone.list).type, gone.index, 1);
+    for (const Removed& gone : removed) {
+        sendChannelMessage(getChanDeletedNotifyMsgType(), gone.channel->type().type, gone.index, 1);
     }
     recordChange(change, true);
     return true;
@@ -151,10 +158,10 @@ bool Edit::removeChans(bool notify) {
         return false;
     }
     allChannelsRemoved();
-    std::vector<ChannelSet::Removed> removed; // kept until everybody was told
+    std::vector<std::unique_ptr<Channel>> removed; // kept until everybody was told
     removed.reserve(static_cast<size_t>(count));
     for (int i = count - 1; i >= 0; --i) {
-        removed.push_back(m_channels->remove(m_channels->find(i)));
+        removed.push_back(m_channels->remove(*m_channels->find(i)));
     }
     dropDerivedValues();
 

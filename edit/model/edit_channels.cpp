@@ -7,7 +7,7 @@
 namespace {
 
 using List = Edit::ChannelSet::List;
-using Place = Edit::ChannelSet::Place;
+using Channel = Edit::ChannelSet::Channel;
 
 /// True if a filter value lets a value pass: the wildcard, the same, or a bit in common.
 template <typename Bits>
@@ -17,9 +17,9 @@ bool passes(Bits filter, Bits wildcard, Bits value) {
 }
 
 /// The name by which a channel is shown that has none of its own.
-String standardName(const Place& place) {
+String standardName(const Edit::ChannelSet& channels, const Channel& channel) {
     const char* letters = "";
-    switch (place.list) {
+    switch (channel.list) {
     case Edit::ChannelSet::Effects:
         letters = "FX";
         break;
@@ -35,7 +35,11 @@ String standardName(const Place& place) {
     case Edit::ChannelSet::kNumLists:
         return {};
     }
-    return String::format("%s%zu", letters, place.position + 1);
+    return String::format("%s%d", letters, channels.position(&channel) + 1);
+}
+
+Edit::ChanType typeOf(const Channel* channel) {
+    return channel != nullptr ? channel->type() : Edit::ChanType();
 }
 
 /// A name is a line of text: files write it on one.
@@ -64,7 +68,8 @@ uint16_t Edit::getNumChans(Edit_Chan_Type type, Edit_Chan_SubType subtype) const
 }
 
 IdStamp Edit::getId(int index) const {
-    return m_channels->id(m_channels->find(index));
+    const Channel* const known = m_channels->find(index);
+    return known != nullptr ? known->id : IdStamp();
 }
 
 int Edit::getIdx(const IdStamp& chan) const {
@@ -72,21 +77,19 @@ int Edit::getIdx(const IdStamp& chan) const {
 }
 
 int Edit::getIndexWithinType(const IdStamp& chan) const {
-    const Place place = m_channels->find(chan);
-    return place ? static_cast<int>(place.position) : NO_CHAN;
+    return m_channels->position(m_channels->find(chan));
 }
 
 int Edit::getIndexWithinType(int index) const {
-    const Place place = m_channels->find(index);
-    return place ? static_cast<int>(place.position) : NO_CHAN;
+    return m_channels->position(m_channels->find(index));
 }
 
 Edit_Chan_Type Edit::getChanType(int index) const {
-    return ChannelSet::typeOf(m_channels->find(index).list).type;
+    return typeOf(m_channels->find(index)).type;
 }
 
 Edit_Chan_SubType Edit::getChanSubtype(int index) const {
-    return ChannelSet::typeOf(m_channels->find(index).list).subtype;
+    return typeOf(m_channels->find(index)).subtype;
 }
 
 Edit_Chan_Type Edit::getChanType(const IdStamp& chan) const {
@@ -98,18 +101,17 @@ Edit_Chan_SubType Edit::getChanSubtype(const IdStamp& chan) const {
 }
 
 Edit::ChanType Edit::getChanTypeAndSubType(const IdStamp& chan) const {
-    const ChannelSet::Entry* const known = m_channels->entry(chan);
-    return known != nullptr ? ChannelSet::typeOf(known->list) : ChanType();
+    return typeOf(m_channels->find(chan));
 }
 
 bool Edit::chanValid(int index, Edit_Chan_Type type) const {
-    const Place place = m_channels->find(index);
+    const Channel* const known = m_channels->find(index);
     switch (type) {
     case AnyChan:
-        return static_cast<bool>(place);
+        return known != nullptr;
     case VideoChan:
     case AudioChan:
-        return ChannelSet::typeOf(place.list).type == type && m_channels->content(place) != nullptr;
+        return typeOf(known).type == type && known->content != nullptr;
     default:
         return false;
     }
@@ -128,7 +130,7 @@ int Edit::getNextChan(int& index, Edit_Chan_Type type, Edit_Chan_SubType subtype
     const int count = getNumChans();
     int next = index >= kBeforeFirstChan && index < count ? index + 1 : count;
     for (; next < count; ++next) {
-        const ChanType chan = ChannelSet::typeOf(m_channels->find(next).list);
+        const ChanType chan = m_channels->find(next)->type();
         if (passes(type, AnyChan, chan.type) && passes(subtype, Edit_Chan_SubType::ANY, chan.subtype)) {
             return index = next;
         }
@@ -149,12 +151,13 @@ void Edit::getChans(Vector<IdStamp>& chans, Edit_Chan_Type type, Edit_Chan_SubTy
 }
 
 cel* Edit::getCel(const IdStamp& chan) const {
-    const ChannelSet::Entry* const known = m_channels->entry(chan);
+    const Channel* const known = m_channels->find(chan);
     return known != nullptr ? known->cached : nullptr;
 }
 
 cel* Edit::get_edit_cel_p(int index) const {
-    return m_channels->content(m_channels->find(index));
+    const Channel* const known = m_channels->find(index);
+    return known != nullptr ? known->content.get() : nullptr;
 }
 
 bool Edit::sameType(const IdStamp& a, const IdStamp& b) const {
@@ -162,12 +165,11 @@ bool Edit::sameType(const IdStamp& a, const IdStamp& b) const {
 }
 
 bool Edit::isEmpty(int index) const {
-    const Place place = m_channels->find(index);
-    if (place.list == ChannelSet::Levels) {
-        return m_channels->levels()[place.position].is_dummy();
+    const Channel* const known = m_channels->find(index);
+    if (known == nullptr) {
+        return true;
     }
-    const cel* const content = m_channels->content(place);
-    return content == nullptr || content->isEmpty();
+    return known->content != nullptr ? known->content->isEmpty() : known->levels.is_dummy();
 }
 
 bool Edit::isEmpty(const IdStamp& chan) const {
@@ -175,50 +177,52 @@ bool Edit::isEmpty(const IdStamp& chan) const {
 }
 
 bool Edit::isEmpty() const {
-    for (int i = 0; i < getNumChans(); ++i) {
-        if (!isEmpty(i)) {
-            return false;
-        }
-    }
-    return true;
+    return !m_channels->any([](const Channel& channel) {
+        return channel.content != nullptr ? !channel.content->isEmpty() : !channel.levels.is_dummy();
+    });
+}
+
+Qx::Ptr<cel> Edit::contentOf(const IdStamp& chan) const {
+    const Channel* const known = m_channels->find(chan);
+    return known != nullptr ? known->content : nullptr;
 }
 
 VidCel Edit::getVidCel(const IdStamp& chan) const {
-    const Place place = m_channels->find(chan);
-    return place.list == ChannelSet::Video ? m_channels->video()[place.position] : VidCel::createInvalid();
+    const Channel* const known = m_channels->find(chan);
+    return known != nullptr && known->list == ChannelSet::Video ? VidCel(known->content, known->id)
+                                                                : VidCel::createInvalid();
 }
 
 VFXCel Edit::getVFXCel(const IdStamp& chan) const {
-    const Place place = m_channels->find(chan);
-    return place.list == ChannelSet::Effects ? m_channels->effects()[place.position]
-                                             : VFXCel::createInvalid();
+    const Channel* const known = m_channels->find(chan);
+    return known != nullptr && known->list == ChannelSet::Effects ? VFXCel(known->content, known->id)
+                                                                  : VFXCel::createInvalid();
 }
 
 AudCel Edit::getAudCel(const IdStamp& chan) const {
-    const Place place = m_channels->find(chan);
-    return place.list == ChannelSet::Audio ? m_channels->audio()[place.position] : AudCel::createInvalid();
+    const Channel* const known = m_channels->find(chan);
+    return known != nullptr && known->list == ChannelSet::Audio ? known->sound : AudCel::createInvalid();
 }
 
 AudLevelsCel Edit::getLevelsCel(const IdStamp& chan) const {
-    const Place place = m_channels->find(chan);
-    return place.list == ChannelSet::Levels ? m_channels->levels()[place.position]
-                                            : AudLevelsCel::createInvalid();
+    const Channel* const known = m_channels->find(chan);
+    return known != nullptr && known->list == ChannelSet::Levels ? known->levels
+                                                                 : AudLevelsCel::createInvalid();
 }
 
 bool Edit::setAudCel(const AudCel& audio, bool notify) {
-    const Place place = m_channels->find(audio.id());
-    if (place.list != ChannelSet::Audio || m_channels->content(place) != audio.getCel()) {
+    Channel* const known = m_channels->find(audio.id());
+    if (known == nullptr || known->list != ChannelSet::Audio || known->content != audio.sharedCel()) {
         return false;
     }
     const IdStamp& levels = audio.getLevelsChanID();
     if (levels.valid()) {
-        const AudCel* const owner = m_channels->audioOf(levels);
-        if (m_channels->find(levels).list != ChannelSet::Levels ||
-            (owner != nullptr && owner->id() != audio.id())) {
+        const Channel* const owner = m_channels->audioOf(levels);
+        if (!getLevelsCel(levels).valid() || (owner != nullptr && owner != known)) {
             return false;
         }
     }
-    const AudCel& present = m_channels->audio()[place.position];
+    const AudCel& present = known->sound;
     const bool fades = present.getXFadesEnabled() != audio.getXFadesEnabled();
     const bool sound = present.getSoundOutputEnabled() != audio.getSoundOutputEnabled() ||
                        present.getLevelsChanID() != levels;
@@ -228,18 +232,26 @@ bool Edit::setAudCel(const AudCel& audio, bool notify) {
     if (refusesChange()) {
         return false;
     }
-    m_channels->setAudio(place.position, audio);
+    known->sound = audio;
     soundChanged(sound ? kLevelsChanged : kFadesChanged, audio.id(), notify);
     return true;
 }
 
+void Edit::verifyAudioNodes() {
+    m_channels->forEach([this](const Channel& channel) {
+        if (channel.list == ChannelSet::Audio) {
+            getLevelsCel(channel.sound.getLevelsChanID()).checkNodesRevision(channel.sound);
+        }
+    });
+}
+
 String Edit::getChanName(const IdStamp& chan) const {
-    const ChannelSet::Entry* const known = m_channels->entry(chan);
+    const Channel* const known = m_channels->find(chan);
     return known != nullptr ? known->name : String();
 }
 
 bool Edit::setChanName(const IdStamp& chan, const String& name) {
-    ChannelSet::Entry* const known = m_channels->entry(chan);
+    Channel* const known = m_channels->find(chan);
     if (known == nullptr || !isGoodName(name) || (known->name != name && refusesChange())) {
         return false;
     }
@@ -251,11 +263,11 @@ bool Edit::setChanName(const IdStamp& chan, const String& name) {
 }
 
 String Edit::getChanDisplayName(const IdStamp& chan) const {
-    const ChannelSet::Entry* const known = m_channels->entry(chan);
+    const Channel* const known = m_channels->find(chan);
     if (known == nullptr) {
         return {};
     }
-    return known->name.empty() ? standardName(m_channels->find(chan)) : known->name;
+    return known->name.empty() ? standardName(*m_channels, *known) : known->name;
 }
 
 IdStamp Edit::getChanWithName(const String& name) const {
@@ -269,12 +281,12 @@ IdStamp Edit::getChanWithName(const String& name) const {
 }
 
 String Edit::getMaterialInfo(const IdStamp& chan) const {
-    const ChannelSet::Entry* const known = m_channels->entry(chan);
+    const Channel* const known = m_channels->find(chan);
     return known != nullptr ? known->materialInfo : String();
 }
 
 bool Edit::setMaterialInfo(const IdStamp& chan, const String& text) {
-    ChannelSet::Entry* const known = m_channels->entry(chan);
+    Channel* const known = m_channels->find(chan);
     if (known == nullptr || (known->materialInfo != text && refusesChange())) {
         return false;
     }
@@ -286,39 +298,40 @@ bool Edit::setMaterialInfo(const IdStamp& chan, const String& text) {
 }
 
 bool Edit::set_edit_cel_p(int index, cel* content, bool notify) {
-    const Place place = m_channels->find(index);
-    if (!isGivenCel(content) || m_channels->content(place) == nullptr) {
+    Channel* const known = m_channels->find(index);
+    if (!isGivenCel(content) || known == nullptr || known->content == nullptr) {
         return false;
     }
-    if (content == m_channels->content(place)) {
+    if (content == known->content.get()) {
         return true;
     }
     if (refusesChange()) {
         return false;
     }
-    celReplaced(m_channels->content(place), content);
-    m_channels->setContent(place, Qx::Ptr<cel>(content));
-    if (place.list == ChannelSet::Audio) {
-        soundChanged(kEventsChanged, m_channels->id(place), notify);
+    celReplaced(known->content.get(), content);
+    ChannelSet::setContent(*known, Qx::Ptr<cel>(content));
+    const IdStamp chan = known->id;
+    if (known->list == ChannelSet::Audio) {
+        soundChanged(kEventsChanged, chan, notify);
     } else {
-        recordChangeOf(kEventsChanged, m_channels->id(place), notify);
+        recordChangeOf(kEventsChanged, chan, notify);
     }
     return true;
 }
 
 bool Edit::cacheCelForTrack(const IdStamp& chan, cel* content) {
-    const Place place = m_channels->find(chan);
-    if (!place || place.list == ChannelSet::Levels) {
+    Channel* const known = m_channels->find(chan);
+    if (known == nullptr || known->list == ChannelSet::Levels) {
         return false;
     }
-    m_channels->entry(chan)->cached = isGivenCel(content) ? content : m_channels->content(place);
+    known->cached = isGivenCel(content) ? content : known->content.get();
     return true;
 }
 
 bool Edit::setChannelID(const IdStamp& chan, const IdStamp& newId) {
     const IdStamp old = chan;
-    const Place place = m_channels->find(chan);
-    if (!place || !newId.valid()) {
+    Channel* const known = m_channels->find(chan);
+    if (known == nullptr || !newId.valid()) {
         return false;
     }
     if (chan == newId) {
@@ -328,7 +341,7 @@ bool Edit::setChannelID(const IdStamp& chan, const IdStamp& newId) {
         return false;
     }
     const IdStamp wanted = newId;
-    m_channels->rename(place, wanted);
+    m_channels->rename(*known, wanted);
     channelRenamed(old, wanted);
     recordUndescribed();
     return true;
@@ -340,14 +353,12 @@ IdStamp Edit::setupEditChannel(ChanType type, Qx::Ptr<cel> content) {
         return {};
     }
     const IdStamp id = usableStamp(content->editChannelId());
-    const Place place{list, m_channels->size(list)};
     const String name = content->editChannelName();
     const String materialInfo = content->editChannelMaterialInfo();
-    m_channels->insert(list, place.position, std::move(content), id);
-    ChannelSet::Entry* const known = m_channels->entry(id);
+    Channel& added = m_channels->insert(list, m_channels->size(list), std::move(content), id);
     // The name kept with a cel is the one shown: the standard one says that the channel has none of its own.
-    known->name = name == standardName(place) || !isGoodName(name) ? String() : name;
-    known->materialInfo = materialInfo;
+    added.name = name == standardName(*m_channels, added) || !isGoodName(name) ? String() : name;
+    added.materialInfo = materialInfo;
     dropDerivedValues();
     return id;
 }
@@ -367,27 +378,25 @@ double Edit::get_start_or_end_time(bool start, bool withLevels) const {
             any = true;
         }
     };
-    for (int i = 0; i < getNumChans(); ++i) {
-        const Place place = m_channels->find(i);
-        if (place.list == ChannelSet::Levels) {
-            const AudLevelsCel& levels = m_channels->levels()[place.position];
-            if (withLevels && !levels.is_dummy()) {
-                widen(levels.getExtents());
+    m_channels->forEach([&](const Channel& channel) {
+        if (channel.list == ChannelSet::Levels) {
+            if (withLevels && !channel.levels.is_dummy()) {
+                widen(channel.levels.getExtents());
             }
-        } else if (const cel* const content = m_channels->content(place); content->numEvents() > 0) {
-            widen({content->get_start_time(), content->get_end_time()});
+        } else if (channel.content->numEvents() > 0) {
+            widen({channel.content->get_start_time(), channel.content->get_end_time()});
         }
-    }
+    });
     return start ? extent.start() : extent.end();
 }
 
 double Edit::getSyncLoss(const IdStamp& chan) const {
-    const ChannelSet::Entry* const known = m_channels->entry(chan);
+    const Channel* const known = m_channels->find(chan);
     return known != nullptr ? known->syncLoss : 0;
 }
 
 bool Edit::setSyncLoss(const IdStamp& chan, double seconds, bool notify) {
-    ChannelSet::Entry* const known = m_channels->entry(chan);
+    Channel* const known = m_channels->find(chan);
     if (known == nullptr || !std::isfinite(seconds) || (known->syncLoss != seconds && refusesChange())) {
         return false;
     }

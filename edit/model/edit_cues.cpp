@@ -1,11 +1,9 @@
 #include "edit/model/edit.h"
+#include "edit/model/edit_keys.h"
 
 #include <unordered_set>
 
 namespace {
-
-/// The cue list's name in the object store. It lives in files: do not change it.
-constexpr const char* kCueId = "CueId";
 
 bool isCelCue(const cue_point& cue) {
     return cue.attached() && !cue.hasFlags(CueFlag::kKept);
@@ -76,15 +74,15 @@ void Edit::storeCues() {
         }
     }
     kept->dropCels(); // they may go before the stored cues do
-    m_store.storeObject(kCueId, std::move(kept));
+    m_store.storeObject(EditKeys::kCues, std::move(kept));
 }
 
 bool Edit::retrieveCues() {
-    if (!m_store.contains(kCueId)) {
+    if (!m_store.contains(EditKeys::kCues)) {
         m_cues.delete_all_cues();
         return true;
     }
-    const auto* stored = dynamic_cast<const cue_list*>(m_store.openObject(kCueId));
+    const auto* stored = dynamic_cast<const cue_list*>(m_store.openObject(EditKeys::kCues));
     if (stored == nullptr) {
         return false;
     }

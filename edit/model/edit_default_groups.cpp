@@ -1,15 +1,9 @@
 #include "edit/model/edit.h"
+#include "edit/model/edit_keys.h"
 
 #include "platform/services/log.h"
 
 #include <algorithm>
-
-namespace {
-
-/// The header text of groups in older files. It lives in files: do not change it.
-constexpr const char* kLegacyGroups = "CHAN_GRPS";
-
-} // namespace
 
 bool Edit::isDefaultGroupingPresent() const {
     if (get_log_type() != kLogShot) {
@@ -60,7 +54,7 @@ bool Edit::updateDefaultGroupingForShot() {
 }
 
 String Edit::getGroupTextFromED2() const {
-    return m_header.getString(kLegacyGroups);
+    return EditKeys::kLegacyGroups.get(m_header);
 }
 
 void Edit::updateChannelGroups() {
@@ -84,5 +78,5 @@ void Edit::updateChannelGroups() {
         }
         list->addGroup(chans, ChannelGroup::ePlain);
     }
-    m_header.remove(kLegacyGroups);
+    m_header.remove(EditKeys::kLegacyGroups);
 }

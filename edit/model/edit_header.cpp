@@ -1,4 +1,5 @@
 #include "edit/model/edit.h"
+#include "edit/model/edit_keys.h"
 #include "edit/model/edit_registry.h"
 #include "edit/project/permissions_manager.h"
 #include "platform/services/clock.h"
@@ -13,6 +14,9 @@ constexpr int kRevisionWithFrameRate = 501;
 constexpr int kRevisionWithDuration = 503;
 constexpr uint32_t kRevisionUnknown = UINT32_MAX;
 
+static_assert(EditKeys::kTransfer.fallback() == Edit::kDefaultTransfer);
+static_assert(EditKeys::kPermissions.fallback() == Edit::kPermissionsAll);
+
 /// Seconds since 1970 as the header keeps them: the low 32 bits.
 int32_t now() {
     return static_cast<int32_t>(static_cast<uint32_t>(Qx::nowSeconds()));
@@ -23,22 +27,22 @@ int32_t now() {
 void Edit::initHeader() {
     const Qx::CurrentProject project = Qx::currentProject();
     m_header.clear();
-    m_header.setBool("READ_ONLY", false);
-    m_header.setInt("IS_BACKUP", 0);
-    m_header.setInt("ORIGINAL_MATERIAL", 0);
-    m_header.setInt("HIDDEN", 0);
-    m_header.setInt("SEARCH_EDIT", 0);
-    m_header.setCookie("UNDO_COOKIE", invalid_cookie);
-    m_header.setCookie("REDO_COOKIE", invalid_cookie);
-    m_header.setCookie("PROJECT_COOKIE", project.project);
-    m_header.setInt("CREATION_TIME", now());
+    EditKeys::kReadOnly.set(m_header, false);
+    EditKeys::kBackup.set(m_header, 0);
+    EditKeys::kOriginalMaterial.set(m_header, 0);
+    EditKeys::kHidden.set(m_header, 0);
+    EditKeys::kSearchEdit.set(m_header, 0);
+    EditKeys::kUndoCookie.set(m_header, invalid_cookie);
+    EditKeys::kRedoCookie.set(m_header, invalid_cookie);
+    EditKeys::kProjectCookie.set(m_header, project.project);
+    EditKeys::kCreationTime.set(m_header, now());
     setModificationDetails();
-    m_header.setInt("ED2_REVISION", kCurrentRevision);
-    m_header.setInt("FRAME_RATE", project.frameRateCode);
-    m_header.setInt("SOURCE_MEDIUM", project.defaultEditMedium);
-    m_header.setInt("FRAME_BASED", 1);
-    m_header.setInt("TRANSFER", kDefaultTransfer);
-    m_header.setString("OWNER", PermissionsManager::getCurrentUser());
+    EditKeys::kRevision.set(m_header, kCurrentRevision);
+    EditKeys::kFrameRate.set(m_header, project.frameRateCode);
+    EditKeys::kSourceMedium.set(m_header, project.defaultEditMedium);
+    EditKeys::kFrameBased.set(m_header, 1);
+    EditKeys::kTransfer.set(m_header, kDefaultTransfer);
+    EditKeys::kOwner.set(m_header, PermissionsManager::getCurrentUser());
 
     clear_cache_flags();
     m_entireMedium = 0;
@@ -62,18 +66,18 @@ void Edit::dropDerivedValues() {
 }
 
 String Edit::getName() const {
-    return m_header.getString("NAME");
+    return EditKeys::kName.get(m_header);
 }
 
 void Edit::setName(const String& name) {
     if (name != getName()) {
-        m_header.setString("NAME", name);
+        EditKeys::kName.set(m_header, name);
         recordChange(kNameChanged, true);
     }
 }
 
 bool Edit::get_read_only() const {
-    return m_header.getBool("READ_ONLY", false);
+    return EditKeys::kReadOnly.get(m_header);
 }
 
 void Edit::set_read_only(bool readOnly) {
@@ -81,44 +85,44 @@ void Edit::set_read_only(bool readOnly) {
         // Once the property is set nothing can dirty the edit, and the property itself has to be saved.
         set_dirty(true);
         const QuietHeader quiet(*this);
-        m_header.setBool("READ_ONLY", true);
+        EditKeys::kReadOnly.set(m_header, true);
     } else {
-        m_header.setBool("READ_ONLY", readOnly);
+        EditKeys::kReadOnly.set(m_header, readOnly);
     }
 }
 
 int Edit::get_backup() const {
-    return m_header.getInt("IS_BACKUP");
+    return EditKeys::kBackup.get(m_header);
 }
 
 void Edit::set_backup(int backup) {
-    m_header.setInt("IS_BACKUP", backup);
+    EditKeys::kBackup.set(m_header, backup);
 }
 
 int Edit::get_hidden() const {
-    return m_header.getInt("HIDDEN");
+    return EditKeys::kHidden.get(m_header);
 }
 
 void Edit::set_hidden(int hidden) {
     if (hidden != get_hidden()) {
-        m_header.setInt("HIDDEN", hidden);
+        EditKeys::kHidden.set(m_header, hidden);
     }
 }
 
 int Edit::get_search_edit() const {
-    return m_header.getInt("SEARCH_EDIT");
+    return EditKeys::kSearchEdit.get(m_header);
 }
 
 void Edit::set_search_edit(int search) {
-    m_header.setInt("SEARCH_EDIT", search);
+    EditKeys::kSearchEdit.set(m_header, search);
 }
 
 int Edit::get_original_material() const {
-    return m_header.getInt("ORIGINAL_MATERIAL");
+    return EditKeys::kOriginalMaterial.get(m_header);
 }
 
 void Edit::set_original_material(int original) {
-    m_header.setInt("ORIGINAL_MATERIAL", original);
+    EditKeys::kOriginalMaterial.set(m_header, original);
     dropDerivedValues();
     if (m_cookie.is_valid()) {
         const Qx::Status recorded =
@@ -132,56 +136,56 @@ void Edit::set_original_material(int original) {
 
 void Edit::set_entire_medium(int entire) {
     m_entireMedium = entire;
-    m_header.setInt("ENTIRE_MEDIUM", entire);
+    EditKeys::kEntireMedium.set(m_header, entire);
     updateProjectRecord();
 }
 
 cookie Edit::get_undo_cookie() const {
-    return m_header.getCookie("UNDO_COOKIE", invalid_cookie);
+    return EditKeys::kUndoCookie.get(m_header);
 }
 
 void Edit::set_undo_cookie(const cookie& item) {
-    m_header.setCookie("UNDO_COOKIE", item);
+    EditKeys::kUndoCookie.set(m_header, item);
 }
 
 cookie Edit::get_redo_cookie() const {
-    return m_header.getCookie("REDO_COOKIE", invalid_cookie);
+    return EditKeys::kRedoCookie.get(m_header);
 }
 
 void Edit::set_redo_cookie(const cookie& item) {
-    m_header.setCookie("REDO_COOKIE", item);
+    EditKeys::kRedoCookie.set(m_header, item);
 }
 
 int Edit::getCreationTime() const {
-    return m_header.getInt("CREATION_TIME");
+    return EditKeys::kCreationTime.get(m_header);
 }
 
 String Edit::getCreationProgram() const {
-    return m_header.getString("CREATION_PROGRAM");
+    return EditKeys::kCreationProgram.get(m_header);
 }
 
 void Edit::setCreationDetails() {
-    m_header.setInt("CREATION_TIME", now());
-    m_header.setString("CREATION_PROGRAM", kProgramVersion);
+    EditKeys::kCreationTime.set(m_header, now());
+    EditKeys::kCreationProgram.set(m_header, kProgramVersion);
 }
 
 int Edit::getModificationTime() const {
-    return m_header.getInt("MODIFICATION_TIME");
+    return EditKeys::kModificationTime.get(m_header);
 }
 
 String Edit::getModificationProgram() const {
-    return m_header.getString("MODIFICATION_PROGRAM");
+    return EditKeys::kModificationProgram.get(m_header);
 }
 
 void Edit::setModificationDetails() {
     const int32_t time = now();
-    m_header.setInt("MODIFICATION_TIME", time);
-    m_header.setInt("MOD_TIME_V3", time);
-    m_header.setString("MODIFICATION_PROGRAM", kProgramVersion);
+    EditKeys::kModificationTime.set(m_header, time);
+    EditKeys::kModificationTimeV3.set(m_header, time);
+    EditKeys::kModificationProgram.set(m_header, kProgramVersion);
 }
 
 uint64_t Edit::getModificationCount() const {
-    const int64_t count = m_header.getInt64("MOD_COUNT", 0);
+    const int64_t count = EditKeys::kModificationCount.get(m_header);
     return count > 0 ? static_cast<uint64_t>(count) : 0;
 }
 
@@ -189,23 +193,23 @@ void Edit::incModificationCount() {
     // A count from outside may be the greatest there is; it stays there.
     const uint64_t count = getModificationCount();
     if (count < static_cast<uint64_t>(INT64_MAX)) {
-        m_header.setInt64("MOD_COUNT", static_cast<int64_t>(count + 1));
+        EditKeys::kModificationCount.set(m_header, static_cast<int64_t>(count + 1));
     }
 }
 
 Edit::Permissions Edit::getPermissions() const {
-    const int value = m_header.getInt("PERMISSIONS", kPermissionsAll);
+    const int value = EditKeys::kPermissions.get(m_header);
     return value >= kPermissionsNone && value <= kPermissionsAll ? static_cast<Permissions>(value)
                                                                  : kPermissionsAll;
 }
 
 void Edit::setPermissions(Permissions permissions) {
-    m_header.setInt("PERMISSIONS", permissions);
+    EditKeys::kPermissions.set(m_header, permissions);
 }
 
 int Edit::get_ed2_revision() const {
     if (m_revision == kRevisionUnknown) {
-        m_revision = static_cast<uint32_t>(m_header.getInt("ED2_REVISION", 1));
+        m_revision = static_cast<uint32_t>(EditKeys::kRevision.get(m_header));
     }
     return static_cast<int>(m_revision);
 }
@@ -213,9 +217,9 @@ int Edit::get_ed2_revision() const {
 void Edit::set_ed2_revision(int revision) {
     m_revision = static_cast<uint32_t>(revision);
     if (m_revision == kRevisionUnknown) {
-        m_header.remove("ED2_REVISION");
+        m_header.remove(EditKeys::kRevision);
     } else {
-        m_header.setInt("ED2_REVISION", revision);
+        EditKeys::kRevision.set(m_header, revision);
     }
 }
 
@@ -225,11 +229,11 @@ Qx::FrameRate Edit::getFrameRate() const {
     }
     Qx::FrameRate rate = Qx::projectFrameRate();
     if (get_ed2_revision() >= kRevisionWithFrameRate) {
-        const Qx::FrameRate stored(m_header.getInt("FRAME_RATE", rate.code()));
+        const Qx::FrameRate stored(EditKeys::kFrameRate.get(m_header, rate.code()));
         rate = stored.valid() ? stored : rate;
     } else {
         const Qx::FrameRate derived(
-            Qx::Ed2Support::tvStdFromText(m_header.getString("tvtype")).frameRateCode);
+            Qx::Ed2Support::tvStdFromText(EditKeys::kTvType.get(m_header)).frameRateCode);
         if (derived.valid()) {
             rate = derived;
             if (!isReadOnly()) {
@@ -247,8 +251,8 @@ void Edit::setFrameRate(Qx::FrameRate rate) {
     if (!rate.valid()) {
         return;
     }
-    if (!m_header.contains("FRAME_RATE") || m_header.getInt("FRAME_RATE") != rate.code()) {
-        m_header.setInt("FRAME_RATE", rate.code());
+    if (!m_header.contains(EditKeys::kFrameRate) || EditKeys::kFrameRate.get(m_header) != rate.code()) {
+        EditKeys::kFrameRate.set(m_header, rate.code());
     }
     m_frameRate = rate;
     m_frameRateValid = true;
@@ -260,57 +264,79 @@ double Edit::get_frame_time() const {
 
 double Edit::getSourceMediumDuration() const {
     if (m_sourceMediumDuration == Qx::kNoTime && get_ed2_revision() >= kRevisionWithDuration) {
-        m_sourceMediumDuration = m_header.getDouble("SOURCE_MEDIUM_DURATION", Qx::kNoTime);
+        m_sourceMediumDuration = EditKeys::kSourceMediumDuration.get(m_header);
     }
     return m_sourceMediumDuration;
 }
 
 void Edit::setSourceMediumDuration(double seconds) {
     m_sourceMediumDuration = seconds;
-    m_header.setDouble("SOURCE_MEDIUM_DURATION", seconds);
+    EditKeys::kSourceMediumDuration.set(m_header, seconds);
 }
 
 int Edit::getSourceMedium() const {
     if (!m_sourceMedium) {
-        m_sourceMedium = m_header.getInt("SOURCE_MEDIUM", Qx::currentProject().defaultEditMedium);
+        m_sourceMedium = EditKeys::kSourceMedium.get(m_header, Qx::currentProject().defaultEditMedium);
     }
     return *m_sourceMedium;
 }
 
 void Edit::setSourceMedium(int medium) {
     m_sourceMedium = medium;
-    m_header.setInt("SOURCE_MEDIUM", medium);
+    EditKeys::kSourceMedium.set(m_header, medium);
 }
 
 int Edit::getTransfer() const {
     if (!m_transfer) {
-        m_transfer = m_header.getInt("TRANSFER", kDefaultTransfer);
+        m_transfer = EditKeys::kTransfer.get(m_header);
     }
     return *m_transfer;
 }
 
 void Edit::setTransfer(int transfer) {
     m_transfer = transfer;
-    m_header.setInt("TRANSFER", transfer);
+    EditKeys::kTransfer.set(m_header, transfer);
 }
 
 double Edit::get_elapsed_time_origin() const {
-    return m_header.getDouble("ELAPSED_ORIGIN", 0.0);
+    return EditKeys::kElapsedOrigin.get(m_header);
 }
 
 void Edit::set_elapsed_time_origin(double seconds) {
-    m_header.setDouble("ELAPSED_ORIGIN", seconds);
+    EditKeys::kElapsedOrigin.set(m_header, seconds);
+}
+
+int64_t Edit::getStartTimecode() const {
+    const Qx::FrameRate rate = getFrameRate();
+    return EditKeys::kStartTimecode.get(m_header, rate.toFrames(get_elapsed_time_origin()));
+}
+
+void Edit::setStartTimecode(int64_t frames) {
+    EditKeys::kStartTimecode.set(m_header, frames);
+}
+
+double Edit::getTimecodeOrigin() const {
+    return m_header.contains(EditKeys::kStartTimecode) ? getFrameRate().toSeconds(getStartTimecode())
+                                                       : get_elapsed_time_origin();
+}
+
+bool Edit::isDropFrame(bool otherwise) const {
+    return EditKeys::kDropFrame.get(m_header, otherwise) && getFrameRate().hasDropFrame();
+}
+
+void Edit::setDropFrame(bool dropFrame) {
+    EditKeys::kDropFrame.set(m_header, dropFrame);
 }
 
 String Edit::getOwner() const {
-    return m_header.getString("OWNER");
+    return EditKeys::kOwner.get(m_header);
 }
 
 void Edit::setOwner(const String& owner, bool notify) {
     if (owner == getOwner()) {
         return;
     }
-    m_header.setString("OWNER", owner);
+    EditKeys::kOwner.set(m_header, owner);
     if (notify) {
         recordChange(kPropertiesChanged, true);
     }

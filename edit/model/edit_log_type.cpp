@@ -1,9 +1,10 @@
 #include "edit/model/edit.h"
+#include "edit/model/edit_keys.h"
 
 namespace {
 
 /// True if the value under a key is there and not an empty text.
-bool holdsSomething(const configb& header, const char* key) {
+bool holdsSomething(const configb& header, std::string_view key) {
     const configb::Value* const value = header.find(key);
     if (value == nullptr) {
         return false;
@@ -14,9 +15,9 @@ bool holdsSomething(const configb& header, const char* key) {
 
 /// The type of an item of original material, from how it relates to the shot that it may be a copy of.
 edit_log_type_t typeOfOriginal(const configb& header) {
-    const int dupe = header.getInt("is_dupe", -1);
-    const int slashDupe = header.getInt("is_slash_dupe", -1);
-    if (header.contains("hidden_cookie")) {
+    const int dupe = EditKeys::kDupe.get(header);
+    const int slashDupe = EditKeys::kSlashDupe.get(header);
+    if (header.contains(EditKeys::kHiddenCookie)) {
         return slashDupe > 0 ? kLogGhost7 : kLogGhost6;
     }
     if (dupe < 1 && slashDupe < 1) {
@@ -34,16 +35,16 @@ edit_log_type_t Edit::log_type_get_m() const {
     if (m_cookie.isMagic()) {
         return kLogMagic;
     }
-    if (!m_header.contains("original_material")) {
+    if (!m_header.contains(EditKeys::kOriginalMaterial)) {
         return kLogNone;
     }
-    if (m_header.getInt("original_material") != 0) {
+    if (EditKeys::kOriginalMaterial.get(m_header) != 0) {
         return typeOfOriginal(m_header);
     }
-    if (m_header.getInt("entire_medium") != 0) {
+    if (EditKeys::kEntireMedium.get(m_header) != 0) {
         return kLogReel;
     }
-    return holdsSomething(m_header, "FX_TEMPLATE") ? kLogTemplate : kLogEdit;
+    return holdsSomething(m_header, EditKeys::kFxTemplate) ? kLogTemplate : kLogEdit;
 }
 
 edit_log_type_t Edit::get_log_type() const {
@@ -77,7 +78,7 @@ bool Edit::is_original() const {
 }
 
 bool Edit::is_kemroll() const {
-    return isEdit() && m_header.contains("KEMROLL_TIME");
+    return isEdit() && m_header.contains(EditKeys::kKemrollTime);
 }
 
 String Edit::log_type_string_get_ms(edit_log_type_t type) {

@@ -27,7 +27,7 @@ void renumberCues(cue_list& cues, const std::vector<int>& numbers) {
 
 /// The header keys that go by a channel's number.
 constexpr struct {
-    const char* name;
+    std::string_view name;
     bool isAudio; ///< by its old number, for audio channels
 } kChannelKeys[] = {{EditKeys::kSyncLoss, false},
                     {EditKeys::kSyncError, true},

@@ -322,18 +322,6 @@ void EditFile::setAside(Edit& edit, const String& object, const String& why) {
 
 // ---- writing
 
-Qx::Ptr<cel> EditFile::sharedCel(const Edit& edit, const IdStamp& chan) {
-    const Edit::ChanType type = edit.getChanTypeAndSubType(chan);
-    if (type.type == AudioChan) {
-        return edit.getAudCel(chan).sharedCel();
-    }
-    if (type.type != VideoChan) {
-        return nullptr;
-    }
-    return type.subtype == Edit_Chan_SubType::ALIAS ? edit.getVFXCel(chan).sharedCel()
-                                                    : edit.getVidCel(chan).sharedCel();
-}
-
 namespace {
 
 /// Levels channels with their audio channels, in the order of these.
@@ -387,7 +375,7 @@ void EditFile::lendCels(Edit& edit) {
     }
     for (int i = 0; i < edit.getNumChans(); ++i) {
         const IdStamp id = edit.getId(i);
-        const Qx::Ptr<cel> content = sharedCel(edit, id);
+        const Qx::Ptr<cel> content = edit.contentOf(id);
         if (content == nullptr) {
             continue;
         }
@@ -422,11 +410,11 @@ void EditFile::lendCels(Edit& edit) {
     edit.m_storedCels = std::move(lent);
 }
 
-void EditFile::extractCelsFromStore(Edit& edit, bool written) noexcept {
-    edit.m_store.releaseLent();
+void Edit::extractCelsFromStore(bool written) noexcept {
+    m_store.releaseLent();
     if (!written) {
         // What the store holds under each name is not known after a failure: the next save packs every cel.
-        edit.m_storedCels.reset();
+        m_storedCels.reset();
     }
 }
 
@@ -445,7 +433,7 @@ void EditFile::reset(Edit& edit) {
 void EditFile::markWritten(Edit& edit) {
     for (int i = 0; i < edit.getNumChans(); ++i) {
         const IdStamp id = edit.getId(i);
-        if (const Qx::Ptr<cel> content = sharedCel(edit, id)) {
+        if (const Qx::Ptr<cel> content = edit.contentOf(id)) {
             content->setChanged(false);
         } else if (AudLevelsCel levels = edit.getLevelsCel(id); levels.valid()) {
             levels.setChanged(false);

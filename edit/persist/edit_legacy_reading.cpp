@@ -118,7 +118,7 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
     const Quiet quiet(edit);
     reset(edit);
     edit.m_initialising = true;
-    const Qx::Ed2Support::TVStd named = LegacyUpgrades::getNamedStandard(file);
+    const Qx::Ed2Support::TVStd named = getNamedStandard(file);
     putFrameRateBack(file);
     unsigned after = 0;
     if (Qx::Status header = edit.m_header.buildFrom(file, 0, after); !header) {
@@ -127,8 +127,8 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
     }
     edit.clear_cache_flags();
     edit.redetermineLogType();
-    LegacyUpgrades::updateLegacyFormat(edit, named);
-    const LegacyUpgrades::RememberedFlags flags(edit);
+    edit.updateLegacyFormat(named);
+    const RememberedFlags flags(edit);
     edit.set_ed2_revision(kCurrentEditRevision);
 
     Qx::Status status;
@@ -151,7 +151,7 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
         } else if (edit.getNumChans() == 0) {
             status = Qx::Status::failure(Qx::StatusCode::Damaged, refused + "it has no channels");
         } else {
-            LegacyUpgrades::updateLegacyFrameRate(edit, named);
+            edit.updateLegacyFrameRate(named);
             edit.set_cookie(cookie(std::string_view(Qx::withoutExtension(Qx::fileNameOf(path)))));
             edit.convertCues();
             edit.m_load_edit_bits_from_header();
@@ -180,7 +180,7 @@ Qx::Status Edit::readED2Cels(const TextFile& file) {
 
 Qx::Status EditFile::readLegacyChannels(Edit& edit, const TextFile& file,
                                         std::vector<FileChannel>& sections) {
-    const int count = edit.m_header.getInt(EditKeys::kNumChans);
+    const int count = EditKeys::kNumChans.get(edit.m_header);
     unsigned next = readCueSection(file).after;
     while (std::ssize(sections) < count) {
         const int found = file.find(kChannelLine, next);

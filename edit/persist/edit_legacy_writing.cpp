@@ -107,18 +107,20 @@ Qx::Ed2Support::TVStd Edit::writeED2Config(TextFile& file) const {
     for (int at = 0; (at = file.find("CHANNEL_MAP", static_cast<unsigned>(at), true)) >= 0;) {
         file.removeLine(static_cast<unsigned>(at));
     }
-    removeFirstLine(file, "UNDO_COOKIE:");
-    removeFirstLine(file, "REDO_COOKIE:");
-    for (int at = -1; (at = file.find("LABEL", static_cast<unsigned>(at + 1), true)) >= 0;) {
+    removeFirstLine(file, String(EditKeys::kUndoCookie) + ":");
+    removeFirstLine(file, String(EditKeys::kRedoCookie) + ":");
+    for (int at = -1; (at = file.find(String(EditKeys::kLabel), static_cast<unsigned>(at + 1), true)) >= 0;) {
         const String line = file[static_cast<unsigned>(at)];
         const int comma = line.nthIndex(1, ',');
         if (line.find("LABEL_REV:") != String::npos && comma >= 0) {
             file.changeLine(static_cast<unsigned>(at), String(line.substr(0, static_cast<size_t>(comma))));
         }
     }
-    putHeaderLine(file, "NUM_CHANS:int ", "NUM_CHANS:int " + std::to_string(getNumChans(AudioChan) + 1));
+    const String numChans = String(EditKeys::kNumChans) + ":int ";
+    putHeaderLine(file, numChans, numChans + std::to_string(getNumChans(AudioChan) + 1));
     const String standard = Qx::Ed2Support::tvStdTextForProject();
-    putHeaderLine(file, "FRAME_RATE:int ", String(EditKeys::kTvType) + ":textdata " + standard);
+    putHeaderLine(file, String(EditKeys::kFrameRate) + ":int ",
+                  String(EditKeys::kTvType) + ":textdata " + standard);
     return Qx::Ed2Support::tvStdFromText(standard);
 }
 
@@ -143,7 +145,7 @@ unsigned Edit::writeED2Cels(TextFile& file, Qx::Ed2Support::TVStd standard) cons
     const Vector<IdStamp> chans = EditFile::legacyChannels(*this);
     unsigned written = 0;
     for (const IdStamp& chan : chans) {
-        const Qx::Ptr<cel> content = EditFile::sharedCel(*this, chan);
+        const Qx::Ptr<cel> content = contentOf(chan);
         if (content == nullptr) {
             continue;
         }

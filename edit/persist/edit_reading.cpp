@@ -1,5 +1,4 @@
 #include "edit/persist/detail/edit_file.h"
-#include "edit/persist/detail/legacy_upgrades.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 #include "platform/services/log.h"
@@ -40,9 +39,9 @@ Edit::Edit(const WString& path, eEditOpenBehaviour behaviour) : Edit() {
             return;
         }
         m_bad = false;
-        LegacyUpgrades::removeShotSoundRamps(*this);
-        LegacyUpgrades::initialiseAudioVarispeeds(*this);
-        LegacyUpgrades::updateLegacyFileLabels(*this);
+        removeShotSoundRamps();
+        initialiseAudioVarispeeds();
+        updateLegacyFileLabels();
         set_dirty(true);
         return;
     }
@@ -168,15 +167,15 @@ void Edit::getInfoFromHeader() {
 }
 
 void Edit::m_load_edit_bits_from_header() {
-    m_entireMedium = m_header.getInt(EditKeys::kEntireMedium, 0);
-    if (!m_header.contains("quality_string") && m_header.contains("quality")) {
-        m_header.setString("quality_string", String::format("%d mins", m_header.getInt("quality")));
+    m_entireMedium = EditKeys::kEntireMedium.get(m_header);
+    if (!m_header.contains(EditKeys::kQualityText) && m_header.contains(EditKeys::kQuality)) {
+        EditKeys::kQualityText.set(m_header, String::format("%d mins", EditKeys::kQuality.get(m_header)));
     }
     if (m_header.contains(EditKeys::kCurrentTime)) {
-        set_current_time_raw(NO_CHAN, m_header.getDouble(EditKeys::kCurrentTime));
+        set_current_time_raw(NO_CHAN, EditKeys::kCurrentTime.get(m_header));
     }
     m_markTime = Qx::kNoTime;
-    set_mark_time_raw(NO_CHAN, m_header.getDouble(EditKeys::kMarkTime, Qx::kNoTime));
+    set_mark_time_raw(NO_CHAN, EditKeys::kMarkTime.get(m_header));
 
     Vector<IdStamp> chans;
     getChans(chans, AudioChan);

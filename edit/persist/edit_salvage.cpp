@@ -314,9 +314,9 @@ Qx::Status salvageEdit(const String& path, EditPtr& edit, std::vector<String>& l
     }
     read->set_cookie(invalid_cookie);
     configb& header = read->Opts();
-    header.setInt("IS_BACKUP", 0);
-    header.setCookie("UNDO_COOKIE", invalid_cookie);
-    header.setCookie("REDO_COOKIE", invalid_cookie);
+    EditKeys::kBackup.set(header, 0);
+    EditKeys::kUndoCookie.set(header, invalid_cookie);
+    EditKeys::kRedoCookie.set(header, invalid_cookie);
     read->init_dirty();
     lost.insert(lost.end(), found.begin(), found.end());
     edit = read;

@@ -8,25 +8,6 @@
 
 #include <algorithm>
 
-namespace EditKeys {
-
-String numbered(const char* name, int number) {
-    return String(name) + std::to_string(number);
-}
-
-void removeNumbered(configb& header, const char* name, int from) {
-    const std::string_view prefix(name);
-    for (const String& key : header.keys()) {
-        int number = 0;
-        if (key.size() > prefix.size() && String::equalNoCase(key.substr(0, prefix.size()), prefix) &&
-            Qx::textToInt(std::string_view(key).substr(prefix.size()), number) && number >= from) {
-            header.remove(key);
-        }
-    }
-}
-
-} // namespace EditKeys
-
 bool EditFile::fail(Edit& edit, Qx::Status why) {
     edit.m_fileStatus = std::move(why);
     return false;
@@ -209,10 +190,10 @@ Qx::Status EditFile::openStore(Edit& edit, const String& path) {
 }
 
 void EditFile::updateHeader(const Edit& edit, configb& header, const Vector<IdStamp>& order) {
-    header.setInt(EditKeys::kNumChans, static_cast<int>(order.size()));
-    header.setDouble(EditKeys::kCurrentTime, edit.m_currentTime);
+    EditKeys::kNumChans.set(header, static_cast<int>(order.size()));
+    EditKeys::kCurrentTime.set(header, edit.m_currentTime);
     if (edit.mark_is_valid()) {
-        header.setDouble(EditKeys::kMarkTime, edit.m_markTime);
+        EditKeys::kMarkTime.set(header, edit.m_markTime);
     } else {
         header.remove(EditKeys::kMarkTime);
     }

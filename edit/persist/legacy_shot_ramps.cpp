@@ -1,5 +1,4 @@
 #include "edit/model/edit.h"
-#include "edit/persist/detail/legacy_upgrades.h"
 #include "platform/media/frame_rate.h"
 #include "platform/services/log.h"
 
@@ -94,16 +93,16 @@ bool hasLevelsTracks(const Edit& edit) {
 
 } // namespace
 
-void LegacyUpgrades::removeShotSoundRamps(Edit& edit) {
-    if (hasLevelsTracks(edit)) {
+void Edit::removeShotSoundRamps() {
+    if (hasLevelsTracks(*this)) {
         return;
     }
     Vector<IdStamp> chans;
-    edit.getChans(chans, AudioChan);
+    getChans(chans, AudioChan);
     try {
         for (const IdStamp& chan : chans) {
-            if (cel* content = edit.getCel(chan)) {
-                RampsToNodes(edit, chan).convert(*content);
+            if (cel* content = getCel(chan)) {
+                RampsToNodes(*this, chan).convert(*content);
             }
         }
     } catch (const std::logic_error& error) {

@@ -84,28 +84,6 @@ void scaleTimes(Edit& edit, double factor, double frame) {
 
 } // namespace
 
-namespace LegacyUpgrades {
-
-Qx::Ed2Support::TVStd getTvStandard(const configb& header) {
-    const Qx::Ed2Support::TVStd named = Qx::Ed2Support::tvStdFromText(header.getString(EditKeys::kTvType));
-    if (named.known()) {
-        return named;
-    }
-    switch (header.getInt(EditKeys::kFrameRate)) {
-    case Qx::FrameRate::Fps24:
-        return Qx::Ed2Support::tvStdFromText("pal_24");
-    case Qx::FrameRate::Fps25:
-        return Qx::Ed2Support::tvStdFromText("pal");
-    case Qx::FrameRate::Fps29_97:
-        return Qx::Ed2Support::tvStdFromText("ntsc");
-    default: {
-        Qx::Ed2Support::TVStd other;
-        other.frameRateCode = Qx::FrameRate(header.getInt(EditKeys::kFrameRate)).code();
-        return other;
-    }
-    }
-}
-
 Qx::Ed2Support::TVStd getNamedStandard(const TextFile& file) {
     // Only the header's own lines count: a text further on may begin with anything.
     const int end = Ed2Names::headerEnd(file);
@@ -114,25 +92,20 @@ Qx::Ed2Support::TVStd getNamedStandard(const TextFile& file) {
         return at >= 0 && at < end ? String(file[static_cast<unsigned>(at)].substr(start.size())).trimmed()
                                    : String();
     };
-    configb header;
-    header.setString(EditKeys::kTvType, valueOf(String(EditKeys::kTvType) + ":textdata "));
     int code = 0;
-    if (Qx::textToInt(valueOf(String(EditKeys::kFrameRate) + ":int "), code)) {
-        header.setInt(EditKeys::kFrameRate, code);
-    }
-    return getTvStandard(header);
+    static_cast<void>(Qx::textToInt(valueOf(String(EditKeys::kFrameRate) + ":int "), code));
+    return Qx::Ed2Support::getTvStandard(valueOf(String(EditKeys::kTvType) + ":textdata "), code);
 }
 
 RememberedFlags::RememberedFlags(const Edit& edit)
     : m_hadSequence(edit.Opts().contains(EditKeys::kSequence)),
       m_hadFrameBased(edit.Opts().contains(EditKeys::kFrameBased)),
       m_hadTransfer(edit.Opts().contains(EditKeys::kTransfer)),
-      m_sequence(edit.Opts().getInt(EditKeys::kSequence)),
-      m_frameBased(edit.Opts().getInt(EditKeys::kFrameBased)),
-      m_transfer(edit.Opts().getInt(EditKeys::kTransfer)) {}
+      m_sequence(EditKeys::kSequence.get(edit.Opts())), m_frameBased(EditKeys::kFrameBased.get(edit.Opts())),
+      m_transfer(EditKeys::kTransfer.get(edit.Opts())) {}
 
 void RememberedFlags::restore(Edit& edit) const {
-    const auto put = [&edit](bool had, const char* key, int value) {
+    const auto put = [&edit](bool had, std::string_view key, int value) {
         if (had) {
             edit.Opts().setInt(key, value);
         } else {
@@ -144,49 +117,49 @@ void RememberedFlags::restore(Edit& edit) const {
     put(m_hadTransfer, EditKeys::kTransfer, m_transfer);
 }
 
-void updateLegacyFormat(Edit& edit, const Qx::Ed2Support::TVStd& standard) {
-    if (edit.get_log_type() == kLogShot && standard.known()) {
-        notDone(edit, "updateLegacyFormat", "no table of picture formats; the shot's format stays as it is");
+void Edit::updateLegacyFormat(const Qx::Ed2Support::TVStd& standard) {
+    if (get_log_type() == kLogShot && standard.known()) {
+        notDone(*this, "updateLegacyFormat", "no table of picture formats; the shot's format stays as it is");
     }
 }
 
-void removeHiddenFXTracks(Edit& edit) {
+void Edit::removeHiddenFXTracks() {
     Vector<IdStamp> chans;
-    edit.getChans(chans, VideoChan, Edit_Chan_SubType::ALIAS);
+    getChans(chans, VideoChan, Edit_Chan_SubType::ALIAS);
     for (const IdStamp& chan : chans) {
-        if (edit.getChanSubtype(chan) == Edit_Chan_SubType::ALIAS && edit.isEmpty(chan)) {
-            edit.removeChan(chan, false);
+        if (getChanSubtype(chan) == Edit_Chan_SubType::ALIAS && isEmpty(chan)) {
+            removeChan(chan, false);
         }
     }
 }
 
-void utilizeMagicIdStampsForChannelIds(Edit& edit) {
+void Edit::utilizeMagicIdStampsForChannelIds() {
     std::map<IdStamp, IdStamp> renamed;
-    for (int i = 0; i < edit.getNumChans(); ++i) {
-        const IdStamp old = edit.getId(i);
+    for (int i = 0; i < getNumChans(); ++i) {
+        const IdStamp old = getId(i);
         if (old.getMagicType() == IdStampMagic::Channel) {
             continue;
         }
         IdStamp wanted = old;
         wanted.setMagicType(IdStampMagic::Channel);
-        if (edit.getIdx(wanted) != NO_CHAN) {
+        if (getIdx(wanted) != NO_CHAN) {
             wanted = IdStamp::fresh(IdStampMagic::Channel);
         }
-        if (edit.setChannelID(old, wanted)) {
+        if (setChannelID(old, wanted)) {
             renamed.emplace(old, wanted);
         }
     }
     if (renamed.empty()) {
         return;
     }
-    forEachCel(edit, AudioChan, [&](const IdStamp& chan, const cel&) {
-        AudCel audio = edit.getAudCel(chan);
+    forEachCel(*this, AudioChan, [&](const IdStamp& chan, const cel&) {
+        AudCel audio = getAudCel(chan);
         if (const auto found = renamed.find(audio.getLevelsChanID()); found != renamed.end()) {
             audio.setLevelsChanID(found->second);
-            edit.setAudCel(audio);
+            setAudCel(audio);
         }
     });
-    forEachCel(edit, AnyChan, [&renamed](const IdStamp&, cel& content) {
+    forEachCel(*this, AnyChan, [&renamed](const IdStamp&, cel& content) {
         for (int i = 0; i < content.numEvents(); ++i) {
             channel_event event = content.get_event(i);
             if (const auto found = renamed.find(event.id); found != renamed.end()) {
@@ -195,19 +168,19 @@ void utilizeMagicIdStampsForChannelIds(Edit& edit) {
             }
         }
     });
-    edit.init_dirty();
+    init_dirty();
 }
 
-void makeMaterialNodesTransient(Edit& edit) {
-    if (showsEffects(edit)) {
-        notDone(edit, "makeMaterialNodesTransient", "effect graphs of this revision are kept as they are");
+void Edit::makeMaterialNodesTransient() {
+    if (showsEffects(*this)) {
+        notDone(*this, "makeMaterialNodesTransient", "effect graphs of this revision are kept as they are");
     }
 }
 
-void validateUTRIDs(Edit& edit) {
+void Edit::validateUTRIDs() {
     std::set<IdStamp> seen;
     int fixed = 0;
-    forEachCel(edit, VideoChan | AudioChan, [&](const IdStamp&, cel& content) {
+    forEachCel(*this, VideoChan | AudioChan, [&](const IdStamp&, cel& content) {
         for (int i = 0; i < content.numEvents(); ++i) {
             channel_event event = content.get_event(i);
             const cookie strip = content.get_event(i & ~1).strip;
@@ -220,14 +193,14 @@ void validateUTRIDs(Edit& edit) {
         }
     });
     if (fixed > 0) {
-        edit.init_dirty();
-        herc_printf("Edit::validateUTRIDs() : Fixed %d invalid IDs in '%s' (%s)\n", fixed,
-                    edit.getName().c_str(), edit.get_cookie_str().c_str());
+        init_dirty();
+        herc_printf("Edit::validateUTRIDs() : Fixed %d invalid IDs in '%s' (%s)\n", fixed, getName().c_str(),
+                    get_cookie_str().c_str());
     }
 }
 
-void initialiseAudioVarispeeds(Edit& edit) {
-    forEachCel(edit, AudioChan, [](const IdStamp&, cel& content) {
+void Edit::initialiseAudioVarispeeds() {
+    forEachCel(*this, AudioChan, [](const IdStamp&, cel& content) {
         for (int i = 0; i < content.numEvents(); ++i) {
             if (content.get_event(i).velocity != 1.0) {
                 ce_handle(&content, i).set_strip_velocity(1.0);
@@ -236,13 +209,14 @@ void initialiseAudioVarispeeds(Edit& edit) {
     });
 }
 
-void updateLegacyFileLabels(Edit& edit) {
-    if (edit.Opts().contains("numLabels_") || edit.Opts().contains("LABEL0")) {
-        notDone(edit, "updateLegacyFileLabels", "labels are kept as the texts that they are");
+void Edit::updateLegacyFileLabels() {
+    if (m_header.contains(EditKeys::kNumLabels) ||
+        m_header.contains(EditKeys::numbered(EditKeys::kLabel, 0))) {
+        notDone(*this, "updateLegacyFileLabels", "labels are kept as the texts that they are");
     }
 }
 
-void updateLegacyFrameRate(Edit& edit, const Qx::Ed2Support::TVStd& standard) {
+void Edit::updateLegacyFrameRate(const Qx::Ed2Support::TVStd& standard) {
     Qx::FrameRate to(standard.frameRateCode);
     if (standard.frameRateCode == Qx::FrameRate::Fps23_976) {
         to = Qx::FrameRate(Qx::FrameRate::Fps24);
@@ -250,30 +224,30 @@ void updateLegacyFrameRate(Edit& edit, const Qx::Ed2Support::TVStd& standard) {
         to = Qx::FrameRate(Qx::FrameRate::Fps29_97);
     }
     if (!to.valid()) {
-        notDone(edit, "updateLegacyFrameRate", "the edit names no frame rate; its times stay as they are");
+        notDone(*this, "updateLegacyFrameRate", "the edit names no frame rate; its times stay as they are");
         return;
     }
     if (to.code() != standard.frameRateCode) {
         const double factor = to.frameDuration() / Qx::FrameRate(standard.frameRateCode).frameDuration();
-        scaleTimes(edit, factor, to.frameDuration());
-        edit.setFrameRate(to);
+        scaleTimes(*this, factor, to.frameDuration());
+        setFrameRate(to);
     }
-    const edit_log_type_t type = edit.get_log_type();
+    const edit_log_type_t type = get_log_type();
     if (type == kLogShot) {
-        if (const cel* first = edit.get_edit_cel_p(0)) {
-            edit.setSourceMediumDuration(first->get_end_time());
+        if (const cel* first = get_edit_cel_p(0)) {
+            setSourceMediumDuration(first->get_end_time());
         }
-        edit.setSourceMedium(standard.mediumCode);
-        edit.Opts().setInt(EditKeys::kTransferAudioMedium,
-                           to.denominator() == 1001 ? kMediumRateWith1001 : kMediumRateWhole);
-        notDone(edit, "updateLegacyFrameRate", "no film-sync playback factor is derived for the shot");
+        setSourceMedium(standard.mediumCode);
+        EditKeys::kTransferAudioMedium.set(m_header,
+                                           to.denominator() == 1001 ? kMediumRateWith1001 : kMediumRateWhole);
+        notDone(*this, "updateLegacyFrameRate", "no film-sync playback factor is derived for the shot");
         return;
     }
-    edit.setSourceMedium(Qx::currentProject().defaultEditMedium);
+    setSourceMedium(Qx::currentProject().defaultEditMedium);
     if (type != kLogGhost3 && type != kLogGhost5) {
         return;
     }
-    forEachCel(edit, AnyChan, [](const IdStamp&, cel& content) {
+    forEachCel(*this, AnyChan, [](const IdStamp&, cel& content) {
         for (int i = 0; i + 1 < content.numEvents(); i += 2) {
             const channel_event in = content.get_event(i);
             if (!in.strip.isMagic() && content.get_event(i + 1).level != in.level) {
@@ -283,10 +257,8 @@ void updateLegacyFrameRate(Edit& edit, const Qx::Ed2Support::TVStd& standard) {
     });
 }
 
-void replaceLegacyEffects(Edit& edit) {
-    if (showsEffects(edit)) {
-        notDone(edit, "replaceLegacyEffects", "effects of this revision are kept as they are");
+void Edit::replaceLegacyEffects() {
+    if (showsEffects(*this)) {
+        notDone(*this, "replaceLegacyEffects", "effects of this revision are kept as they are");
     }
 }
-
-} // namespace LegacyUpgrades

@@ -108,11 +108,9 @@ private:
 EdlExporting::EdlExporting(const Edit& edit, const EdlExportOptions& options, LossReport& report)
     : m_edit(edit), m_options(options), m_report(report), m_rate(edit.getFrameRate()),
       m_sources(edit, m_rate, options, report) {
-    const configb& header = edit.Opts();
-    m_drop = header.getBool(EdlKey::kDropFrame, Qx::currentProject().dropFrame) && m_rate.hasDropFrame();
+    m_drop = edit.isDropFrame(Qx::currentProject().dropFrame);
     const int64_t day = Qx::framesPerDay(m_rate, m_drop);
-    m_start = header.contains(EdlKey::kStart) ? header.getInt64(EdlKey::kStart)
-                                              : m_rate.toFrames(edit.get_elapsed_time_origin());
+    m_start = edit.getStartTimecode();
     m_start = day > 0 ? ((m_start % day) + day) % day : 0;
 }
 

@@ -1,6 +1,7 @@
 #include "interchange/edl/edl_import.h"
 
 #include "edit/model/edit.h"
+#include "edit/model/edit_keys.h"
 #include "interchange/edl/edl_records.h"
 #include "interchange/marker_colour.h"
 #include "platform/services/files.h"
@@ -115,7 +116,7 @@ EditPtr EdlImporting::newEdit(const cookie& item, bool original) const {
     edit->set_cookie(item);
     edit->setFrameRate(m_list.rate);
     // Not through the accessor, which records an owner with the project.
-    edit->Opts().setInt("ORIGINAL_MATERIAL", original ? 1 : 0);
+    EditKeys::kOriginalMaterial.set(edit->Opts(), original ? 1 : 0);
     return edit;
 }
 
@@ -164,9 +165,9 @@ void EdlImporting::buildShot(size_t index) {
     const String& name = !event.clipName.empty()     ? event.clipName
                          : !event.sourceFile.empty() ? event.sourceFile
                                                      : event.reel;
-    shot.Opts().setString("NAME", shownName(name, event.line));
+    EditKeys::kName.set(shot.Opts(), shownName(name, event.line));
     shot.Opts().setString(EdlKey::kReel, event.reel);
-    shot.Opts().setBool(EdlKey::kDropFrame, event.sourceDrop);
+    EditKeys::kDropFrame.set(shot.Opts(), event.sourceDrop);
     if (!event.sourceFile.empty()) {
         shot.Opts().setString(EdlKey::kSourceFile, event.sourceFile);
     }
@@ -254,9 +255,9 @@ void EdlImporting::buildSequence(const String& name) {
     buildChannels(*sequence);
     addCues(*sequence);
     configb& header = sequence.Opts();
-    header.setString("NAME", shownName(m_list.title.empty() ? name : m_list.title, 0));
-    header.setInt64(EdlKey::kStart, m_programme.start);
-    header.setBool(EdlKey::kDropFrame, m_programme.dropFrame);
+    EditKeys::kName.set(header, shownName(m_list.title.empty() ? name : m_list.title, 0));
+    EditKeys::kStartTimecode.set(header, m_programme.start);
+    EditKeys::kDropFrame.set(header, m_programme.dropFrame);
     header.setString(EdlKey::kEvents, packEdlRecords(m_records));
     if (!m_list.notes.empty()) {
         header.setString(EdlKey::kNotes, m_list.notes);

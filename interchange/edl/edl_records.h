@@ -11,13 +11,11 @@
 /// an export can give it back.
 namespace interchange {
 
-/// Header keys of an imported sequence.
+/// Header keys of an imported sequence that only a list knows.
 namespace EdlKey {
-inline constexpr const char* kStart = "EDIT_START";     ///< int64: first record in, frames from midnight
-inline constexpr const char* kDropFrame = "DROP_FRAME"; ///< bool: whether that is counted in drop frame
-inline constexpr const char* kEvents = "EDL_EVENTS";    ///< string: `packEdlRecords`
-inline constexpr const char* kNotes = "EDL_NOTES";      ///< string: the notes above the first event
-// Of an imported shot (DROP_FRAME too: its source timecode's).
+inline constexpr const char* kEvents = "EDL_EVENTS"; ///< string: `packEdlRecords`
+inline constexpr const char* kNotes = "EDL_NOTES";   ///< string: the notes above the first event
+// Of an imported shot.
 inline constexpr const char* kReel = "REEL";                  ///< string
 inline constexpr const char* kSourceFile = "EDL_SOURCE_FILE"; ///< string: the full name behind the reel
 inline constexpr const char* kMediaPath = "EDL_MEDIA_PATH";   ///< string: text, never opened

@@ -41,6 +41,26 @@ TVStd tvStdFromText(std::string_view text) {
     return {};
 }
 
+TVStd getTvStandard(std::string_view text, int frameRateCode) {
+    const TVStd named = tvStdFromText(text);
+    if (named.known()) {
+        return named;
+    }
+    switch (frameRateCode) {
+    case FrameRate::Fps24:
+        return tvStdFromText("pal_24");
+    case FrameRate::Fps25:
+        return tvStdFromText("pal");
+    case FrameRate::Fps29_97:
+        return tvStdFromText("ntsc");
+    default: {
+        TVStd other;
+        other.frameRateCode = FrameRate(frameRateCode).code();
+        return other;
+    }
+    }
+}
+
 String tvStdTextForProject() {
     const CurrentProject project = currentProject();
     switch (project.frameRateCode) {

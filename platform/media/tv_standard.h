@@ -23,6 +23,10 @@ struct TVStd {
 /// that is not known for any other. Blanks around the text and the case of its letters do not count. The two
 /// NTSC texts are 29.97 frames a second, the three of 24 frames exactly 24.
 QM_API TVStd tvStdFromText(std::string_view text);
+/// The standard that a legacy edit is of: the one that `text` names, else what follows from the code of its
+/// frame rate. With a rate that no text stands for only the rate is told; one that is not known when neither
+/// tells anything.
+QM_API TVStd getTvStandard(std::string_view text, int frameRateCode);
 /// The text of the current project's standard; empty for a rate that has none.
 QM_API String tvStdTextForProject();
 

@@ -4,6 +4,9 @@
 #include "platform/base/subscriber_list.h"
 #include "platform/notify/notifier.h"
 
+/// What ties an observer to the server of a value: the observer hears of values until it goes.
+using ValClientBase = Qx::Guard;
+
 /// A value that observers can follow. Setting it informs them synchronously with the same promises as
 /// `Notifier`. Each observer is handed a copy of the value as it was set, so it may set another one
 /// meanwhile, or destroy the server.
@@ -43,8 +46,8 @@ public:
     /// Informs every observer of a value that does not become the current one.
     void announce(T value) { m_subscribers.tell(value); }
 
-    /// Hears each value that is set or announced until the guard goes.
-    [[nodiscard]] Qx::Ptr<Qx::Guard> addListener(Listener listener) {
+    /// Hears each value that is set or announced until what is returned goes.
+    [[nodiscard]] Qx::Ptr<ValClientBase> addListener(Listener listener) {
         return Qx::guardFor(m_subscribers.add(std::move(listener)));
     }
 

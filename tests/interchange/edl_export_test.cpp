@@ -4,6 +4,7 @@
 #include "interchange/edl/edl_writer.h"
 #include "interchange/marker_colour.h"
 
+#include "edit/model/edit_keys.h"
 #include "support/recording_log.h"
 #include "support/temporary_folder.h"
 
@@ -82,8 +83,8 @@ std::string folded(const std::string& text) {
 std::string meaning(ImportedList& list, bool withSecondPicture = true) {
     std::string text = list.edit().getName() + "\n";
     const configb& header = list.edit().Opts();
-    text += std::to_string(header.getInt64(EdlKey::kStart)) +
-            (header.getBool(EdlKey::kDropFrame) ? " drop\n" : "\n");
+    text += std::to_string(header.getInt64(EditKeys::kStartTimecode)) +
+            (header.getBool(EditKeys::kDropFrame) ? " drop\n" : "\n");
     for (int chan = 0; chan < list.edit().getNumChans(); ++chan) {
         const String name = list.edit().getChanDisplayName(list.edit().getId(chan));
         if (name == "V2" && !withSecondPicture) {
@@ -101,7 +102,7 @@ std::string meaning(ImportedList& list, bool withSecondPicture = true) {
                 const configb& source = std::as_const(*shot).Opts();
                 text += " " + source.getString(EdlKey::kReel) + "|" + shot->getName() + "|" +
                         source.getString(EdlKey::kSourceFile) +
-                        (source.getBool(EdlKey::kDropFrame) ? "|df" : "");
+                        (source.getBool(EditKeys::kDropFrame) ? "|df" : "");
             }
             text += "\n";
         }
@@ -350,7 +351,7 @@ TEST(EdlExport, HostileHeadersWriteNoEvents) {
                           "E999999999999 D -5\nR002 X V\tC\nS" + stamp +
                               "\nV1e999\nN002 R9 V C 0 9 0 9\nNTITLE: evil\nN\x1b[2J\nNAUD 9 3\n");
     edit.Opts().setString(EdlKey::kNotes, "003 R9 V C 0 9 0 9\nFCM: DROP FRAME\nREM good");
-    edit.Opts().setInt64(EdlKey::kStart, INT64_MIN);
+    edit.Opts().setInt64(EditKeys::kStartTimecode, INT64_MIN);
     edit.setName("two\nlines");
     list.shot(0).setName("001 R9 V C 0 9 0 9\nTITLE: z");
     EdlList read;

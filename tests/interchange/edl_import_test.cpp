@@ -3,6 +3,7 @@
 #include "interchange/marker_colour.h"
 
 #include "edit/model/edit.h"
+#include "edit/model/edit_keys.h"
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"
 #include "support/faulty_file_system.h"
@@ -95,8 +96,8 @@ TEST(EdlImport, AListBecomesASequenceAndItsShots) {
     EXPECT_EQ(edit.get_log_type(), kLogEdit);
     EXPECT_EQ(edit.getName(), "Scene 4");
     EXPECT_EQ(edit.getFrameRate().code(), Qx::FrameRate::Fps25);
-    EXPECT_EQ(edit.Opts().getInt64(EdlKey::kStart), 36000 * 25);
-    EXPECT_FALSE(edit.Opts().getBool(EdlKey::kDropFrame, true));
+    EXPECT_EQ(edit.Opts().getInt64(EditKeys::kStartTimecode), 36000 * 25);
+    EXPECT_FALSE(edit.Opts().getBool(EditKeys::kDropFrame, true));
     ASSERT_EQ(edit.getNumChans(VideoChan), 1);
     ASSERT_EQ(edit.getNumChans(AudioChan), 2);
 
@@ -195,8 +196,8 @@ TEST(EdlImport, DropFrameBecomesRealTime) {
     const double frame = 1001.0 / 30000.0;
     EXPECT_DOUBLE_EQ(celOf(sequence(import), 0).get_end_time(), 1800 * frame);
     EXPECT_DOUBLE_EQ(celOf(sequence(import), 0).get_event(0).stripTime, 107892 * frame);
-    EXPECT_TRUE(sequence(import).Opts().getBool(EdlKey::kDropFrame));
-    EXPECT_EQ(sequence(import).Opts().getInt64(EdlKey::kStart), 215784);
+    EXPECT_TRUE(sequence(import).Opts().getBool(EditKeys::kDropFrame));
+    EXPECT_EQ(sequence(import).Opts().getInt64(EditKeys::kStartTimecode), 215784);
 }
 
 TEST(EdlImport, AFailureLeavesTheResult) {

@@ -8,9 +8,8 @@
 
 namespace test {
 
-/// Every name below a folder with its bytes, so that two moments of a tree can be compared. Folders stand
-/// with
-/// "(folder)", links with their target; a folder that does not exist gives an empty snapshot.
+/// Every name below a folder with its bytes, so that two moments of a tree can be compared. Folders
+/// stand with "(folder)", links with their target; a folder that does not exist gives an empty snapshot.
 inline std::map<std::string, std::string> treeSnapshot(const std::string& folder) {
     namespace fs = std::filesystem;
     std::map<std::string, std::string> tree;

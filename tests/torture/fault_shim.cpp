@@ -5,9 +5,8 @@
 //     TORTURE_AT      the number of the call, from 1; 0 to count only
 //     TORTURE_ERROR   the error that the call fails with
 //     TORTURE_SIGNAL  the signal that comes before the call instead
-//     TORTURE_MODE    "one" call fails, that one and all that follow ("rest"), or from that one on every call
-//     that takes
-//                     room ("full")
+//     TORTURE_MODE    "one" call fails, that one and all that follow ("rest"),
+//                     or from that one on every call that takes room ("full")
 //     TORTURE_REPORT  a file that gets the call's name and path, and at the end the number of calls
 //
 // No header that declares the calls is included, so that each is declared once, here, by what it takes at the

@@ -374,6 +374,5 @@ ProjectSession::Known ProjectSession::look(const cookie& item) const {
     if (const Qx::Status read = readEdit(item, edit); !read) {
         return {{}, read.reason(), false};
     }
-    const bool dropFrame = std::as_const(*edit).Opts().getBool(interchange::EdlKey::kDropFrame);
-    return {edit->getName(), {}, dropFrame && edit->getFrameRate().hasDropFrame()};
+    return {edit->getName(), {}, edit->isDropFrame(false)};
 }

@@ -37,9 +37,9 @@
 /// this process has it already or everything is closed. No observer is told under 2 to 5.
 ///
 /// A project is left and another one taken in three steps: `isLeaving` is set, from when on nothing is
-/// opened; what the cache holds is written and dropped; `epoch` rises, and the other project is taken, in one
-/// hold of
-/// 4. What was being opened meanwhile belongs to an epoch that is over and is handed to nobody.
+/// opened; what the cache holds is written and dropped; `epoch` rises, and the other project is taken, under
+/// one hold of 4.
+/// What was being opened meanwhile belongs to an epoch that is over and is handed to nobody.
 struct ManagerState {
     /// A cached edit with what is known of its file: another program that replaced the file since is noticed.
     struct CachedEdit : EditCacheEntry {

@@ -1,22 +1,15 @@
 #include "edit/model/detail/channel_set.h"
 
 #include <algorithm>
+#include <numeric>
 #include <utility>
 
 namespace {
 
 using List = Edit::ChannelSet::List;
+using Channel = Edit::ChannelSet::Channel;
 
-ptrdiff_t offset(size_t position) {
-    return static_cast<ptrdiff_t>(position);
-}
-
-template <typename Channel>
-size_t positionOf(const std::vector<Channel>& channels, const IdStamp& id) {
-    const auto found = std::find_if(channels.begin(), channels.end(),
-                                    [&](const Channel& channel) { return channel.id() == id; });
-    return static_cast<size_t>(found - channels.begin());
-}
+constexpr size_t kFirstRoom = 16;
 
 /// An audio channel like another, but playing a different cel or bearing a different stamp.
 AudCel audioLike(const AudCel& old, Qx::Ptr<cel> content, const IdStamp& id) {
@@ -25,6 +18,20 @@ AudCel audioLike(const AudCel& old, Qx::Ptr<cel> content, const IdStamp& id) {
     audio.setSoundOutputEnabled(old.getSoundOutputEnabled());
     audio.setXFadesEnabled(old.getXFadesEnabled());
     return audio;
+}
+
+template <typename Channels>
+auto channelAt(Channels& channels, int index) {
+    return index >= 0 && index < std::ssize(channels) ? channels[static_cast<size_t>(index)].get() : nullptr;
+}
+
+template <typename Channels>
+auto pairedWith(Channels& channels, const IdStamp& levels) {
+    const auto found = std::find_if(channels.begin(), channels.end(), [&](const auto& channel) {
+        return levels.valid() && channel->list == Edit::ChannelSet::Audio &&
+               channel->sound.getLevelsChanID() == levels;
+    });
+    return found != channels.end() ? found->get() : nullptr;
 }
 
 } // namespace
@@ -57,255 +64,137 @@ Edit::ChanType Edit::ChannelSet::typeOf(List list) {
     return {};
 }
 
-size_t Edit::ChannelSet::size() const {
-    return m_effects.size() + m_video.size() + m_audio.size() + m_levels.size();
+bool Edit::ChannelSet::Channel::changed() const {
+    return content != nullptr ? content->changed() : levels.changed();
 }
 
-size_t Edit::ChannelSet::size(List list) const {
-    switch (list) {
-    case Effects:
-        return m_effects.size();
-    case Video:
-        return m_video.size();
-    case Audio:
-        return m_audio.size();
-    case Levels:
-        return m_levels.size();
-    case kNumLists:
-        break;
-    }
-    return 0;
+size_t Edit::ChannelSet::first(List list) const {
+    return std::accumulate(m_sizes.begin(), m_sizes.begin() + list, size_t{0});
 }
 
-Edit::ChannelSet::Place Edit::ChannelSet::find(int index) const {
-    if (index < 0) {
-        return {};
-    }
-    size_t left = static_cast<size_t>(index);
-    for (const List list : {Effects, Video, Audio, Levels}) {
-        if (left < size(list)) {
-            return {list, left};
-        }
-        left -= size(list);
-    }
-    return {};
+Channel* Edit::ChannelSet::find(int index) {
+    return channelAt(m_channels, index);
 }
 
-Edit::ChannelSet::Place Edit::ChannelSet::find(const IdStamp& chan) const {
-    const Entry* const known = entry(chan);
-    if (known == nullptr) {
-        return {};
-    }
-    switch (known->list) {
-    case Effects:
-        return {Effects, positionOf(m_effects, chan)};
-    case Video:
-        return {Video, positionOf(m_video, chan)};
-    case Audio:
-        return {Audio, positionOf(m_audio, chan)};
-    case Levels:
-        return {Levels, positionOf(m_levels, chan)};
-    case kNumLists:
-        break;
-    }
-    return {};
+const Channel* Edit::ChannelSet::find(int index) const {
+    return channelAt(m_channels, index);
 }
 
-int Edit::ChannelSet::index(const Place& place) const {
-    if (!place) {
+Channel* Edit::ChannelSet::find(const IdStamp& chan) {
+    const auto found = m_byId.find(chan);
+    return found != m_byId.end() ? found->second : nullptr;
+}
+
+const Channel* Edit::ChannelSet::find(const IdStamp& chan) const {
+    const auto found = m_byId.find(chan);
+    return found != m_byId.end() ? found->second : nullptr;
+}
+
+Channel* Edit::ChannelSet::audioOf(const IdStamp& levels) {
+    return pairedWith(m_channels, levels);
+}
+
+const Channel* Edit::ChannelSet::audioOf(const IdStamp& levels) const {
+    return pairedWith(m_channels, levels);
+}
+
+int Edit::ChannelSet::index(const Channel* channel) const {
+    if (channel == nullptr) {
         return NO_CHAN;
     }
-    size_t first = 0;
-    for (const List list : {Effects, Video, Audio}) {
-        first += list < place.list ? size(list) : 0;
+    const auto from = m_channels.begin() + static_cast<ptrdiff_t>(first(channel->list));
+    const auto found =
+        std::find_if(from, m_channels.end(), [&](const auto& other) { return other.get() == channel; });
+    return static_cast<int>(found - m_channels.begin());
+}
+
+int Edit::ChannelSet::position(const Channel* channel) const {
+    return channel == nullptr ? NO_CHAN : index(channel) - static_cast<int>(first(channel->list));
+}
+
+Channel& Edit::ChannelSet::put(size_t index, std::unique_ptr<Channel> channel) {
+    Channel& placed = *channel;
+    // All memory is had before anything changes.
+    if (m_channels.size() == m_channels.capacity()) {
+        m_channels.reserve(std::max(kFirstRoom, 2 * m_channels.size()));
     }
-    return static_cast<int>(first + place.position);
+    m_byId.insert_or_assign(placed.id, &placed);
+    m_channels.insert(m_channels.begin() + static_cast<ptrdiff_t>(index), std::move(channel));
+    ++m_sizes[placed.list];
+    return placed;
 }
 
-const ManagedCel* Edit::ChannelSet::managed(const Place& place) const {
-    switch (place.list) {
-    case Effects:
-        return &m_effects[place.position];
-    case Video:
-        return &m_video[place.position];
-    case Audio:
-        return &m_audio[place.position];
-    case Levels:
-    case kNumLists:
-        break;
+Channel& Edit::ChannelSet::insert(List list, size_t at, Qx::Ptr<cel> content, const IdStamp& id) {
+    auto channel = std::make_unique<Channel>();
+    channel->list = list;
+    channel->id = id;
+    setContent(*channel, std::move(content));
+    return put(first(list) + at, std::move(channel));
+}
+
+void Edit::ChannelSet::insertLevels(AudLevelsCel levels, const IdStamp& id, Channel& audio) {
+    auto channel = std::make_unique<Channel>();
+    channel->list = Levels;
+    channel->id = id;
+    channel->levels = std::move(levels);
+    channel->levels.id(id);
+    put(m_channels.size(), std::move(channel));
+    audio.sound.setLevelsChanID(id);
+}
+
+std::unique_ptr<Channel> Edit::ChannelSet::remove(const Channel& channel) {
+    const auto place = m_channels.begin() + index(&channel);
+    std::unique_ptr<Channel> out = std::move(*place);
+    m_channels.erase(place);
+    m_byId.erase(out->id);
+    --m_sizes[out->list];
+    if (Channel* const audio = out->list == Levels ? audioOf(out->id) : nullptr) {
+        audio->sound.setLevelsChanID(IdStamp());
     }
-    return nullptr;
-}
-
-IdStamp Edit::ChannelSet::id(const Place& place) const {
-    if (place.list == Levels) {
-        return m_levels[place.position].id();
-    }
-    const ManagedCel* const channel = managed(place);
-    return channel != nullptr ? channel->id() : IdStamp();
-}
-
-cel* Edit::ChannelSet::content(const Place& place) const {
-    const ManagedCel* const channel = managed(place);
-    return channel != nullptr ? channel->getCel() : nullptr;
-}
-
-const Edit::ChannelSet::Entry* Edit::ChannelSet::entry(const IdStamp& chan) const {
-    const auto found = m_entries.find(chan);
-    return found != m_entries.end() ? &found->second : nullptr;
-}
-
-Edit::ChannelSet::Entry* Edit::ChannelSet::entry(const IdStamp& chan) {
-    const auto found = m_entries.find(chan);
-    return found != m_entries.end() ? &found->second : nullptr;
-}
-
-const AudCel* Edit::ChannelSet::audioOf(const IdStamp& levels) const {
-    const auto found = std::find_if(m_audio.begin(), m_audio.end(), [&](const AudCel& audio) {
-        return levels.valid() && audio.getLevelsChanID() == levels;
-    });
-    return found != m_audio.end() ? &*found : nullptr;
-}
-
-AudCel* Edit::ChannelSet::audioPairedWith(const IdStamp& levels) {
-    return const_cast<AudCel*>(audioOf(levels));
-}
-
-void Edit::ChannelSet::insert(List list, size_t at, Qx::Ptr<cel> content, const IdStamp& id) {
-    Entry known;
-    known.list = list;
-    known.cached = content.get();
-    switch (list) {
-    case Effects:
-        m_effects.insert(m_effects.begin() + offset(at), VFXCel(std::move(content), id));
-        break;
-    case Video:
-        m_video.insert(m_video.begin() + offset(at), VidCel(std::move(content), id));
-        break;
-    case Audio:
-        m_audio.insert(m_audio.begin() + offset(at), AudCel(std::move(content), id));
-        break;
-    case Levels:
-    case kNumLists:
-        return;
-    }
-    m_entries.insert_or_assign(id, std::move(known));
-}
-
-void Edit::ChannelSet::insertLevels(AudLevelsCel levels, const IdStamp& id, size_t audio) {
-    levels.id(id);
-    m_levels.push_back(std::move(levels));
-    m_audio[audio].setLevelsChanID(id);
-    Entry known;
-    known.list = Levels;
-    m_entries.insert_or_assign(id, std::move(known));
-}
-
-Edit::ChannelSet::Removed Edit::ChannelSet::remove(const Place& place) {
-    Removed out;
-    out.list = place.list;
-    out.index = index(place);
-    out.id = id(place);
-    const ptrdiff_t at = offset(place.position);
-    switch (place.list) {
-    case Effects:
-        out.content = m_effects[place.position];
-        m_effects.erase(m_effects.begin() + at);
-        break;
-    case Video:
-        out.content = m_video[place.position];
-        m_video.erase(m_video.begin() + at);
-        break;
-    case Audio:
-        out.content = m_audio[place.position];
-        m_audio.erase(m_audio.begin() + at);
-        break;
-    case Levels:
-        out.levels = m_levels[place.position];
-        m_levels.erase(m_levels.begin() + at);
-        if (AudCel* const audio = audioPairedWith(out.id)) {
-            audio->setLevelsChanID(IdStamp());
-        }
-        break;
-    case kNumLists:
-        break;
-    }
-    m_entries.erase(out.id);
     return out;
 }
 
-void Edit::ChannelSet::setContent(const Place& place, Qx::Ptr<cel> content) {
-    const IdStamp stamp = id(place);
-    Entry* const known = entry(stamp);
-    if (known == nullptr) {
-        return;
-    }
-    known->cached = content.get();
-    switch (place.list) {
-    case Effects:
-        m_effects[place.position] = VFXCel(std::move(content), stamp);
-        break;
-    case Video:
-        m_video[place.position] = VidCel(std::move(content), stamp);
-        break;
-    case Audio:
-        m_audio[place.position] = audioLike(m_audio[place.position], std::move(content), stamp);
-        break;
-    case Levels:
-    case kNumLists:
-        break;
+void Edit::ChannelSet::setContent(Channel& channel, Qx::Ptr<cel> content) {
+    channel.cached = content.get();
+    channel.content = std::move(content);
+    if (channel.list == Audio) {
+        channel.sound = audioLike(channel.sound, channel.content, channel.id);
     }
 }
 
-void Edit::ChannelSet::rename(const Place& place, const IdStamp& newId) {
-    const IdStamp old = id(place);
-    auto node = m_entries.extract(old);
+void Edit::ChannelSet::rename(Channel& channel, const IdStamp& newId) {
+    auto node = m_byId.extract(channel.id);
     node.key() = newId;
-    m_entries.insert(std::move(node));
-    switch (place.list) {
-    case Effects:
-        m_effects[place.position].id(newId);
-        break;
-    case Video:
-        m_video[place.position].id(newId);
-        break;
-    case Audio:
-        m_audio[place.position].id(newId);
-        break;
-    case Levels:
-        m_levels[place.position].id(newId);
-        if (AudCel* const audio = audioPairedWith(old)) {
-            audio->setLevelsChanID(newId);
-        }
-        break;
-    case kNumLists:
-        break;
+    m_byId.insert(std::move(node));
+    if (Channel* const audio = channel.list == Levels ? audioOf(channel.id) : nullptr) {
+        audio->sound.setLevelsChanID(newId);
     }
+    channel.id = newId;
+    channel.levels.id(newId);
+    channel.sound.id(newId);
 }
 
 void Edit::ChannelSet::clear() {
-    m_effects.clear();
-    m_video.clear();
-    m_audio.clear();
-    m_levels.clear();
-    m_entries.clear();
+    m_byId.clear();
+    m_channels.clear();
+    m_sizes.fill(0);
 }
 
 std::unique_ptr<Edit::ChannelSet> Edit::ChannelSet::clone() const {
     auto copy = std::make_unique<ChannelSet>();
-    const auto cloneAll = [](const auto& from, auto& to) {
-        to.reserve(from.size());
-        for (const auto& channel : from) {
-            to.push_back(channel.clone());
+    copy->m_channels.reserve(size());
+    for (const auto& channel : m_channels) {
+        auto twin = std::make_unique<Channel>(*channel);
+        if (channel->list == Audio) {
+            twin->sound = channel->sound.clone();
+            twin->content = twin->sound.sharedCel();
+        } else if (channel->list == Levels) {
+            twin->levels = channel->levels.clone();
+        } else {
+            twin->content = std::make_shared<cel>(*channel->content);
         }
-    };
-    cloneAll(m_effects, copy->m_effects);
-    cloneAll(m_video, copy->m_video);
-    cloneAll(m_audio, copy->m_audio);
-    cloneAll(m_levels, copy->m_levels);
-    copy->m_entries = m_entries;
-    for (auto& [id, known] : copy->m_entries) {
-        known.cached = copy->content(copy->find(id));
+        twin->cached = twin->content.get();
+        copy->put(copy->size(), std::move(twin));
     }
     return copy;
 }

@@ -3,94 +3,98 @@
 #include "edit/model/edit.h"
 
 #include <array>
-#include <optional>
+#include <memory>
 #include <unordered_map>
 #include <vector>
 
-/// The channels of an edit: four lists that define the channel index, and a map from stamp to what is known
-/// of a channel besides its cel.
+/// The channels of an edit: one sequence in the order of the channel index, which its four lists follow one
+/// another in.
 ///
 /// It owns the cels (shared), the level envelopes, names, material texts and sync losses. It knows nothing of
 /// dirt, descriptions, notification, groups or cues: `Edit` calls it and sees to those.
 ///
-/// Invariants: every channel of a list has one entry of the map under its stamp and every entry has its
-/// channel; no stamp is null; an entry's list is the list that the channel is in; the levels stamp of an
-/// audio channel is null or that of a levels channel, and no two audio channels have the same. Not
-/// thread-safe.
+/// Invariants: the sequence is in the order of the lists; no stamp is null or there twice; the levels stamp
+/// of an audio channel is null or that of a levels channel, and no two audio channels have the same. A
+/// channel stays where it is in memory until it is removed. Not thread-safe.
 class Edit::ChannelSet {
 public:
     /// The lists in the order of the channel index.
     enum List : unsigned { Effects, Video, Audio, Levels, kNumLists };
 
-    /// Where a channel is.
-    struct Place {
+    /// All that is known of one channel.
+    struct Channel {
         List list = kNumLists;
-        size_t position = 0;
-        [[nodiscard]] explicit operator bool() const { return list != kNumLists; }
-    };
-
-    /// What is known of a channel besides its content.
-    struct Entry {
-        List list = kNumLists;
-        cel* cached = nullptr; ///< what `getCel` by stamp answers; null for a levels channel
+        IdStamp id;
+        Qx::Ptr<cel> content;  ///< null for a levels channel
+        cel* cached = nullptr; ///< what `getCel` by stamp answers
+        AudLevelsCel levels;   ///< of a levels channel
+        AudCel sound;          ///< of an audio channel: its cel with what is heard of it
         String name;           ///< empty unless the channel has one of its own
         String materialInfo;
         double syncLoss = 0; ///< seconds
-    };
 
-    /// A channel that was taken out: holds its content until it goes.
-    struct Removed {
-        List list = kNumLists;
-        int index = NO_CHAN; ///< before the removal
-        IdStamp id;
-        ManagedCel content;
-        AudLevelsCel levels;
+        [[nodiscard]] ChanType type() const { return typeOf(list); }
+        [[nodiscard]] bool changed() const;
     };
 
     /// The list for a type and subtype as callers give them; `kNumLists` if an edit holds no such channels.
     [[nodiscard]] static List listFor(Edit_Chan_Type type, Edit_Chan_SubType subtype);
     [[nodiscard]] static ChanType typeOf(List list);
 
-    [[nodiscard]] size_t size() const;
-    [[nodiscard]] size_t size(List list) const;
-    [[nodiscard]] Place find(int index) const;
-    [[nodiscard]] Place find(const IdStamp& chan) const;
-    [[nodiscard]] int index(const Place& place) const;
-    [[nodiscard]] IdStamp id(const Place& place) const;
-    /// Null for a levels channel or no channel.
-    [[nodiscard]] cel* content(const Place& place) const;
-    [[nodiscard]] const Entry* entry(const IdStamp& chan) const;
-    [[nodiscard]] Entry* entry(const IdStamp& chan);
-    [[nodiscard]] bool contains(const IdStamp& chan) const { return entry(chan) != nullptr; }
+    [[nodiscard]] size_t size() const { return m_channels.size(); }
+    [[nodiscard]] size_t size(List list) const { return m_sizes[list]; }
+    /// The index of the first channel of a list, or where it would be.
+    [[nodiscard]] size_t first(List list) const;
 
-    [[nodiscard]] const std::vector<VFXCel>& effects() const { return m_effects; }
-    [[nodiscard]] const std::vector<VidCel>& video() const { return m_video; }
-    [[nodiscard]] const std::vector<AudCel>& audio() const { return m_audio; }
-    [[nodiscard]] const std::vector<AudLevelsCel>& levels() const { return m_levels; }
+    /// The channel with an index or a stamp; null if there is none.
+    [[nodiscard]] Channel* find(int index);
+    [[nodiscard]] const Channel* find(int index) const;
+    [[nodiscard]] Channel* find(const IdStamp& chan);
+    [[nodiscard]] const Channel* find(const IdStamp& chan) const;
+    [[nodiscard]] bool contains(const IdStamp& chan) const { return m_byId.contains(chan); }
     /// The audio channel that a levels channel belongs to; null if none.
-    [[nodiscard]] const AudCel* audioOf(const IdStamp& levels) const;
+    [[nodiscard]] Channel* audioOf(const IdStamp& levels);
+    [[nodiscard]] const Channel* audioOf(const IdStamp& levels) const;
+
+    /// The index of a channel of the set, and its position in its list; `NO_CHAN` for null.
+    [[nodiscard]] int index(const Channel* channel) const;
+    [[nodiscard]] int position(const Channel* channel) const;
+
+    /// True if `test` is of some channel.
+    template <typename Test>
+    [[nodiscard]] bool any(Test test) const {
+        for (const auto& channel : m_channels) {
+            if (test(*channel)) {
+                return true;
+            }
+        }
+        return false;
+    }
+    /// Calls `visit` with each channel in the order of the index.
+    template <typename Visit>
+    void forEach(Visit visit) const {
+        for (const auto& channel : m_channels) {
+            visit(*channel);
+        }
+    }
 
     /// Puts a channel with a stamp that is not null and not taken before position `at` of a list.
-    void insert(List list, size_t at, Qx::Ptr<cel> content, const IdStamp& id);
-    void insertLevels(AudLevelsCel levels, const IdStamp& id, size_t audio);
-    /// `place` must be one of a channel. A pairing with its levels or its audio channel ends.
-    Removed remove(const Place& place);
+    Channel& insert(List list, size_t at, Qx::Ptr<cel> content, const IdStamp& id);
+    /// Adds a levels channel, with such a stamp, and pairs it with an audio channel.
+    void insertLevels(AudLevelsCel levels, const IdStamp& id, Channel& audio);
+    /// Takes a channel out. A pairing of levels with their audio channel ends.
+    std::unique_ptr<Channel> remove(const Channel& channel);
     /// Gives the channel another cel; not for a levels channel.
-    void setContent(const Place& place, Qx::Ptr<cel> content);
-    /// Takes over output, cross-fades and pairing for the audio channel at a position.
-    void setAudio(size_t position, const AudCel& audio) { m_audio[position] = audio; }
-    void rename(const Place& place, const IdStamp& newId);
+    static void setContent(Channel& channel, Qx::Ptr<cel> content);
+    void rename(Channel& channel, const IdStamp& newId);
     void clear();
     /// A deep copy, stamps kept.
     [[nodiscard]] std::unique_ptr<ChannelSet> clone() const;
 
 private:
-    [[nodiscard]] const ManagedCel* managed(const Place& place) const;
-    [[nodiscard]] AudCel* audioPairedWith(const IdStamp& levels);
+    Channel& put(size_t index, std::unique_ptr<Channel> channel);
 
-    std::vector<VFXCel> m_effects;
-    std::vector<VidCel> m_video;
-    std::vector<AudCel> m_audio;
-    std::vector<AudLevelsCel> m_levels;
-    std::unordered_map<IdStamp, Entry> m_entries;
+    std::vector<std::unique_ptr<Channel>> m_channels;
+    std::array<size_t, kNumLists> m_sizes{};
+    std::unordered_map<IdStamp, Channel*> m_byId;
 };

@@ -1,39 +1,7 @@
 #pragma once
 
 #include "edit/model/edit.h"
-
-/// Names in edit files. They live in files: do not change them.
-namespace EditKeys {
-inline constexpr const char* kNumChans = "NUM_CHANS";
-inline constexpr const char* kCurrentTime = "CURRENT_TIME";
-inline constexpr const char* kMarkTime = "MARK_TIME";
-inline constexpr const char* kSyncLoss = "SyncLoss";                   ///< followed by the channel index
-inline constexpr const char* kSyncError = "SYNC_ERROR";                ///< followed by the old index
-inline constexpr const char* kSoundOutput = "SOUND_OUTPUT_FLAG";       ///< followed by the old index
-inline constexpr const char* kSoundOutputXFade = "SOUND_OUTPUT_XFADE"; ///< followed by the old index
-inline constexpr const char* kEntireMedium = "ENTIRE_MEDIUM";
-inline constexpr const char* kLevels = "Levels";             ///< followed by a counter
-inline constexpr const char* kLevelsName = "LevelsName";     ///< followed by the counter of a Levels key
-inline constexpr const char* kLevelsPlace = "LevelsPlace";   ///< followed by the counter of a Levels key
-inline constexpr const char* kLevelsUnread = "LevelsUnread"; ///< followed by a counter
-inline constexpr const char* kCelKind = "CelKind";           ///< followed by the counter of a Celid object
-inline constexpr const char* kCelid = "Celid";               ///< name of a cel object, followed by a counter
-inline constexpr const char* kUnread = ".unread"; ///< ends the name of an object that was set aside
-inline constexpr const char* kCues = "CueId";     ///< name of the cue object
-inline constexpr const char* kTvType = "tvtype";
-inline constexpr const char* kFrameRate = "FRAME_RATE";
-inline constexpr const char* kRevision = "ED2_REVISION";
-inline constexpr const char* kFrameBased = "FRAME_BASED";
-inline constexpr const char* kTransfer = "TRANSFER";
-inline constexpr const char* kSequence = "SEQUENCE";
-inline constexpr const char* kTransferAudioMedium = "TRANSFER_AUDIO_MEDIUM";
-inline constexpr const char* kHeaderEnd = "END_EDIT_HEADER";
-
-/// A name followed by a number.
-[[nodiscard]] String numbered(const char* name, int number);
-/// Removes every key that is `name` followed by a number of at least `from`.
-void removeNumbered(configb& header, const char* name, int from);
-} // namespace EditKeys
+#include "edit/model/edit_keys.h"
 
 /// What reading and writing do inside an edit. The steps are called in the order in which they are declared;
 /// a step that fails says why in one sentence.
@@ -74,7 +42,7 @@ public:
     class Lending {
     public:
         explicit Lending(Edit& edit) : m_edit(edit) {}
-        ~Lending() { extractCelsFromStore(m_edit, m_isWritten); }
+        ~Lending() { m_edit.extractCelsFromStore(m_isWritten); }
         void setWritten() { m_isWritten = true; }
         Lending(const Lending&) = delete;
         Lending& operator=(const Lending&) = delete;
@@ -92,8 +60,6 @@ public:
     static void markWritten(Edit& edit);
     /// The state after a save that failed: the edit is dirty, and whoever writes dirty edits knows of it.
     static void markUnwritten(Edit& edit);
-    /// The content of a channel that has a cel; null for others.
-    [[nodiscard]] static Qx::Ptr<cel> sharedCel(const Edit& edit, const IdStamp& chan);
     /// The number that legacy headers give a channel: 0 the video channel, 1 the first audio channel and so
     /// on.
     [[nodiscard]] static int oldIndex(const Edit& edit, const IdStamp& audio);
@@ -146,8 +112,6 @@ public:
     /// What the header says of channels, times and flags, for a file that has the channels `order`.
     static void updateHeader(const Edit& edit, configb& header, const Vector<IdStamp>& order);
     static void lendCels(Edit& edit);
-    /// Ends the lending. Afterwards the edit alone owns its cels.
-    static void extractCelsFromStore(Edit& edit, bool written) noexcept;
     /// @}
 
     /// \name Legacy text

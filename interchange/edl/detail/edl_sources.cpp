@@ -1,5 +1,6 @@
 #include "interchange/edl/detail/edl_sources.h"
 
+#include "edit/model/edit_keys.h"
 #include "interchange/edl/detail/edl_line.h"
 #include "interchange/edl/edl_records.h"
 
@@ -108,7 +109,7 @@ void EdlSources::describe(EdlSource& source) {
 
 void EdlSources::takeHeader(EdlSource& source, const Edit& shot) {
     const configb& header = shot.Opts();
-    source.drop = header.getBool(EdlKey::kDropFrame, false) && m_rate.hasDropFrame();
+    source.drop = EditKeys::kDropFrame.get(header) && m_rate.hasDropFrame();
     source.name = oneLine(shot.getName());
     source.sourceFile = oneLine(header.getString(EdlKey::kSourceFile));
     source.mediaPath = oneLine(header.getString(EdlKey::kMediaPath));
