@@ -50,10 +50,24 @@ void Verifier::add(const cookie& item, const String& name) {
     VerifiedFile& file = m_files.emplace_back();
     file.name = name;
     file.item = item;
-    verifyEditFile(Qx::joinPath(m_folder, name), file.faults);
-    if (!file.faults.empty() && Qx::askFile(Qx::joinPath(m_folder, name)).isMissing()) {
-        m_files.pop_back(); // moved or deleted by a writer since its name was read
-        return;
+    const String path = Qx::joinPath(m_folder, name);
+    // A writer may move or replace it at that moment: then what is there afterwards counts.
+    constexpr int kTries = 5;
+    for (int tries = 0; tries < kTries; ++tries) {
+        const Qx::FileInfo before = Qx::askFile(path).info();
+        file.faults.clear();
+        verifyEditFile(path, file.faults);
+        if (file.faults.empty()) {
+            break;
+        }
+        const Qx::FileAnswer after = Qx::askFile(path);
+        if (after.isMissing()) {
+            m_files.pop_back();
+            return;
+        }
+        if (Qx::isSameFile(before, after.info())) {
+            break;
+        }
     }
     if (!item.is_valid()) {
         file.faults.push_back("its name is not that of an item, so nothing opens it; rename it to a cookie");
