@@ -164,6 +164,9 @@ int applyOperation(ProjectSession& session, const ApplyOptions& options, edit_op
                                           (cause.empty() ? String() : ": " + cause) + "; " +
                                           letGo(item, to, from)));
     }
+    if (!options.dryRun) {
+        setOutcome(item.asString() + " was changed by " + String(editOperationName(op)));
+    }
     const EditReport after = reportOf(*to.edit, session.sourceNamer());
     reportResult(*to.edit, before, after, op, result);
     drawEdit(after);

@@ -19,6 +19,7 @@ constexpr int kGreatestWidth = 500;
 
 int outputError = 0;
 String lastLine; ///< what was written last, if it is one line
+String outcome;  ///< what the command did, where its output is more than a line
 
 const char* environment(const char* name) {
     const char* value = std::getenv(name);
@@ -125,6 +126,10 @@ void writeOut(std::string_view text) {
     }
 }
 
+void setOutcome(String line) {
+    outcome = std::move(line);
+}
+
 bool finishOutput(bool changed) {
     errno = 0;
     if (std::fflush(stdout) != 0 && outputError == 0) {
@@ -135,7 +140,8 @@ bool finishOutput(bool changed) {
     }
     reportError(String("cannot write standard output: ") + std::strerror(outputError) +
                 (changed ? "; the command was carried out all the same" : "") +
-                (changed && !lastLine.empty() ? ": " + lastLine : String()));
+                (changed && !(outcome + lastLine).empty() ? ": " + (outcome.empty() ? lastLine : outcome)
+                                                          : String()));
     return false;
 }
 

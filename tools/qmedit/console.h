@@ -58,6 +58,8 @@ private:
 
 /// Writes to standard output. A failure is remembered; see `finishOutput`.
 void writeOut(std::string_view text);
+/// What the command did, in one line, for `finishOutput` where more than a line is written of it.
+void setOutcome(String line);
 /// Flushes standard output. False, with one line on standard error, if anything could not be written. The
 /// line says so when edits were `changed` all the same, with the line that was to tell of it.
 [[nodiscard]] bool finishOutput(bool changed = false);
