@@ -18,10 +18,6 @@ String fileOf(const String& folder, const cookie& item) {
     return Qx::joinPath(folder, item.asString() + getEditFilenameExt());
 }
 
-Qx::Status asStatus(const Qx::FileError& error) {
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
-}
-
 /// The edits that a note names; none for a text that is no whole note.
 std::vector<cookie> editsOf(const String& text) {
     const std::vector<String> lines = text.split('\n', true);
@@ -49,14 +45,14 @@ bool isThere(const std::vector<String>& names, const cookie& item) {
 Qx::Status examine(const String& folder, const std::vector<String>& names, UnfinishedImport& import) {
     const Qx::FileAnswer written = Qx::askFile(import.note);
     if (written.isUnknown()) {
-        return asStatus(written.obstacle());
+        return written.obstacle().status();
     }
     String text;
     if (written.isRegular()) {
         const Qx::FileError error = Qx::readWholeFile(import.note, text, kSizeLimit);
         // It may have come to its end meanwhile.
         if (error && !Qx::askFile(import.note).isMissing()) {
-            return asStatus(error);
+            return error.status();
         }
     }
     std::vector<cookie> edits = editsOf(text);
@@ -68,7 +64,7 @@ Qx::Status examine(const String& folder, const std::vector<String>& names, Unfin
         const String path = fileOf(folder, shot);
         const Qx::FileAnswer found = Qx::askFile(path);
         if (found.isUnknown()) {
-            return asStatus(found.obstacle());
+            return found.obstacle().status();
         }
         if (found.isRegular() && found.info().modifiedNs <= written.info().modifiedNs) {
             import.files.push_back(path);
@@ -103,7 +99,7 @@ Qx::Status writeImportNote(const String& folder, const std::vector<cookie>& edit
 
 Qx::Status unfinishedImports(const String& folder, std::vector<UnfinishedImport>& imports) {
     std::vector<String> names;
-    Qx::Status status = asStatus(Qx::retryInterrupted([&] { return Qx::fileSystem().list(folder, names); }));
+    Qx::Status status = Qx::retryInterrupted([&] { return Qx::fileSystem().list(folder, names); }).status();
     for (auto name = std::lower_bound(names.begin(), names.end(), kNameStart);
          name != names.end() && name->starts_with(kNameStart); ++name) {
         if (!name->ends_with(kNameEnd)) {

@@ -7,10 +7,6 @@
 
 namespace {
 
-Qx::Status asStatus(const Qx::FileError& error) {
-    return error ? Qx::Status::failure(error.text()) : Qx::Status();
-}
-
 Qx::FileError moveFile(const String& from, const String& to) {
     return Qx::retryInterrupted([&] { return Qx::fileSystem().rename(from, to); });
 }
@@ -47,7 +43,7 @@ Qx::Status Recovering::objection() const {
     }
     const Qx::FileAnswer present = Qx::askFile(file);
     if (present.isUnknown()) {
-        return asStatus(present.obstacle());
+        return present.obstacle().status();
     }
     const Qx::FileInfo known = m_present != nullptr ? m_present->file : Qx::FileInfo();
     if (!Qx::isSameFile(present.info(), known) ||
@@ -67,7 +63,7 @@ Qx::Status Recovering::keepPresent(String& kept) {
         return status;
     }
     Qx::Status status = findCorruptName(m_undo.file(), kept);
-    return status ? asStatus(moveFile(m_undo.file(), kept)) : status;
+    return status ? moveFile(m_undo.file(), kept).status() : status;
 }
 
 /// A failure is told of by the caller, who looks where the file is.
@@ -87,19 +83,19 @@ Qx::Status Recovering::run(String& kept) {
     const String& file = m_undo.file();
     // Copied first: keeping the present state may move the one that is taken to another name.
     const String copy = file + kRecoveryCopy;
-    if (Qx::Status copied = asStatus(Qx::copyFile(m_taken.path, copy)); !copied) {
+    if (Qx::Status copied = Qx::copyFile(m_taken.path, copy).status(); !copied) {
         return copied;
     }
     Qx::Status status = keepPresent(kept);
     if (status) {
-        status = asStatus(moveFile(copy, file));
+        status = moveFile(copy, file).status();
     }
     if (!status) {
         putPresentBack(kept);
         static_cast<void>(Qx::fileSystem().remove(copy).code);
         return status;
     }
-    return asStatus(Qx::retryInterrupted([&] { return Qx::fileSystem().syncFolder(Qx::folderOf(file)); }));
+    return Qx::retryInterrupted([&] { return Qx::fileSystem().syncFolder(Qx::folderOf(file)); }).status();
 }
 
 /// `dropped` gets the edit that was in the cache, to go when no lock is held.
