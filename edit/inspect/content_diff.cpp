@@ -1,6 +1,7 @@
 #include "edit/inspect/content_diff.h"
 
 #include "edit/inspect/detail/diff_walk.h"
+#include "edit/model/edit_keys.h"
 #include "platform/base/num_range.h"
 
 #include <algorithm>
@@ -14,28 +15,6 @@
 namespace {
 
 using Aud::DynamicLevelControl::Node;
-
-/// The header keys that are no content of their own.
-bool isBookkeeping(const String& key) {
-    static constexpr const char* kKeys[] = {
-        // Every save or change writes them.
-        "MODIFICATION_TIME", "MODIFICATION_PROGRAM", "MOD_TIME_V3", "MOD_COUNT", "CHANGE_DESCRIPTION",
-        // Which of its states an edit is, and what belongs to those.
-        "MILESTONE", "CLIPBOARD_USED", "IS_BACKUP", "UNDO_COOKIE", "REDO_COOKIE",
-        // Of the channels, which are compared themselves.
-        "NUM_CHANS"};
-    // The same, followed by a number.
-    static constexpr std::string_view kNumbered[] = {
-        "CelKind",  "Levels",     "LevelsName",        "LevelsPlace",
-        "SyncLoss", "SYNC_ERROR", "SOUND_OUTPUT_FLAG", "SOUND_OUTPUT_XFADE"};
-    const size_t number = key.find_last_not_of("0123456789") + 1;
-    return std::any_of(std::begin(kKeys), std::end(kKeys),
-                       [&](const char* name) { return String::equalNoCase(key, name); }) ||
-           (number < key.size() &&
-            std::any_of(std::begin(kNumbered), std::end(kNumbered), [&](std::string_view name) {
-                return String::equalNoCase(key.substr(0, number), name);
-            }));
-}
 
 /// By bits, so that a value which is no number equals itself.
 bool sameValue(const configb::Value& a, const configb::Value& b) {
@@ -53,12 +32,12 @@ std::vector<ValueDiff> valuesDiff(const configb& before, const configb& after) {
     std::vector<ValueDiff> diffs;
     for (const String& key : before.keys()) {
         const configb::Value* const now = after.find(key);
-        if (!isBookkeeping(key) && (now == nullptr || !sameValue(*before.find(key), *now))) {
+        if (!EditKeys::isBookkeeping(key) && (now == nullptr || !sameValue(*before.find(key), *now))) {
             diffs.push_back({key, valueOf(before, key), valueOf(after, key)});
         }
     }
     for (const String& key : after.keys()) {
-        if (!isBookkeeping(key) && !before.contains(key)) {
+        if (!EditKeys::isBookkeeping(key) && !before.contains(key)) {
             diffs.push_back({key, std::nullopt, valueOf(after, key)});
         }
     }
