@@ -1,5 +1,6 @@
 #pragma once
 
+#include "edit/model/cel.h"
 #include "edit/model/edit.h"
 
 #include <vector>

@@ -2,6 +2,7 @@
 
 #include "bench/work_folder.h"
 #include "edit/manager/edit_manager.h"
+#include "edit/model/cel.h"
 #include "edit/project/cookie_allocator.h"
 #include "platform/services/atomic_batch.h"
 #include "platform/services/current_project.h"

@@ -1,5 +1,6 @@
 // Any bytes as an edit file: refused whole, or an edit that is consistent and says so again.
 
+#include "edit/model/cel.h"
 #include "edit/model/edit.h"
 #include "platform/services/log.h"
 #include "tests/support/memory_file.h"

@@ -2,12 +2,15 @@
 
 #include "edit/manager/edit_manager_lock.h"
 #include "edit/manager/import_note.h"
+#include "edit/model/cel.h"
+#include "edit/model/channel_event.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_registry.h"
 #include "edit/project/cookie_allocator.h"
 #include "platform/services/atomic_batch.h"
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"
+#include "platform/store/configb.h"
 
 #include <unordered_map>
 #include <unordered_set>

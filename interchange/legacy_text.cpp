@@ -1,5 +1,7 @@
 #include "interchange/legacy_text.h"
 
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_keys.h"
 #include "platform/media/tv_standard.h"

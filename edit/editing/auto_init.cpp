@@ -10,8 +10,8 @@ unsigned autoInitAudioTracks(EditModule& module) {
     const double end = edit->getEndTime();
     unsigned filled = 0;
     for (const IdStamp& chan : chans) {
-        cel* const its = edit->get_edit_cel_p(edit->getIdx(chan));
-        filled += its != nullptr && its->fillToTime(end) ? 1 : 0;
+        cel* const content = edit->get_edit_cel_p(edit->getIdx(chan));
+        filled += content != nullptr && content->fillToTime(end) ? 1 : 0;
     }
     if (filled > 0) {
         edit->set_dirty(true);

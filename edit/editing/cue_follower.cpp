@@ -1,4 +1,5 @@
 #include "edit/editing/detail/cue_follower.h"
+#include "edit/model/cue_list.h"
 
 #include <algorithm>
 #include <map>
@@ -18,8 +19,8 @@ Editor::CueFollower::CueFollower(Edit& edit, const Plan& plan, edit_operation op
             continue;
         }
         for (const Step& step : plan.steps) {
-            const cel* const its = edit.get_edit_cel_p(edit.getIdx(plan.targets[step.target].chan));
-            if (cue.event().get_its_cel() == its &&
+            const cel* const content = edit.get_edit_cel_p(edit.getIdx(plan.targets[step.target].chan));
+            if (cue.event().get_its_cel() == content &&
                 Qx::timeIsConsideredToBeInRegion(cue.editTime(), {step.at, step.end()})) {
                 m_moved.push_back({i, cue.event().get_channel_event().id});
             }
@@ -55,15 +56,15 @@ void Editor::CueFollower::moveToCopies() {
     }
     for (auto& [chan, events] : wanted) {
         const int index = m_edit.getIdx(chan);
-        const cel* const its = m_edit.get_edit_cel_p(index);
+        const cel* const content = m_edit.get_edit_cel_p(index);
         std::sort(events.begin(), events.end());
-        for (int i = 0; its != nullptr && i < its->numEvents(); ++i) {
-            const IdStamp& event = its->getChanEventPtr(i)->id;
+        for (int i = 0; content != nullptr && i < content->numEvents(); ++i) {
+            const IdStamp& event = content->getChanEventPtr(i)->id;
             for (auto at = std::lower_bound(events.begin(), events.end(), std::pair(event, size_t{0}));
                  at != events.end() && at->first == event; ++at) {
                 cue_point* const cue = m_edit.get_cues().get_cue_point(at->second, 0);
                 if (cue != nullptr) {
-                    cue->setEvent(ce_handle(its, i));
+                    cue->setEvent(ce_handle(content, i));
                     cue->setChannel(cue->channel() == kAnyCueChan ? kAnyCueChan : index);
                 }
             }

@@ -1,5 +1,6 @@
 #include "edit/editing/edit_module.h"
 
+#include "edit/model/cel.h"
 #include "platform/media/frame_rate.h"
 
 #include <cmath>
@@ -88,8 +89,8 @@ bool EditModule::isSelected(const IdStamp& chan) const {
     if (!m_edit.valid() || !m_edit->chanValid(chan, AnyChan)) {
         return false;
     }
-    const Record* const its = record(chan);
-    return its == nullptr || its->selected;
+    const Record* const content = record(chan);
+    return content == nullptr || content->selected;
 }
 
 void EditModule::getSelectedChans(Vector<IdStamp>& chans, Edit_Chan_Type type,
@@ -128,9 +129,9 @@ void EditModule::setMarkTime(const IdStamp& chan, double time, MarkType type) {
     if (!m_edit.valid() || !m_edit->chanValid(chan, AnyChan) || !std::isfinite(time) || !isMarkType(type)) {
         return;
     }
-    Record& its = m_records[chan];
-    (type == InMark ? its.in : its.out) = time;
-    if (its.selected && !its.marked()) {
+    Record& content = m_records[chan];
+    (type == InMark ? content.in : content.out) = time;
+    if (content.selected && !content.marked()) {
         m_records.erase(chan);
     }
 }
@@ -147,18 +148,18 @@ void EditModule::setMarkTime(const IdStamp& chan, const std::pair<double, double
 }
 
 double EditModule::getMarkTime(const IdStamp& chan, MarkType type) const {
-    const Record* const its = m_edit.valid() ? record(chan) : nullptr;
-    if (its == nullptr || !isMarkType(type)) {
+    const Record* const content = m_edit.valid() ? record(chan) : nullptr;
+    if (content == nullptr || !isMarkType(type)) {
         return kNoTime;
     }
-    return type == InMark ? its->in : its->out;
+    return type == InMark ? content->in : content->out;
 }
 
 double EditModule::getMarkTime(MarkType type) const {
     double found = kNoTime;
-    for (const auto& [chan, its] : m_records) {
+    for (const auto& [chan, content] : m_records) {
         const double time = getMarkTime(chan, type);
-        if (its.selected && time != kNoTime &&
+        if (content.selected && time != kNoTime &&
             (found == kNoTime || (type == InMark ? time < found : time > found))) {
             found = time;
         }
@@ -181,8 +182,8 @@ double EditModule::getMarkedPlace(const IdStamp& chan, MarkType type) const {
     if (found != kNoTime || !m_edit.valid() || !isMarkType(type)) {
         return found != kNoTime ? found : m_current;
     }
-    for (const auto& [other, its] : m_records) {
-        const double time = its.selected ? its.markInOrder(type) : kNoTime;
+    for (const auto& [other, content] : m_records) {
+        const double time = content.selected ? content.markInOrder(type) : kNoTime;
         if (time != kNoTime && (found == kNoTime || (type == InMark ? time < found : time > found))) {
             found = time;
         }
@@ -215,9 +216,9 @@ void EditModule::markAllAt(double time, MarkType type) {
         return;
     }
     if (time == kNoTime) {
-        for (auto& [chan, its] : m_records) {
-            if (its.selected) {
-                (type == InMark ? its.in : its.out) = kNoTime;
+        for (auto& [chan, content] : m_records) {
+            if (content.selected) {
+                (type == InMark ? content.in : content.out) = kNoTime;
             }
         }
     } else {
@@ -257,8 +258,8 @@ Range EditModule::getMarkedRegion(const IdStamp& chan, Mode mode) const {
 Range EditModule::getMarkedRegion(Mode mode) const {
     Range region = Editable::invalidRange();
     bool found = false;
-    for (const auto& [chan, its] : m_records) {
-        if (!its.selected) {
+    for (const auto& [chan, content] : m_records) {
+        if (!content.selected) {
             continue;
         }
         const Range own = getMarkedRegion(chan, mode);
@@ -273,16 +274,17 @@ Range EditModule::getMarkedRegion(Mode mode) const {
 }
 
 Range EditModule::sourceRegionFor(const IdStamp& chan, const Range& region) const {
-    const cel* const its = m_edit.valid() ? m_edit->get_edit_cel_p(m_edit->getIdx(chan)) : nullptr;
-    if (its == nullptr || !isSet(region)) {
+    const cel* const content = m_edit.valid() ? m_edit->get_edit_cel_p(m_edit->getIdx(chan)) : nullptr;
+    if (content == nullptr || !isSet(region)) {
         return Editable::invalidRange();
     }
-    const CEHPair pair(*its, region.start());
+    const CEHPair pair(*content, region.start());
     if (!pair.valid() || pair.inH().get_strip_cookie().isBlack() ||
         region.end() > pair.editRange().end() + Qx::kTimeTolerance) {
         return Editable::invalidRange();
     }
-    return {its->get_strip_time(pair.inH(), region.start()), its->get_strip_time(pair.inH(), region.end())};
+    return {content->get_strip_time(pair.inH(), region.start()),
+            content->get_strip_time(pair.inH(), region.end())};
 }
 
 Range EditModule::getSourceRegion(const IdStamp& chan, Mode mode) const {
@@ -326,14 +328,14 @@ void EditModule::makeSimilarMarks(const EditModule& source, EditModule& destinat
         !std::isfinite(at)) {
         return;
     }
-    for (auto& [chan, its] : destination.m_records) {
-        its.in = its.out = kNoTime;
+    for (auto& [chan, content] : destination.m_records) {
+        content.in = content.out = kNoTime;
     }
     const auto moved = [&](double mark) { return mark == kNoTime ? kNoTime : mark - region.start() + at; };
-    for (const auto& [chan, its] : marks) {
-        const IdStamp theirs = its.marked() ? destination.correspondingTo(source, chan) : IdStamp();
+    for (const auto& [chan, content] : marks) {
+        const IdStamp theirs = content.marked() ? destination.correspondingTo(source, chan) : IdStamp();
         if (theirs.valid()) {
-            destination.setMarkTime(theirs, std::pair(moved(its.in), moved(its.out)));
+            destination.setMarkTime(theirs, std::pair(moved(content.in), moved(content.out)));
         }
     }
     destination.verify();

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "edit/model/edit.h"
+#include "platform/base/num_range.h"
 
 #include <map>
 #include <utility>

@@ -270,11 +270,11 @@ bool Editor::Planner::addSourceSteps(Target target, const EditModule& destinatio
         addCopyStep(index, lay.at, edit, target.source, lay.region);
     }
     if (m_op == Op::ReplaceToEnd && target.chan.valid()) {
-        const cel* const its =
+        const cel* const events =
             m_destination.getEdit()->get_edit_cel_p(m_destination.getEdit()->getIdx(target.chan));
         const double end = lay.open + m_span.length();
-        if (its != nullptr && its->get_end_time() > end + kTimeTolerance) {
-            addStep(kCoreRemove, index, end, its->get_end_time() - end);
+        if (events != nullptr && events->get_end_time() > end + kTimeTolerance) {
+            addStep(kCoreRemove, index, end, events->get_end_time() - end);
         }
     }
     return m_reason.empty();
@@ -300,19 +300,19 @@ void Editor::Planner::addInsert(size_t target, const Lay& lay) {
 
 /// One step for each part of the region where the destination has nothing or black.
 void Editor::Planner::addFillBlack(size_t target, const Lay& lay) {
-    const Target& its = m_plan->targets[target];
+    const Target& events = m_plan->targets[target];
     const Edit& edit = *m_destination.getEdit();
-    const cel* const content = its.chan.valid() ? edit.get_edit_cel_p(edit.getIdx(its.chan)) : nullptr;
+    const cel* const content = events.chan.valid() ? edit.get_edit_cel_p(edit.getIdx(events.chan)) : nullptr;
     double to = lay.at + lay.region.length();
     if (m_destination.isMarked(InMark) && m_destination.isMarked(OutMark)) {
-        const double out = m_destination.getMarkedPlace(its.chan, OutMark);
-        to = out > m_destination.getMarkedPlace(its.chan, InMark) ? std::min(to, rounded(out)) : to;
+        const double out = m_destination.getMarkedPlace(events.chan, OutMark);
+        to = out > m_destination.getMarkedPlace(events.chan, InMark) ? std::min(to, rounded(out)) : to;
     }
     const auto fill = [&](double from, double end) {
-        if (its.source.valid() && end - from > kTimeTolerance) {
+        if (events.source.valid() && end - from > kTimeTolerance) {
             const double lead = from - lay.at;
             const double start = lay.region.start() + lead;
-            addCopyStep(target, from, *m_source.getEdit(), its.source, Range(start, start + (end - from)),
+            addCopyStep(target, from, *m_source.getEdit(), events.source, Range(start, start + (end - from)),
                         lead);
         }
     };

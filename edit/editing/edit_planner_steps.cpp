@@ -60,8 +60,8 @@ std::shared_ptr<cel> makePart(const cel* source, const cel::Range& region, bool 
 }
 
 AudLevelsCel levelsOf(const Edit& edit, const IdStamp& audio) {
-    const AudCel its = edit.getAudCel(audio);
-    return its.valid() ? edit.getLevelsCel(its.getLevelsChanID()) : AudLevelsCel();
+    const AudCel events = edit.getAudCel(audio);
+    return events.valid() ? edit.getLevelsCel(events.getLevelsChanID()) : AudLevelsCel();
 }
 
 IdStamp addLevels(Edit& edit, const IdStamp& audio) {
@@ -166,8 +166,8 @@ bool Editor::Planner::mustHoldEnd(const Target& target, double to) const {
 }
 
 void Editor::Planner::addBlackStep(Op core, size_t target, double at, double length) {
-    const Target& its = m_plan->targets[target];
-    const bool black = isContinuous(its.type) || mustHoldEnd(its, at + length);
+    const Target& events = m_plan->targets[target];
+    const bool black = isContinuous(events.type) || mustHoldEnd(events, at + length);
     addStep(core, target, at, length, makePart(nullptr, Range(0, length), black));
 }
 
@@ -198,14 +198,14 @@ std::shared_ptr<cel> Editor::Planner::onFrames(const std::shared_ptr<cel>& part)
 /// `lead` seconds behind a frame of the destination.
 void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, const IdStamp& chan,
                                   const Range& region, double lead) {
-    Target& its = m_plan->targets[target];
+    Target& events = m_plan->targets[target];
     std::shared_ptr<cel> part =
-        takePart(from.get_edit_cel_p(from.getIdx(chan)), region, isContinuous(its.type), lead);
+        takePart(from.get_edit_cel_p(from.getIdx(chan)), region, isContinuous(events.type), lead);
     const bool refers = from.isShot() && from.get_cookie().isStorable() && &from != &*m_destination.getEdit();
     if (refers && part != nullptr) {
         part = referTo(from.get_cookie(), *part, region.start());
     }
-    if (part != nullptr && mustHoldEnd(its, at + region.length())) {
+    if (part != nullptr && mustHoldEnd(events, at + region.length())) {
         part->fillToTime(region.length());
     }
     if (part == nullptr) {
@@ -215,7 +215,7 @@ void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, co
     }
     addStep(kCoreReplace, target, at, region.length(), part);
     Step& step = m_plan->steps.back();
-    if (its.type.type != AudioChan || !step.withLevels) {
+    if (events.type.type != AudioChan || !step.withLevels) {
         return;
     }
     const AudLevelsCel levels = refers ? AudLevelsCel() : editing_detail::levelsOf(from, chan);
@@ -223,8 +223,9 @@ void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, co
         // A channel may be changed before its levels are laid elsewhere.
         step.levels = &from == &*m_destination.getEdit() ? levels.clone() : levels;
         step.levelsRange = region;
-        its.needsLevels = its.needsLevels || (!its.levels.valid() && (m_flags & Editor::NoNewChannels) == 0);
-    } else if (its.levels.valid() || its.needsLevels) {
+        events.needsLevels =
+            events.needsLevels || (!events.levels.valid() && (m_flags & Editor::NoNewChannels) == 0);
+    } else if (events.levels.valid() || events.needsLevels) {
         step.levels = AudLevelsCel::create();
         step.levels.replaceClipNodes(AudCel(part, IdStamp()));
     }
@@ -261,7 +262,7 @@ bool Editor::Planner::checkSteps() {
 bool Editor::Planner::checkStep(const Step& step) {
     const Target& target = m_plan->targets[step.target];
     const Edit& edit = *m_destination.getEdit();
-    const cel* const its = target.chan.valid() ? edit.get_edit_cel_p(edit.getIdx(target.chan)) : nullptr;
+    const cel* const events = target.chan.valid() ? edit.get_edit_cel_p(edit.getIdx(target.chan)) : nullptr;
     const String what = String(editOperationName(m_op)) + " on " + nameOf(target);
     if (step.at < 0) {
         return refuse(what + " would begin before the start of the edit, at " + secondsText(step.at) + " s");
@@ -270,7 +271,7 @@ bool Editor::Planner::checkStep(const Step& step) {
         return refuse(what + " would have no length");
     }
     const AudLevelsCel levels = edit.getLevelsCel(target.levels);
-    double last = its != nullptr ? its->get_end_time() : 0;
+    double last = events != nullptr ? events->get_end_time() : 0;
     if (const auto& nodes = levels.getNodeStore().nodes(); !nodes.empty()) {
         last = std::max(last, nodes.back().time);
     }
@@ -279,7 +280,7 @@ bool Editor::Planner::checkStep(const Step& step) {
     if (std::max(last, step.at) + grows > cel::kGreatestTime || step.end() > cel::kGreatestTime) {
         return refuse(what + " would reach beyond the greatest time that an edit can hold");
     }
-    if (its != nullptr && its->numEvents() % 2 != 0) {
+    if (events != nullptr && events->numEvents() % 2 != 0) {
         return refuse(what + ": the channel's last event is incomplete");
     }
     if (step.core != kCoreRemove && step.part == nullptr) {
@@ -296,13 +297,14 @@ void Editor::Planner::findShifts() {
     const Edit& edit = *m_destination.getEdit();
     for (const Step& step : m_plan->steps) {
         Target& target = m_plan->targets[step.target];
-        const cel* const its = edit.get_edit_cel_p(edit.getIdx(target.chan));
-        if (step.core == kCoreReplace || its == nullptr) {
+        const cel* const events = edit.get_edit_cel_p(edit.getIdx(target.chan));
+        if (step.core == kCoreReplace || events == nullptr) {
             continue;
         }
         target.movesFrom = step.core == kCoreInsert ? step.at : step.end();
         target.shift = step.core == kCoreInsert ? step.length : -step.length;
-        const double end = its->get_end_time();
-        target.moves = end > target.movesFrom + kTimeTolerance && !its->isEmpty(Range(target.movesFrom, end));
+        const double end = events->get_end_time();
+        target.moves =
+            end > target.movesFrom + kTimeTolerance && !events->isEmpty(Range(target.movesFrom, end));
     }
 }

@@ -22,8 +22,8 @@ Vector<IdStamp> selectedOf(const EditModule& module, const Edit::ChanType& kind)
 
 double Editor::Planner::endOf(const IdStamp& chan) const {
     const Edit& edit = *m_destination.getEdit();
-    const cel* const its = edit.get_edit_cel_p(edit.getIdx(chan));
-    return its != nullptr ? its->get_end_time() : 0;
+    const cel* const events = edit.get_edit_cel_p(edit.getIdx(chan));
+    return events != nullptr ? events->get_end_time() : 0;
 }
 
 bool Editor::Planner::planWithin() {

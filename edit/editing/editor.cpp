@@ -2,6 +2,7 @@
 
 #include "edit/editing/detail/cue_follower.h"
 #include "edit/manager/edit_manager.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit_keys.h"
 #include "platform/services/config_int.h"
 #include "platform/services/log.h"

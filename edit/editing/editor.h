@@ -2,6 +2,7 @@
 
 #include "edit/editing/edit_module.h"
 #include "edit/editing/edit_operation.h"
+#include "edit/model/cel.h"
 
 #include <map>
 #include <memory>

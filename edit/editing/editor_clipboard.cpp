@@ -1,5 +1,6 @@
 #include "edit/editing/detail/edit_plan.h"
 #include "edit/manager/edit_manager.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit_keys.h"
 #include "platform/services/log.h"
 
@@ -23,9 +24,9 @@ void clearClipboard(Edit& clipboard) {
 }
 
 /// Binds copies of the objects of a cel's events in another edit.
-void copyEffects(const cel& its, TagBag& from, TagBag& to) {
-    for (int i = 0; i < its.numEvents() && from.numObjects() > 0; ++i) {
-        const String name = its.getChanEventPtr(i)->id.asString();
+void copyEffects(const cel& events, TagBag& from, TagBag& to) {
+    for (int i = 0; i < events.numEvents() && from.numObjects() > 0; ++i) {
+        const String name = events.getChanEventPtr(i)->id.asString();
         const Streamable* const object = from.contains(name) ? from.openObject(name) : nullptr;
         if (object != nullptr) {
             to.storeObject(name, object->clone());
@@ -61,7 +62,7 @@ void Editor::doClipboardEditing(edit_operation op) {
     clipboard->setFrameRate(edit.getFrameRate());
     for (size_t i = 0; i < m_plan->targets.size(); ++i) {
         const Target& target = m_plan->targets[i];
-        const cel* const its = celOf(target.chan);
+        const cel* const events = celOf(target.chan);
         double from = Qx::kNoTime;
         double to = 0;
         for (const Step& step : m_plan->steps) {
@@ -70,7 +71,7 @@ void Editor::doClipboardEditing(edit_operation op) {
                 to = std::max(to, step.end());
             }
         }
-        to = its != nullptr ? std::min(to, its->get_end_time()) : 0;
+        to = events != nullptr ? std::min(to, events->get_end_time()) : 0;
         if (!(to - from > Qx::kTimeTolerance)) {
             continue;
         }
@@ -79,7 +80,7 @@ void Editor::doClipboardEditing(edit_operation op) {
         if (isContinuous(target.type)) {
             content->fillToTime(start);
         }
-        const std::shared_ptr<cel> part = makePart(its, {from, to}, isContinuous(target.type));
+        const std::shared_ptr<cel> part = makePart(events, {from, to}, isContinuous(target.type));
         if (part == nullptr || !content->weld(part.get(), start)) {
             continue;
         }

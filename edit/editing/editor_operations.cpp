@@ -26,32 +26,32 @@ void copyObjects(TagBag& from, TagBag& to, const Stamps& stamps) {
 
 } // namespace
 
-bool Editor::EditOpPerformer::doEdit(cel& its, const Step& step, cel::IdMap& copied,
+bool Editor::EditOpPerformer::doEdit(cel& content, const Step& step, cel::IdMap& copied,
                                      cel::Splits& splits) const {
     const cel::Range all(0, step.length);
     switch (step.core) {
     case kCoreReplace:
-        return its.replace(step.part.get(), all, step.at, copied, m_op == Op::ReplaceMaterial, &splits);
+        return content.replace(step.part.get(), all, step.at, copied, m_op == Op::ReplaceMaterial, &splits);
     case kCoreInsert:
-        return its.insert(step.part.get(), all, step.at, copied, &splits);
+        return content.insert(step.part.get(), all, step.at, copied, &splits);
     case kCoreRemove:
-        return its.remove({step.at, step.end()}, &splits);
+        return content.remove({step.at, step.end()}, &splits);
     default:
         herc_printf("EditOpPerformer::doEdit() : Unhandled EditOperation\n");
         return false;
     }
 }
 
-void Editor::EditOpPerformer::doLevels(AudLevelsCel& its, const Step& step) {
-    if (!its.valid() || !step.withLevels) {
+void Editor::EditOpPerformer::doLevels(AudLevelsCel& content, const Step& step) {
+    if (!content.valid() || !step.withLevels) {
         return;
     }
     if (step.core == kCoreReplace) {
-        its.replace(step.levels, step.levelsRange, step.at);
+        content.replace(step.levels, step.levelsRange, step.at);
     } else if (step.core == kCoreInsert) {
-        its.insert(step.levels, step.levelsRange, step.at);
+        content.insert(step.levels, step.levelsRange, step.at);
     } else if (step.core == kCoreRemove) {
-        its.remove({step.at, step.end()});
+        content.remove({step.at, step.end()});
     }
 }
 
@@ -61,17 +61,17 @@ void Editor::makeChanges(edit_operation op, CueFollower& cues) {
     const Edit& edit = *m_destination.getEdit();
     for (const Step& step : m_plan->steps) {
         const Target& target = m_plan->targets[step.target];
-        cel* const its = celOf(target.chan);
-        if (its == nullptr) {
+        cel* const content = celOf(target.chan);
+        if (content == nullptr) {
             continue; // a channel that could not be added; `autoAddTracks` has reported it
         }
-        const double end = its->get_end_time();
+        const double end = content->get_end_time();
         if (step.core != kCoreRemove && editing_detail::isContinuous(target.type)) {
-            its->fillToTime(step.at);
+            content->fillToTime(step.at);
         }
         cel::IdMap copied;
         cel::Splits splits;
-        if (!performer.doEdit(*its, step, copied, splits)) {
+        if (!performer.doEdit(*content, step, copied, splits)) {
             ole_splat("Editor: a step of %s that was checked failed\n", editOperationName(op).data());
             continue;
         }

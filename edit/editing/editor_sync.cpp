@@ -23,8 +23,8 @@ bool Editor::recordInterTrackSyncLosses() {
     size_t reference = SIZE_MAX;
     bool pictureFound = false;
     for (int i = 0; i < edit.getNumChans(); ++i) {
-        const cel* const its = edit.get_edit_cel_p(i);
-        if (its == nullptr) {
+        const cel* const content = edit.get_edit_cel_p(i);
+        if (content == nullptr) {
             continue;
         }
         const IdStamp chan = edit.getId(i);
@@ -38,8 +38,8 @@ bool Editor::recordInterTrackSyncLosses() {
                 planned = true;
             }
         }
-        const double end = its->get_end_time();
-        moves = planned ? moves : end > place + kTimeTolerance && !its->isEmpty({place, end});
+        const double end = content->get_end_time();
+        moves = planned ? moves : end > place + kTimeTolerance && !content->isEmpty({place, end});
         if (!moves) {
             continue;
         }

@@ -1,4 +1,6 @@
 #include "edit/editing/detail/edit_plan.h"
+#include "edit/model/channel_group_list.h"
+#include "edit/model/cue_list.h"
 #include "platform/base/ole_splat.h"
 
 #include <algorithm>
@@ -15,20 +17,20 @@ bool touch(const channel_event& out, const channel_event& in) {
 }
 
 /// True if pair `pair` of a cel and the one after it are black and touch.
-bool isBlackJoint(const cel& its, int pair) {
-    const channel_event* const in = its.getChanEventPtr(2 * pair);
-    const channel_event* const out = its.getChanEventPtr(2 * pair + 1);
-    const channel_event* const next = its.getChanEventPtr(2 * pair + 2);
+bool isBlackJoint(const cel& events, int pair) {
+    const channel_event* const in = events.getChanEventPtr(2 * pair);
+    const channel_event* const out = events.getChanEventPtr(2 * pair + 1);
+    const channel_event* const next = events.getChanEventPtr(2 * pair + 2);
     return in != nullptr && next != nullptr && in->strip.isBlack() && next->strip.isBlack() &&
            touch(*out, *next);
 }
 
 /// The pairs of a cel within a span that was changed, with the pieces that a cut left on either side and what
 /// touches those: a cue that kept them apart may have gone on with the other piece.
-std::pair<int, int> pairsAround(const cel& its, const cel::Range& span) {
-    const int first = std::max(its.find_ceh(span.start(), CE_IN_POINT).index(), 0) / 2;
-    const int last = std::max(its.find_ceh(span.end(), CE_IN_POINT).index(), 0) / 2;
-    return {std::max(first - 2, 0), std::min(last + 1, its.numPairs() - 1)};
+std::pair<int, int> pairsAround(const cel& events, const cel::Range& span) {
+    const int first = std::max(events.find_ceh(span.start(), CE_IN_POINT).index(), 0) / 2;
+    const int last = std::max(events.find_ceh(span.end(), CE_IN_POINT).index(), 0) / 2;
+    return {std::max(first - 2, 0), std::min(last + 1, events.numPairs() - 1)};
 }
 
 } // namespace
@@ -101,16 +103,16 @@ void Editor::padTracksWithBlack(edit_operation op) {
     const Edit& edit = *m_destination.getEdit();
     double end = 0;
     for (int i = 0; i < edit.getNumChans(); ++i) {
-        const cel* const its = edit.get_edit_cel_p(i);
-        if (its != nullptr && isContinuous({edit.getChanType(i), edit.getChanSubtype(i)})) {
-            end = std::max(end, its->get_end_time());
+        const cel* const events = edit.get_edit_cel_p(i);
+        if (events != nullptr && isContinuous({edit.getChanType(i), edit.getChanSubtype(i)})) {
+            end = std::max(end, events->get_end_time());
         }
     }
     for (int i = 0; i < edit.getNumChans(); ++i) {
-        cel* const its = edit.get_edit_cel_p(i);
-        if (its != nullptr && isContinuous({edit.getChanType(i), edit.getChanSubtype(i)}) &&
-            its->fillToTime(end)) {
-            noteTouched(edit.getId(i), {CEHPair(its->get_end_ceh()).editRange().start(), end});
+        cel* const events = edit.get_edit_cel_p(i);
+        if (events != nullptr && isContinuous({edit.getChanType(i), edit.getChanSubtype(i)}) &&
+            events->fillToTime(end)) {
+            noteTouched(edit.getId(i), {CEHPair(events->get_end_ceh()).editRange().start(), end});
         }
     }
 }
@@ -142,17 +144,17 @@ void Editor::simplifyBlack() {
                !objects.contains(pair[0].id.asString()) && !objects.contains(next[0].id.asString());
     };
     for (const auto& [chan, span] : m_touched) {
-        cel* const its = celOf(chan);
-        if (its == nullptr) {
+        cel* const events = celOf(chan);
+        if (events == nullptr) {
             continue;
         }
-        const auto [first, last] = pairsAround(*its, span);
+        const auto [first, last] = pairsAround(*events, span);
         bool found = false;
         for (int pair = first; pair <= last && !found; ++pair) {
-            found = isBlackJoint(*its, pair);
+            found = isBlackJoint(*events, pair);
         }
         if (found) {
-            its->simplify(Simplification::MergeBlack, mayMerge);
+            events->simplify(Simplification::MergeBlack, mayMerge);
         }
     }
 }
@@ -160,15 +162,15 @@ void Editor::simplifyBlack() {
 /// Checks the pairs about the place of the operation: in order, matched, without overlap.
 void Editor::verifyTracks() {
     for (const auto& [chan, span] : m_touched) {
-        const cel* const its = celOf(chan);
-        if (its == nullptr) {
+        const cel* const events = celOf(chan);
+        if (events == nullptr) {
             continue;
         }
-        const auto [first, last] = pairsAround(*its, span);
+        const auto [first, last] = pairsAround(*events, span);
         for (int pair = first; pair <= last; ++pair) {
-            const channel_event& in = *its->getChanEventPtr(2 * pair);
-            const channel_event& out = *its->getChanEventPtr(2 * pair + 1);
-            const channel_event* const next = its->getChanEventPtr(2 * pair + 2);
+            const channel_event& in = *events->getChanEventPtr(2 * pair);
+            const channel_event& out = *events->getChanEventPtr(2 * pair + 1);
+            const channel_event* const next = events->getChanEventPtr(2 * pair + 2);
             if (in.kind != CE_IN_POINT || out.kind != CE_OUT_POINT || out.editTime < in.editTime ||
                 (next != nullptr && next->editTime < out.editTime)) {
                 ole_splat("Editor: the events of channel %s at %g s are not consistent\n",

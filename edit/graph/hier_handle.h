@@ -1,6 +1,7 @@
 #pragma once
 
 #include "edit/model/ce_handle.h"
+#include "edit/model/cel.h"
 #include "edit/model/edit_ptr.h"
 
 #include <array>

@@ -1,6 +1,8 @@
 #include "edit/inspect/edit_content.h"
 
+#include "edit/model/aud_levels_cel.h"
 #include "edit/model/channel_group_list.h"
+#include "edit/model/managed_cel.h"
 #include "platform/services/files.h"
 #include "platform/store/edit_header_proxy.h"
 #include "platform/store/object_store_info.h"

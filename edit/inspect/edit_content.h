@@ -2,8 +2,10 @@
 
 #include "edit/inspect/edit_report.h"
 
+#include "edit/model/cel.h"
 #include "platform/base/status.h"
 #include "platform/media/level_store.h"
+#include "platform/store/configb.h"
 
 #include <compare>
 #include <utility>

@@ -1,5 +1,9 @@
 #include "edit/inspect/edit_report.h"
 
+#include "edit/model/cel.h"
+#include "edit/model/channel_event.h"
+#include "edit/model/cue_list.h"
+#include "edit/model/managed_cel.h"
 #include "platform/media/timecode.h"
 #include "platform/services/current_project.h"
 

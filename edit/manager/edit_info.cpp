@@ -2,6 +2,7 @@
 
 #include "edit/manager/detail/manager_state.h"
 #include "edit/manager/edit_record.h"
+#include "edit/model/cel.h"
 #include "platform/base/scanned_number.h"
 
 namespace {

@@ -4,6 +4,7 @@
 #include "edit/model/edit.h"
 #include "edit/model/edit_registry.h"
 #include "platform/base/vector.h"
+#include "platform/media/tv_standard.h"
 #include "platform/notify/notifier.h"
 #include "platform/notify/val_server.h"
 #include "platform/services/network.h"

@@ -1,6 +1,7 @@
 #include "edit/manager/detail/manager_state.h"
 #include "edit/project/cookie_allocator.h"
 #include "edit/project/project_details.h"
+#include "platform/media/tv_standard.h"
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/log.h"

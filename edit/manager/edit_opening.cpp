@@ -6,6 +6,7 @@
 #include "platform/services/edit_filenames.h"
 #include "platform/services/log.h"
 #include "platform/services/timed_task.h"
+#include "platform/store/tag_bag.h"
 
 #include <cerrno>
 #include <chrono>

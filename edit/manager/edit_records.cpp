@@ -5,6 +5,7 @@
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/log.h"
+#include "platform/store/tag_bag.h"
 
 #include <exception>
 

@@ -26,8 +26,8 @@ bool ce_handle::is_out_point() const {
 }
 
 ce_info ce_handle::get_ce_info() const {
-    const channel_event* its = event();
-    return its != nullptr ? its->kind : ce_info{};
+    const channel_event* content = event();
+    return content != nullptr ? content->kind : ce_info{};
 }
 
 ce_handle ce_handle::get_next_ceh(int kinds) const {
@@ -65,11 +65,11 @@ bool ce_handle::set_edit_time(double time) {
 }
 
 double ce_handle::get_strip_time(double editTime) const {
-    const channel_event* its = event();
-    if (its == nullptr) {
+    const channel_event* content = event();
+    if (content == nullptr) {
         return 0;
     }
-    return editTime == Qx::kStripTimeAtEvent ? its->stripTime
+    return editTime == Qx::kStripTimeAtEvent ? content->stripTime
                                              : stripAt(*matching_in_ceh().get_chan_evnt_ptr(), editTime);
 }
 
@@ -80,33 +80,33 @@ void ce_handle::set_strip_time(double time) {
 }
 
 cookie ce_handle::get_strip_cookie() const {
-    const channel_event* its = event();
-    return its != nullptr ? its->strip : invalid_cookie;
+    const channel_event* content = event();
+    return content != nullptr ? content->strip : invalid_cookie;
 }
 
 void ce_handle::set_strip_cookie(const cookie& strip) {
-    change([&](channel_event& its) { its.strip = strip; });
+    change([&](channel_event& content) { content.strip = strip; });
 }
 
 float ce_handle::get_strip_level(double editTime) const {
-    const channel_event* its = event();
-    if (its == nullptr) {
+    const channel_event* content = event();
+    if (content == nullptr) {
         return 0;
     }
     const channel_event* out = matching_out_ceh().get_chan_evnt_ptr();
     if (editTime == Qx::kStripTimeAtEvent || out == nullptr) {
-        return its->level;
+        return content->level;
     }
     return levelAt(*matching_in_ceh().get_chan_evnt_ptr(), *out, editTime);
 }
 
 void ce_handle::set_strip_level(float level) {
-    change([&](channel_event& its) { its.level = level; });
+    change([&](channel_event& content) { content.level = level; });
 }
 
 double ce_handle::get_strip_velocity() const {
-    const channel_event* its = event();
-    return its != nullptr ? its->velocity : 0;
+    const channel_event* content = event();
+    return content != nullptr ? content->velocity : 0;
 }
 
 void ce_handle::set_strip_velocity(double velocity) {
@@ -127,17 +127,17 @@ void ce_handle::set_strip_velocity(double velocity) {
 }
 
 int ce_handle::get_dmod_code() const {
-    const channel_event* its = event();
-    return its != nullptr ? its->code : 0;
+    const channel_event* content = event();
+    return content != nullptr ? content->code : 0;
 }
 
 void ce_handle::set_dmod_code(int code) {
-    change([&](channel_event& its) { its.code = code; });
+    change([&](channel_event& content) { content.code = code; });
 }
 
 channel_event ce_handle::get_channel_event() const {
-    const channel_event* its = event();
-    return its != nullptr ? *its : channel_event();
+    const channel_event* content = event();
+    return content != nullptr ? *content : channel_event();
 }
 
 bool ce_handle::time_in_range_exclusive(double time) const {
@@ -147,41 +147,41 @@ bool ce_handle::time_in_range_exclusive(double time) const {
 }
 
 IdStamp ce_handle::getEffectGraph() const {
-    const channel_event* its = event();
-    return its != nullptr ? its->id : IdStamp();
+    const channel_event* content = event();
+    return content != nullptr ? content->id : IdStamp();
 }
 
 void ce_handle::setEffectGraph(const IdStamp& id) {
-    change([&](channel_event& its) { its.id = id; });
+    change([&](channel_event& content) { content.id = id; });
 }
 
 uint16_t ce_handle::audioRamp_DurationQFrames() const {
-    const channel_event* its = event();
-    return its != nullptr ? its->rampQFrames : uint16_t{0};
+    const channel_event* content = event();
+    return content != nullptr ? content->rampQFrames : uint16_t{0};
 }
 
 void ce_handle::set_audioRamp_DurationQFrames(uint16_t quarterFrames) {
-    change([&](channel_event& its) { its.rampQFrames = quarterFrames; });
+    change([&](channel_event& content) { content.rampQFrames = quarterFrames; });
 }
 
 Aud::GainCurve::eCurveType ce_handle::audioRamp_CurveType() const {
-    const channel_event* its = event();
-    return static_cast<Aud::GainCurve::eCurveType>(its != nullptr ? its->rampCurve : 0);
+    const channel_event* content = event();
+    return static_cast<Aud::GainCurve::eCurveType>(content != nullptr ? content->rampCurve : 0);
 }
 
 void ce_handle::set_audioRamp_CurveType(Aud::GainCurve::eCurveType type) {
-    change([&](channel_event& its) { its.rampCurve = type; });
+    change([&](channel_event& content) { content.rampCurve = type; });
 }
 
 template <typename Change>
 void ce_handle::change(Change&& apply) {
-    const channel_event* its = event();
-    if (its == nullptr) {
+    const channel_event* content = event();
+    if (content == nullptr) {
         return;
     }
-    channel_event changed = *its;
+    channel_event changed = *content;
     apply(changed);
-    if (changed != *its && isGoodEvent(changed)) {
+    if (changed != *content && isGoodEvent(changed)) {
         changing() = changed;
         m_cel->changedNow();
     }
@@ -189,10 +189,10 @@ void ce_handle::change(Change&& apply) {
 
 CEHPair::CEHPair(const ce_handle& event) : m_in(event.matching_in_ceh()), m_out(event.matching_out_ceh()) {}
 
-CEHPair::CEHPair(const cel& its, double time) : CEHPair(&its, time) {}
+CEHPair::CEHPair(const cel& content, double time) : CEHPair(&content, time) {}
 
-CEHPair::CEHPair(const cel* its, double time) {
-    const ce_handle in = its != nullptr ? its->find_ceh(time, CE_IN_POINT) : ce_handle();
+CEHPair::CEHPair(const cel* content, double time) {
+    const ce_handle in = content != nullptr ? content->find_ceh(time, CE_IN_POINT) : ce_handle();
     const ce_handle out = in.matching_out_ceh();
     if (in.valid() != 0 && out.valid() != 0 &&
         Qx::timeIsConsideredToBeInRegion(time, {in.get_edit_time(), out.get_edit_time()})) {

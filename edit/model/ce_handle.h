@@ -13,10 +13,10 @@ class cel;
 class QM_API ce_handle {
 public:
     ce_handle() = default;
-    ce_handle(const cel* its, int index) : m_cel(const_cast<cel*>(its)), m_index(index) {}
+    ce_handle(const cel* content, int index) : m_cel(const_cast<cel*>(content)), m_index(index) {}
 
     [[nodiscard]] cel* get_its_cel() const { return m_cel; }
-    void set_its_cel(cel* its) { m_cel = its; }
+    void set_its_cel(cel* content) { m_cel = content; }
     [[nodiscard]] int index() const { return m_index; }
     void set_index(int index) { m_index = index; }
 
@@ -95,8 +95,8 @@ public:
     /// The pair that holds an event.
     explicit CEHPair(const ce_handle& event);
     /// The pair that plays at a time; of a null cel, none.
-    CEHPair(const cel& its, double time);
-    CEHPair(const cel* its, double time);
+    CEHPair(const cel& content, double time);
+    CEHPair(const cel* content, double time);
     [[nodiscard]] bool valid() const { return m_in.valid() != 0 && m_out.valid() != 0; }
     [[nodiscard]] ce_handle inH() const { return m_in; }
     [[nodiscard]] ce_handle outH() const { return m_out; }
@@ -107,6 +107,3 @@ private:
     ce_handle m_in;
     ce_handle m_out;
 };
-
-// The handle's inline members need the cel.
-#include "edit/model/cel.h"

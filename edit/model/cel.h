@@ -150,9 +150,9 @@ public:
     ///
     /// What holds for all of them:
     /// - Marks are seconds. A mark within the tolerance (`Qx::kTimeTolerance`) of a cut means that cut, of
-    /// two
-    ///   the nearer, and what is joined there meets exactly. A pair of no length belongs to the region that
-    ///   starts with it.
+    ///   two the nearer, and what is joined there meets exactly. A pair of no length
+    ///   belongs to the region that starts with it.
+    ///
     /// - No operation leaves a piece or a gap shorter than the tolerance: what would be one, because a mark
     ///   means a cut beside it or a time was rounded, goes. (Times are doubles: at 1e9 s they lie a tenth of
     ///   the tolerance apart, so whatever moves there is rounded to that.)
@@ -160,22 +160,22 @@ public:
     ///   usable time (`kGreatestTime`), a null source, and a result that would reach past `kGreatestTime` are
     ///   refused; so is everything while the last pair is open (an in point added, its out point not).
     /// - Gaps are content: a gap of the source is a gap where it is laid. Past the end of a cel lies a gap,
-    /// so
-    ///   what is laid there leaves one, and nothing is filled with black; a region past the end is not an
-    ///   error and the answer is true.
+    ///   so what is laid there leaves one, and nothing is filled with black; a region past the end is not
+    ///   an error and the answer is true.
+    ///
     /// - The source may be the cel itself: the result is as if it had been copied first.
     /// - Cutting a pair changes nothing of what is seen or heard in either piece: strip time and level at the
     ///   cut are those that the pair has there. The events at the cut have no fade; the fade at an end that
     ///   stays, stays. The `dmod` codes of the two ends go with the pieces' ends.
     /// - Stamps: a piece that is left of a pair keeps both of the pair's stamps, and so what is bound to
-    ///   them.
-    ///   Where several pieces stay in the cel, the first keeps the in point's stamp, the last the out
+    ///   them. Where several pieces stay in the cel, the first keeps the in point's stamp, the last the out
     ///   point's, and the events at the cuts get fresh ones; `splits`, when given, receives the in point's
     ///   stamp and the fresh one of each further piece's in point, so that an effect can be bound to all.
+    ///
     /// - Events that are copied out of a source get fresh stamps; `ids` receives the stamp of each and the
-    /// fresh
-    ///   one: of a pair that several gaps took a piece of (`materialOnly`), that of the first piece, from
-    ///   which the others count as split.
+    ///   fresh one: of a pair that several gaps took a piece of (`materialOnly`), that of the first piece,
+    ///   from which the others count as split.
+    ///
     /// - Velocity stays; the strip time of a piece's out point is where its in point and velocity lead.
     ///
     /// Cost: two binary searches, the events laid, and one pass over what follows if it moves. No allocation
@@ -232,8 +232,8 @@ public:
     /// stays, so the source is laid there as it is.
     ///
     ///       |                                            ||
-    ///     AAABBB    replace([1, 3), 2, material)  AAdeBB      cut before d and after e, the ends of the
-    ///     region;
+    ///     AAABBB    replace([1, 3), 2, material)  AAdeBB      cut before d and after e,
+    ///                                                         the ends of the region;
     ///                                                         between d and e lies the cut of A and B
     bool replace(const cel* source, const Range& sourceRange, double at, IdMap& ids,
                  bool materialOnly = false, Splits* splits = nullptr);
@@ -462,6 +462,6 @@ inline ce_handle& ce_handle::operator--() {
 }
 
 inline double ce_handle::get_edit_time() const {
-    const channel_event* its = m_cel != nullptr ? m_cel->getChanEventPtr(m_index) : nullptr;
-    return its != nullptr ? its->editTime : 0;
+    const channel_event* content = m_cel != nullptr ? m_cel->getChanEventPtr(m_index) : nullptr;
+    return content != nullptr ? content->editTime : 0;
 }

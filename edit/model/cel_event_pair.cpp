@@ -1,18 +1,19 @@
 #include "edit/model/cel_event_pair.h"
 
 #include "edit/model/edit.h"
+#include "platform/store/tag_bag.h"
 
 #include <cmath>
 
-CelEventPair::CelEventPair(const EditPtr& edit, cel* its, double time) : m_edit(edit) {
-    if (its != nullptr) {
-        setPair(its->find_ceh(time, CE_IN_POINT));
+CelEventPair::CelEventPair(const EditPtr& edit, cel* content, double time) : m_edit(edit) {
+    if (content != nullptr) {
+        setPair(content->find_ceh(time, CE_IN_POINT));
     }
 }
 
-CelEventPair::CelEventPair(const EditPtr& edit, cel* its, const ce_handle& in) : m_edit(edit), m_in(in) {
-    if (its != nullptr && m_in.get_its_cel() == nullptr) {
-        m_in.set_its_cel(its);
+CelEventPair::CelEventPair(const EditPtr& edit, cel* content, const ce_handle& in) : m_edit(edit), m_in(in) {
+    if (content != nullptr && m_in.get_its_cel() == nullptr) {
+        m_in.set_its_cel(content);
     }
     m_out = m_in.matching_out_ceh();
     hold();
@@ -37,11 +38,11 @@ CelEventPair::CelEventPair(const EditPtr& edit, int chanIdx, double time)
     : CelEventPair(edit, edit.valid() ? edit->getId(chanIdx) : IdStamp(), time) {}
 
 void CelEventPair::findAt(double time) {
-    cel* its = m_edit.valid() && m_chan.valid() ? m_edit->getCel(m_chan) : nullptr;
-    if (its == nullptr) {
+    cel* content = m_edit.valid() && m_chan.valid() ? m_edit->getCel(m_chan) : nullptr;
+    if (content == nullptr) {
         return;
     }
-    setPair(its->find_ceh(time, CE_IN_POINT));
+    setPair(content->find_ceh(time, CE_IN_POINT));
     if (!containsEditTime(time)) {
         invalidate();
     }
@@ -54,9 +55,9 @@ void CelEventPair::setPair(const ce_handle& event) {
 }
 
 void CelEventPair::hold() {
-    const cel* const its = getCel();
-    if (m_held.get() != its) {
-        m_held = its != nullptr ? its->weak_from_this().lock() : nullptr;
+    const cel* const content = getCel();
+    if (m_held.get() != content) {
+        m_held = content != nullptr ? content->weak_from_this().lock() : nullptr;
     }
 }
 

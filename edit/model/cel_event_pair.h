@@ -36,9 +36,9 @@ public:
     CelEventPair() = default;
     /// The pair whose in point governs `time` in a bare cel (`cel::find_ceh`), whether it plays there or not.
     /// The stamp stays null. A null cel gives an invalid pair.
-    CelEventPair(const EditPtr& edit, cel* its, double time);
+    CelEventPair(const EditPtr& edit, cel* content, double time);
     /// The pair that begins with `in`. The stamp stays null.
-    CelEventPair(const EditPtr& edit, cel* its, const ce_handle& in);
+    CelEventPair(const EditPtr& edit, cel* content, const ce_handle& in);
     /// The pair of an event, in or out point, on a channel. A null edit gives an invalid pair.
     CelEventPair(const EditPtr& edit, const ce_handle& event, int chanIdx);
     CelEventPair(const EditPtr& edit, const ce_handle& event, const IdStamp& chan);

@@ -22,8 +22,8 @@ CelIterator::CelIterator(const EditPtr& edit, int chanIdx, const ce_handle& even
 CelIterator::CelIterator(const CelEventPair& pair)
     : CelEventPair(pair), m_stamp(pair.trackId()), m_itsEdit(pair.getEdit()) {}
 
-CelIterator::CelIterator(cel* its)
-    : CelEventPair(EditPtr(), its, its != nullptr ? its->get_start_ceh() : ce_handle()) {}
+CelIterator::CelIterator(cel* content)
+    : CelEventPair(EditPtr(), content, content != nullptr ? content->get_start_ceh() : ce_handle()) {}
 
 cel* CelIterator::findCel() const {
     if (m_itsEdit.valid() && m_stamp.valid()) {
@@ -33,15 +33,15 @@ cel* CelIterator::findCel() const {
 }
 
 void CelIterator::moveToStart() {
-    const cel* its = findCel();
-    setPair(its != nullptr ? its->get_start_ceh() : ce_handle());
+    const cel* content = findCel();
+    setPair(content != nullptr ? content->get_start_ceh() : ce_handle());
 }
 
 void CelIterator::moveToEnd() {
-    const cel* its = findCel();
+    const cel* content = findCel();
     invalidate();
-    if (its != nullptr) {
-        setPair(its->get_end_ceh());
+    if (content != nullptr) {
+        setPair(content->get_end_ceh());
     }
 }
 

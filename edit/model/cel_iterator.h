@@ -23,7 +23,7 @@ public:
     CelIterator(const EditPtr& edit, int chanIdx, const ce_handle& event);
     explicit CelIterator(const CelEventPair& pair);
     /// At the start of a bare cel.
-    explicit CelIterator(cel* its);
+    explicit CelIterator(cel* content);
 
     /// To the first pair; invalid for an empty channel. Without a channel stamp, of the cel that it walks.
     void moveToStart();

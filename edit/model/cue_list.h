@@ -1,5 +1,6 @@
 #pragma once
 
+#include "edit/model/cel.h"
 #include "edit/model/cue_point.h"
 #include "platform/store/streamable_layer.h"
 

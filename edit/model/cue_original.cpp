@@ -1,3 +1,4 @@
+#include "edit/model/cue_list.h"
 #include "edit/model/cue_point.h"
 #include "edit/model/edit.h"
 #include "edit/project/permissions_manager.h"

@@ -20,9 +20,9 @@ struct Span {
     double stripTo = 0;
     cookie strip;
 
-    Span(const cel& its, int inIndex) {
-        const channel_event* in = its.getChanEventPtr(inIndex);
-        const channel_event* out = its.getChanEventPtr(inIndex + 1);
+    Span(const cel& content, int inIndex) {
+        const channel_event* in = content.getChanEventPtr(inIndex);
+        const channel_event* out = content.getChanEventPtr(inIndex + 1);
         if (in != nullptr && out != nullptr) {
             editFrom = in->editTime;
             editTo = out->editTime;
@@ -52,12 +52,12 @@ struct Span {
 };
 
 /// The in point of the pair that plays at a time; an invalid handle where none does.
-ce_handle playing(const cel* its, double time) {
-    if (its == nullptr) {
+ce_handle playing(const cel* content, double time) {
+    if (content == nullptr) {
         return {};
     }
-    const ce_handle in = its->find_ceh(time, CE_IN_POINT);
-    return in.valid() != 0 && Span(*its, in.index()).holds(time) ? in : ce_handle();
+    const ce_handle in = content->find_ceh(time, CE_IN_POINT);
+    return in.valid() != 0 && Span(*content, in.index()).holds(time) ? in : ce_handle();
 }
 
 } // namespace
@@ -76,8 +76,8 @@ cue_point::cue_point(const char* text, double time, int chan, int code, const Ve
         }
         return;
     }
-    for (const cel* its : cels) {
-        const ce_handle event = playing(its, editTime());
+    for (const cel* content : cels) {
+        const ce_handle event = playing(content, editTime());
         if (event.valid() != 0 && !event.get_strip_cookie().isBlack()) {
             attachTo(event);
             return;
@@ -116,8 +116,8 @@ bool cue_point::attachTo(const ce_handle& event) {
     setEvent(event);
     m_flags.set(CueFlag::kAttached, true);
     update_strip_time();
-    const cel& its = *event.get_its_cel();
-    m_flags.set(CueFlag::kInside, Span(its, event.index() & ~1).distance(editTime()) <= 0);
+    const cel& content = *event.get_its_cel();
+    m_flags.set(CueFlag::kInside, Span(content, event.index() & ~1).distance(editTime()) <= 0);
     return true;
 }
 
@@ -142,30 +142,30 @@ void cue_point::remember() {
     if (event == nullptr) {
         return;
     }
-    const cel& its = *m_event.get_its_cel();
+    const cel& content = *m_event.get_its_cel();
     const int in = m_event.index() & ~1;
     m_eventId = event->id;
-    const channel_event* out = its.getChanEventPtr(in + 1);
+    const channel_event* out = content.getChanEventPtr(in + 1);
     m_outId = out != nullptr ? out->id : IdStamp();
-    const Span span(its, in);
+    const Span span(content, in);
     m_stripFrom = span.stripFrom;
     m_stripTo = span.stripTo;
 }
 
 /// Brings the handle back to the cue's event after the cel changed. Without one it is left at no event.
 bool cue_point::findEvent(EventSearch& search) {
-    const cel* its = m_event.get_its_cel();
-    if (its == nullptr || m_event.index() < 0) {
+    const cel* content = m_event.get_its_cel();
+    if (content == nullptr || m_event.index() < 0) {
         return false;
     }
     if (!m_eventId.valid()) {
         return m_event.valid() != 0;
     }
-    int index = search.nearest(*its, m_eventId, m_event.index());
+    int index = search.nearest(*content, m_eventId, m_event.index());
     if (index < 0 && m_outId.valid() && m_event.index() % 2 == 0) {
-        const int out = search.nearest(*its, m_outId, m_event.index() + 1);
+        const int out = search.nearest(*content, m_outId, m_event.index() + 1);
         if (out > 0) {
-            const Span span(*its, out - 1);
+            const Span span(*content, out - 1);
             const bool part = span.strip == m_stripCookie && span.within(m_stripFrom, m_stripTo);
             index = part && span.plays(m_stripTime) ? out - 1 : -1;
         }
@@ -189,23 +189,23 @@ void cue_point::takeOverStrip() {
 /// After a split: to the piece that plays the cue's strip time, when the one with the stamp does not any
 /// more.
 void cue_point::moveToPiece(EventSearch& search) {
-    const cel& its = *m_event.get_its_cel();
+    const cel& content = *m_event.get_its_cel();
     const bool played = m_stripTime >= std::min(m_stripFrom, m_stripTo) - Qx::kTimeTolerance &&
                         m_stripTime <= std::max(m_stripFrom, m_stripTo) + Qx::kTimeTolerance;
     const int in = m_event.index();
-    const channel_event* const out = its.getChanEventPtr(in + 1);
+    const channel_event* const out = content.getChanEventPtr(in + 1);
     // A pair that has its out point still was trimmed at most.
     if (in % 2 != 0 || !played || out == nullptr || out->id == m_outId || !m_outId.valid() ||
-        Span(its, in).plays(m_stripTime)) {
+        Span(content, in).plays(m_stripTime)) {
         return;
     }
     // Of pieces that follow one another a later moment lies in a later one.
     const double way = m_stripTo >= m_stripFrom ? 1.0 : -1.0;
-    const int last = search.nearest(its, m_outId, in + 1) - 1;
-    for (int piece = search.firstPiece(its, in, m_stripTime * way); piece <= last; piece += 2) {
-        const Span span(its, piece);
+    const int last = search.nearest(content, m_outId, in + 1) - 1;
+    for (int piece = search.firstPiece(content, in, m_stripTime * way); piece <= last; piece += 2) {
+        const Span span(content, piece);
         if (span.strip == m_stripCookie && span.plays(m_stripTime) && span.within(m_stripFrom, m_stripTo)) {
-            search.notePiece(its, in, m_stripTime * way, piece);
+            search.notePiece(content, in, m_stripTime * way, piece);
             m_event.set_index(piece);
             return;
         }
@@ -286,8 +286,8 @@ void cue_point::convert(const Vector<cel*>& cels, EventSearch& search) {
     }
     if (!attachByStamp(searched, search) && !attachByTimes(searched, search)) {
         const bool reread = hasFlags(CueFlag::kInside);
-        for (const cel* its : searched) {
-            const ce_handle event = reread ? playing(its, editTime()) : ce_handle();
+        for (const cel* content : searched) {
+            const ce_handle event = reread ? playing(content, editTime()) : ce_handle();
             if (event.valid() != 0) {
                 attachTo(event);
                 return;
@@ -302,10 +302,10 @@ bool cue_point::attachByStamp(const Vector<cel*>& cels, EventSearch& search) {
         return false;
     }
     const int hint = std::max(m_event.index(), 0);
-    for (cel* its : cels) {
-        const int index = its != nullptr ? search.nearest(*its, m_eventId, hint) : -1;
+    for (cel* content : cels) {
+        const int index = content != nullptr ? search.nearest(*content, m_eventId, hint) : -1;
         if (index >= 0) {
-            m_event = ce_handle(its, index);
+            m_event = ce_handle(content, index);
             return true;
         }
     }
@@ -321,22 +321,22 @@ bool cue_point::attachByTimes(const Vector<cel*>& cels, EventSearch& search) {
     };
     ce_handle best;
     double bestDistance = 0;
-    for (const cel* its : cels) {
-        const ce_handle there = playing(its, time);
-        if (there.valid() != 0 &&
-            (fits(Span(*its, there.index())) || near(its->get_strip_time(there, time), m_stripTime))) {
+    for (const cel* content : cels) {
+        const ce_handle there = playing(content, time);
+        if (there.valid() != 0 && (fits(Span(*content, there.index())) ||
+                                   near(content->get_strip_time(there, time), m_stripTime))) {
             best = there;
             break;
         }
         const int near =
-            its == nullptr ? -1 : search.nearestPair(*its, time, time - m_stripTime, [&](int in) {
-                const Span span(*its, in);
+            content == nullptr ? -1 : search.nearestPair(*content, time, time - m_stripTime, [&](int in) {
+                const Span span(*content, in);
                 return !span.strip.isBlack() && fits(span);
             });
         if (near >= 0) {
-            const double distance = Span(*its, near).distance(time);
+            const double distance = Span(*content, near).distance(time);
             if (best.valid() == 0 || distance < bestDistance) {
-                best = ce_handle(its, near);
+                best = ce_handle(content, near);
                 bestDistance = distance;
             }
         }

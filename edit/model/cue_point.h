@@ -1,6 +1,7 @@
 #pragma once
 
 #include "edit/model/ce_handle.h"
+#include "edit/model/cel.h"
 #include "edit/model/cue_flags_field.h"
 #include "edit/model/strp_field.h"
 #include "edit/model/tc_field.h"

@@ -1,7 +1,10 @@
 #include "edit/model/edit.h"
 
+#include "edit/model/cue_list.h"
 #include "edit/model/detail/channel_set.h"
 #include "edit/model/edit_keys.h"
+#include "platform/base/critical_section.h"
+#include "platform/notify/val_server.h"
 #include "platform/services/log.h"
 #include "platform/store/edit_header_proxy.h"
 
@@ -12,9 +15,20 @@ std::atomic<bool> defaultDebugMode{false};
 
 } // namespace
 
+struct Edit::Parts {
+    explicit Parts(Dirtiable& edit) : header(EditKeys::kHeaderName, EditKeys::kHeaderEnd, &edit) {}
+
+    configb header;
+    cue_list cues;
+    TagBag store;
+    ValServer<EditModification> changes;
+    criticalSection section;
+};
+
 Edit::Edit()
-    : m_header(EditKeys::kHeaderName, EditKeys::kHeaderEnd, this),
-      m_channels(std::make_unique<ChannelSet>()) {
+    : m_parts(std::make_unique<Parts>(*this)), m_header(m_parts->header),
+      m_channels(std::make_unique<ChannelSet>()), m_cues(m_parts->cues), m_store(m_parts->store),
+      m_changes(m_parts->changes), m_section(m_parts->section) {
     constructed.fetch_add(1);
     m_debug = defaultDebugMode.load();
     init();

@@ -1,28 +1,39 @@
 #pragma once
 
-#include "edit/model/aud_levels_cel.h"
-#include "edit/model/channel_group_list.h"
+#include "edit/model/channel_group.h"
 #include "edit/model/channel_types.h"
-#include "edit/model/cue_list.h"
 #include "edit/model/edit_chan_time_info.h"
 #include "edit/model/edit_modification.h"
 #include "edit/model/edit_ptr.h"
 #include "edit/model/edit_types.h"
-#include "edit/model/managed_cel.h"
-#include "platform/base/critical_section.h"
+#include "platform/base/ptr.h"
+#include "platform/base/status.h"
 #include "platform/base/vector.h"
 #include "platform/media/frame_rate.h"
-#include "platform/media/tv_standard.h"
 #include "platform/notify/notifier.h"
-#include "platform/notify/val_server.h"
-#include "platform/store/configb.h"
-#include "platform/store/tag_bag.h"
+#include "platform/store/dirtiable.h"
 
 #include <atomic>
 #include <memory>
 #include <optional>
 
+// Whoever uses one of these includes the header that is named after it.
+class AudCel;
+class AudLevelsCel;
+class ChannelGroupList;
+class TagBag;
 class TextFile;
+class VFXCel;
+class VidCel;
+class cel;
+class configb;
+class criticalSection;
+class cue_list;
+template <typename T>
+class ValServer;
+namespace Qx::Ed2Support {
+struct TVStd;
+}
 
 /// One edit in memory: a header of named properties and an ordered set of channels, each with its cel.
 ///
@@ -731,12 +742,16 @@ private:
     void cuesChanged();
     void groupsChanged();
 
+    /// What the edit is made of, each in a header of its own.
+    struct Parts;
+
     std::atomic<int32_t> m_refCount{0};
-    configb m_header;
+    std::unique_ptr<Parts> m_parts;
+    configb& m_header;
     std::unique_ptr<ChannelSet> m_channels;
     cookie m_cookie;
     double m_currentTime = 0;
-    double m_markTime = Qx::kNoTime;
+    double m_markTime; ///< set by `init`
     bool m_dirty = false;
     bool m_initialising = false;
     bool m_temporary = false;
@@ -753,15 +768,15 @@ private:
     mutable uint32_t m_revision = UINT32_MAX;
     mutable std::optional<int> m_sourceMedium;
     mutable std::optional<int> m_transfer;
-    mutable double m_sourceMediumDuration = Qx::kNoTime;
-    cue_list m_cues;
+    mutable double m_sourceMediumDuration; ///< set with the header
+    cue_list& m_cues;
     bool m_celCuesLoaded = false;
-    mutable TagBag m_store;
+    TagBag& m_store;
     std::shared_ptr<StoredCels> m_storedCels; ///< which cel the store holds under which name
     static constexpr uint64_t kNeverFound = UINT64_MAX;
     mutable std::atomic<ChannelGroupList*> m_groups{nullptr};
     mutable std::atomic<uint64_t> m_groupsFoundAt{kNeverFound}; ///< the store's departures at the time
-    ValServer<EditModification> m_changes;
+    ValServer<EditModification>& m_changes;
     Qx::Status m_fileStatus;
-    mutable criticalSection m_section;
+    criticalSection& m_section;
 };

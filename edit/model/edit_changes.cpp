@@ -3,6 +3,7 @@
 #include "edit/model/edit_keys.h"
 #include "edit/model/edit_registry.h"
 #include "edit/project/permissions_manager.h"
+#include "platform/notify/val_server.h"
 #include "platform/services/log.h"
 #include "platform/services/network.h"
 

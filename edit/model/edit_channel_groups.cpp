@@ -1,4 +1,7 @@
+#include "edit/model/channel_group_list.h"
 #include "edit/model/edit.h"
+#include "platform/base/critical_section.h"
+#include "platform/store/tag_bag.h"
 
 #include <algorithm>
 #include <functional>

@@ -1,5 +1,9 @@
+#include "edit/model/cel.h"
+#include "edit/model/channel_group_list.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_keys.h"
+#include "platform/store/tag_bag.h"
 
 #include <unordered_set>
 
@@ -106,8 +110,8 @@ void Edit::channelRemoved(const IdStamp& chan, int index) {
             }
         }
     }
-    if (const cel* its = get_edit_cel_p(index); its != nullptr && getId(index) == chan) {
-        m_cues.dropCel(its);
+    if (const cel* content = get_edit_cel_p(index); content != nullptr && getId(index) == chan) {
+        m_cues.dropCel(content);
     }
     if (index >= 0 && index != NO_CHAN) {
         m_cues.delete_matching_cues(0, index);

@@ -1,7 +1,9 @@
 #include "edit/model/edit.h"
 #include "edit/model/edit_keys.h"
 
+#include "edit/model/channel_group_list.h"
 #include "platform/services/log.h"
+#include "platform/store/tag_bag.h"
 
 #include <algorithm>
 

@@ -2,6 +2,7 @@
 #include "edit/model/edit_keys.h"
 #include "edit/model/edit_registry.h"
 #include "edit/project/permissions_manager.h"
+#include "platform/media/tv_standard.h"
 #include "platform/services/clock.h"
 #include "platform/services/current_project.h"
 #include "platform/services/log.h"

@@ -2,6 +2,7 @@
 
 #include "edit/model/edit.h"
 #include "edit/model/edit_registry.h"
+#include "platform/store/configb.h"
 
 #include <utility>
 

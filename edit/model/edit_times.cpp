@@ -1,4 +1,5 @@
 #include "edit/model/edit.h"
+#include "platform/base/num_range.h"
 
 #include <cmath>
 

@@ -90,8 +90,8 @@ bool AudCel::setFadeLength(const ce_handle& event, unsigned short quarterFrames)
     if (!valid() || getCel()->check_ceh(event) == 0) {
         return false;
     }
-    ce_handle its = event;
-    its.set_audioRamp_DurationQFrames(quarterFrames);
+    ce_handle content = event;
+    content.set_audioRamp_DurationQFrames(quarterFrames);
     modification();
     return true;
 }
@@ -104,8 +104,8 @@ bool AudCel::setShotSound(double time, BeginEnd end, float level) {
     if (!pair.valid()) {
         return false;
     }
-    ce_handle its = end == BeginEnd::Begin ? pair.inH() : pair.outH();
-    its.set_strip_level(level);
+    ce_handle content = end == BeginEnd::Begin ? pair.inH() : pair.outH();
+    content.set_strip_level(level);
     modification();
     return true;
 }

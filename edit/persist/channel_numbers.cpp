@@ -1,3 +1,4 @@
+#include "edit/model/managed_cel.h"
 #include "edit/persist/detail/edit_file.h"
 
 #include <algorithm>

@@ -1,8 +1,11 @@
+#include "edit/model/managed_cel.h"
 #include "edit/persist/detail/edit_file.h"
+#include "platform/notify/val_server.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 #include "platform/services/log.h"
 #include "platform/store/edit_header_proxy.h"
+#include "platform/store/tag_bag.h"
 
 #include <exception>
 #include <new>

@@ -1,3 +1,4 @@
+#include "edit/model/managed_cel.h"
 #include "edit/persist/detail/edit_file.h"
 #include "edit/project/permissions_manager.h"
 #include "platform/services/edit_filenames.h"
@@ -5,6 +6,7 @@
 #include "platform/services/log.h"
 #include "platform/services/network.h"
 #include "platform/store/edit_header_proxy.h"
+#include "platform/store/tag_bag.h"
 
 #include <algorithm>
 

@@ -1,3 +1,5 @@
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/cel.h"
 #include "edit/model/edit.h"
 #include "platform/media/frame_rate.h"
 #include "platform/services/log.h"

@@ -1,7 +1,9 @@
 #include "edit/persist/detail/legacy_upgrades.h"
 #include "edit/persist/detail/ed2_names.h"
 
+#include "edit/model/aud_levels_cel.h"
 #include "edit/model/edit.h"
+#include "edit/model/managed_cel.h"
 #include "edit/persist/detail/edit_file.h"
 #include "platform/services/current_project.h"
 #include "platform/services/log.h"

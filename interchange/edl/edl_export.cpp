@@ -9,6 +9,7 @@
 #include "platform/media/timecode.h"
 #include "platform/services/atomic_file.h"
 #include "platform/services/current_project.h"
+#include "platform/store/configb.h"
 
 #include <algorithm>
 #include <cmath>
@@ -59,9 +60,9 @@ struct Lead {
     size_t clip = kNoClip;
 };
 
-class EdlExporting {
+class EdlExporter {
 public:
-    EdlExporting(const Edit& edit, const EdlExportOptions& options, LossReport& report);
+    EdlExporter(const Edit& edit, const EdlExportOptions& options, LossReport& report);
     Qx::Status run(String& text);
 
 private:
@@ -105,7 +106,7 @@ private:
     EdlList m_list;
 };
 
-EdlExporting::EdlExporting(const Edit& edit, const EdlExportOptions& options, LossReport& report)
+EdlExporter::EdlExporter(const Edit& edit, const EdlExportOptions& options, LossReport& report)
     : m_edit(edit), m_options(options), m_report(report), m_rate(edit.getFrameRate()),
       m_sources(edit, m_rate, options, report) {
     m_drop = edit.isDropFrame(Qx::currentProject().dropFrame);
@@ -115,7 +116,7 @@ EdlExporting::EdlExporting(const Edit& edit, const EdlExportOptions& options, Lo
 }
 
 // Texts in a header may come from anywhere: numbers are digits, and a reel is one word.
-void EdlExporting::takeRecords() {
+void EdlExporter::takeRecords() {
     m_records = unpackEdlRecords(m_edit.Opts().getString(EdlKey::kEvents));
     for (EdlRecord& record : m_records) {
         const int number = record.number.size() <= kLongNumber ? detail::digitsValue(record.number) : -1;
@@ -128,7 +129,7 @@ void EdlExporting::takeRecords() {
     m_recordUsed.assign(m_records.size(), false);
 }
 
-Qx::Status EdlExporting::checkProgramme() {
+Qx::Status EdlExporter::checkProgramme() {
     const String name = m_edit.get_cookie_str();
     if (m_clips.empty()) {
         return Qx::Status::failure("edit " + name +
@@ -158,13 +159,13 @@ Qx::Status EdlExporting::checkProgramme() {
 }
 
 // The first clip that came from a record, unless it stands above another one already.
-size_t EdlExporting::clipOfRecord(size_t record) const {
+size_t EdlExporter::clipOfRecord(size_t record) const {
     const size_t clip = m_firstOfRecord[record];
     return clip == kNoClip || m_isLead[clip] ? kNoClip : clip;
 }
 
 // The source frame at which what plays before a clip goes on, if on every track it is the source named.
-bool EdlExporting::outgoingFrame(const ExportClip& clip, Lead& lead) const {
+bool EdlExporter::outgoingFrame(const ExportClip& clip, Lead& lead) const {
     const String& named = m_records[clip.record - 1].reel;
     EdlChannels found = 0;
     const auto [first, last] = m_byEnd.equal_range(clip.recordIn);
@@ -183,7 +184,7 @@ bool EdlExporting::outgoingFrame(const ExportClip& clip, Lead& lead) const {
     return (found & clip.channels) == clip.channels;
 }
 
-void EdlExporting::findTransition(size_t index, const KeptType& type) {
+void EdlExporter::findTransition(size_t index, const KeptType& type) {
     const ExportClip& clip = m_clips[index];
     const size_t record = clip.record;
     Lead lead;
@@ -215,7 +216,7 @@ void EdlExporting::findTransition(size_t index, const KeptType& type) {
     m_leads[index] = lead;
 }
 
-void EdlExporting::findKey(size_t index, const KeptType& type) {
+void EdlExporter::findKey(size_t index, const KeptType& type) {
     ExportClip& clip = m_clips[index];
     if ((clip.channels & kEdlPicture2) == 0) {
         return;
@@ -231,7 +232,7 @@ void EdlExporting::findKey(size_t index, const KeptType& type) {
     m_leads[index].clip = background;
 }
 
-void EdlExporting::dropForeground(ExportClip& clip) {
+void EdlExporter::dropForeground(ExportClip& clip) {
     if ((clip.channels & kEdlPicture2) != 0) {
         m_report.addLoss(0, "the foreground of a key at " +
                                 Qx::timecodeText(m_start + clip.recordIn, m_rate, m_drop) +
@@ -240,7 +241,7 @@ void EdlExporting::dropForeground(ExportClip& clip) {
     }
 }
 
-void EdlExporting::findLeads() {
+void EdlExporter::findLeads() {
     m_leads.assign(m_clips.size(), {});
     m_isLead.assign(m_clips.size(), false);
     m_firstOfRecord.assign(m_records.size(), kNoClip);
@@ -265,7 +266,7 @@ void EdlExporting::findLeads() {
     }
 }
 
-ExportLine EdlExporting::lineOf(const ExportClip& clip, const EdlSource& source) const {
+ExportLine EdlExporter::lineOf(const ExportClip& clip, const EdlSource& source) const {
     ExportLine line;
     EdlEvent& event = line.event;
     line.source = &source;
@@ -302,14 +303,14 @@ ExportLine EdlExporting::lineOf(const ExportClip& clip, const EdlSource& source)
     return line;
 }
 
-String EdlExporting::numberOf(const ExportClip& clip) {
+String EdlExporter::numberOf(const ExportClip& clip) {
     if (clip.record != kNoRecord && !m_recordUsed[clip.record] && !m_records[clip.record].number.empty()) {
         return m_records[clip.record].number;
     }
     return String::format("%03d", ++m_greatestNumber);
 }
 
-void EdlExporting::keepNotes(ExportLine& line, size_t record, bool first) {
+void EdlExporter::keepNotes(ExportLine& line, size_t record, bool first) {
     if (record == kNoRecord) {
         return;
     }
@@ -326,7 +327,7 @@ void EdlExporting::keepNotes(ExportLine& line, size_t record, bool first) {
     }
 }
 
-void EdlExporting::addLead(std::vector<ExportLine>& lines, const ExportClip& clip, const Lead& lead) {
+void EdlExporter::addLead(std::vector<ExportLine>& lines, const ExportClip& clip, const Lead& lead) {
     if (lead.clip != kNoClip) {
         const ExportClip& above = m_clips[lead.clip];
         ExportLine& line = lines.emplace_back(lineOf(above, m_sources[above.source]));
@@ -353,7 +354,7 @@ void EdlExporting::addLead(std::vector<ExportLine>& lines, const ExportClip& cli
     m_eventRecord.push_back(clip.record);
 }
 
-void EdlExporting::addEvent(size_t index) {
+void EdlExporter::addEvent(size_t index) {
     const Lead& lead = m_leads[index];
     const ExportClip& clip = m_clips[index];
     std::vector<ExportLine> lines;
@@ -390,7 +391,7 @@ void EdlExporting::addEvent(size_t index) {
     }
 }
 
-void EdlExporting::addEvents() {
+void EdlExporter::addEvents() {
     std::vector<size_t> below(m_clips.size(), kNoClip);
     for (size_t i = 0; i < m_clips.size(); ++i) {
         if (m_leads[i].clip != kNoClip) {
@@ -412,7 +413,7 @@ void EdlExporting::addEvents() {
 }
 
 // Cues that no imported line stands for go below the last event that starts at or before them.
-void EdlExporting::addCues() {
+void EdlExporter::addCues() {
     for (const auto& [line, until] : m_cuesBelow) {
         const String cues = m_markers->takeBefore(until);
         if (!cues.empty()) {
@@ -423,7 +424,7 @@ void EdlExporting::addCues() {
 }
 
 // A SPLIT tells how much later the second of two lines of one number starts.
-void EdlExporting::checkSplits() {
+void EdlExporter::checkSplits() {
     for (size_t i = 0; i < m_list.events.size(); ++i) {
         EdlEvent& event = m_list.events[i];
         if (!event.notes.starts_with("SPLIT")) {
@@ -447,7 +448,7 @@ void EdlExporting::checkSplits() {
 }
 
 // Numbers of an imported list stay as they were written there, unless all become long.
-void EdlExporting::tidyNumbers() {
+void EdlExporter::tidyNumbers() {
     const bool longNumbers = m_numEvents > kMostThreeDigitEvents;
     size_t width = longNumbers ? kLongNumber : 0;
     for (const EdlEvent& event : m_list.events) {
@@ -461,7 +462,7 @@ void EdlExporting::tidyNumbers() {
     }
 }
 
-Qx::Status EdlExporting::run(String& text) {
+Qx::Status EdlExporter::run(String& text) {
     if (!m_rate.valid()) {
         return Qx::Status::failure("edit " + m_edit.get_cookie_str() +
                                    " has no frame rate; give it one, as timecode needs it");
@@ -504,7 +505,7 @@ Qx::Status EdlExporting::run(String& text) {
 } // namespace
 
 Qx::Status exportEdl(const Edit& edit, const EdlExportOptions& options, String& text, LossReport& report) {
-    return EdlExporting(edit, options, report).run(text);
+    return EdlExporter(edit, options, report).run(text);
 }
 
 Qx::Status exportEdlFile(const Edit& edit, const EdlExportOptions& options, const String& path,

@@ -1,5 +1,7 @@
 #include "interchange/edl/edl_import.h"
 
+#include "edit/model/cel.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_keys.h"
 #include "interchange/edl/edl_records.h"
@@ -23,9 +25,9 @@ struct Source {
 
 constexpr size_t kNoSource = SIZE_MAX;
 
-class EdlImporting {
+class EdlImporter {
 public:
-    EdlImporting(const EdlList& list, const EdlProgramme& programme, Import& result)
+    EdlImporter(const EdlList& list, const EdlProgramme& programme, Import& result)
         : m_list(list), m_programme(programme), m_result(result) {}
 
     void build(const String& name);
@@ -95,7 +97,7 @@ bool isPicture(EdlChannels channel) {
 }
 
 // A name that a project can show. The notes keep the whole of it.
-String EdlImporting::shownName(const String& name, int line) {
+String EdlImporter::shownName(const String& name, int line) {
     constexpr size_t most = 1000;
     if (name.size() <= most) {
         return name;
@@ -108,7 +110,7 @@ String EdlImporting::shownName(const String& name, int line) {
     return name.substr(0, end);
 }
 
-EditPtr EdlImporting::newEdit(const cookie& item, bool original) const {
+EditPtr EdlImporter::newEdit(const cookie& item, bool original) const {
     EditPtr edit(new Edit);
     edit->setCreationDetails();
     // Dirty from the start, so that no header change below announces an item that no project has.
@@ -121,7 +123,7 @@ EditPtr EdlImporting::newEdit(const cookie& item, bool original) const {
 }
 
 // The number of the source that an event plays.
-size_t EdlImporting::sourceOf(const EdlClip& clip) {
+size_t EdlImporter::sourceOf(const EdlClip& clip) {
     size_t& known = m_sourceOfEvent[clip.event];
     if (known != kNoSource) {
         return known;
@@ -140,7 +142,7 @@ size_t EdlImporting::sourceOf(const EdlClip& clip) {
     return known;
 }
 
-void EdlImporting::findSources() {
+void EdlImporter::findSources() {
     m_sourceOfEvent.assign(m_list.events.size(), kNoSource);
     for (const EdlTrack& track : m_programme.tracks) {
         for (const EdlClip& clip : track.clips) {
@@ -157,7 +159,7 @@ void EdlImporting::findSources() {
     }
 }
 
-void EdlImporting::buildShot(size_t index) {
+void EdlImporter::buildShot(size_t index) {
     const Source& source = m_sources[index];
     const EdlEvent& event = m_list.events[source.event];
     const cookie item = provisionalCookie(index);
@@ -190,7 +192,7 @@ void EdlImporting::buildShot(size_t index) {
     m_result.shots.push_back(std::move(shot));
 }
 
-Qx::Ptr<cel> EdlImporting::buildCel(const EdlTrack* track) {
+Qx::Ptr<cel> EdlImporter::buildCel(const EdlTrack* track) {
     auto content = std::make_shared<cel>();
     if (track == nullptr) {
         return content;
@@ -206,7 +208,7 @@ Qx::Ptr<cel> EdlImporting::buildCel(const EdlTrack* track) {
     return content;
 }
 
-void EdlImporting::buildChannels(Edit& edit) {
+void EdlImporter::buildChannels(Edit& edit) {
     EdlChannels used = 0;
     for (const EdlTrack& track : m_programme.tracks) {
         used |= track.channel;
@@ -223,7 +225,7 @@ void EdlImporting::buildChannels(Edit& edit) {
     }
 }
 
-void EdlImporting::addCues(Edit& edit) {
+void EdlImporter::addCues(Edit& edit) {
     for (const EdlMarker& marker : m_list.markers) {
         const int64_t position = markerPosition(m_list, m_programme, marker);
         if (position < 0) {
@@ -241,7 +243,7 @@ void EdlImporting::addCues(Edit& edit) {
     edit.get_cues().sort();
 }
 
-void EdlImporting::buildSequence(const String& name) {
+void EdlImporter::buildSequence(const String& name) {
     m_records.resize(m_list.events.size());
     for (size_t i = 0; i < m_records.size(); ++i) {
         const EdlEvent& event = m_list.events[i];
@@ -265,7 +267,7 @@ void EdlImporting::buildSequence(const String& name) {
     m_result.sequence = std::move(sequence);
 }
 
-void EdlImporting::build(const String& name) {
+void EdlImporter::build(const String& name) {
     findSources();
     m_result.shots.reserve(m_sources.size());
     for (size_t i = 0; i < m_sources.size(); ++i) {
@@ -284,7 +286,7 @@ Qx::Status importEdlList(const EdlList& list, const String& name, const ImportOp
     if (Qx::Status status = layTracks(list, options.strict, programme, built.report); !status) {
         return status;
     }
-    EdlImporting(list, programme, built).build(name);
+    EdlImporter(list, programme, built).build(name);
     result = std::move(built);
     return {};
 }

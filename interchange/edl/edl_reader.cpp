@@ -33,7 +33,7 @@ String EdlEvent::typeText() const {
 }
 
 Qx::Status readEdl(std::string_view text, Qx::FrameRate rate, EdlList& list, LossReport& report) {
-    detail::EdlReading reading(rate, report);
+    detail::EdlReader reading(rate, report);
     Qx::Status status = reading.read(text);
     if (status) {
         list = std::move(reading.list());
@@ -69,18 +69,18 @@ bool isTransition(const EdlEvent& event) {
 
 } // namespace
 
-Qx::Status EdlReading::failure(int line, const String& what) const {
+Qx::Status EdlReader::failure(int line, const String& what) const {
     return Qx::Status::failure(m_report.file() + ":" + std::to_string(line) + ": " + what);
 }
 
-void EdlReading::warnOnce(Once once, const String& what) {
+void EdlReader::warnOnce(Once once, const String& what) {
     if (!m_warned[once]) {
         m_warned[once] = true;
         m_report.addWarning(m_line, what);
     }
 }
 
-String EdlReading::name(std::string_view text) {
+String EdlReader::name(std::string_view text) {
     bool replaced = false;
     String result = utf8Name(text, replaced);
     if (replaced) {
@@ -89,11 +89,11 @@ String EdlReading::name(std::string_view text) {
     return result;
 }
 
-bool EdlReading::paired() const {
+bool EdlReader::paired() const {
     return !m_list.events.empty() && m_list.events.back().role == EdlRole::Incoming;
 }
 
-Qx::Status EdlReading::read(std::string_view text) {
+Qx::Status EdlReader::read(std::string_view text) {
     if (!m_list.rate.valid()) {
         return failure(1, "a list does not state its frame rate; give one");
     }
@@ -112,7 +112,7 @@ Qx::Status EdlReading::read(std::string_view text) {
     return finish();
 }
 
-Qx::Status EdlReading::readLine(std::string_view whole) {
+Qx::Status EdlReader::readLine(std::string_view whole) {
     const std::string_view line = trimBlanks(whole);
     if (line.empty()) {
         return {};
@@ -137,7 +137,7 @@ Qx::Status EdlReading::readLine(std::string_view whole) {
     return {};
 }
 
-bool EdlReading::readStatement(std::string_view line) {
+bool EdlReader::readStatement(std::string_view line) {
     if (beginsNoCase(line, "TITLE:")) {
         if (!m_titleSeen) {
             m_list.title = name(trimBlanks(line.substr(6)));
@@ -163,7 +163,7 @@ bool EdlReading::readStatement(std::string_view line) {
     return false;
 }
 
-Qx::Status EdlReading::readEvent(std::string_view line) {
+Qx::Status EdlReader::readEvent(std::string_view line) {
     EdlLine parsed;
     if (Qx::Status status = parseEventLine(line, m_fields, parsed); !status) {
         // In a source table a line that begins with digits is a row of it.
@@ -191,7 +191,7 @@ Qx::Status EdlReading::readEvent(std::string_view line) {
     return {};
 }
 
-void EdlReading::pairWithLineBefore(EdlEvent& event) {
+void EdlReader::pairWithLineBefore(EdlEvent& event) {
     if (!isTransition(event)) {
         return;
     }
@@ -211,7 +211,7 @@ void EdlReading::pairWithLineBefore(EdlEvent& event) {
                                       "black");
 }
 
-bool EdlReading::resolveDrop(bool dropSeparator, bool nonDropSeparator) {
+bool EdlReader::resolveDrop(bool dropSeparator, bool nonDropSeparator) {
     const bool drop = dropSeparator || (!nonDropSeparator && m_dropFrame);
     if (drop && !m_list.rate.hasDropFrame()) {
         warnOnce(kNoDropFrame, "the list says drop frame, which " + m_list.rate.asString() +
@@ -222,7 +222,7 @@ bool EdlReading::resolveDrop(bool dropSeparator, bool nonDropSeparator) {
 }
 
 // Leaves `count` at -1 for a timecode of four fields.
-Qx::Status EdlReading::readTime(std::string_view text, Qx::TimecodeFields& fields, int64_t& count) {
+Qx::Status EdlReader::readTime(std::string_view text, Qx::TimecodeFields& fields, int64_t& count) {
     count = -1;
     if (text.find_first_of(":;,.") == std::string_view::npos) {
         count = digitsValue(text);
@@ -238,7 +238,7 @@ Qx::Status EdlReading::readTime(std::string_view text, Qx::TimecodeFields& field
     return {};
 }
 
-Qx::Status EdlReading::readTimes(const EdlLine& parsed, EdlEvent& event) {
+Qx::Status EdlReader::readTimes(const EdlLine& parsed, EdlEvent& event) {
     int64_t* const results[] = {&event.sourceIn, &event.sourceOut, &event.recordIn, &event.recordOut};
     for (size_t side = 0; side < 4; side += 2) {
         Qx::TimecodeFields fields[2];
@@ -264,7 +264,7 @@ Qx::Status EdlReading::readTimes(const EdlLine& parsed, EdlEvent& event) {
     return {};
 }
 
-Qx::Status EdlReading::finish() {
+Qx::Status EdlReader::finish() {
     if (m_list.events.empty()) {
         return failure(std::max(m_line, 1), "the list has no events; export it again from its source");
     }
@@ -278,7 +278,7 @@ Qx::Status EdlReading::finish() {
     return {};
 }
 
-Qx::Status EdlReading::finishEvent(EdlEvent& event) {
+Qx::Status EdlReader::finishEvent(EdlEvent& event) {
     const bool reverse = event.speed && event.speed->framesPerSecond < 0;
     if (event.sourceOut < event.sourceIn && !reverse) {
         event.sourceOut += Qx::framesPerDay(m_list.rate, event.sourceDrop);
@@ -305,7 +305,7 @@ Qx::Status EdlReading::finishEvent(EdlEvent& event) {
     return {};
 }
 
-void EdlReading::checkSplits() {
+void EdlReader::checkSplits() {
     for (const Split& split : m_splits) {
         if (split.event + 1 >= m_list.events.size()) {
             m_report.addWarning(split.line, "SPLIT has no two event lines below it and changes nothing");

@@ -69,9 +69,9 @@ private:
     std::map<int64_t, EdlClip> m_clips;
 };
 
-class Laying {
+class TrackBuilder {
 public:
-    Laying(const EdlList& list, bool strict, LossReport& report)
+    TrackBuilder(const EdlList& list, bool strict, LossReport& report)
         : m_list(list), m_strict(strict), m_report(report) {}
 
     Qx::Status lay(EdlProgramme& programme);
@@ -99,7 +99,7 @@ private:
     std::map<EdlChannels, Lane> m_lanes; // by bit, so in the order of the tracks
 };
 
-bool Laying::runsOverMidnight() {
+bool TrackBuilder::runsOverMidnight() {
     const auto& events = m_list.events;
     bool crosses = false;
     size_t back = 0;
@@ -121,7 +121,7 @@ bool Laying::runsOverMidnight() {
 }
 
 // The record in after the longest pause on the circle of a day.
-int64_t Laying::startOfDay() const {
+int64_t TrackBuilder::startOfDay() const {
     std::vector<std::pair<int64_t, int64_t>> spans;
     spans.reserve(m_list.events.size());
     int64_t day = 0;
@@ -147,7 +147,7 @@ int64_t Laying::startOfDay() const {
     return start;
 }
 
-void Laying::findPositions() {
+void TrackBuilder::findPositions() {
     const auto& events = m_list.events;
     auto& positions = m_programme.positions;
     positions.resize(events.size());
@@ -176,11 +176,11 @@ void Laying::findPositions() {
     }
 }
 
-const EdlEvent* Laying::outgoingOf(size_t index) const {
+const EdlEvent* TrackBuilder::outgoingOf(size_t index) const {
     return m_list.events[index].role == EdlRole::Incoming ? &m_list.events[index - 1] : nullptr;
 }
 
-EdlClip Laying::clipOf(size_t index) const {
+EdlClip TrackBuilder::clipOf(size_t index) const {
     const EdlEvent& event = m_list.events[index];
     EdlClip clip;
     clip.event = index;
@@ -202,7 +202,7 @@ EdlClip Laying::clipOf(size_t index) const {
     return clip;
 }
 
-void Laying::checkDurations(const EdlEvent& event) {
+void TrackBuilder::checkDurations(const EdlEvent& event) {
     if (event.role == EdlRole::Outgoing && recordLength(event) == 0) {
         return;
     }
@@ -226,7 +226,7 @@ void Laying::checkDurations(const EdlEvent& event) {
     }
 }
 
-void Laying::reportTransition(const EdlEvent& event, const EdlEvent* outgoing) {
+void TrackBuilder::reportTransition(const EdlEvent& event, const EdlEvent* outgoing) {
     const bool fromBlack = outgoing == nullptr || outgoing->isBlack();
     String what;
     switch (event.type) {
@@ -250,7 +250,7 @@ void Laying::reportTransition(const EdlEvent& event, const EdlEvent* outgoing) {
     m_report.addLoss(event.line, std::move(what));
 }
 
-Qx::Status Laying::checkTransition(size_t index) {
+Qx::Status TrackBuilder::checkTransition(size_t index) {
     const EdlEvent& event = m_list.events[index];
     if (event.duration <= recordLength(event)) {
         return {};
@@ -264,7 +264,7 @@ Qx::Status Laying::checkTransition(size_t index) {
 }
 
 // A line of no length says where the outgoing side goes on: that should be where a clip ends.
-void Laying::checkJoin(size_t index, EdlChannels channels) {
+void TrackBuilder::checkJoin(size_t index, EdlChannels channels) {
     for (EdlChannels bits = channels; bits != 0; bits &= bits - 1) {
         const EdlChannels channel = bits & ~(bits - 1);
         const auto lane = m_lanes.find(channel);
@@ -277,7 +277,7 @@ void Laying::checkJoin(size_t index, EdlChannels channels) {
     }
 }
 
-Qx::Status Laying::layOn(EdlChannels channel, const EdlClip& clip) {
+Qx::Status TrackBuilder::layOn(EdlChannels channel, const EdlClip& clip) {
     const size_t covered = m_lanes[channel].lay(clip);
     const EdlEvent& event = m_list.events[clip.event];
     const EdlEvent& below = m_list.events[covered];
@@ -293,7 +293,7 @@ Qx::Status Laying::layOn(EdlChannels channel, const EdlClip& clip) {
     return {};
 }
 
-Qx::Status Laying::layEvent(size_t index) {
+Qx::Status TrackBuilder::layEvent(size_t index) {
     const EdlEvent& event = m_list.events[index];
     if (event.role == EdlRole::Outgoing && recordLength(event) == 0) {
         checkJoin(index, event.channels);
@@ -326,7 +326,7 @@ Qx::Status Laying::layEvent(size_t index) {
     return {};
 }
 
-Qx::Status Laying::lay(EdlProgramme& programme) {
+Qx::Status TrackBuilder::lay(EdlProgramme& programme) {
     findPositions();
     std::vector<size_t> order(m_list.events.size());
     for (size_t i = 0; i < order.size(); ++i) {
@@ -352,7 +352,7 @@ Qx::Status Laying::lay(EdlProgramme& programme) {
 } // namespace
 
 Qx::Status layTracks(const EdlList& list, bool strict, EdlProgramme& programme, LossReport& report) {
-    return Laying(list, strict, report).lay(programme);
+    return TrackBuilder(list, strict, report).lay(programme);
 }
 
 int64_t markerPosition(const EdlList& list, const EdlProgramme& programme, const EdlMarker& marker) {

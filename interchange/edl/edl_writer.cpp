@@ -12,9 +12,9 @@ constexpr const char* kDropMode = "FCM: DROP FRAME";
 constexpr const char* kNonDropMode = "FCM: NON-DROP FRAME";
 constexpr EdlChannels kInField = kEdlPicture | edlAudio(1) | edlAudio(2);
 
-class EdlWriting {
+class EdlWriter {
 public:
-    EdlWriting(const EdlList& list, const EdlTextOptions& options)
+    EdlWriter(const EdlList& list, const EdlTextOptions& options)
         : m_list(list), m_lineEnd(options.crlf ? "\r\n" : "\n") {}
 
     String write() {
@@ -89,7 +89,7 @@ private:
 } // namespace
 
 String edlText(const EdlList& list, const EdlTextOptions& options) {
-    return EdlWriting(list, options).write();
+    return EdlWriter(list, options).write();
 }
 
 std::string_view edlChannelText(EdlChannels channels) {

@@ -6,7 +6,7 @@
 #include <array>
 #include <compare>
 #include <cstdint>
-#include <functional>
+#include <string_view>
 
 class PStream;
 

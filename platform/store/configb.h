@@ -4,6 +4,7 @@
 #include "platform/base/export.h"
 #include "platform/base/qx_string.h"
 #include "platform/base/status.h"
+#include "platform/store/dirtiable.h"
 
 #include <cstdint>
 #include <map>
@@ -12,13 +13,6 @@
 
 class PStream;
 class TextFile;
-
-/// Hears when a header store becomes dirty.
-class QM_API Dirtiable {
-public:
-    virtual ~Dirtiable();
-    virtual void onConfigbDirty() = 0;
-};
 
 /// A store of typed values by key, as in the header of an edit. Keys are matched without regard to the case
 /// of ASCII letters and keep the spelling of their first writing and their order. A key is not empty and

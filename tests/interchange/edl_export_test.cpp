@@ -4,6 +4,9 @@
 #include "interchange/edl/edl_writer.h"
 #include "interchange/marker_colour.h"
 
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/cel.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit_keys.h"
 #include "support/recording_log.h"
 #include "support/temporary_folder.h"

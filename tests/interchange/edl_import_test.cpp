@@ -2,6 +2,8 @@
 #include "interchange/edl/edl_records.h"
 #include "interchange/marker_colour.h"
 
+#include "edit/model/cel.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_keys.h"
 #include "platform/services/current_project.h"

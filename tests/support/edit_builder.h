@@ -1,5 +1,7 @@
 #pragma once
 
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/cel.h"
 #include "edit/model/edit.h"
 
 #include <cmath>

@@ -1,6 +1,13 @@
 #pragma once
 
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/cel.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
+#include "edit/model/managed_cel.h"
+#include "platform/store/configb.h"
+
+#include <variant>
 
 namespace test {
 

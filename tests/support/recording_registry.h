@@ -4,6 +4,7 @@
 #include "edit/model/edit_registry.h"
 
 #include <map>
+#include <utility>
 #include <vector>
 
 namespace test {

@@ -1,3 +1,6 @@
+#include "edit/model/channel_group_list.h"
+#include "edit/model/cue_list.h"
+#include "platform/store/configb.h"
 #include "tests/support/edit_builder.h"
 #include "tests/tools/qmedit_fixture.h"
 

@@ -1,5 +1,7 @@
 #include "edit_states.h"
 
+#include "edit/model/cel.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
 #include "edit/persist/edit_salvage.h"
 #include "platform/services/atomic_file.h"

@@ -5,9 +5,11 @@
 #include "torture.h"
 
 #include "edit/manager/edit_manager.h"
+#include "platform/store/configb.h"
 #include "tests/edit/manager/managed_project.h"
 
 #include <atomic>
+#include <chrono>
 #include <thread>
 
 namespace torture {

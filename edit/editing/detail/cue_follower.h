@@ -1,6 +1,7 @@
 #pragma once
 
 #include "edit/editing/detail/edit_plan.h"
+#include "edit/model/cel.h"
 
 /// Lets the cues of an edit follow one operation. Made before the changes; `follow` comes after them. Records
 /// no change of the edit: it is a part of the operation's.

@@ -1,6 +1,8 @@
 #pragma once
 
 #include "edit/editing/detail/edit_plan.h"
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/cel.h"
 
 /// Makes the changes of one operation: the core operation, the operation as given, and the edit region.
 class Editor::EditOpPerformer {
@@ -14,9 +16,9 @@ public:
 
     /// Makes one change of a channel's cel; receives the stamps of copied and of cut events. False, with the
     /// channel unchanged, for a core that is none of replace, insert and remove.
-    bool doEdit(cel& its, const Step& step, cel::IdMap& copied, cel::Splits& splits) const;
+    bool doEdit(cel& content, const Step& step, cel::IdMap& copied, cel::Splits& splits) const;
     /// The same for the levels of an audio channel.
-    static void doLevels(AudLevelsCel& its, const Step& step);
+    static void doLevels(AudLevelsCel& content, const Step& step);
 
 private:
     edit_operation m_core;

@@ -1,6 +1,8 @@
 #pragma once
 
 #include "edit/editing/editor.h"
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/cel.h"
 
 #include <vector>
 

@@ -74,10 +74,10 @@ struct Cut {
     Cut cut{pair, false, time};
     double distance = kTolerance;
     bool found = false;
-    const auto consider = [&](double its, size_t before) {
-        const double far = std::abs(its - time);
+    const auto consider = [&](double at, size_t before) {
+        const double far = std::abs(at - time);
         if (far < distance || (far == distance && !found)) {
-            cut = {before, false, its};
+            cut = {before, false, at};
             distance = far;
             found = true;
         }

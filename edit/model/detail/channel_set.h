@@ -1,6 +1,9 @@
 #pragma once
 
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/cel.h"
 #include "edit/model/edit.h"
+#include "edit/model/managed_cel.h"
 
 #include <array>
 #include <memory>

@@ -16,21 +16,21 @@ class EventSearch {
 public:
     /// The index of the event with a stamp that is nearest to `hint` among those of the same end of a pair
     /// (an in point has an even index); -1 if there is none.
-    [[nodiscard]] int nearest(const cel& its, const IdStamp& id, int hint);
+    [[nodiscard]] int nearest(const cel& content, const IdStamp& id, int hint);
 
     /// The in point, nearest to a time, of a pair for which `fits(in)` is true; -1 if there is none. Only
     /// pairs are asked whose edit time is by `offset`, within twice the tolerance, later than their strip
     /// time.
-    [[nodiscard]] int nearestPair(const cel& its, double time, double offset,
+    [[nodiscard]] int nearestPair(const cel& content, double time, double offset,
                                   const std::function<bool(int)>& fits);
 
     /// Where to begin to look for the piece, of what was pair `in`, that plays a moment: behind the pair, or
     /// at the piece that was noted for a moment before.
-    [[nodiscard]] int firstPiece(const cel& its, int in, double moment) const {
-        return m_cel == &its && m_in == in && moment >= m_moment ? m_piece : in + 2;
+    [[nodiscard]] int firstPiece(const cel& content, int in, double moment) const {
+        return m_cel == &content && m_in == in && moment >= m_moment ? m_piece : in + 2;
     }
-    void notePiece(const cel& its, int in, double moment, int piece) {
-        m_cel = &its;
+    void notePiece(const cel& content, int in, double moment, int piece) {
+        m_cel = &content;
         m_in = in;
         m_moment = moment;
         m_piece = piece;
@@ -43,9 +43,9 @@ private:
         std::vector<std::pair<IdStamp, int>> stamps;
         std::vector<std::pair<double, int>> offsets; ///< of pairs
     };
-    [[nodiscard]] static int walk(const cel& its, const IdStamp& id, int hint, int& walked);
-    [[nodiscard]] static int walkPairs(const cel& its, double time, const std::function<bool(int)>& fits);
-    [[nodiscard]] static int inIndex(const cel& its, Known& known, const IdStamp& id, int hint);
+    [[nodiscard]] static int walk(const cel& content, const IdStamp& id, int hint, int& walked);
+    [[nodiscard]] static int walkPairs(const cel& content, double time, const std::function<bool(int)>& fits);
+    [[nodiscard]] static int inIndex(const cel& content, Known& known, const IdStamp& id, int hint);
 
     std::map<const cel*, Known> m_known;
     int m_shift = 0;

@@ -1,7 +1,10 @@
 #pragma once
 
+#include "edit/model/cel.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_keys.h"
+#include "platform/store/text_file.h"
 
 /// What reading and writing do inside an edit. The steps are called in the order in which they are declared;
 /// a step that fails says why in one sentence.

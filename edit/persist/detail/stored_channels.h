@@ -1,5 +1,6 @@
 #pragma once
 
+#include "edit/model/aud_levels_cel.h"
 #include "edit/persist/detail/edit_file.h"
 
 /// Which cel the store's bytes under each Celid name were made from, and with which channel information: a

@@ -1,6 +1,10 @@
 #include "interchange/edl/detail/edl_clips.h"
 
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/cel.h"
+#include "edit/model/managed_cel.h"
 #include "platform/media/timecode.h"
+#include "platform/store/tag_bag.h"
 
 #include <algorithm>
 #include <cmath>

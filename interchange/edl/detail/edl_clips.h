@@ -1,5 +1,6 @@
 #pragma once
 
+#include "edit/model/channel_event.h"
 #include "interchange/edl/detail/edl_sources.h"
 #include "interchange/edl/edl_reader.h"
 #include "interchange/edl/edl_records.h"

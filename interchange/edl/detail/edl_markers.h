@@ -1,5 +1,6 @@
 #pragma once
 
+#include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
 #include "interchange/loss_report.h"
 

@@ -7,9 +7,9 @@
 namespace interchange::detail {
 
 /// One reading of one list, line by line. Used once and thrown away.
-class EdlReading {
+class EdlReader {
 public:
-    EdlReading(Qx::FrameRate rate, LossReport& report) : m_report(report) { m_list.rate = rate; }
+    EdlReader(Qx::FrameRate rate, LossReport& report) : m_report(report) { m_list.rate = rate; }
 
     Qx::Status read(std::string_view text);
     [[nodiscard]] EdlList& list() { return m_list; }

@@ -13,7 +13,7 @@ constexpr double kGreatestSpeed = 99'999; // frames a second
 
 } // namespace
 
-void EdlReading::readNote(std::string_view line) {
+void EdlReader::readNote(std::string_view line) {
     const Note note = parseNote(line);
     if (note.kind == NoteKind::Split) {
         // It belongs to the two event lines below.
@@ -26,7 +26,7 @@ void EdlReading::readNote(std::string_view line) {
     }
 }
 
-void EdlReading::keepNote(std::string_view line) {
+void EdlReader::keepNote(std::string_view line) {
     String& notes = m_list.events.empty() ? m_list.notes : last().notes;
     if (!notes.empty()) {
         notes += '\n';
@@ -34,7 +34,7 @@ void EdlReading::keepNote(std::string_view line) {
     notes += line;
 }
 
-void EdlReading::applyNote(const Note& note) {
+void EdlReader::applyNote(const Note& note) {
     switch (note.kind) {
     case NoteKind::FromClipName:
         nameFrom(note.value);
@@ -75,7 +75,7 @@ void EdlReading::applyNote(const Note& note) {
 
 // Below a transition the name of a FROM note is the outgoing side's; black has no clip, so there it can only
 // mean the other side.
-void EdlReading::nameFrom(std::string_view text) {
+void EdlReader::nameFrom(std::string_view text) {
     m_sourceForIncoming = false;
     if (paired() && !outgoing().isBlack()) {
         if (outgoing().clipName.empty()) {
@@ -90,7 +90,7 @@ void EdlReading::nameFrom(std::string_view text) {
     }
 }
 
-void EdlReading::nameTo(std::string_view text) {
+void EdlReader::nameTo(std::string_view text) {
     m_sourceForIncoming = true;
     if (last().clipName.empty() || (m_nameIsFrom && last().type != EdlType::Cut)) {
         last().clipName = name(text);
@@ -98,7 +98,7 @@ void EdlReading::nameTo(std::string_view text) {
     }
 }
 
-void EdlReading::applySourceFile(std::string_view text) {
+void EdlReader::applySourceFile(std::string_view text) {
     const bool toOutgoing = paired() && !m_sourceForIncoming && !outgoing().isBlack();
     EdlEvent& side = toOutgoing && outgoing().sourceFile.empty() ? outgoing() : last();
     if (side.sourceFile.empty()) {
@@ -107,7 +107,7 @@ void EdlReading::applySourceFile(std::string_view text) {
     m_sourceForIncoming = true;
 }
 
-void EdlReading::applyFullReel(std::string_view value) {
+void EdlReader::applyFullReel(std::string_view value) {
     constexpr std::string_view replaced = "REPLACED BY:";
     const size_t at = value.find(replaced);
     if (at == std::string_view::npos) {
@@ -123,7 +123,7 @@ void EdlReading::applyFullReel(std::string_view value) {
     }
 }
 
-void EdlReading::applyAudio(std::string_view value) {
+void EdlReader::applyAudio(std::string_view value) {
     EdlChannels channels = 0;
     while (!value.empty()) {
         const std::string_view word = takeWord(value);
@@ -140,7 +140,7 @@ void EdlReading::applyAudio(std::string_view value) {
     }
 }
 
-void EdlReading::applySpeed(std::string_view value) {
+void EdlReader::applySpeed(std::string_view value) {
     splitFields(value, m_fields);
     EdlSpeed speed;
     speed.line = m_line;
@@ -168,7 +168,7 @@ void EdlReading::applySpeed(std::string_view value) {
     m_speeds.push_back(std::move(speed));
 }
 
-void EdlReading::giveSpeed(EdlEvent& event, EdlSpeed speed) {
+void EdlReader::giveSpeed(EdlEvent& event, EdlSpeed speed) {
     if (event.speed) {
         m_report.addWarning(speed.line, "a second M2 for one event is not used");
     } else {
@@ -179,7 +179,7 @@ void EdlReading::giveSpeed(EdlEvent& event, EdlSpeed speed) {
 // The sides of a transition take the speeds by reel; where both are of one reel, by order. A single one is
 // then the incoming side's if only that side can have a speed: the other has no length, or the durations of
 // this one differ.
-void EdlReading::placeSpeeds() {
+void EdlReader::placeSpeeds() {
     for (size_t i = 0; i < m_speeds.size(); ++i) {
         EdlSpeed& speed = m_speeds[i];
         bool toOutgoing = false;
@@ -200,7 +200,7 @@ void EdlReading::placeSpeeds() {
     m_speeds.clear();
 }
 
-void EdlReading::applyMarker(std::string_view value) {
+void EdlReader::applyMarker(std::string_view value) {
     const std::string_view time = takeWord(value);
     Qx::TimecodeFields fields;
     if (Qx::Status status = Qx::parseTimecode(time, m_list.rate, fields); !status) {

@@ -2,6 +2,7 @@
 #include "tests/support/faulty_file_system.h"
 #include "tests/support/tree_snapshot.h"
 
+#include "edit/model/channel_group_list.h"
 #include "edit/project/permissions_manager.h"
 
 #include <atomic>

@@ -1,6 +1,7 @@
 #include "edit/manager/edit_manager_lock.h"
 #include "edit/project/permissions_manager.h"
 #include "edit/project/projdb.h"
+#include "platform/media/tv_standard.h"
 #include "platform/services/config_int.h"
 #include "platform/services/crash_flag.h"
 #include "platform/services/local_service.h"

@@ -1,5 +1,6 @@
 #include "edit/manager/edit_info.h"
 #include "platform/services/config_int.h"
+#include "platform/store/configb.h"
 #include "support/faulty_file_system.h"
 #include "tests/edit/manager/managed_project.h"
 

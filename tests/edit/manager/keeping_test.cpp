@@ -1,5 +1,6 @@
 #include "edit/manager/edit_manager.h"
 #include "edit/manager/edit_manager_lock.h"
+#include "platform/store/configb.h"
 #include "support/memory_meter.h"
 #include "tests/edit/manager/managed_project.h"
 #include "tests/support/child_process.h"

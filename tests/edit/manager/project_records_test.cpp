@@ -1,5 +1,6 @@
 #include "edit/manager/edit_info.h"
 #include "edit/manager/edit_record.h"
+#include "edit/model/cel.h"
 #include "edit/project/projdb.h"
 #include "tests/edit/manager/managed_project.h"
 #include "tests/support/faulty_file_system.h"

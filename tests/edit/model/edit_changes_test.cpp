@@ -1,5 +1,6 @@
 #include "edit/model/edit.h"
 #include "edit/project/permissions_manager.h"
+#include "platform/notify/val_server.h"
 #include "platform/services/network.h"
 #include "tests/support/edit_builder.h"
 #include "tests/support/edit_state.h"

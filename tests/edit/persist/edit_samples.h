@@ -1,7 +1,13 @@
 #pragma once
 
+#include "edit/model/aud_levels_cel.h"
+#include "edit/model/cel.h"
+#include "edit/model/channel_group_list.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
+#include "edit/model/managed_cel.h"
 #include "platform/services/files.h"
+#include "platform/store/configb.h"
 #include "platform/store/text_file.h"
 
 #include <algorithm>

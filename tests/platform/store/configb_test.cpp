@@ -5,6 +5,7 @@
 #include <bit>
 #include <clocale>
 #include <cmath>
+#include <functional>
 #include <gtest/gtest.h>
 #include <limits>
 

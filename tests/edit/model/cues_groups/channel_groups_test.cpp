@@ -1,4 +1,7 @@
 #include "cue_fixture.h"
+#include "edit/model/channel_group_list.h"
+#include "platform/store/configb.h"
+#include "platform/store/tag_bag.h"
 #include "support/recording_log.h"
 #include "support/temporary_folder.h"
 

@@ -1,4 +1,5 @@
 #include "cue_fixture.h"
+#include "edit/model/channel_group_list.h"
 #include "edit/model/channel_mask.h"
 #include "edit/model/channel_view.h"
 

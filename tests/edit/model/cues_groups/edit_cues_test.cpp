@@ -1,4 +1,6 @@
 #include "cue_fixture.h"
+#include "edit/model/channel_group_list.h"
+#include "platform/store/tag_bag.h"
 
 #include <gtest/gtest.h>
 

@@ -1,4 +1,5 @@
 #include "cue_fixture.h"
+#include "edit/model/channel_group_list.h"
 #include "support/memory_meter.h"
 
 #include <gtest/gtest.h>
