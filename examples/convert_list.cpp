@@ -5,6 +5,7 @@
 //     convert_list IN.edl RATE OUT.edl
 
 #include <cstdio>
+#include <edit/model/cel.h>
 #include <edit/model/edit.h>
 #include <interchange/edl/edl_export.h>
 #include <interchange/edl/edl_import.h>

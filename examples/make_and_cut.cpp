@@ -6,6 +6,7 @@
 #include <cstdio>
 #include <edit/editing/editor.h>
 #include <edit/manager/session.h>
+#include <edit/model/cel.h>
 
 namespace {
 

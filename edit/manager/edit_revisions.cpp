@@ -179,10 +179,8 @@ bool RevisionStep::moveFiles() {
     if (!status) {
         const bool isBack = m_moves.takeBack();
         report(status.reason());
-        if (written) {
-            managerState().noteFile(entry);
-        }
         if (!isBack) {
+            managerState().noteFile(entry);
             writeAgain(entry);
         }
         managerState().setLeaving(entry, false);
@@ -266,9 +264,9 @@ void RevisionStep::moveFilesBack() {
     failed = state.removeCacheEntry(m_item);
     if (!m_moves.takeBack()) {
         writeAgain(*m_dropped);
+        ManagerState::noteFile(*m_dropped);
     }
     m_dropped->leaving = false;
-    ManagerState::noteFile(*m_dropped);
     state.putBack(std::move(m_dropped));
     report("the revision could not be opened");
 }

@@ -163,7 +163,10 @@ FileError AtomicFile::finishTemporary(bool sync) {
             return error;
         }
     }
-    auto error = retryInterrupted([&] { return m_file->close(); });
+    auto error = retryInterrupted([&] { return m_file->info(m_info); });
+    if (!error) {
+        error = retryInterrupted([&] { return m_file->close(); });
+    }
     m_file.reset();
     return error;
 }

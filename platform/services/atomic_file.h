@@ -42,6 +42,9 @@ public:
     FileError commit(bool durable = true);
     /// True once the name holds the new file.
     [[nodiscard]] bool replaced() const { return m_replaced; }
+    /// The new file as it was when it was whole, under the temporary name: what it is under its own name as
+    /// well, except for a time that the file system sets late. Set by `commit`.
+    [[nodiscard]] const FileInfo& info() const { return m_info; }
 
 private:
     FileError openTemporary();
@@ -55,6 +58,7 @@ private:
     std::unique_ptr<OpenFile> m_file;
     uint64_t m_size = 0;
     uint64_t m_begun = 0; ///< how many bytes the system was asked to begin to make durable
+    FileInfo m_info;
     bool m_replaced = false;
     bool m_done = false; ///< committed: renamed, or handed to a batch
     FileError m_failed;  ///< the first failure; later calls repeat it

@@ -143,10 +143,13 @@ Status StoreWriter::commit(StoreIdentity& identity, bool& replaced) {
     replaced = !error || m_file.replaced();
     if (replaced) {
         std::swap(identity, made);
-        // Within a batch the name still holds the old file.
-        if (m_file.replaced()) {
-            identity.info = askFile(m_path).info();
-            identity.infoKnown = identity.info.kind != FileKind::Unknown;
+        identity.info = m_file.info();
+        identity.infoKnown = true;
+        // Within a batch the name still holds the old file. Some file systems set the time when a file is closed.
+        const FileInfo named = m_file.replaced() ? askFile(m_path).info() : FileInfo();
+        if (named.kind == identity.info.kind && named.device == identity.info.device &&
+            named.inode == identity.info.inode && named.size == identity.info.size) {
+            identity.info = named;
         }
     }
     return error.status();

@@ -262,6 +262,13 @@ void TagBag::setExtension(const String& extension) {
     m_contents->extension = extension;
 }
 
+Qx::FileInfo TagBag::fileInfo() const {
+    Qx::FileInfo unknown;
+    unknown.kind = Qx::FileKind::Unknown;
+    return m_contents->source.infoKnown && m_contents->source.path == path() ? m_contents->source.info
+                                                                             : unknown;
+}
+
 String TagBag::path() const {
     return m_contents->path();
 }

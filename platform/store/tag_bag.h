@@ -4,6 +4,7 @@
 #include "platform/base/id_stamp.h"
 #include "platform/base/open_behaviour.h"
 #include "platform/base/status.h"
+#include "platform/services/files.h"
 #include "platform/store/object_store_info.h"
 #include "platform/store/streamable.h"
 
@@ -83,6 +84,9 @@ public:
     /// The extension of the file's name, with its dot.
     void setExtension(const String& extension);
     [[nodiscard]] String path() const;
+    /// The file under `path` as it was when this bag read or wrote it; it may be another one since. Of kind
+    /// Unknown when it did neither.
+    [[nodiscard]] Qx::FileInfo fileInfo() const;
 
     /// Binds an object under a name; the bag owns it, and a former object of that name goes. It counts as
     /// changed.

@@ -138,6 +138,14 @@ void ManagerState::noteFile(CachedEdit& entry) {
     entry.know(Qx::askFile(entry.path).info());
 }
 
+void ManagerState::noteWritten(CachedEdit& entry) {
+    noteFile(entry);
+    if (entry.file.kind == Qx::FileKind::Unknown) {
+        // A file that nobody knows counts as another program's; who wrote it knows it without asking.
+        entry.know(entry.edit->objectStore().fileInfo());
+    }
+}
+
 bool ManagerState::writeLast(CachedEdit& entry, bool waits) {
     if (entry.isAway() && Qx::askFile(entry.path).isMissing()) {
         entry.edit->init_dirty();
@@ -169,11 +177,11 @@ Qx::Status ManagerState::writeFile(CachedEdit& entry, bool waits) {
     if (!edit.write_file(Qx::widen(entry.path))) {
         herc_printf("edit_manager: %s\n", edit.lastFileError().c_str());
         // The file may have been replaced and only not been made durable.
-        noteFile(entry);
+        noteWritten(entry);
         addToDirtyList(entry.item);
         return edit.lastFileStatus();
     }
-    noteFile(entry);
+    noteWritten(entry);
     entry.forgetRedo();
     removeFromDirtyList(entry.item);
     if (edit.get_dirty()) {

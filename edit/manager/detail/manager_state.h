@@ -169,6 +169,8 @@ struct ManagerState {
     }
     /// What the edit's file is at this moment is taken as known.
     static void noteFile(CachedEdit& entry);
+    /// The same after a writing, whose outcome is known also when the system cannot tell.
+    static void noteWritten(CachedEdit& entry);
 
     void addToDirtyList(const cookie& item);
     void removeFromDirtyList(const cookie& item);
