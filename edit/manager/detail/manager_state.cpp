@@ -4,6 +4,7 @@
 #include "edit/manager/revision_chain.h"
 #include "platform/services/atomic_batch.h"
 #include "platform/services/log.h"
+#include "platform/store/tag_bag.h"
 
 namespace {
 

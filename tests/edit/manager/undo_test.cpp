@@ -289,6 +289,23 @@ TEST(Undo, AFullDiskLeavesTheEditUnderItsName) {
     EXPECT_EQ(ManagedProject::nameOf(), "new");
 }
 
+TEST(Undo, AnswersForTheStepItMadeWhereverOneCallFails) {
+    for (size_t n = 1, made = n; made >= n; ++n) {
+        ManagedProject project;
+        ManagedProject::save("a");
+        ASSERT_TRUE(edit_manager::backup_edit(kEdit));
+        ManagedProject::change("b");
+        bool done = false;
+        {
+            test::FaultyFileSystem system;
+            system.failAt(n, EMFILE);
+            done = edit_manager::undoRequest(kEdit);
+            made = system.operations().size();
+        }
+        EXPECT_EQ(ManagedProject::nameOf(), done ? "a" : "b") << "call " << n;
+    }
+}
+
 TEST(Milestones, AreDueByCountAndGoRoundTheSlots) {
     const struct {
         unsigned mods;
