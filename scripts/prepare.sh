@@ -4,8 +4,14 @@
 say() { printf '%s\n' "$*" >&2; }
 fail() { say "$*"; exit 1; }
 
-# The number of parallel jobs: one per core, at most three, so that the machine stays usable.
-jobs() { local n; n=$(nproc 2>/dev/null || echo 2); [ "$n" -gt 3 ] && n=3; echo "$n"; }
+# The number of parallel jobs: one a core, as far as there is 1.5 GiB of memory for each.
+jobs() {
+    local cores room
+    cores=$(nproc 2>/dev/null || echo 2)
+    room=$(awk '/^MemAvailable:/ { print int($2 / 1572864) }' /proc/meminfo 2>/dev/null)
+    [ -n "$room" ] && [ "$room" -lt "$cores" ] && cores=$room
+    echo $((cores < 1 ? 1 : cores))
+}
 
 # need PACKAGE...: installs those of the packages that are not there. As root it installs them; otherwise it
 # prints the one command to type and stops.
@@ -61,6 +67,8 @@ follow() {
 build() {
     local preset=$1 label=$2 options=$3 log status; shift 3
     mkdir -p build; log=build/$preset.log
+    # From nothing it is quicker to compile several sources at a time; who changes one changes what was chosen.
+    [ -f "build/$preset/CMakeCache.txt" ] || options="-DQUILLMARCH_UNITY=ON $options"
     # shellcheck disable=SC2086
     if ! cmake --preset "$preset" $options >"$log" 2>&1; then
         tail -n 30 "$log" >&2

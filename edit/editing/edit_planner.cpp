@@ -6,6 +6,7 @@
 #include <array>
 
 using editing_detail::isContinuous;
+using editing_detail::kChannelKinds;
 using editing_detail::secondsText;
 using Op = edit_operation;
 using editing_detail::roundTo;
@@ -15,11 +16,6 @@ using Qx::MarkTypes::InMark;
 using Qx::MarkTypes::OutMark;
 
 namespace {
-
-/// The kinds of channel that an operation works on, in the order of the channel index.
-constexpr std::array<Edit::ChanType, 3> kKinds = {Edit::ChanType{VideoChan, Edit_Chan_SubType::ALIAS},
-                                                  Edit::ChanType{VideoChan, Edit_Chan_SubType::NONE},
-                                                  Edit::ChanType{AudioChan, Edit_Chan_SubType::NONE}};
 
 /// True for the operations that fill the destination's marked region.
 bool isMarkedOperation(Op op) {
@@ -150,7 +146,7 @@ bool Editor::Planner::planPass(const EditModule& destination, bool otherEyes) {
             }
         }
     } else {
-        for (const Edit::ChanType& kind : kKinds) {
+        for (const Edit::ChanType& kind : kChannelKinds) {
             if (!pairChannels(destination, kind, pairs)) {
                 return false;
             }

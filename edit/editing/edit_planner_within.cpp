@@ -2,15 +2,12 @@
 
 #include <algorithm>
 
+using editing_detail::kChannelKinds;
 using editing_detail::secondsText;
 using Op = edit_operation;
 using Qx::kTimeTolerance;
 
 namespace {
-
-constexpr Edit::ChanType kKinds[] = {{VideoChan, Edit_Chan_SubType::ALIAS},
-                                     {VideoChan, Edit_Chan_SubType::NONE},
-                                     {AudioChan, Edit_Chan_SubType::NONE}};
 
 Vector<IdStamp> selectedOf(const EditModule& module, const Edit::ChanType& kind) {
     Vector<IdStamp> chans;
@@ -31,7 +28,7 @@ bool Editor::Planner::planWithin() {
 }
 
 bool Editor::Planner::planRemoveOrLift() {
-    for (const Edit::ChanType& kind : kKinds) {
+    for (const Edit::ChanType& kind : kChannelKinds) {
         for (const IdStamp& chan : selectedOf(m_destination, kind)) {
             Range region;
             if (!destinationRegion(m_destination, chan, region)) {
@@ -61,7 +58,7 @@ bool Editor::Planner::planInterTrack() {
                                    ? "needs exactly two selected channels of a kind to change places"
                                    : "needs at least two selected channels of a kind";
     bool anyKind = false;
-    for (const Edit::ChanType& kind : kKinds) {
+    for (const Edit::ChanType& kind : kChannelKinds) {
         const Vector<IdStamp> chans = selectedOf(m_destination, kind);
         if (chans.size() < 2) {
             continue;

@@ -1,5 +1,6 @@
 #include "edit/model/aud_levels_cel.h"
 
+#include "edit/model/detail/cel_events.h"
 #include "platform/base/ole_splat.h"
 #include "platform/media/frame_rate.h"
 #include "platform/store/streamable_layer.h"
@@ -8,9 +9,11 @@
 
 namespace {
 
-constexpr const char* kLayerName = "AudLevels";
+constexpr const char* kLevelsLayer = "AudLevels";
 constexpr uint8_t kMajor = 1;
 using Store = Aud::DynamicLevelControl::Store;
+using cel_detail::isUsableRange;
+using cel_detail::isUsableTime;
 
 } // namespace
 
@@ -36,11 +39,11 @@ public:
 
 private:
     static const bool registered;
-    static constexpr Form kForm{kLayerName, kLayerName, kMajor};
+    static constexpr Form kForm{kLevelsLayer, kLevelsLayer, kMajor};
 };
 
 const bool AudLevelsCel::Contents::registered = [] {
-    Streamable::registerBuilder(kLayerName,
+    Streamable::registerBuilder(kLevelsLayer,
                                 [] { return std::unique_ptr<Streamable>(std::make_unique<Contents>()); });
     return true;
 }();
@@ -107,18 +110,6 @@ AudLevelsCel::Range AudLevelsCel::getExtents(Editable::ExtentType type, bool fro
     }
     return {fromZero ? std::min(0.0, nodes[first].time) : nodes[first].time, nodes[last - 1].time};
 }
-
-namespace {
-
-bool isUsableTime(double time) {
-    return std::abs(time) <= Store::kGreatestTime;
-}
-
-bool isUsableRange(const cel::Range& range) {
-    return isUsableTime(range.start()) && isUsableTime(range.end()) && range.length() > Qx::kTimeTolerance;
-}
-
-} // namespace
 
 bool AudLevelsCel::insert(const AudLevelsCel& source, const Range& sourceRange, double at) {
     const auto& nodes = getNodeStore().nodes();

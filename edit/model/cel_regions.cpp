@@ -6,10 +6,6 @@ using namespace cel_detail;
 
 namespace {
 
-bool isUsableRange(const cel::Range& range) {
-    return isUsableTime(range.start()) && isUsableTime(range.end()) && !isNotPast(range.end(), range.start());
-}
-
 /// Gives the events of a part fresh stamps and notes which stamp became which.
 void refresh(Events& events, size_t first, cel::IdMap& ids) {
     for (size_t i = first; i < events.size(); ++i) {

@@ -13,12 +13,12 @@ static_assert(std::is_trivially_copyable_v<channel_event>);
 
 namespace {
 
-constexpr const char* kLayerName = "cel";
+constexpr const char* kCelLayer = "cel";
 /// Fewer events are copied: what keeps them would cost more than they do.
 constexpr size_t kLeastBorrowed = 1024;
 
 [[maybe_unused]] const bool registered = [] {
-    Streamable::registerBuilder(kLayerName,
+    Streamable::registerBuilder(kCelLayer,
                                 [] { return std::unique_ptr<Streamable>(std::make_unique<cel>()); });
     return true;
 }();
@@ -49,7 +49,7 @@ bool takeEvents(std::span<const std::byte> bytes, const std::shared_ptr<const vo
 
 } // namespace
 
-constinit const StreamableLayer::Form cel::kForm{kLayerName, kLayerName, 2};
+constinit const StreamableLayer::Form cel::kForm{kCelLayer, kCelLayer, 2};
 
 std::unique_ptr<Streamable> cel::clone(BuilderType) const {
     return copy();

@@ -15,7 +15,7 @@ constexpr uint8_t kFirstRevisionWithType = 2;
 constexpr size_t kPackedStamp = 1 + 3 * sizeof(uint32_t);
 constexpr size_t kLeastPackedGroup = 1 + sizeof(uint32_t);
 
-const bool kRegistered = [] {
+const bool kGroupsRegistered = [] {
     Streamable::registerBuilder(ChannelGroupList::Id, []() -> std::unique_ptr<Streamable> {
         return std::make_unique<ChannelGroupList>();
     });

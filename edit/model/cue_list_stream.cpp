@@ -9,10 +9,10 @@
 
 namespace {
 
-constexpr const char* kLayerName = "cue_list";
+constexpr const char* kCuesLayer = "cue_list";
 
-const bool kRegistered = [] {
-    Streamable::registerBuilder(kLayerName,
+const bool kCuesRegistered = [] {
+    Streamable::registerBuilder(kCuesLayer,
                                 []() -> std::unique_ptr<Streamable> { return std::make_unique<cue_list>(); });
     return true;
 }();
@@ -53,7 +53,7 @@ void cue_point::unpack(PStream& stream, unsigned revision) {
     }
 }
 
-constinit const StreamableLayer::Form cue_list::kForm{kLayerName, "cues"};
+constinit const StreamableLayer::Form cue_list::kForm{kCuesLayer, "cues"};
 
 void cue_list::pack(PStream& stream) const {
     stream.setUnsignedLong(static_cast<uint32_t>(m_cues.size()));

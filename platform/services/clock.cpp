@@ -8,13 +8,13 @@ namespace Qx {
 
 namespace {
 
-struct State {
+struct ClockState {
     std::mutex mutex;
     Clock clock; ///< empty: the machine's
 };
 
-State& state() {
-    static auto& shared = *new State;
+ClockState& clockState() {
+    static auto& shared = *new ClockState;
     return shared;
 }
 
@@ -22,9 +22,9 @@ State& state() {
 
 int64_t nowSeconds() {
     {
-        const std::lock_guard hold(state().mutex);
-        if (state().clock) {
-            return state().clock();
+        const std::lock_guard hold(clockState().mutex);
+        if (clockState().clock) {
+            return clockState().clock();
         }
     }
     const auto since = std::chrono::system_clock::now().time_since_epoch();
@@ -32,8 +32,8 @@ int64_t nowSeconds() {
 }
 
 Clock setClock(Clock clock) {
-    const std::lock_guard hold(state().mutex);
-    return std::exchange(state().clock, std::move(clock));
+    const std::lock_guard hold(clockState().mutex);
+    return std::exchange(clockState().clock, std::move(clock));
 }
 
 } // namespace Qx

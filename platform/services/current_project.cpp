@@ -23,16 +23,16 @@ String userOfProcess() {
     return String::format("user %u", static_cast<unsigned>(id));
 }
 
-struct State {
+struct ProjectState {
     std::mutex mutex;
     CurrentProject project;
     std::atomic<unsigned> generation{1};
 
-    State() { project.user = userOfProcess(); }
+    ProjectState() { project.user = userOfProcess(); }
 };
 
-State& state() {
-    static auto& shared = *new State;
+ProjectState& projectState() {
+    static auto& shared = *new ProjectState;
     return shared;
 }
 
@@ -43,22 +43,22 @@ String CurrentProject::folder() const {
 }
 
 CurrentProject currentProject() {
-    const std::lock_guard hold(state().mutex);
-    return state().project;
+    const std::lock_guard hold(projectState().mutex);
+    return projectState().project;
 }
 
 void setCurrentProject(const CurrentProject& project) {
-    const std::lock_guard hold(state().mutex);
-    const bool isAnother =
-        state().project.project != project.project || state().project.rootFolder != project.rootFolder;
-    state().project = project;
+    const std::lock_guard hold(projectState().mutex);
+    const bool isAnother = projectState().project.project != project.project ||
+                           projectState().project.rootFolder != project.rootFolder;
+    projectState().project = project;
     if (isAnother) {
-        ++state().generation;
+        ++projectState().generation;
     }
 }
 
 unsigned currentProjectGeneration() {
-    return state().generation.load();
+    return projectState().generation.load();
 }
 
 } // namespace Qx

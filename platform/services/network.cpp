@@ -8,14 +8,14 @@ namespace Qx::Network {
 
 namespace {
 
-struct State {
+struct NetworkState {
     std::mutex mutex;
     std::shared_ptr<Service> service;
     std::atomic<bool> mode{false};
 };
 
-State& state() {
-    static auto& shared = *new State;
+NetworkState& networkState() {
+    static auto& shared = *new NetworkState;
     return shared;
 }
 
@@ -24,11 +24,11 @@ State& state() {
 Service::~Service() = default;
 
 bool networkMode() {
-    return state().mode.load();
+    return networkState().mode.load();
 }
 
 void setNetworkMode(bool on) {
-    state().mode.store(on);
+    networkState().mode.store(on);
 }
 
 void send(const Message& message) {
@@ -41,13 +41,13 @@ void send(const Message& message) {
 }
 
 std::shared_ptr<Service> setService(std::shared_ptr<Service> replacement) {
-    const std::lock_guard hold(state().mutex);
-    return std::exchange(state().service, std::move(replacement));
+    const std::lock_guard hold(networkState().mutex);
+    return std::exchange(networkState().service, std::move(replacement));
 }
 
 std::shared_ptr<Service> service() {
-    const std::lock_guard hold(state().mutex);
-    return state().service;
+    const std::lock_guard hold(networkState().mutex);
+    return networkState().service;
 }
 
 } // namespace Qx::Network

@@ -12,7 +12,7 @@ constexpr std::string_view kUtf8Mark = "\xEF\xBB\xBF";
 constexpr size_t kMaxLines = size_t{1} << 24;
 
 /// So much text is gathered before it goes to the file.
-constexpr size_t kWriteSize = size_t{1} << 20;
+constexpr size_t kPieceSize = size_t{1} << 20;
 
 std::string_view withoutMark(std::string_view text) {
     return text.starts_with(kUtf8Mark) ? text.substr(kUtf8Mark.size()) : text;
@@ -81,7 +81,7 @@ Qx::Status TextFile::save(const String& path) const {
     for (size_t i = 0; i < m_lines.size() && !error; ++i) {
         piece += m_lines[i];
         piece += '\n';
-        if (piece.size() >= kWriteSize || i + 1 == m_lines.size()) {
+        if (piece.size() >= kPieceSize || i + 1 == m_lines.size()) {
             error = file.write(piece);
             piece.clear();
         }

@@ -4,6 +4,7 @@
 #include "edit/model/aud_levels_cel.h"
 #include "edit/model/cel.h"
 
+#include <array>
 #include <vector>
 
 /// A channel of the destination that takes part in an operation.
@@ -118,6 +119,11 @@ private:
 };
 
 namespace editing_detail {
+
+/// The kinds of channel that an operation works on, in the order of the channel index.
+inline constexpr std::array<Edit::ChanType, 3> kChannelKinds = {
+    Edit::ChanType{VideoChan, Edit_Chan_SubType::ALIAS}, Edit::ChanType{VideoChan, Edit_Chan_SubType::NONE},
+    Edit::ChanType{AudioChan, Edit_Chan_SubType::NONE}};
 
 /// A cel of the content of `source` from `region.start()` on, `region.length()` long and beginning at 0, with
 /// black where nothing lies if `fillGaps`. A null source gives a black or empty one.

@@ -59,6 +59,11 @@ constexpr double kTolerance = Qx::kTimeTolerance;
     return time - mark <= kTolerance;
 }
 
+/// False for what is too short, as well.
+[[nodiscard]] inline bool isUsableRange(const cel::Range& range) {
+    return isUsableTime(range.start()) && isUsableTime(range.end()) && !isNotPast(range.end(), range.start());
+}
+
 /// What a mark means in a cel: it lies inside pair number `pair`, beyond the tolerance from either end, or
 /// before that pair and not before the end of the one ahead. `time` is the time of the cut that the mark
 /// counts as one with, the nearest and of two the earlier, or else its own. This is decided here, once:
