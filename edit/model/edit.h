@@ -750,8 +750,6 @@ private:
     void channelRenamed(const IdStamp& from, const IdStamp& to);
     /// A channel's cel is replaced: its cues follow to the events with the same stamps.
     void celReplaced(const cel* from, cel* to);
-    /// Before a save: tells the object store which group lists changed.
-    void storeGroups();
     void cuesChanged();
     void groupsChanged();
 
