@@ -30,7 +30,7 @@ TagBase::TagBase(TagBag& bag, const IdStamp& id) {
 Streamable* TagBase::find() const {
     m_object = nullptr;
     if (TagBag* const its = bag()) {
-        m_object = its->openObject(m_id);
+        m_object = its->contains(m_id) ? its->openObject(m_id) : nullptr;
         m_foundAt = m_life->departures;
     }
     return m_object;

@@ -20,8 +20,8 @@ public:
     [[nodiscard]] const IdStamp& id() const { return m_id; }
     /// The bag; null when it has gone.
     [[nodiscard]] TagBag* bag() const { return m_life != nullptr ? m_life->bag : nullptr; }
-    /// The object, opened if need be; null when there is none or it cannot be opened (`TagBag::objectStatus`
-    /// tells why). The bag owns it; good until an object leaves the bag.
+    /// The object, opened if need be; null when there is none, or it cannot be opened (`TagBag::objectStatus`
+    /// then tells why). Allocates nothing unless it has to be opened. The bag owns it; good until an object leaves the bag.
     [[nodiscard]] Streamable* object() const { return isFresh() ? m_object : find(); }
     /// True if the object can be opened.
     [[nodiscard]] bool valid() const { return object() != nullptr; }
@@ -35,13 +35,16 @@ public:
     bool operator==(const TagBase& other) const { return m_id == other.m_id && bag() == other.bag(); }
 
 protected:
+    /// Changes whenever another object may be found than before.
+    [[nodiscard]] uint64_t foundAt() const { return m_foundAt; }
+
+private:
     /// True while `m_object` is the object.
     [[nodiscard]] bool isFresh() const {
         return m_object != nullptr && m_life->bag != nullptr && m_life->departures == m_foundAt;
     }
     Streamable* find() const;
 
-private:
     std::shared_ptr<const TagBagLife> m_life;
     IdStamp m_id;
     mutable Streamable* m_object = nullptr;
@@ -62,10 +65,12 @@ public:
 
     /// As `object`, and null for an object of another class.
     [[nodiscard]] T* get() const {
-        if (!isFresh() || m_typed == nullptr) {
-            m_typed = dynamic_cast<T*>(object());
+        Streamable* const its = object();
+        if (m_typed == nullptr || m_typedAt != foundAt()) {
+            m_typed = dynamic_cast<T*>(its);
+            m_typedAt = foundAt();
         }
-        return m_typed;
+        return its != nullptr ? m_typed : nullptr;
     }
     [[nodiscard]] bool valid() const { return get() != nullptr; }
     explicit operator bool() const { return valid(); }
@@ -75,4 +80,5 @@ public:
 
 private:
     mutable T* m_typed = nullptr;
+    mutable uint64_t m_typedAt = 0;
 };

@@ -10,7 +10,7 @@ using namespace Qx::detail;
 
 namespace {
 
-/// The image goes once less than this part of it is in use; the rest is copied out of it.
+/// The image goes once less than this part of what lay in it is in use; the rest is copied out of it.
 constexpr size_t kLeastPartInUse = 8;
 
 /// True if a layer that the object's class knows is of a revision from the future there.
@@ -145,6 +145,7 @@ void TagBag::Contents::takeImage(std::span<const StoredObject> objects, std::spa
         entry.keeper = image.keep(entry.memory);
         m_imageBytesInUse += entry.isInImage() ? entry.memory.size() : 0;
     }
+    m_imageBytes = m_imageBytesInUse;
     if (m_imageBytesInUse == 0) {
         image.drop();
     }
@@ -247,7 +248,7 @@ void TagBag::Contents::forgetBytes(Entry& entry) {
 }
 
 void TagBag::Contents::thinImage() {
-    if (image.bytes().empty() || m_imageBytesInUse > image.bytes().size() / kLeastPartInUse) {
+    if (image.bytes().empty() || m_imageBytesInUse > m_imageBytes / kLeastPartInUse) {
         return;
     }
     for (Entry& other : entries) {

@@ -28,7 +28,7 @@ public:
         Qx::detail::StoredPlace place;
         std::span<const std::byte> memory;
         std::vector<std::byte> copied; ///< backs `memory` once the image was dropped
-        /// Keeps `memory`, with the image or without, if the image is a large one.
+        /// Keeps `memory`, with the image or without, if it is a large part of a large image.
         std::shared_ptr<const void> keeper;
 
         [[nodiscard]] bool hasBytes() const { return inMemory || onFile; }
@@ -100,5 +100,6 @@ private:
 
     std::unordered_map<std::string_view, Entries::iterator> m_index; ///< keys lie in the entries
     std::vector<Entry*> m_order; ///< the entries by their place; stale unless as long as `entries`
+    size_t m_imageBytes = 0;     ///< of the objects that lay in the image, those kept apart left out
     size_t m_imageBytesInUse = 0;
 };

@@ -88,6 +88,7 @@ TEST_F(TagTest, TagNamesItsObjectAsLongAsItIsThere) {
         EXPECT_EQ(tag->tagId(), node(1));
         EXPECT_EQ(tag->tagTypeId().id(), "Linked");
         put(bag, node(1), {node(7)});
+        EXPECT_NE(tag.object(), nullptr);
         EXPECT_EQ(tag->links.size(), 1u) << "the object that took the place";
         bag.storeObject(node(2), numbers({1}));
         EXPECT_TRUE(TagBase(bag, node(2)).valid());
