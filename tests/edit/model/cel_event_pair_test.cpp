@@ -73,7 +73,7 @@ TEST_F(PairsOfAnEdit, AnswerForTheirSpanAndForNone) {
     EXPECT_EQ(pair.getChanType(), VideoChan);
     EXPECT_EQ(pair.getChanSubType(), Edit_Chan_SubType::NONE);
     EXPECT_EQ(pair.getObjectID(), edit->getCel(chan)->get_event(2).id);
-    EXPECT_FALSE(pair.getEffectHandle().id().valid());
+    EXPECT_EQ(pair.getEffectHandle().object(), nullptr);
     pair.invalidate();
     EXPECT_FALSE(pair.valid());
     EXPECT_EQ(pair.idx(), NO_CHAN);
