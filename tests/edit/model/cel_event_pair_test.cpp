@@ -3,6 +3,7 @@
 #include "edit/model/cel_event_pair.h"
 #include "edit/model/cel_iterator.h"
 #include "edit/model/edit.h"
+#include "platform/store/tag.h"
 #include "support/cel_layout.h"
 
 #include <gtest/gtest.h>
