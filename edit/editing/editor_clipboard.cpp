@@ -25,7 +25,7 @@ void clearClipboard(Edit& clipboard) {
 
 /// Binds copies of the objects of a cel's events in another edit.
 void copyEffects(const cel& events, TagBag& from, TagBag& to) {
-    for (int i = 0; i < events.numEvents() && from.numObjects() > 0; ++i) {
+    for (int i = 0; i < events.numEvents() && from.getNumObjects() > 0; ++i) {
         const String name = events.getChanEventPtr(i)->id.asString();
         const Streamable* const object = from.contains(name) ? from.openObject(name) : nullptr;
         if (object != nullptr) {

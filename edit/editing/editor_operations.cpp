@@ -12,7 +12,7 @@ namespace {
 /// Binds copies of the objects that `from` has for some events to the events that were made of them.
 template <typename Stamps>
 void copyObjects(TagBag& from, TagBag& to, const Stamps& stamps) {
-    if (from.numObjects() == 0) {
+    if (from.getNumObjects() == 0) {
         return;
     }
     for (const auto& [old, made] : stamps) {

@@ -1,7 +1,7 @@
 #include "edit/model/cel_event_pair.h"
 
 #include "edit/model/edit.h"
-#include "platform/store/tag_bag.h"
+#include "platform/store/tag.h"
 
 #include <cmath>
 
@@ -102,12 +102,8 @@ uint16_t CelEventPair::getAudioFadeOutQFrames() const {
     return valid() ? m_out.audioRamp_DurationQFrames() : uint16_t{0};
 }
 
-Streamable* CelEventPair::getEffectHandle() const {
-    const IdStamp id = getObjectID();
-    if (!m_edit.valid() || !id.valid()) {
-        return nullptr;
-    }
-    return m_edit->objectStore().openObject(id.asString());
+Tag<FXGraphNodeBase> CelEventPair::getEffectHandle() const {
+    return m_edit.valid() ? m_edit->openObject(getObjectID()) : Tag<FXGraphNodeBase>();
 }
 
 CelEventPair::Range CelEventPair::editRange(RangeType type) const {

@@ -5,7 +5,9 @@
 #include "edit/model/edit_ptr.h"
 #include "platform/base/ptr.h"
 
-class Streamable;
+class FXGraphNodeBase;
+template <typename T>
+class Tag;
 
 /// One pair of a channel: an in point, its out point, and the edit and channel that they belong to.
 ///
@@ -76,9 +78,9 @@ public:
     /// Quarter-frames; 0 for an invalid pair.
     [[nodiscard]] uint16_t getAudioFadeInQFrames() const;
     [[nodiscard]] uint16_t getAudioFadeOutQFrames() const;
-    /// The object that the edit's store holds for the in event: the effect node bound to the pair. Null when
-    /// there is none. The edit owns it.
-    [[nodiscard]] Streamable* getEffectHandle() const;
+    /// The effect node bound to the pair, by the stamp of its in event. Names nothing when there is none. The
+    /// edit owns the node.
+    [[nodiscard]] Tag<FXGraphNodeBase> getEffectHandle() const;
     /// `Editable::invalidRange()` for an invalid pair.
     [[nodiscard]] Range editRange(RangeType type = CutToCut) const;
     /// Strip times at the ends of `editRange`, the start's first: a reverse span starts above its end. Both

@@ -6,10 +6,16 @@ using namespace cel_detail;
 
 namespace {
 
+/// A fresh stamp for what was copied or cut from an event: of one that shows an effect, a node's again.
+IdStamp freshLike(const IdStamp& old) {
+    const bool isEffect = old.valid() && old.getMagicType() == IdStampMagic::EffectNode;
+    return IdStamp::fresh(isEffect ? IdStampMagic::EffectNode : IdStampMagic::Material);
+}
+
 /// Gives the events of a part fresh stamps and notes which stamp became which.
 void refresh(Events& events, size_t first, cel::IdMap& ids) {
     for (size_t i = first; i < events.size(); ++i) {
-        const IdStamp fresh = channel_event::newId();
+        const IdStamp fresh = freshLike(events[i].id);
         ids.insert_or_assign(events[i].id, fresh);
         events[i].id = fresh;
     }
@@ -46,7 +52,7 @@ void appendRight(Events& block, const EventArray& events, const Cut& cut, bool s
     }
     if (split) {
         const IdStamp old = in.id;
-        in.id = channel_event::newId();
+        in.id = freshLike(old);
         noteSplit(splits, old, in.id);
     }
     block.push_back(in);
@@ -111,7 +117,7 @@ private:
     /// what is laid of it in further gaps, as split from that.
     void giveStamps(size_t first) {
         if (m_copied == m_next + 1) {
-            m_block[first].id = channel_event::newId();
+            m_block[first].id = freshLike(m_copy);
             m_block[first + 1].id = channel_event::newId();
             noteSplit(m_splits, m_copy, m_block[first].id);
             return;
@@ -126,7 +132,7 @@ private:
         channel_event first = from > in.editTime ? cutIn(in, out, from) : in;
         channel_event second = to < out.editTime ? cutOut(in, out, to) : out;
         if (from > in.editTime) {
-            first.id = channel_event::newId();
+            first.id = freshLike(in.id);
             noteSplit(m_splits, in.id, first.id);
         }
         if (to < out.editTime) {
@@ -372,7 +378,7 @@ bool cel::weld(const cel* other, double at) {
     if (!block.empty()) {
         m_stamps.follow(m_events, m_changeCount);
         for (channel_event& event : block) {
-            event.id = m_stamps.contains(m_events, event.id) ? channel_event::newId() : event.id;
+            event.id = m_stamps.contains(m_events, event.id) ? freshLike(event.id) : event.id;
         }
         m_events.splice(m_events.size(), m_events.size(), block);
         changedNow();

@@ -72,10 +72,15 @@ ChannelGroupList::~ChannelGroupList() = default;
 ChannelGroupList& ChannelGroupList::operator=(const ChannelGroupList& other) {
     if (this != &other) {
         StreamableLayer::operator=(other);
+        Taggable::operator=(other);
         m_groups = other.m_groups;
-        m_changed = true;
     }
     return *this;
+}
+
+const TagTypeId& ChannelGroupList::tagTypeId() const {
+    static const TagTypeId& type = *new TagTypeId(Id);
+    return type;
 }
 
 const ChannelGroup* ChannelGroupList::getGroup(unsigned i) const {
@@ -94,7 +99,7 @@ bool ChannelGroupList::addGroup(const Vector<IdStamp>& chans, ChannelGroup::eTyp
         return false;
     }
     m_groups.push_back(ChannelGroup(std::move(members), type));
-    m_changed = true;
+    setTagChanged(true);
     return true;
 }
 
@@ -115,7 +120,7 @@ bool ChannelGroupList::destroyGroup(unsigned i) {
         return false;
     }
     m_groups.erase(m_groups.begin() + static_cast<std::ptrdiff_t>(i));
-    m_changed = true;
+    setTagChanged(true);
     return true;
 }
 
@@ -123,7 +128,9 @@ unsigned ChannelGroupList::destroyAllGroups(ChannelGroup::eType type) {
     const size_t gone = std::erase_if(m_groups, [type](const ChannelGroup& group) {
         return type == ChannelGroup::eAll || group.getType() == type;
     });
-    m_changed = m_changed || gone > 0;
+    if (gone > 0) {
+        setTagChanged(true);
+    }
     return static_cast<unsigned>(gone);
 }
 
@@ -133,7 +140,9 @@ bool ChannelGroupList::removeMember(IdStamp chan) {
         taken += std::erase(group.m_chans, chan);
     }
     std::erase_if(m_groups, [](const ChannelGroup& group) { return group.size() < 2; });
-    m_changed = m_changed || taken > 0;
+    if (taken > 0) {
+        setTagChanged(true);
+    }
     return taken > 0;
 }
 
@@ -144,7 +153,7 @@ bool ChannelGroupList::replaceMember(IdStamp from, IdStamp to) {
     for (ChannelGroup& group : m_groups) {
         std::replace(group.m_chans.begin(), group.m_chans.end(), from, to);
     }
-    m_changed = true;
+    setTagChanged(true);
     return true;
 }
 
@@ -178,7 +187,6 @@ void ChannelGroupList::unpack(PStream& stream) {
     }
     m_groups = std::move(groups);
     setCurrentRevision();
-    m_changed = false;
 }
 
 std::unique_ptr<Streamable> ChannelGroupList::clone(BuilderType) const {

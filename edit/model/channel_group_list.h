@@ -2,6 +2,7 @@
 
 #include "edit/model/channel_group.h"
 #include "platform/store/streamable_layer.h"
+#include "platform/store/taggable.h"
 
 #include <vector>
 
@@ -11,7 +12,7 @@
 /// A group has at least two members and no member twice; what would leave one with fewer removes it. That a
 /// channel is in at most one group is up to `Edit::groupChannels`, through which groups are made. Stamps that
 /// are given to a change may be members of the list's own groups. Not thread-safe.
-class QM_API ChannelGroupList : public StreamableLayer {
+class QM_API ChannelGroupList : public StreamableLayer, public Taggable {
 public:
     /// The names in the object store. They live in files: do not change them.
     static constexpr const char* Id = "ChannelGroupList";
@@ -44,10 +45,7 @@ public:
     /// `to` is null or a member already.
     bool replaceMember(IdStamp from, IdStamp to);
 
-    /// True from a change until `setChanged(false)`, so that the object store can be told to pack the list
-    /// again.
-    [[nodiscard]] bool changed() const { return m_changed; }
-    void setChanged(bool changed) { m_changed = changed; }
+    [[nodiscard]] const TagTypeId& tagTypeId() const override;
 
     /// Packed: a count, then per group a revision byte (2), the number of members, per member a revision byte
     /// (2) and the stamp, and the type.
@@ -65,5 +63,4 @@ public:
 
 private:
     std::vector<ChannelGroup> m_groups;
-    bool m_changed = false;
 };

@@ -3,6 +3,7 @@
 #include "edit/model/cel.h"
 #include "edit/model/cue_point.h"
 #include "platform/store/streamable_layer.h"
+#include "platform/store/taggable.h"
 
 #include <utility>
 #include <vector>
@@ -16,12 +17,14 @@
 ///
 /// Attached cues point into cels that the list does not own, and so do those of a copy: see `cue_point`.
 /// Channel arguments: a negative channel or `kAnyCueChan` matches every channel. Not thread-safe.
-class QM_API cue_list : public StreamableLayer {
+class QM_API cue_list : public StreamableLayer, public Taggable {
 public:
     cue_list() : StreamableLayer(kForm) {}
     cue_list(const cue_list&) = default;
     cue_list& operator=(const cue_list&) = default;
     ~cue_list() override;
+
+    [[nodiscard]] const TagTypeId& tagTypeId() const override;
 
     /// \name Cues
     /// @{

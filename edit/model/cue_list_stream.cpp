@@ -55,6 +55,11 @@ void cue_point::unpack(PStream& stream, unsigned revision) {
 
 constinit const StreamableLayer::Form cue_list::kForm{kCuesLayer, "cues"};
 
+const TagTypeId& cue_list::tagTypeId() const {
+    static const TagTypeId& type = *new TagTypeId(kLayerName);
+    return type;
+}
+
 void cue_list::pack(PStream& stream) const {
     stream.setUnsignedLong(static_cast<uint32_t>(m_cues.size()));
     for (const cue_point& cue : m_cues) {

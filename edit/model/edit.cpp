@@ -7,6 +7,7 @@
 #include "platform/notify/val_server.h"
 #include "platform/services/log.h"
 #include "platform/store/edit_header_proxy.h"
+#include "platform/store/tag.h"
 
 namespace {
 
@@ -78,11 +79,9 @@ EditPtr Edit::copy() const {
             (channel != nullptr && channel->list == ChannelSet::Levels)) {
             continue; // what a save puts there of the edit itself
         }
-        if (const Streamable* const object = m_store.openObject(name)) {
-            twin->m_store.storeObject(name, object->clone());
-        } else {
+        if (const Qx::Status status = twin->m_store.copyObject(m_store, name, name); !status) {
             herc_printf("Edit::copy( %s ) - object \"%s\" cannot be read and is left out: %s\n",
-                        cookie_string(m_cookie).c_str(), name.c_str(), m_store.objectError().c_str());
+                        cookie_string(m_cookie).c_str(), name.c_str(), status.reason().c_str());
         }
     }
     twin->m_cues = m_cues;
@@ -169,4 +168,8 @@ const char* Edit::subTypeText(Edit_Chan_SubType subtype) {
     default:
         return "SUBTYPE:NONE";
     }
+}
+
+Tag<FXGraphNodeBase> Edit::getVideoNodeForEvent(const ce_handle& event) const {
+    return openObject(event.getEffectGraph());
 }

@@ -21,14 +21,18 @@
 class AudCel;
 class AudLevelsCel;
 class ChannelGroupList;
+class FXGraphNodeBase;
 class TagBag;
 class TextFile;
 class VFXCel;
 class VidCel;
+class ce_handle;
 class cel;
 class configb;
 class criticalSection;
 class cue_list;
+template <typename T>
+class Tag;
 template <typename T>
 class ValServer;
 namespace Qx::Ed2Support {
@@ -521,6 +525,15 @@ public:
     [[nodiscard]] size_t getNumStoredObjects() const;
     /// The objects bound to the edit.
     [[nodiscard]] TagBag& objectStore() { return m_store; }
+    /// The object bound under a stamp, as a `T`: an effect node unless another class is named. The tag names
+    /// nothing when there is none, it cannot be read or it is of another class.
+    template <typename T = FXGraphNodeBase>
+    [[nodiscard]] Tag<T> openObject(const IdStamp& id) const {
+        return Tag<T>(m_store, id);
+    }
+    /// The effect node bound to an event, whatever channel that is on; a tag that names nothing for an invalid
+    /// handle and an event without one.
+    [[nodiscard]] Tag<FXGraphNodeBase> getVideoNodeForEvent(const ce_handle& event) const;
     /// @}
 
     /// \name Cues (edit_cues.cpp)
@@ -737,8 +750,6 @@ private:
     void channelRenamed(const IdStamp& from, const IdStamp& to);
     /// A channel's cel is replaced: its cues follow to the events with the same stamps.
     void celReplaced(const cel* from, cel* to);
-    /// Before a save: tells the object store which group lists changed.
-    void storeGroups();
     void cuesChanged();
     void groupsChanged();
 

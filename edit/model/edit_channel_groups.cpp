@@ -133,20 +133,6 @@ ChannelGroupList* Edit::retrieveDefaultGroupsList() const {
     return openList(m_store, ChannelGroupList::IdForDefaultGrouping);
 }
 
-void Edit::storeGroups() {
-    const auto tell = [this](ChannelGroupList* list, const char* name) {
-        if (list != nullptr && list->changed()) {
-            m_store.markChanged(name);
-            list->setChanged(false);
-        }
-    };
-    // A list that nobody asked for has no change.
-    if (m_groupsFoundAt.load() != kNeverFound) {
-        tell(openList(m_store, ChannelGroupList::Id), ChannelGroupList::Id);
-    }
-    tell(retrieveDefaultGroupsList(), ChannelGroupList::IdForDefaultGrouping);
-}
-
 bool Edit::groupChannels(const Vector<IdStamp>& chans, ChannelGroup::eType type) {
     ChannelGroupList* list = retrieveGroupsList();
     if (chans.size() < 2 || list == nullptr || refusesChange()) {

@@ -204,5 +204,5 @@ void Edit::m_load_edit_bits_from_header() {
 }
 
 size_t Edit::getNumStoredObjects() const {
-    return m_store.numObjects();
+    return m_store.getNumObjects();
 }

@@ -106,7 +106,6 @@ bool Edit::store(const WString& path) {
         if (auto* const cues = dynamic_cast<cue_list*>(m_store.openObject(EditKeys::kCues))) {
             EditFile::renumberFor(*this, EditFile::storedChannels(*this), *cues);
         }
-        storeGroups();
         const EditHeaderProxy header(m_header);
         EditFile::Lending lending(*this);
         EditFile::lendCels(*this);

@@ -40,7 +40,7 @@ struct Generator {
 thread_local Generator generator;
 
 /// Three words of eight digits and what separates them.
-constexpr size_t kTextSize = 26;
+constexpr size_t kTextSize = sizeof(IdStamp::Text);
 
 void writeHex(char* to, uint32_t word) {
     for (int i = 7; i >= 0; --i) {
@@ -86,12 +86,16 @@ IdStamp IdStamp::fresh(IdStampMagic::MagicType type) {
     return generator.next(type);
 }
 
+IdStamp::Text IdStamp::asText() const {
+    Text text;
+    writeHex(&text.letters[0], m_words[0]);
+    text.letters[8] = '-';
+    writeHex(&text.letters[9], m_words[1]);
+    text.letters[17] = '-';
+    writeHex(&text.letters[18], m_words[2]);
+    return text;
+}
+
 String IdStamp::asString() const {
-    char text[kTextSize];
-    writeHex(text, m_words[0]);
-    text[8] = '-';
-    writeHex(text + 9, m_words[1]);
-    text[17] = '-';
-    writeHex(text + 18, m_words[2]);
-    return {text, kTextSize};
+    return String(std::string_view(asText()));
 }

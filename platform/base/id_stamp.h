@@ -56,6 +56,12 @@ public:
 
     /// The text form. It has no blank, comma or equals sign.
     [[nodiscard]] String asString() const;
+    /// The same without memory of its own, for look-ups.
+    struct Text {
+        std::array<char, 26> letters;
+        operator std::string_view() const { return {letters.data(), letters.size()}; }
+    };
+    [[nodiscard]] Text asText() const;
 
     /// One of the three words, `i` from 0 to 2.
     [[nodiscard]] constexpr uint32_t word(int i) const { return m_words[static_cast<size_t>(i)]; }

@@ -67,10 +67,29 @@ void PageMemory::giveBack(Part part) {
             return;
         }
     }
+    discard(part.first, part.second);
+}
+
+void PageMemory::giveBackUnlent() {
+    const std::lock_guard hold(m_mutex);
+    if (m_lent.empty()) {
+        return;
+    }
+    std::vector<Part> lent = m_lent;
+    std::sort(lent.begin(), lent.end());
+    const std::byte* from = m_begin;
+    for (const Part& part : lent) {
+        discard(from, part.first);
+        from = std::max(from, part.second);
+    }
+    discard(from, m_begin + m_size);
+}
+
+void PageMemory::discard(const std::byte* first, const std::byte* last) {
     // The pages at either end may hold bytes of others.
     const auto page = static_cast<size_t>(::sysconf(_SC_PAGESIZE));
-    std::byte* const begin = alignedUp(m_begin + (part.first - m_begin), page);
-    const auto end = reinterpret_cast<uintptr_t>(part.second);
+    std::byte* const begin = alignedUp(m_begin + (first - m_begin), page);
+    const auto end = reinterpret_cast<uintptr_t>(last);
     const auto size = static_cast<std::ptrdiff_t>(end - end % page) -
                       static_cast<std::ptrdiff_t>(reinterpret_cast<uintptr_t>(begin));
     if (size > 0) {

@@ -33,12 +33,17 @@ public:
     /// Lends a part of the block, which keeps its bytes as long as the loan is held. When that ends, what no
     /// other loan covers is lost: it reads as zero.
     [[nodiscard]] std::shared_ptr<const void> lend(std::span<const std::byte> part);
+    /// Gives back the pages that no loan covers; their bytes are lost. Does nothing when nothing is lent: then the
+    /// whole goes with its pointer.
+    void giveBackUnlent();
 
 private:
     using Part = std::pair<const std::byte*, const std::byte*>;
 
     PageMemory() = default;
     void giveBack(Part part);
+    /// Gives the whole pages between two places back to the system.
+    void discard(const std::byte* first, const std::byte* last);
 
     std::byte* m_begin = nullptr;
     size_t m_size = 0;

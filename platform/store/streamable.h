@@ -4,14 +4,29 @@
 #include "platform/store/pstream.h"
 
 #include <memory>
+#include <span>
+#include <vector>
 
 /// An object that packs itself into a stream, layer by layer: each class of its hierarchy writes one layer
 /// with its own name and revision, base first. A reader passes over the layers that it does not know.
 ///
 /// Packed hierarchy: an unsigned 32-bit layer count, then per layer its short name (string), major and minor
 /// revision (one byte each), an unsigned 32-bit length and that many bytes.
+///
+/// A class of one layer says what that is by `layerName` and its like, `pack` and `unpack`
+/// (`StreamableLayer` helps). A class derived from one that has a layer adds to those `subLayers`,
+/// `STRM_layerPack` and `STRM_layerUnpack`.
 class QM_API Streamable {
 public:
+    /// What a class writes. All of it lives in files: names stay, and a form that earlier readers cannot read
+    /// has a new major revision.
+    struct Form {
+        const char* name;
+        const char* shortName;
+        uint8_t major = 1;
+        uint8_t minor = 0;
+    };
+
     /// What a copy made by `clone` shall be good for.
     enum class BuilderType {
         Copy,  ///< an object of its own
@@ -37,6 +52,19 @@ public:
     /// read.
     virtual void unpack(PStream& stream) = 0;
 
+    /// The layers of the classes that this one is derived from, base first, without its own: none by default.
+    [[nodiscard]] virtual std::span<const Form* const> subLayers() const { return {}; }
+    /// Writes the layer with that index in `subLayers`, or with the index behind them the object's own.
+    virtual void STRM_layerPack(size_t layer, PStream& stream) const;
+    /// Reads such a layer, written with the given revision; `unpack` says how.
+    virtual void STRM_layerUnpack(size_t layer, uint8_t major, uint8_t minor, PStream& stream);
+    /// The full names of all layers, base first, joined by colons; and the same without the object's own.
+    [[nodiscard]] String hierarchyName() const;
+    [[nodiscard]] String subHierarchyName() const;
+    /// True for an object that stands for bytes of a class or a revision that this program does not know: its
+    /// revision is that of those bytes, whatever class has its layer's name here.
+    [[nodiscard]] virtual bool isForeign() const { return false; }
+
     [[nodiscard]] virtual std::unique_ptr<Streamable> clone(BuilderType type = BuilderType::Copy) const = 0;
 
     /// Writes every layer. The revision written is the class's current one (that of an empty object made by
@@ -45,9 +73,9 @@ public:
     virtual void STRM_hierarchyPack(PStream& stream) const;
     /// Reads what `STRM_hierarchyPack` wrote; layers of other names are passed over. A layer of a newer major
     /// revision is refused; of a newer minor revision it is read, and what its writer added behind is passed
-    /// over. False, with the stream in its error state, when the stream is short, lacks the object's layer or
-    /// has it twice, when the revision is refused, or when a layer of a known revision holds more than
-    /// `unpack` took (the object then holds what was read).
+    /// over. False, with the stream in its error state, when the stream is short, lacks a layer of the object
+    /// or has it twice, when a revision is refused, or when a layer of a known revision holds more than was
+    /// taken (the object then holds what was read up to there; of several layers, perhaps some).
     virtual bool STRM_hierarchyUnpack(PStream& stream);
 
     /// Makes an empty object of a class.
@@ -56,4 +84,26 @@ public:
     static void registerBuilder(const char* layerName, Builder builder);
     /// An empty object of the class with that layer name; null when none is registered.
     [[nodiscard]] static std::unique_ptr<Streamable> build(std::string_view layerName);
+
+    /// Makes an empty object that can stand for one of a class that is not known, or of a revision that is
+    /// not. `layerName` is what the object shall name itself.
+    using FallbackBuilder = std::unique_ptr<Streamable> (*)(std::string_view layerName);
+    /// Registers what stands for objects of unknown classes that have a layer of a known base class.
+    static void registerFallback(const char* shortLayerName, FallbackBuilder builder);
+    /// An empty object that can stand for the packed one: that of the most derived layer that has a fallback.
+    /// Null when none has, or the bytes are no packed hierarchy.
+    [[nodiscard]] static std::unique_ptr<Streamable> buildFallback(std::string_view layerName,
+                                                                   std::span<const std::byte> packed);
+
+    /// One layer of a packed hierarchy. The name and bytes point into what was read.
+    struct PackedLayer {
+        std::string_view shortName;
+        uint8_t major = 0;
+        uint8_t minor = 0;
+        std::span<const std::byte> bytes;
+    };
+    /// Reads the layers of a packed hierarchy. False, with the stream in its error state, when it is none.
+    static bool readLayers(PStream& stream, std::vector<PackedLayer>& layers);
+    /// Writes a layer that another program packed, or the head of one; see the class's text for its form.
+    static void writeLayer(PStream& stream, const PackedLayer& layer);
 };

@@ -14,15 +14,6 @@ public:
     void revisionMinor(uint8_t minor) override { m_minor = minor; }
 
 protected:
-    /// What a class writes. All of it lives in files: names stay, and a form that earlier readers cannot read
-    /// has a new major revision.
-    struct Form {
-        const char* name;
-        const char* shortName;
-        uint8_t major = 1;
-        uint8_t minor = 0;
-    };
-
     /// `form` lives as long as the program.
     explicit StreamableLayer(const Form& form) : m_form(&form), m_major(form.major), m_minor(form.minor) {}
     StreamableLayer(const StreamableLayer&) = default;

@@ -4,6 +4,7 @@
 #include "platform/store/detail/header_values.h"
 #include "platform/store/detail/salvage.h"
 #include "platform/store/detail/tag_bag_contents.h"
+#include "platform/store/tag.h"
 
 #include <cerrno>
 #include <list>
@@ -73,9 +74,14 @@ TagBag::OpenResult lookAt(const String& path, Qx::Status& complaint) {
 
 } // namespace
 
-TagBag::TagBag() : m_contents(std::make_unique<Contents>()) {}
+TagBag::TagBag() : m_life(std::make_shared<TagBagLife>()), m_contents(std::make_unique<Contents>()) {
+    m_life->bag = this;
+    m_contents->life = m_life;
+}
 
-TagBag::~TagBag() = default;
+TagBag::~TagBag() {
+    m_life->bag = nullptr;
+}
 
 TagBag::OpenResult TagBag::open(const cookie& item, const String& inFolder, eEditOpenBehaviour behaviour,
                                 const String& extension) {
@@ -283,7 +289,7 @@ void TagBag::storeObject(std::string_view name, std::unique_ptr<Streamable> obje
     m_contents->forgetBytes(entry);
     entry.lent = nullptr;
     m_contents->takeOwned(entry);
-    entry.owned = std::move(object);
+    entry.own(std::move(object), true);
     entry.changed = true;
 }
 
@@ -320,7 +326,7 @@ Streamable* TagBag::openObject(std::string_view name) {
         return nullptr;
     }
     if (entry->owned == nullptr) {
-        entry->owned = m_contents->build(*entry);
+        entry->own(m_contents->build(*entry), false);
         if (entry->owned != nullptr) {
             m_contents->dropMemory(*entry);
         }
@@ -329,7 +335,7 @@ Streamable* TagBag::openObject(std::string_view name) {
 }
 
 uint64_t TagBag::numDepartures() const {
-    return m_contents->numDepartures;
+    return m_life->departures;
 }
 
 std::unique_ptr<Streamable> TagBag::extractObject(std::string_view name) {
@@ -347,6 +353,9 @@ std::unique_ptr<Streamable> TagBag::extractObject(std::string_view name) {
         return nullptr;
     }
     std::unique_ptr<Streamable> object = m_contents->takeOwned(*entry);
+    if (auto* const tagged = dynamic_cast<Taggable*>(object.get())) {
+        tagged->setTagId({});
+    }
     if (!entry->hasBytes()) {
         m_contents->erase(name);
     }
@@ -396,8 +405,13 @@ bool TagBag::contains(std::string_view name) const {
     return m_contents->find(name) != nullptr;
 }
 
-size_t TagBag::numObjects() const {
+size_t TagBag::getNumObjects() const {
     return m_contents->entries.size();
+}
+
+TagBase TagBag::operator[](size_t index) {
+    const Contents::Entry* const entry = m_contents->at(index);
+    return entry != nullptr ? TagBase(*this, IdStamp(entry->name)) : TagBase();
 }
 
 std::vector<String> TagBag::names() const {

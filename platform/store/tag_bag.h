@@ -7,17 +7,32 @@
 #include "platform/services/files.h"
 #include "platform/store/object_store_info.h"
 #include "platform/store/streamable.h"
+#include "platform/store/taggable.h"
 
 #include <functional>
 #include <memory>
+#include <span>
 #include <vector>
+
+class TagBase;
+
+/// What tags know of their bag; it outlives the bag while a tag holds it.
+struct TagBagLife {
+    TagBag* bag = nullptr;
+    uint64_t departures = 0; ///< see `TagBag::numDepartures`
+};
 
 /// A store of tagged objects, one file. It owns the objects that are bound to it and knows their bytes; it
 /// knows nothing of edits, undo or notification.
 ///
 /// An object is found by its tag: a name, or an `IdStamp` (kept under its text). An object is in one of two
 /// states: *held* as a live `Streamable` that the store owns or that is lent to it for a save, or *stored* as
-/// bytes. Objects whose class is not known to this program stay bytes and are written again as they are.
+/// bytes. Objects whose class is not known to this program stay bytes and are written again as they are; where
+/// a layer of theirs is known, they can be opened as what that layer makes of them
+/// (`Streamable::registerFallback`).
+///
+/// An object that is also a `Taggable` is told its stamp, and packed when it says that it was changed. For
+/// others, `markChanged` says so.
 ///
 /// The file's form is docs/file-format.md. Writing is atomic (`Qx::AtomicFile`). Not thread-safe: one bag is
 /// used by one thread at a time.
@@ -91,6 +106,9 @@ public:
     /// Binds an object under a name; the bag owns it, and a former object of that name goes. It counts as
     /// changed.
     void storeObject(std::string_view name, std::unique_ptr<Streamable> object);
+    void storeObject(const IdStamp& id, std::unique_ptr<Streamable> object) {
+        storeObject(id.asText(), std::move(object));
+    }
     /// Lends an object to the bag until `extractObject` or `releaseLent`; the caller keeps ownership, and an
     /// object that the bag owned under the name goes. With `changed` false, and bytes known for the name,
     /// those are kept and the object is not packed, unless they can be had no more or an earlier lending with
@@ -103,6 +121,8 @@ public:
     /// call. Null when there is none or its bytes do not make one; `objectError` then tells which. The
     /// pointer is good until the object goes: while `numDepartures` is what it was, none has.
     [[nodiscard]] Streamable* openObject(std::string_view name);
+    /// Allocates nothing for an object that is open.
+    [[nodiscard]] Streamable* openObject(const IdStamp& id) { return openObject(id.asText()); }
     /// How often live objects that the bag owned went from it: replaced, lent over, handed over, removed, or
     /// with the whole content. Never falls.
     [[nodiscard]] uint64_t numDepartures() const;
@@ -111,6 +131,9 @@ public:
     /// memory but found again in the file: if that was replaced or moved since, and no object is lent in
     /// their place, a flush fails. For an object that is lent the loan ends and the result is null.
     [[nodiscard]] std::unique_ptr<Streamable> extractObject(std::string_view name);
+    [[nodiscard]] std::unique_ptr<Streamable> extractObject(const IdStamp& id) {
+        return extractObject(id.asText());
+    }
     /// Unpacks the bytes under a name, as they were last written or read, into an object that the caller has.
     /// False when there are none or they
     /// do not fit; the object is then as its `unpack` promises.
@@ -126,14 +149,33 @@ public:
     void markChanged(std::string_view name);
     /// Removes an object and its bytes. False when there is none.
     bool removeObject(std::string_view name);
+    bool removeObject(const IdStamp& id) { return removeObject(id.asText()); }
     /// Gives an object another name; its bytes and its place in the file stay. False, changing nothing, when
     /// there is no such object, the new name is taken, or it cannot be stored.
     bool renameObject(std::string_view name, std::string_view newName);
 
     [[nodiscard]] bool contains(std::string_view name) const;
-    [[nodiscard]] size_t numObjects() const;
+    [[nodiscard]] bool contains(const IdStamp& id) const { return contains(id.asText()); }
+    [[nodiscard]] size_t getNumObjects() const;
+    /// The object at a place in the order of the file, from 0; its stamp is null where a name is none. Beyond
+    /// the end, a tag that names nothing.
+    [[nodiscard]] TagBase operator[](size_t index);
     /// The names, in the order of the file.
     [[nodiscard]] std::vector<String> names() const;
+
+    /// Copies an object of `from`, which may be this bag, under another name: a clone of what is open, else
+    /// its bytes as they are, so that one of an unknown class can be copied too. An object of that name goes.
+    /// A failure, changing nothing, when there is none, its bytes cannot be had or it is lent.
+    Qx::Status copyObject(TagBag& from, std::string_view name, std::string_view newName);
+    /// Copies objects of `from`, which may be this bag, and every object there that they refer to, however
+    /// remotely, each once. `renamed` tells and is told which stamp here stands for which there: an object
+    /// whose stamp it holds gets the stamp it gives, any other a fresh one of the same magic type. What the
+    /// copies refer to is renamed with it, and so are stamps of other things, channels for instance, that
+    /// `renamed` holds. The order is that of `objects`, each followed by what it refers to.
+    ///
+    /// A failure, changing neither bag nor map, when an object of `objects` is not there or an object cannot
+    /// be copied. References to what is no object of `from` are no failure.
+    Qx::Status copyAndStoreComponents(TagBag& from, std::span<const IdStamp> objects, StampMap& renamed);
 
     /// Writes every object to the file, atomically and durably, in the order of the file, new ones at the end
     /// in the order of their binding. The same objects give the same bytes. On failure the old file is
@@ -146,7 +188,9 @@ public:
     [[nodiscard]] size_t numKept() const;
 
 private:
+    friend class TagBase;
     class Contents;
     OpenResult openFile(eEditOpenBehaviour behaviour);
+    std::shared_ptr<TagBagLife> m_life;
     std::unique_ptr<Contents> m_contents;
 };

@@ -4,18 +4,34 @@
 #include "platform/store/detail/header_values.h"
 #include "platform/store/detail/layer_revision.h"
 
+#include <algorithm>
+
 using namespace Qx::detail;
 
 namespace {
 
-/// The image goes once less than this part of it is in use; the rest is copied out of it.
+/// The image goes once less than this part of what lay in it is in use; the rest is copied out of it.
 constexpr size_t kLeastPartInUse = 8;
+
+/// True if a layer that the object's class knows is of a revision from the future there.
+bool hasNewerLayer(const Streamable& object, std::span<const std::byte> bytes) {
+    PStream stream(bytes);
+    std::vector<Streamable::PackedLayer> layers;
+    const auto below = object.subLayers();
+    const auto isNewer = [&](const Streamable::PackedLayer& layer) {
+        return std::any_of(below.begin(), below.end(), [&](const Streamable::Form* form) {
+            return layer.shortName == form->shortName && layer.major > form->major;
+        });
+    };
+    return Streamable::readLayers(stream, layers) && std::any_of(layers.begin(), layers.end(), isNewer);
+}
 
 } // namespace
 
 void TagBag::Contents::clear() {
     m_index.clear();
-    ++numDepartures;
+    ++life->departures;
+    m_order.clear();
     entries.clear();
     image.drop();
     source = {};
@@ -56,14 +72,39 @@ void TagBag::Contents::erase(std::string_view name) {
             m_imageBytesInUse -= entry->memory.size();
         }
         takeOwned(*entry);
+        m_order.clear();
         m_index.erase(found);
         entries.erase(entry);
     }
 }
 
 std::unique_ptr<Streamable> TagBag::Contents::takeOwned(Entry& entry) {
-    numDepartures += entry.owned != nullptr ? 1 : 0;
+    life->departures += entry.owned != nullptr ? 1 : 0;
+    if (entry.tagged != nullptr) {
+        entry.changed = entry.isChanged();
+        entry.tagged = nullptr;
+    }
     return std::move(entry.owned);
+}
+
+void TagBag::Contents::Entry::own(std::unique_ptr<Streamable> object, bool isNew) {
+    owned = std::move(object);
+    tagged = dynamic_cast<Taggable*>(owned.get());
+    if (tagged != nullptr) {
+        tagged->setTagId(IdStamp(name));
+        tagged->setTagChanged(isNew);
+    }
+}
+
+TagBag::Contents::Entry* TagBag::Contents::at(size_t index) {
+    if (m_order.size() != entries.size()) {
+        m_order.clear();
+        m_order.reserve(entries.size());
+        for (Entry& entry : entries) {
+            m_order.push_back(&entry);
+        }
+    }
+    return index < m_order.size() ? m_order[index] : nullptr;
 }
 
 bool TagBag::Contents::rename(std::string_view name, std::string_view newName) {
@@ -77,6 +118,11 @@ bool TagBag::Contents::rename(std::string_view name, std::string_view newName) {
     std::swap(entry.name, taken);
     node.key() = entry.name;
     m_index.insert(std::move(node));
+    if (entry.tagged != nullptr) {
+        // Tags find an object by its stamp.
+        ++life->departures;
+        entry.tagged->setTagId(IdStamp(entry.name));
+    }
     return true;
 }
 
@@ -99,19 +145,20 @@ void TagBag::Contents::takeImage(std::span<const StoredObject> objects, std::spa
         entry.keeper = image.keep(entry.memory);
         m_imageBytesInUse += entry.isInImage() ? entry.memory.size() : 0;
     }
+    m_imageBytes = m_imageBytesInUse;
     if (m_imageBytesInUse == 0) {
         image.drop();
     }
 }
 
-bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
-    const String who = "object " + quoted(entry.name) + " of " + path();
-    std::span<const std::byte> bytes = entry.memory;
-    std::vector<std::byte> reread;
+bool TagBag::Contents::bytesOf(const Entry& entry, std::vector<std::byte>& reread,
+                               std::span<const std::byte>& bytes) {
+    const auto who = [&] { return "object " + quoted(entry.name) + " of " + path(); };
     if (!entry.hasBytes()) {
-        objectStatus = Qx::Status::failure(Qx::StatusCode::NotFound, who + " was never written");
+        objectStatus = Qx::Status::failure(Qx::StatusCode::NotFound, who() + " was never written");
         return false;
     }
+    bytes = entry.memory;
     if (!entry.inMemory) {
         StoreSource file;
         const bool opened = file.open(source);
@@ -119,21 +166,31 @@ bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
         if (!opened || !file.read(entry.place.offset, reread) || checksum(reread) != entry.place.checksum) {
             objectStatus =
                 Qx::Status::failure(Qx::StatusCode::Damaged,
-                                    who + " cannot be read again: the file was replaced, moved or damaged");
+                                    who() + " cannot be read again: the file was replaced, moved or damaged");
             return false;
         }
         bytes = reread;
+    }
+    return true;
+}
+
+bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
+    std::span<const std::byte> bytes;
+    std::vector<std::byte> reread;
+    if (!bytesOf(entry, reread, bytes)) {
+        return false;
     }
     PStream stream(bytes, entry.inMemory ? entry.keeper : nullptr);
     if (object.STRM_hierarchyUnpack(stream) && stream.remaining() == 0) {
         return true;
     }
-    const LayerRevision current = currentRevision(object);
-    if (entry.layer == object.layerName() && entry.major > current.major) {
-        objectStatus = Qx::Status::failure(
-            Qx::StatusCode::Newer, who + " was written by a newer version of this program: it has revision " +
-                                       std::to_string(entry.major) + ", this version reads " +
-                                       std::to_string(current.major));
+    const String who = "object " + quoted(entry.name) + " of " + path();
+    if (entry.layer == object.layerName() &&
+        (entry.major > currentRevision(object).major || hasNewerLayer(object, bytes))) {
+        objectStatus =
+            Qx::Status::failure(Qx::StatusCode::Newer,
+                                who + " was written by a newer version of this program, in a form that this "
+                                      "version does not read");
     } else {
         objectStatus =
             Qx::Status::failure(Qx::StatusCode::Damaged,
@@ -145,14 +202,29 @@ bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
 
 std::unique_ptr<Streamable> TagBag::Contents::build(const Entry& entry) {
     std::unique_ptr<Streamable> object = Streamable::build(entry.layer);
+    if (object != nullptr && unpack(entry, *object)) {
+        return object;
+    }
     if (object == nullptr) {
         objectStatus = Qx::Status::failure(Qx::StatusCode::Unsupported,
                                            "object " + quoted(entry.name) + " of " + path() +
                                                " is of class " + quoted(entry.layer) +
                                                ", which this program does not know; it is kept as it is");
+    } else if (objectStatus.code() != Qx::StatusCode::Newer) {
         return nullptr;
     }
-    return unpack(entry, *object) ? std::move(object) : nullptr;
+    const Qx::Status why = objectStatus;
+    std::span<const std::byte> bytes;
+    std::vector<std::byte> reread;
+    if (bytesOf(entry, reread, bytes)) {
+        object = Streamable::buildFallback(entry.layer, bytes);
+        if (object != nullptr && unpack(entry, *object)) {
+            objectStatus = {};
+            return object;
+        }
+    }
+    objectStatus = why;
+    return nullptr;
 }
 
 void TagBag::Contents::dropMemory(Entry& entry) {
@@ -176,7 +248,7 @@ void TagBag::Contents::forgetBytes(Entry& entry) {
 }
 
 void TagBag::Contents::thinImage() {
-    if (image.bytes().empty() || m_imageBytesInUse > image.bytes().size() / kLeastPartInUse) {
+    if (image.bytes().empty() || m_imageBytesInUse > m_imageBytes / kLeastPartInUse) {
         return;
     }
     for (Entry& other : entries) {
@@ -280,6 +352,9 @@ void TagBag::Contents::adopt(std::vector<Written>& written, StoreIdentity& ident
         entry.place = row.place;
         entry.onFile = source.known;
         entry.changed = entry.changed && !durable;
+        if (entry.tagged != nullptr && entry.lent == nullptr && durable) {
+            entry.tagged->setTagChanged(false);
+        }
     }
     try {
         thinImage();

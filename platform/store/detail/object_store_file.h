@@ -107,13 +107,17 @@ public:
     /// and `headerMustHold`, nothing but the header was read.
     FileError read(const String& path, bool headerMustHold, StoreVerdict& judged);
     [[nodiscard]] std::span<const std::byte> bytes() const { return {m_bytes, m_size}; }
-    /// Something that keeps a part of the bytes whatever becomes of the image, for a large image; null for a
-    /// small one, whose bytes go with it.
+    /// Something that keeps a large part of the bytes of a large image, whatever becomes of the rest; null for
+    /// what goes with the image. A loan of its own is worth its cost only for what is used where it lies.
     [[nodiscard]] std::shared_ptr<const void> keep(std::span<const std::byte> part) const {
-        return m_pages == nullptr ? nullptr : m_pages->lend(part);
+        return m_pages == nullptr || part.size() < kLeastKept ? nullptr : m_pages->lend(part);
     }
     [[nodiscard]] const StoreIdentity& identity() const { return m_identity; }
+    /// The bytes go, but for the parts that are kept.
     void drop() {
+        if (m_pages != nullptr) {
+            m_pages->giveBackUnlent();
+        }
         m_pages.reset();
         m_heap.reset();
         m_bytes = nullptr;
@@ -121,6 +125,7 @@ public:
     }
 
 private:
+    static constexpr size_t kLeastKept = size_t{1} << 16;
     void allocate(size_t size);
 
     std::shared_ptr<PageMemory> m_pages; ///< of a large image

@@ -19,6 +19,7 @@ public:
         uint8_t major = 0;
         uint8_t minor = 0;
         std::unique_ptr<Streamable> owned;
+        Taggable* tagged = nullptr; ///< the other side of `owned`
         const Streamable* lent = nullptr;
         /// The live object differs from the bytes, or did when it was last here. Cleared by a flush only.
         bool changed = false;
@@ -27,13 +28,18 @@ public:
         Qx::detail::StoredPlace place;
         std::span<const std::byte> memory;
         std::vector<std::byte> copied; ///< backs `memory` once the image was dropped
-        /// Keeps `memory`, with the image or without, if the image is a large one.
+        /// Keeps `memory`, with the image or without, if it is a large part of a large image.
         std::shared_ptr<const void> keeper;
 
         [[nodiscard]] bool hasBytes() const { return inMemory || onFile; }
         [[nodiscard]] bool isInImage() const { return inMemory && copied.empty() && keeper == nullptr; }
         [[nodiscard]] const Streamable* live() const { return lent != nullptr ? lent : owned.get(); }
-        [[nodiscard]] bool mustBePacked() const { return live() != nullptr && (changed || !hasBytes()); }
+        [[nodiscard]] bool isChanged() const {
+            return changed || (lent == nullptr && tagged != nullptr && tagged->isTagChanged());
+        }
+        [[nodiscard]] bool mustBePacked() const { return live() != nullptr && (isChanged() || !hasBytes()); }
+        /// Makes an object the one that the bag owns under the name. `isNew` tells that its bytes are none.
+        void own(std::unique_ptr<Streamable> object, bool isNew);
         [[nodiscard]] Qx::detail::StoredLabel label() const { return {name, layer, major, minor}; }
     };
     using Entries = std::list<Entry>;
@@ -46,11 +52,15 @@ public:
     void erase(std::string_view name);
     /// False when there is no such object or the new name is taken.
     bool rename(std::string_view name, std::string_view newName);
+    /// The entry at a place in the order of the file; null beyond the end.
+    [[nodiscard]] Entry* at(size_t index);
     /// Adds the objects of the image. `complaints` is empty or tells of each whether it is sound; those that
     /// are not are left out.
     void takeImage(std::span<const Qx::detail::StoredObject> objects, std::span<const String> complaints,
                    bool onFile);
 
+    /// An object's bytes, in `reread` if they had to be read from the file. False with `objectStatus` set.
+    bool bytesOf(const Entry& entry, std::vector<std::byte>& reread, std::span<const std::byte>& bytes);
     /// Unpacks an object's bytes. False with `objectStatus` set.
     bool unpack(const Entry& entry, Streamable& object);
     /// A live object from an object's bytes; null with `objectStatus` set.
@@ -76,7 +86,7 @@ public:
     Qx::Status objectStatus;
     size_t numPacked = 0;
     size_t numKept = 0;
-    uint64_t numDepartures = 0;
+    std::shared_ptr<TagBagLife> life;
     Entries entries; ///< in the order of the file
     Qx::detail::StoreImage image;
     Qx::detail::StoreIdentity source;
@@ -89,5 +99,7 @@ private:
     void adopt(std::vector<Written>& written, Qx::detail::StoreIdentity& identity, bool durable);
 
     std::unordered_map<std::string_view, Entries::iterator> m_index; ///< keys lie in the entries
+    std::vector<Entry*> m_order; ///< the entries by their place; stale unless as long as `entries`
+    size_t m_imageBytes = 0;     ///< of the objects that lay in the image, those kept apart left out
     size_t m_imageBytesInUse = 0;
 };

@@ -3,6 +3,7 @@
 #include "edit/model/cel_event_pair.h"
 #include "edit/model/cel_iterator.h"
 #include "edit/model/edit.h"
+#include "platform/store/tag.h"
 #include "support/cel_layout.h"
 
 #include <gtest/gtest.h>
@@ -73,7 +74,7 @@ TEST_F(PairsOfAnEdit, AnswerForTheirSpanAndForNone) {
     EXPECT_EQ(pair.getChanType(), VideoChan);
     EXPECT_EQ(pair.getChanSubType(), Edit_Chan_SubType::NONE);
     EXPECT_EQ(pair.getObjectID(), edit->getCel(chan)->get_event(2).id);
-    EXPECT_EQ(pair.getEffectHandle(), nullptr);
+    EXPECT_EQ(pair.getEffectHandle().object(), nullptr);
     pair.invalidate();
     EXPECT_FALSE(pair.valid());
     EXPECT_EQ(pair.idx(), NO_CHAN);

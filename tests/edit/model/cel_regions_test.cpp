@@ -215,6 +215,24 @@ TEST(CelRegions, TheSourceMayBeTheCelItself) {
     expectSound(under);
 }
 
+TEST(CelRegions, CopiesAndPartsOfAnEffectAreEffects) {
+    cel its = make("AAAABB");
+    its.get_start_ceh().setEffectGraph(IdStamp::fresh(IdStampMagic::EffectNode));
+    cel::IdMap ids;
+    cel::Splits splits;
+    cel copy = make("CCCC");
+    ASSERT_TRUE(copy.insert(&its, {0, 6}, 2, ids, &splits));
+    ASSERT_TRUE(its.remove({1, 2}, &splits));
+    ASSERT_TRUE(its.replace(&copy, {0, 1}, 1, ids, false, &splits));
+    for (const cel* one : {&its, &copy}) {
+        for (int i = 0; i < one->numEvents(); i += 2) {
+            const channel_event& in = *one->getChanEventPtr(i);
+            EXPECT_EQ(in.id.getMagicType() == IdStampMagic::EffectNode, in.strip == layout::sourceOf('A'))
+                << i;
+        }
+    }
+}
+
 TEST(CelRegions, RefusalsChangeNothing) {
     const double huge = cel::kGreatestTime * 2;
     cel its = make("AABB");

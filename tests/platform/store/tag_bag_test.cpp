@@ -177,7 +177,7 @@ TEST_F(StoreTest, OwnedObjectsAreReplacedMarkedAndRemoved) {
     ASSERT_TRUE(bag.flush());
     EXPECT_EQ(bag.numPacked(), 2u);
     ASSERT_EQ(open(bag), TagBag::Opened);
-    EXPECT_EQ(bag.numObjects(), 2u);
+    EXPECT_EQ(bag.getNumObjects(), 2u);
     EXPECT_EQ(valuesOf(bag, "first"), (Values{6}));
     EXPECT_EQ(valuesOf(bag, "last"), (Values{5}));
     bag.storeObject("brief", numbers({1}));
@@ -245,7 +245,7 @@ TEST_F(StoreTest, EveryFaultOfReadingIsToldAndLeavesTheBagClosed) {
         disk.failAt(n, EIO);
         EXPECT_EQ(open(bag), TagBag::NotOpened);
         EXPECT_FALSE(bag.isOpen());
-        EXPECT_EQ(bag.numObjects(), 0u);
+        EXPECT_EQ(bag.getNumObjects(), 0u);
         EXPECT_NE(bag.openError().find(name), String::npos) << bag.openError();
         disk.reset();
         disk.failAt(n, EINTR);
