@@ -56,7 +56,7 @@ void cue_point::unpack(PStream& stream, unsigned revision) {
 constinit const StreamableLayer::Form cue_list::kForm{kCuesLayer, "cues"};
 
 const TagTypeId& cue_list::tagTypeId() const {
-    static const TagTypeId& type = *new TagTypeId(kLayerName);
+    static const TagTypeId& type = *new TagTypeId(kCuesLayer);
     return type;
 }
 
