@@ -24,8 +24,10 @@ CommandOption projectOption(String& project) {
 }
 
 CommandOption cookieOption(std::string& item) {
-    return {
-        .name = "COOKIE", .value = &item, .help = "The edit, as 'qmedit list' names it", .required = true};
+    return {.name = "COOKIE",
+            .value = &item,
+            .help = "The edit: its cookie or its name, as 'qmedit list' has them",
+            .required = true};
 }
 
 CommandOption jsonOption(bool& json, const char* help) {
@@ -35,15 +37,4 @@ CommandOption jsonOption(bool& json, const char* help) {
 int failed(const Qx::Status& status) {
     reportError(status.reason());
     return kFailed;
-}
-
-bool readCookie(const String& text, cookie& item) {
-    item = cookie(text, true);
-    if (item.isStorable()) {
-        return true;
-    }
-    reportError("'" + text +
-                "' is no cookie; a cookie is a letter and seven digits or letters, such as E0001000 "
-                "('qmedit list' shows those of the project)");
-    return false;
 }

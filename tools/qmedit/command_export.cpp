@@ -52,12 +52,15 @@ Qx::Status writeForm(const ExportArguments& arguments, const String& form, const
 int runExport(const ExportArguments& arguments) {
     cookie item;
     String form;
-    if (!readCookie(arguments.item, item) || !readForm(arguments.file, form)) {
+    if (!readForm(arguments.file, form)) {
         return kWrongUsage;
     }
     ProjectSession session(arguments.project);
     if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
+    if (const Qx::Status found = session.findItem(arguments.item, item); !found) {
+        return failed(found);
     }
     EditPtr edit;
     if (const Qx::Status read = session.readEdit(item, edit); !read) {

@@ -35,12 +35,12 @@ String headerTable(const configb& header, const std::vector<String>& keys, const
 
 int runHeader(const HeaderOptions& options) {
     cookie item;
-    if (!readCookie(options.item, item)) {
-        return kWrongUsage;
-    }
     ProjectSession session(options.project);
     if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
+    if (const Qx::Status found = session.findItem(options.item, item); !found) {
+        return failed(found);
     }
     EditPtr edit;
     if (const Qx::Status read = session.readEdit(item, edit); !read) {

@@ -114,15 +114,15 @@ Qx::Status tellLeftovers(ProjectSession& session, bool clean) {
 }
 
 int runVerify(const VerifyArguments& arguments) {
-    std::vector<cookie> items;
-    for (const std::string& text : arguments.items) {
-        if (!readCookie(text, items.emplace_back())) {
-            return kWrongUsage;
-        }
-    }
     ProjectSession session(arguments.project);
     if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
+    std::vector<cookie> items;
+    for (const std::string& text : arguments.items) {
+        if (const Qx::Status found = session.findItem(text, items.emplace_back()); !found) {
+            return failed(found);
+        }
     }
     std::vector<VerifiedFile> files;
     if (const Qx::Status verified = verifyProject(session.folder(), items, files); !verified) {

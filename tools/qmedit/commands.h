@@ -49,12 +49,10 @@ CommandOption jsonOption(bool& json, const char* help);
 String checkFolder(const std::string& folder);
 /// Reports a failure and returns `kFailed`.
 int failed(const Qx::Status& status);
-/// Reads a COOKIE argument. On a text that is none, reports it and returns false.
-[[nodiscard]] bool readCookie(const String& text, cookie& item);
 /// Shows an edit of a project as `qmedit show` does.
 struct ShowOptions {
     String project;
-    cookie item;
+    String item; ///< its cookie or its name
     bool json = false;
     bool allEvents = false;
 };

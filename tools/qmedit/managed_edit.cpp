@@ -48,9 +48,6 @@ ManagedEdit::ManagedEdit(const EditArguments& arguments)
     : m_arguments(arguments), m_session(arguments.project) {}
 
 int ManagedEdit::prepare(bool mayBeGone) {
-    if (!readCookie(m_arguments.item, m_item)) {
-        return kWrongUsage;
-    }
     if (const Qx::Status opened = m_session.openExisting(); !opened) {
         return failed(opened);
     }
@@ -58,6 +55,9 @@ int ManagedEdit::prepare(bool mayBeGone) {
         return failed(locked);
     }
     m_session.manage();
+    if (const Qx::Status found = m_session.findItem(m_arguments.item, m_item); !found) {
+        return failed(found);
+    }
     if (!mayBeGone && edit_manager::getEditFiles(m_item).empty()) {
         EditPtr none;
         return failed(m_session.readEdit(m_item, none));

@@ -24,7 +24,7 @@ class ManagedEdit {
 public:
     explicit ManagedEdit(const EditArguments& arguments);
 
-    /// Reads the cookie, opens the project and takes the lock; the item must not be marked read-only, and
+    /// Opens the project, takes the lock and finds the item; it must not be marked read-only, and
     /// must have a file or a backup unless it `mayBeGone`. An `ExitCode`; what is wrong is reported.
     int prepare(bool mayBeGone = false);
     /// Opens the edit, by `openManaged`.
