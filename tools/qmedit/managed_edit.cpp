@@ -141,7 +141,7 @@ int stepRevision(const EditArguments& arguments, bool redo) {
             String("there is nothing to ") + verb + ": " + item.asString() + " has no " + verb + " backup; " +
             (redo ? "an undo makes one" : "'qmedit backup " + item.asString() + "' makes one")));
     }
-    String change = changeText(edit->getChangeDescription());
+    String change = changeText(ownChangeOf(std::as_const(*edit).Opts()));
     edit.invalidate();
     String notice;
     if (!(redo ? edit_manager::redoRequest(item, &notice) : edit_manager::undoRequest(item, &notice))) {
