@@ -122,7 +122,7 @@ TEST_F(QmeditFiles, ExportRefusesTargetsThatAreNoFiles) {
         EXPECT_TRUE(fs::is_symlink(folder.path("link" + end).c_str()));
     }
     EXPECT_EQ(folder.read("real.edl"), "old");
-    EXPECT_EQ(run({"export", item, folder.path("x.txt")}).code, 1);
+    EXPECT_EQ(run({"export", item, folder.path("x.txt")}).code, 2);
 }
 
 TEST_F(QmeditFiles, TextsThatAreNoCookiesNameNoPath) {

@@ -44,6 +44,14 @@ Qx::Status ChannelChoice::parse(const String& text, ChannelChoice& choice) {
     return {};
 }
 
+int ChannelChoice::highest(Edit_Chan_Type type) const {
+    int number = 0;
+    for (const Name& name : m_names) {
+        number = name.type == type ? std::max({number, name.number, 1}) : number;
+    }
+    return number;
+}
+
 void ChannelChoice::find(const Edit& edit, const Name& name, Vector<IdStamp>& chans) {
     if (name.number == 0) {
         edit.getChans(chans, name.type);

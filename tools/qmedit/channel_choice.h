@@ -14,6 +14,8 @@ public:
 
     /// True if nothing was named, so that every channel takes part.
     [[nodiscard]] bool isEmpty() const { return m_names.empty(); }
+    /// The greatest number that stands with a type; 1 where only its letter does, 0 where neither does.
+    [[nodiscard]] int highest(Edit_Chan_Type type) const;
     /// Leaves selected what is named and there.
     void select(EditModule& module) const;
     /// Fails for a name that none of the edits has; null handles are passed over.

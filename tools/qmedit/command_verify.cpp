@@ -158,7 +158,10 @@ Command verifyCommand() {
     const auto arguments = std::make_shared<VerifyArguments>();
     return {"verify",
             "Check every edit file, backup and milestone of a project",
-            {{.name = "COOKIE", .value = &arguments->items, .help = "Only the files of these edits"},
+            {{.name = "COOKIE",
+              .value = &arguments->items,
+              .help = "Only the files of these edits",
+              .completes = Completes::Items},
              projectOption(arguments->project),
              jsonOption(arguments->json, "Write JSON: an array of files"),
              {.name = "--clean",
