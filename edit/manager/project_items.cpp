@@ -2,6 +2,7 @@
 
 #include "edit/manager/edit_record.h"
 #include "edit/manager/revision_chain.h"
+#include "edit/model/edit.h"
 #include "edit/persist/edit_salvage.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"

@@ -1,4 +1,5 @@
 #include "tests/tools/qmedit_fixture.h"
+#include "tools/qmedit/safe_text.h"
 
 namespace {
 
@@ -64,6 +65,14 @@ TEST_F(Qmedit, AnswersEveryUsageWithItsExitCodeAndStream) {
         EXPECT_NE(result.err.find(usage.error == nullptr ? "" : usage.error), String::npos) << result.err;
         EXPECT_TRUE(snapshot().empty()) << "no command but a good import makes a project";
     }
+}
+
+TEST(SafeText, WrapsAtBlanksAndNeverInsideAWord) {
+    EXPECT_EQ(safe_text::wrapped("one two three", 8, 0, 2), "one two\n  three");
+    EXPECT_EQ(safe_text::wrapped("one two", 8, 5, 5), "one\n     two") << "five columns were taken";
+    EXPECT_EQ(safe_text::wrapped("a muchtoolongword b", 8, 0, 1), "a\n muchtoolongword\n b");
+    EXPECT_EQ(safe_text::wrapped("é é é é", 7, 0, 0), "é é é é") << "columns count, not bytes";
+    EXPECT_EQ(safe_text::wrapped("", 7, 0, 0), "");
 }
 
 TEST_F(Qmedit, HelpOfEachCommandHasAnExampleOfIt) {

@@ -6,6 +6,8 @@
 #include "tools/qmedit/edit_place.h"
 #include "tools/qmedit/managed_edit.h"
 
+#include "edit/model/cue_list.h"
+#include "edit/model/edit.h"
 #include "interchange/marker_colour.h"
 
 #include <algorithm>

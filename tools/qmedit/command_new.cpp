@@ -5,6 +5,7 @@
 #include "tools/qmedit/interrupts.h"
 #include "tools/qmedit/project_session.h"
 
+#include "edit/model/edit.h"
 #include "edit/model/edit_keys.h"
 #include "interchange/import.h"
 #include "platform/services/current_project.h"

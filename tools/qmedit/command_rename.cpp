@@ -3,6 +3,8 @@
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/managed_edit.h"
 
+#include "edit/model/edit.h"
+
 #include <memory>
 
 namespace {

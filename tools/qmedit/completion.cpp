@@ -5,7 +5,9 @@
 
 #include "edit/editing/edit_operation.h"
 #include "edit/manager/revisions.h"
+#include "edit/model/edit.h"
 #include "interchange/marker_colour.h"
+#include "platform/store/configb.h"
 
 #include <completion_scripts.h>
 

@@ -5,9 +5,11 @@
 #include "tools/qmedit/spare_room.h"
 
 #include "edit/manager/revision_chain.h"
+#include "edit/model/edit.h"
 #include "edit/project/permissions_manager.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
+#include "platform/store/configb.h"
 
 namespace {
 
@@ -142,7 +144,8 @@ Qx::Status ManagedEdit::change(EditPtr& edit, const String& what, const std::fun
 
 String undoText(const ManagedEdit& managed, size_t numRedo) {
     return String::format("; %zu to undo", managed.numUndo()) +
-           (numRedo == 0 ? String() : String::format("; %zu redo backup%s went", numRedo, numRedo == 1 ? "" : "s"));
+           (numRedo == 0 ? String()
+                         : String::format("; %zu redo backup%s went", numRedo, numRedo == 1 ? "" : "s"));
 }
 
 size_t ManagedEdit::numUndo() const {
