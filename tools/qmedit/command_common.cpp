@@ -74,7 +74,7 @@ CommandOption strictOption(bool& strict, const char* help) {
 }
 
 CommandOption yesOption(bool& yes) {
-    return {.name = "--yes", .value = &yes, .help = "Do not ask, as a terminal is asked"};
+    return {.name = "--yes", .value = &yes, .help = "Do not ask first (only a terminal is asked)"};
 }
 
 int failed(const Qx::Status& status) {
