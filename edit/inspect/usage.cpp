@@ -1,5 +1,7 @@
 #include "edit/inspect/usage.h"
 
+#include "edit/manager/project_items.h"
+#include "edit/manager/revisions.h"
 #include "edit/model/cel.h"
 
 void addPlayed(const Edit& edit, std::unordered_set<cookie>& played) {
@@ -39,4 +41,31 @@ std::vector<ItemUser> findUsers(const cookie& item, const std::vector<cookie>& e
         }
     }
     return users;
+}
+
+UnusedItems findUnused(const std::vector<cookie>& candidates, const std::vector<cookie>& edits,
+                       const std::function<bool()>& cancelled) {
+    UnusedItems unused;
+    std::unordered_set<cookie> played;
+    for (const cookie& candidate : edits) {
+        if (cancelled && cancelled()) {
+            return unused;
+        }
+        const RevisionList list = revisionsOf(candidate);
+        unused.unread.insert(unused.unread.end(), list.unanswered.begin(), list.unanswered.end());
+        for (const Revision& revision : list.revisions) {
+            EditPtr edit;
+            if (const Qx::Status read = ProjectItems::readFile(revision.path, edit); read) {
+                addPlayed(*edit, played);
+            } else {
+                unused.unread.push_back(read.reason());
+            }
+        }
+    }
+    for (const cookie& item : candidates) {
+        if (!played.contains(item)) {
+            unused.items.push_back(item);
+        }
+    }
+    return unused;
 }

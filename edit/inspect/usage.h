@@ -27,3 +27,17 @@ struct ItemUser {
 [[nodiscard]] QM_API std::vector<ItemUser> findUsers(const cookie& item, const std::vector<cookie>& edits,
                                                      const EditReader& read,
                                                      const std::function<bool()>& cancelled = nullptr);
+
+/// Of some items, those that nothing plays.
+struct UnusedItems {
+    std::vector<cookie> items;
+    /// A sentence for each file that could not be read, so that it may play any of them.
+    std::vector<String> unread;
+};
+
+/// Looks for the items of `candidates` that no state of `edits` plays, of all that are on the disk: undo brings
+/// a backup back, recovery a milestone, each with what it plays. Nothing is changed. Stops early, with no item, when `cancelled`, which may be empty, answers true; it
+/// is asked before each edit.
+[[nodiscard]] QM_API UnusedItems findUnused(const std::vector<cookie>& candidates,
+                                            const std::vector<cookie>& edits,
+                                            const std::function<bool()>& cancelled = nullptr);

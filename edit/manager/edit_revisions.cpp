@@ -1,5 +1,6 @@
 #include "edit/manager/detail/manager_state.h"
 #include "edit/manager/revision_chain.h"
+#include "edit/manager/revisions.h"
 #include "edit/model/edit_keys.h"
 #include "edit/project/permissions_manager.h"
 #include "platform/services/config_int.h"
@@ -148,20 +149,13 @@ bool RevisionStep::hasRevision() const {
 
 /// What is carried over from the edit before the step.
 bool RevisionStep::remember() {
-    ManagerState& state = managerState();
     const SectionHold section(m_before);
     if (!section.isHeld()) {
         return false;
     }
     m_celCuesLoaded = m_before->get_cel_cues_loaded();
     m_owner = m_before->getOwner();
-    m_description = m_before->getChangeDescription();
-    const ManagerState::Hold hold(state.lock);
-    const ManagerState::CachedEdit* const entry = state.findCacheEntry(m_item);
-    // The description of a revision that was brought back is that of bringing it back.
-    if (entry != nullptr && entry->step && entry->step->said == m_description) {
-        m_description = entry->step->own;
-    }
+    m_description = ownChangeOf(std::as_const(*m_before).Opts());
     return true;
 }
 
@@ -284,21 +278,19 @@ void RevisionStep::carryOver() {
 
 /// Says of the edit which change was undone or redone. That counts as a change and reaches its file.
 void RevisionStep::describe() {
-    ManagerState& state = managerState();
     const SectionHold section(m_after);
     if (!section.isHeld()) {
         return;
     }
-    const EditModification own = m_after->getChangeDescription();
+    const EditModification own = ownChangeOf(std::as_const(*m_after).Opts());
     const EditModification said = m_code == kRevisionUndo ? m_description.invert() : own;
     if (m_wasClean) {
         m_after->resetChangeDescription();
     }
     m_after->setChangeDescription(said, true);
-    const ManagerState::Hold hold(state.lock);
-    ManagerState::CachedEdit* const entry = state.findCacheEntry(m_item);
-    if (entry != nullptr && entry->edit == m_after && m_wasClean) {
-        entry->step = {own, said};
+    // The description is that of the step; whoever undoes this state wants to know what made it.
+    if (m_wasClean) {
+        EditKeys::kOwnChange.set(m_after->Opts(), own.asString());
     }
 }
 

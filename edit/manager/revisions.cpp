@@ -4,6 +4,7 @@
 #include "edit/manager/folder_names.h"
 #include "edit/manager/milestone_ring.h"
 #include "edit/manager/revision_chain.h"
+#include "edit/model/edit_keys.h"
 #include "edit/model/edit_modification.h"
 #include "edit/persist/edit_salvage.h"
 #include "platform/services/edit_filenames.h"
@@ -34,7 +35,9 @@ void readHeader(Revision& revision) {
     const configb& header = proxy->header();
     revision.name = header.getString("NAME");
     revision.modifications = header.getInt64("MOD_COUNT", 0);
-    revision.change = changeText(EditModification::fromString(header.getString("CHANGE_DESCRIPTION")));
+    revision.change = changeText(revision.kind == Revision::Itself
+                                     ? EditModification::fromString(EditKeys::kChangeDescription.get(header))
+                                     : ownChangeOf(header));
     if (const int64_t time = header.getInt("MODIFICATION_TIME"); time > 0) {
         revision.time = time;
     }
@@ -166,6 +169,12 @@ const Revision* RevisionList::newestSound() const {
 
 RevisionList revisionsOf(const cookie& item) {
     return Gathering(item).run();
+}
+
+EditModification ownChangeOf(const configb& header) {
+    return EditModification::fromString(header.contains(EditKeys::kOwnChange)
+                                            ? EditKeys::kOwnChange.get(header)
+                                            : EditKeys::kChangeDescription.get(header));
 }
 
 String changeText(const EditModification& change) {

@@ -8,6 +8,7 @@
 #include <vector>
 
 class EditModification;
+class configb;
 
 /// One file that holds a state of an edit: its own, a backup, a milestone, or one that was set aside.
 struct Revision {
@@ -20,7 +21,8 @@ struct Revision {
     int64_t time = 0;  ///< of the last change, seconds since 1970: the edit's own where it can be read
     Qx::FileInfo file; ///< what lay at `path` when it was checked; of kind Unknown where that is not known
     int64_t modifications = 0;
-    String change; ///< what the last change was; empty where that is not told
+    String change; ///< what the last change was, of another state than the edit's own the one that made it;
+                   ///< empty where that is not told
     String damage; ///< why it cannot be taken; empty for a sound one
     bool refused =
         false; ///< `damage` may not be the file's: it cannot be read here, or is of a later version
@@ -48,6 +50,10 @@ struct QM_API RevisionList {
 /// and opened by nobody; nothing is changed. Who wants the list to stay true holds the writers' lock
 /// (`EditManagerLock`).
 [[nodiscard]] QM_API RevisionList revisionsOf(const cookie& item);
+
+/// The change that made the state of an edit, by its header: its description, but where an undo or redo led
+/// back to the state the one that made it first. Of type `kNotDescribed` where that is not told.
+[[nodiscard]] QM_API EditModification ownChangeOf(const configb& header);
 
 /// What `Revision::change` says of a description: a word such as "insert"; empty for none.
 [[nodiscard]] QM_API String changeText(const EditModification& change);

@@ -173,6 +173,7 @@ void Edit::writeDescription() {
     const QuietHeader quiet(*this);
     const bool wasDirty = m_header.isDirty();
     EditKeys::kChangeDescription.set(m_header, m_changes.getValue().asString());
+    m_header.remove(EditKeys::kOwnChange);
     incModificationCount();
     m_header.setDirty(wasDirty);
 }
@@ -188,6 +189,7 @@ void Edit::resetChangeDescription() {
     const bool wasDirty = m_header.isDirty();
     m_changes.setValueSilently(kInitial);
     m_header.remove(EditKeys::kChangeDescription);
+    m_header.remove(EditKeys::kOwnChange);
     m_header.setDirty(wasDirty);
 }
 

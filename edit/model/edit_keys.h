@@ -61,6 +61,7 @@ inline constexpr Row kTable[] = {
     {"MODIFICATION_PROGRAM", Type::Text, 0, Role::Bookkeeping},
     {"MOD_COUNT", Type::Int64, 0, Role::Bookkeeping},
     {"CHANGE_DESCRIPTION", Type::Text, 0, Role::Bookkeeping},
+    {"OWN_CHANGE", Type::Text, 0, Role::Bookkeeping},
     {"MILESTONE", Type::Int64, 0, Role::Bookkeeping},
     {"CLIPBOARD_USED", Type::Int, 0, Role::Bookkeeping},
     // What it is counted and played by
@@ -180,6 +181,8 @@ inline constexpr Key<int> kModificationTimeV3{"MOD_TIME_V3"};
 inline constexpr Key<String> kModificationProgram{"MODIFICATION_PROGRAM"};
 inline constexpr Key<int64_t> kModificationCount{"MOD_COUNT"};
 inline constexpr Key<String> kChangeDescription{"CHANGE_DESCRIPTION"};
+/// The change that made the state, where an undo or redo led back to it and the description tells of that.
+inline constexpr Key<String> kOwnChange{"OWN_CHANGE"};
 inline constexpr Key<int64_t> kMilestone{"MILESTONE"};
 inline constexpr Key<int> kClipboardUsed{"CLIPBOARD_USED"};
 inline constexpr Key<int> kRevision{"ED2_REVISION"};

@@ -16,6 +16,24 @@ file(MAKE_DIRECTORY ${WORK}/program ${WORK}/ran)
 set(prefix ${WORK}/prefix)
 run_step("installing" ${CMAKE_COMMAND} --install ${BUILD} --prefix ${prefix})
 
+# What goes with the command line lies where the shells and `man` look for it.
+if(EXISTS ${prefix}/bin/qmedit)
+    foreach(shell bash-completion/completions/qmedit zsh/site-functions/_qmedit fish/vendor_completions.d/qmedit.fish)
+        file(STRINGS ${prefix}/share/${shell} asks REGEX "--complete")
+        if(NOT asks)
+            message(FATAL_ERROR "the completion ${shell} does not ask qmedit")
+        endif()
+    endforeach()
+    file(STRINGS ${SOURCE}/docs/qmedit.md sections REGEX "^## ")
+    file(STRINGS ${prefix}/share/man/man1/qmedit.1 page REGEX "^\\.SH ")
+    list(LENGTH sections expected)
+    list(LENGTH page found)
+    math(EXPR expected "${expected} + 2") # NAME and DESCRIPTION
+    if(NOT found EQUAL expected)
+        message(FATAL_ERROR "the manual page has ${found} sections, not ${expected}")
+    endif()
+endif()
+
 # The C++ blocks of a page of the manual: <prefix>1, <prefix>2, ... and their number, <prefix>count.
 function(cpp_blocks page prefix)
     file(READ ${SOURCE}/${page} rest)

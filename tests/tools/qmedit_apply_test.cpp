@@ -105,13 +105,14 @@ TEST_F(QmeditApply, WhatIsWrongIsNamedAndChangesNothing) {
     struct Case {
         std::vector<std::string> arguments;
         int code;
-        const char* text;
+        std::string text;
     };
     const Case cases[] = {
         {{"apply", "move", "--to", m_edit}, 2, "is no operation"},
         {{"apply", "0", "--to", m_edit}, 2, "is no operation"},
         {{"apply", "insert", "--to", m_edit}, 2, "--from"},
-        {{"apply", "lift", "--to", "E0"}, 2, "is no cookie"},
+        {{"apply", "lift", "--to", "E0@1s-2s"}, 1, "'E0' is neither the cookie nor the name"},
+        {{"apply", "lift", "--to", m_edit + "@1s-2s", "--channels", "V9"}, 1, "there is no V9: " + m_edit},
         {{"apply", "lift", "--to", m_edit + "@1s-"}, 2, "lacks a time"},
         {{"apply", "lift", "--to", m_edit + "@1s-2s", "--channels", "X"}, 2, "names no channel"},
         {{"apply", "lift", "--to", "E0ZZZ000@1s-2s"}, 1, "there is no edit"},
@@ -120,7 +121,7 @@ TEST_F(QmeditApply, WhatIsWrongIsNamedAndChangesNothing) {
         {{"apply", "lift", "--dry-run", "--to", m_edit + "@3s"}, 1, "two different marks"},
         {{"apply", "lift", "--dry-run", "--to", m_edit + "@3s-3s"}, 1, "two different marks"},
         {{"apply", "lift", "--dry-run", "--to", m_edit}, 1, "no marked region"},
-        {{"diff", m_edit, "nothing.qme"}, 1, "neither a cookie of the project"},
+        {{"diff", m_edit, "nothing.qme"}, 1, "neither an edit of the project"},
     };
     for (const Case& its : cases) {
         const test::ProgramResult result = run(its.arguments);

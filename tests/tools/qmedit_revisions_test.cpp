@@ -119,7 +119,7 @@ TEST_F(QmeditRevisions, ABackupLeavesTheEditInItsPlace) {
     done({"undo", item});
     const std::string before = bytesOf(fileOf(item));
     const String line = done({"backup", item});
-    EXPECT_TRUE(has(line, "1 redo backups went")) << line;
+    EXPECT_TRUE(has(line, "1 redo backup went")) << line;
     EXPECT_EQ(whiches(item), "edit U1");
     EXPECT_EQ(bytesOf(fileOf(item, ".U1")), before);
     EXPECT_EQ(nameOf(item), "Short");

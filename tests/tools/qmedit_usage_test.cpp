@@ -1,4 +1,5 @@
 #include "tests/tools/qmedit_fixture.h"
+#include "tools/qmedit/safe_text.h"
 
 namespace {
 
@@ -19,24 +20,30 @@ TEST_F(Qmedit, AnswersEveryUsageWithItsExitCodeAndStream) {
         {{"demo", "--help"}, 0, nullptr},
         {{"completion", "bash"}, 0, nullptr},
         {{}, 2, "name a command"},
+        {{"help"}, 0, nullptr},
+        {{"help", "marker", "add"}, 0, nullptr},
         {{"no-such-command"}, 2, "no-such-command"},
+        {{"shwo"}, 2, "there is no command 'shwo'; did you mean 'show'?"},
+        {{"help", "shwo"}, 2, "did you mean 'show'?"},
+        {{"marker"}, 2, "qmedit help marker"},
+        {{"marker", "romove"}, 2, "did you mean 'remove'?"},
+        {{"show", "x", "--jsno"}, 2, "has no option --jsno; did you mean '--json'?"},
+        {{"apply", "repalce", "--to", "x"}, 2, "did you mean 'Replace'?"},
+        {{"new", ""}, 2, "NAME"},
+        {{"rename", "x", "a\nb"}, 2, "control characters"},
         {{"--no-such-option"}, 2, "--no-such-option"},
-        {{"list", "--rate", "25"}, 2, "qmedit list --help"},
+        {{"list", "--rate", "25"}, 2, "qmedit help list"},
         {{"import"}, 2, "FILE"},
         {{"import", "a.edl", "b.edl"}, 2, "b.edl"},
         {{"import", "a.edl", "--rate", "26"}, 2, "26"},
         {{"import", "a.edl", "--project", ""}, 2, "--project"},
         {{"show"}, 2, "COOKIE"},
-        {{"show", "E000100"}, 2, "E000100"},
-        {{"show", "../E0001000"}, 2, "no cookie"},
         {{"show", "E0001000", "--json", "--events"}, 2, "--events"},
-        {{"header", "?"}, 2, "no cookie"},
         {{"completion", "csh"}, 2, "csh"},
         {{"list"}, 1, "no project"},
         {{"show", "E0001000"}, 1, "no project"},
         {{"header", "E0001000"}, 1, "no project"},
         {{"undo"}, 2, "COOKIE"},
-        {{"backup", "../E0001000"}, 2, "no cookie"},
         {{"recover", "E0001000", "--from"}, 2, "--from"},
         {{"history", "E0001000"}, 1, "no project"},
         {{"backup", "E0001000"}, 1, "no project"},
@@ -60,15 +67,45 @@ TEST_F(Qmedit, AnswersEveryUsageWithItsExitCodeAndStream) {
     }
 }
 
+TEST(SafeText, WrapsAtBlanksAndNeverInsideAWord) {
+    EXPECT_EQ(safe_text::wrapped("one two three", 8, 0, 2), "one two\n  three");
+    EXPECT_EQ(safe_text::wrapped("one two", 8, 5, 5), "one\n     two") << "five columns were taken";
+    EXPECT_EQ(safe_text::wrapped("a muchtoolongword b", 8, 0, 1), "a\n muchtoolongword\n b");
+    EXPECT_EQ(safe_text::wrapped("é é é é", 7, 0, 0), "é é é é") << "columns count, not bytes";
+    EXPECT_EQ(safe_text::wrapped("", 7, 0, 0), "");
+}
+
 TEST_F(Qmedit, HelpOfEachCommandHasAnExampleOfIt) {
-    for (const std::string command :
-         {"import", "export", "list", "show", "header", "apply", "diff", "verify", "salvage", "history",
-          "backup", "undo", "redo", "recover", "delete", "flush", "demo", "completion"}) {
+    std::vector<String> commands;
+    for (const String& line : run({"--complete", ""}).out.split('\n', true)) {
+        commands.push_back(line.substr(0, line.find('\t')));
+    }
+    ASSERT_GT(commands.size(), 20u);
+    for (const String& command : commands) {
         const String help = run({command, "--help"}).out;
         const size_t example = help.find("Example:");
         ASSERT_NE(example, String::npos) << command;
         EXPECT_NE(help.find("qmedit " + command, example), String::npos) << command;
     }
+}
+
+TEST_F(Qmedit, ANameStandsForACookieWhereOneIsAskedFor) {
+    const String item = imported(kShortList);
+    const String shown = run({"show", item}).out;
+    EXPECT_EQ(run({"show", "Short"}).out, shown);
+    EXPECT_EQ(run({"show", "sHORT"}).out, shown) << "in any case";
+    EXPECT_EQ(run({"header", "gulls", "NAME"}).out, "gulls\n") << "a shot";
+    EXPECT_EQ(run({"apply", "lift", "--dry-run", "--to", "Short@1s-2s"}).code, 0);
+    EXPECT_EQ(run({"backup", "short"}).code, 0);
+    EXPECT_EQ(run({"diff", "Short.u1", "Short"}).out, "the same\n");
+
+    const test::ProgramResult misspelt = run({"show", "Shrot"});
+    EXPECT_EQ(misspelt.code, 1);
+    EXPECT_NE(misspelt.err.find("did you mean 'Short'?"), String::npos) << misspelt.err;
+    const String second = imported(kShortList);
+    const test::ProgramResult several = run({"show", "Short"});
+    EXPECT_EQ(several.code, 1);
+    EXPECT_NE(several.err.find(item + ", " + second), String::npos) << several.err;
 }
 
 TEST_F(Qmedit, SaysSoWhenStandardOutputIsFull) {
@@ -78,13 +115,51 @@ TEST_F(Qmedit, SaysSoWhenStandardOutputIsFull) {
     EXPECT_NE(result.err.find("standard output"), String::npos) << result.err;
 }
 
-TEST_F(Qmedit, CompletesCommandsOptionsAndCookiesInBash) {
+TEST_F(Qmedit, CompletesFromTheCommandsAndTheProject) {
     const String item = imported(kShortList);
+    run({"backup", item});
+    const auto answered = [&](std::vector<std::string> words) {
+        words.insert(words.begin(), "--complete");
+        const test::ProgramResult result = run(std::move(words));
+        EXPECT_EQ(result.code, 0);
+        String all;
+        for (const String& line : result.out.split('\n', true)) {
+            all += (all.empty() ? "" : " ") + String(line.substr(0, line.find('\t')));
+        }
+        return all;
+    };
+    const std::vector<std::pair<std::vector<std::string>, String>> cases = {
+        {{"sh"}, "show"},
+        {{"marker", "re"}, "remove"},
+        {{"import", "--str"}, "--strict"},
+        {{"import", ""}, ":files"},
+        {{"list", "--project", ""}, ":folders"},
+        {{"import", "x", "--rate", "29"}, "29.97"},
+        {{"show", "sho"}, "Short"},
+        {{"show", "--json", "gul"}, "gulls"},
+        {{"show", item, ""}, ""},
+        {{"verify", item, item.lower()}, item},
+        {{"header", "Short", "frame_r"}, "FRAME_RATE"},
+        {{"recover", item, "--from", "u"}, "U1"},
+        {{"recover", "--from", "U1", item}, item},
+        {{"apply", "replace-m"}, "replace-marked replace-material"},
+        {{"marker", "add", item + "@1s", "text", "--colour", "r"}, "RED"},
+        {{"completion", ""}, "bash zsh fish"},
+        {{"no-such-command", ""}, ""},
+    };
+    for (const auto& [words, expected] : cases) {
+        EXPECT_EQ(answered(words), expected) << words.front() << " ... " << words.back();
+    }
+}
+
+TEST_F(Qmedit, TheShellsHandTheirWordsToTheCompletion) {
+    const String item = imported(kShortList);
+    run({"rename", item, "Market Day"});
     const String script = folder.write("completion.bash", run({"completion", "bash"}).out);
     const auto completed = [&](const std::string& words, int count) {
         const std::string commands = "source " + script + "; COMP_WORDS=(" + words +
                                      "); COMP_CWORD=" + std::to_string(count) +
-                                     "; _qmedit; echo ${COMPREPLY[@]}";
+                                     "; _qmedit; echo \"${COMPREPLY[@]}\"";
         const auto result = test::runProgram("/bin/bash", {"--norc", "-c", commands},
                                              {{"QMEDIT_PROJECT=" + project(), "PATH=/usr/bin:/bin"}, {}});
         EXPECT_EQ(result.err, "");
@@ -92,13 +167,9 @@ TEST_F(Qmedit, CompletesCommandsOptionsAndCookiesInBash) {
     };
     const std::string program = QMEDIT_PROGRAM;
     EXPECT_EQ(completed(program + " sh", 1), "show");
-    EXPECT_EQ(completed(program + " import --str", 2), "--strict");
-    EXPECT_EQ(completed(program + " show ''", 2).find("E0001000"), 0u);
     EXPECT_EQ(completed(program + " header " + item, 2), item);
-    EXPECT_EQ(completed(program + " import x --rate 29", 4), "29.97");
-    EXPECT_EQ(completed(program + " undo " + item, 2), item);
-    run({"backup", item});
-    EXPECT_EQ(completed(program + " recover " + item + " --from u", 4), "U1");
+    EXPECT_EQ(completed(program + " undo mark", 2), "Market\\ Day");
+    EXPECT_EQ(completed(program + " import " + script.substr(0, script.size() - 4), 2), script);
 }
 
 } // namespace

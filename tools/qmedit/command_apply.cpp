@@ -1,3 +1,4 @@
+#include "tools/qmedit/channel_choice.h"
 #include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
@@ -6,10 +7,10 @@
 #include "tools/qmedit/managed_edit.h"
 #include "tools/qmedit/project_session.h"
 #include "tools/qmedit/spare_room.h"
+#include "tools/qmedit/suggestion.h"
 
 #include "edit/editing/editor.h"
 #include "edit/manager/edit_manager.h"
-#include "edit/model/channel_mask.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 
@@ -54,16 +55,6 @@ Qx::Status markModule(Side& side) {
     return {};
 }
 
-/// Leaves selected what a set of channels names: bit 0 the picture, with its effects, bit n sound channel n.
-void selectChannels(EditModule& module, const channel_mask& mask) {
-    Vector<IdStamp> chans;
-    module.getEdit()->getChans(chans, AudioChan);
-    module.selectChans(mask.has_video(), VideoChan, Edit_Chan_SubType::ANY);
-    for (size_t i = 0; i < chans.size(); ++i) {
-        module.selectChan(chans[i], mask.get(static_cast<int>(i) + 1));
-    }
-}
-
 void reportResult(const Edit& edit, const EditReport& before, const EditReport& after, edit_operation op,
                   const Editor::Result& result) {
     const EditDiff diff = diffOf(before, after);
@@ -84,10 +75,13 @@ void reportResult(const Edit& edit, const EditReport& before, const EditReport& 
     }
 }
 
-Qx::Status readSides(const ProjectSession& session, bool managed, bool hasSource, Side& to, Side& from) {
+Qx::Status readSides(ProjectSession& session, bool managed, bool hasSource, Side& to, Side& from) {
     for (Side* side : {&to, &from}) {
         if (side == &from && !hasSource) {
             continue;
+        }
+        if (Qx::Status found = session.findItem(side->place.name, side->place.item); !found) {
+            return found;
         }
         const cookie& item = side->place.item;
         // The file is looked at first, so that one that does not read stays as it is. One that is away comes
@@ -133,16 +127,18 @@ String letGo(const cookie& item, Side& to, Side& from) {
     return putFileBack(item, to.edit);
 }
 
-int applyOperation(ProjectSession& session, const ApplyOptions& options, edit_operation op, Side& to,
-                   Side& from) {
+int applyOperation(ProjectSession& session, const ApplyOptions& options, edit_operation op,
+                   const ChannelChoice& channels, Side& to, Side& from) {
     if (Qx::Status read = readSides(session, !options.dryRun, !options.from.empty(), to, from); !read) {
         return failed(read);
     }
-    if (!options.channels.empty()) {
-        const channel_mask mask(options.channels.c_str());
-        selectChannels(to.module, mask);
+    if (!channels.isEmpty()) {
+        if (const Qx::Status there = channels.check({to.edit, from.edit}); !there) {
+            return failed(there);
+        }
+        channels.select(to.module);
         if (from.edit.valid()) {
-            selectChannels(from.module, mask);
+            channels.select(from.module);
         }
     }
     const cookie item = to.place.item;
@@ -182,11 +178,14 @@ int runApply(const ApplyOptions& options) {
     Side to;
     Side from;
     if (!editOperationFromText(options.operation, op) || op == edit_operation::NoOperation) {
-        String names;
+        std::vector<String> names;
+        String all;
         for (int i = 1; i < kNumEditOperations; ++i) {
-            names += (i > 1 ? ", " : "") + String(editOperationName(static_cast<edit_operation>(i)));
+            names.emplace_back(editOperationName(static_cast<edit_operation>(i)));
+            all += (all.empty() ? "" : ", ") + names.back();
         }
-        reportError("'" + options.operation + "' is no operation; the operations are " + names);
+        reportError("'" + options.operation + "' is no operation" +
+                    didYouMean(options.operation, names, "; the operations are " + all));
         return kWrongUsage;
     }
     for (const auto& [text, side] : {std::pair(&options.to, &to), std::pair(&options.from, &from)}) {
@@ -196,10 +195,9 @@ int runApply(const ApplyOptions& options) {
             return kWrongUsage;
         }
     }
-    if (!options.channels.empty() && channel_mask(options.channels.c_str()).num_set() == 0) {
-        reportError("'" + options.channels +
-                    "' names no channel; write V for the picture and A with a number "
-                    "for a sound channel, as in VA1A2");
+    ChannelChoice channels;
+    if (const Qx::Status read = ChannelChoice::parse(options.channels, channels); !read) {
+        reportError(read.reason());
         return kWrongUsage;
     }
     if (editOpRequiresSourceAndDest(op) && options.from.empty()) {
@@ -211,7 +209,7 @@ int runApply(const ApplyOptions& options) {
         return failed(opened);
     }
     if (options.dryRun) {
-        return applyOperation(session, options, op, to, from);
+        return applyOperation(session, options, op, channels, to, from);
     }
     if (const Qx::Status created = session.create(); !created) {
         return failed(created);
@@ -221,7 +219,7 @@ int runApply(const ApplyOptions& options) {
         return failed(locked);
     }
     session.manage();
-    const int code = applyOperation(session, options, op, to, from);
+    const int code = applyOperation(session, options, op, channels, to, from);
     // The edits are let go before the manager closes them.
     to = {};
     from = {};
@@ -237,24 +235,25 @@ Command applyCommand() {
             {{.name = "OPERATION",
               .value = &options->operation,
               .help = "Its name or number: replace, insert, remove, lift, ...",
-              .required = true},
+              .required = true,
+              .completes = Completes::Operations},
              {.name = "--to",
               .value = &options->to,
               .help = "The edit that is changed, with its marks",
               .form = "COOKIE[@IN[-OUT]]",
-              .required = true},
+              .required = true,
+              .completes = Completes::Items},
              {.name = "--from",
               .value = &options->from,
               .help = "The source, with its marks; all of it without",
-              .form = "COOKIE[@IN-OUT]"},
+              .form = "COOKIE[@IN-OUT]",
+              .completes = Completes::Items},
              {.name = "--channels",
               .value = &options->channels,
               .help = "The channels of both edits that take part, else all",
               .form = "VA1A2"},
              projectOption(options->project),
-             {.name = "--dry-run",
-              .value = &options->dryRun,
-              .help = "Show what would come of it and change nothing"}},
+             dryRunOption(options->dryRun)},
             "Example:\n  qmedit apply insert --from E0002000@5s-8s --to E0001000@10:00:05:00\n\n"
             "A time is record timecode, frames (125f) or seconds (5s) from the edit's beginning. The edit "
             "is backed up before.",

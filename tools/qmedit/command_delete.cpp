@@ -1,12 +1,12 @@
 #include "tools/qmedit/command_line.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
+#include "tools/qmedit/deletion.h"
 #include "tools/qmedit/interrupts.h"
 #include "tools/qmedit/managed_edit.h"
 #include "tools/qmedit/revision_text.h"
 
 #include "edit/inspect/usage.h"
-#include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 
 #include <memory>
@@ -15,6 +15,8 @@ namespace {
 
 struct DeleteArguments : EditArguments {
     bool force = false;
+    bool dryRun = false;
+    bool yes = false;
 };
 
 /// Why an edit is still wanted: another one plays it, or may play it as nobody can read that. Empty if none
@@ -55,44 +57,71 @@ void reportRest(const cookie& item) {
     }
 }
 
+/// Says what goes, on standard error.
+String goingText(const ProjectSession& session, const cookie& item) {
+    EditPtr edit;
+    const bool isRead = session.readEdit(item, edit).isOk();
+    String text = item.asString() + (isRead ? " '" + edit->getName() + "'" : String()) + ":";
+    for (const String& file : edit_manager::getEditFiles(item)) {
+        text += " " + Qx::fileNameOf(file);
+    }
+    return text;
+}
+
+/// Fails where an edit plays the item, or may.
+Qx::Status checkUnplayed(ProjectSession& session, const DeleteArguments& arguments, const cookie& item) {
+    String players;
+    if (Qx::Status looked = arguments.force ? Qx::Status() : findPlayers(session, item, players); !looked) {
+        return looked;
+    }
+    return players.empty() ? Qx::Status()
+                           : Qx::Status::failure(item.asString() + " was not deleted: it is played by " +
+                                                 players + "; --force deletes it all the same");
+}
+
+/// Shows what would go, and asks unless that was answered with --yes. Nobody else is kept waiting meanwhile:
+/// what is asked here is looked at again under the writers' lock.
+int showAndAsk(const DeleteArguments& arguments, bool& isMeant) {
+    ProjectSession session(arguments.project);
+    cookie item;
+    Qx::Status status = session.openExisting();
+    if (status) {
+        status = session.findItem(arguments.item, item);
+    }
+    if (status && edit_manager::getEditFiles(item).empty()) {
+        EditPtr none;
+        status = session.readEdit(item, none);
+    }
+    if (status) {
+        status = checkUnplayed(session, arguments, item);
+    }
+    if (!status) {
+        return failed(status);
+    }
+    reportProgress((arguments.dryRun ? "would delete " : "deleting ") + goingText(session, item));
+    isMeant = !arguments.dryRun && (arguments.yes || confirmed("Delete it?"));
+    return isMeant || arguments.dryRun ? kDone : failed(Qx::Status::failure("nothing was deleted"));
+}
+
 int runDelete(const DeleteArguments& arguments) {
+    bool isMeant = false;
+    if (const int code = showAndAsk(arguments, isMeant); code != kDone || !isMeant) {
+        return code;
+    }
     ManagedEdit managed(arguments);
     if (const int code = managed.prepare(); code != kDone) {
         return code;
     }
     const cookie& item = managed.item();
-    if (!arguments.force) {
-        String players;
-        if (const Qx::Status looked = findPlayers(managed.session(), item, players); !looked) {
-            return failed(looked);
-        }
-        if (!players.empty()) {
-            return failed(Qx::Status::failure(item.asString() + " was not deleted: it is played by " +
-                                              players + "; --force deletes it all the same"));
-        }
+    if (const Qx::Status unplayed = checkUnplayed(managed.session(), arguments, item); !unplayed) {
+        return failed(unplayed);
     }
-    EditPtr edit;
-    const bool isRead = managed.session().readEdit(item, edit).isOk();
-    const Vector<String> files = edit_manager::getEditFiles(item);
-    String names;
-    for (const String& file : files) {
-        names += " " + Qx::fileNameOf(file);
-    }
-    reportProgress("deleting " + item.asString() + (isRead ? " '" + edit->getName() + "'" : String()) + ":" +
-                   names);
-    edit.invalidate();
-    if (!edit_manager::delete_edit_file_and_backups(item, false)) {
-        const Vector<String> left = edit_manager::getEditFiles(item);
-        return failed(Qx::Status::failure(
-            left.size() == files.size()
-                ? item.asString() + " could not be deleted and is as it was; see whether the project can be "
-                                    "written (QMEDIT_LOG=1 tells more)"
-                : String::format("%zu of %zu files of ", left.size(), files.size()) + item.asString() +
-                      " could not be deleted; see whether they can be written, and delete it again"));
+    const size_t count = edit_manager::getEditFiles(item).size();
+    if (const Qx::Status deleted = deleteKeeping(managed.session(), item, arguments.force); !deleted) {
+        return failed(deleted);
     }
     reportRest(item);
-    writeOut(item.asString() +
-             String::format(": deleted with %zu file%s\n", files.size(), files.size() == 1 ? "" : "s"));
+    writeOut(item.asString() + String::format(": deleted with %zu file%s\n", count, count == 1 ? "" : "s"));
     return kDone;
 }
 
@@ -100,14 +129,18 @@ int runDelete(const DeleteArguments& arguments) {
 
 Command deleteCommand() {
     const auto arguments = std::make_shared<DeleteArguments>();
-    return {"delete",
-            "Delete an edit with all its backups",
-            {cookieOption(arguments->item),
-             projectOption(arguments->project),
-             {.name = "--force",
-              .value = &arguments->force,
-              .help = "Also a shot that an edit of the project plays"}},
-            "Example:\n  qmedit delete E0001000\n\n"
-            "There is no way back but by milestones, which stay.",
-            [arguments] { return runDelete(*arguments); }};
+    return {
+        "delete",
+        "Delete an edit with all its backups",
+        {cookieOption(arguments->item),
+         projectOption(arguments->project),
+         {.name = "--force",
+          .value = &arguments->force,
+          .help = "Also a shot that an edit of the project plays, and where no milestone can be made"},
+         dryRunOption(arguments->dryRun),
+         yesOption(arguments->yes)},
+        "Example:\n  qmedit delete E0001000\n\n"
+        "Its backups go too. Milestones stay, and its present state becomes one: 'qmedit recover' brings it "
+        "back.",
+        [arguments] { return runDelete(*arguments); }};
 }

@@ -19,24 +19,29 @@ struct DiffOptions {
     bool json = false;
 };
 
-/// Reads an edit by its cookie from the project, one of its states as "COOKIE.U1", else a file by its path,
-/// whatever its name: backups, milestones and copies are edit files too. `store` becomes its file, and empty
-/// where that is legacy text.
-Qx::Status readItem(const ProjectSession& session, const String& name, bool hasProject, EditPtr& edit,
+/// Reads an edit of the project by its cookie or name, one of its states as "COOKIE.U1", or a file by its
+/// path, whatever its name: backups, milestones and copies are edit files too. `store` becomes its file, and
+/// empty where that is legacy text.
+Qx::Status readItem(ProjectSession& session, const String& name, bool hasProject, EditPtr& edit,
                     String& store) {
-    const cookie item(name, true);
-    if (item.isStorable() && hasProject) {
+    const bool isFile = Qx::askFile(name).isRegular();
+    cookie item(name, true);
+    if (hasProject && (item.isStorable() || !isFile) && session.findItem(name, item)) {
         store = ProjectSession::fileOf(item);
         return session.readEdit(item, edit);
     }
     String path = name;
-    const cookie stated(std::string_view(name).substr(0, name.find('.')), true);
-    if (!Qx::askFile(name).isRegular() && hasProject && stated.isStorable()) {
-        path = getFilenameForCookie(stated) + String(name.substr(name.find('.'))).upper();
+    // A name may have dots too, and so has "CORRUPT.1".
+    for (size_t dot = name.find('.'); hasProject && !isFile && dot != String::npos;
+         dot = name.find('.', dot + 1)) {
+        if (session.findItem(name.substr(0, dot), item)) {
+            path = getFilenameForCookie(item) + String(name.substr(dot)).upper();
+            break;
+        }
     }
     if (!Qx::askFile(path).isRegular()) {
         return Qx::Status::failure("'" + name +
-                                   "' is neither a cookie of the project, nor a state of one such as "
+                                   "' is neither an edit of the project, nor a state of one such as "
                                    "E0001000.U1, nor a file");
     }
     if (getEditFileTypeFromFileName(Qx::widen(path)) == kLegacyTextFile) {
@@ -121,12 +126,14 @@ Command diffCommand() {
           .value = &options->before,
           .help = "An edit of the project, or an edit file",
           .form = "COOKIE|FILE",
-          .required = true},
+          .required = true,
+          .completes = Completes::Items},
          {.name = "AFTER",
           .value = &options->after,
           .help = "The edit to compare with it",
           .form = "COOKIE|FILE",
-          .required = true},
+          .required = true,
+          .completes = Completes::Items},
          projectOption(options->project),
          jsonOption(options->json, "Write JSON")},
         "Example:\n  qmedit diff E0001000 /backup/E0001000.qme\n\n"

@@ -52,12 +52,15 @@ Qx::Status writeForm(const ExportArguments& arguments, const String& form, const
 int runExport(const ExportArguments& arguments) {
     cookie item;
     String form;
-    if (!readCookie(arguments.item, item) || !readForm(arguments.file, form)) {
+    if (!readForm(arguments.file, form)) {
         return kWrongUsage;
     }
     ProjectSession session(arguments.project);
     if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
+    if (const Qx::Status found = session.findItem(arguments.item, item); !found) {
+        return failed(found);
     }
     EditPtr edit;
     if (const Qx::Status read = session.readEdit(item, edit); !read) {
@@ -86,11 +89,10 @@ Command exportCommand() {
              {.name = "FILE",
               .value = &arguments->file,
               .help = "The file to write, replaced if it is there; its extension says its form",
-              .required = true},
+              .required = true,
+              .completes = Completes::Files},
              projectOption(arguments->project),
-             {.name = "--strict",
-              .value = &arguments->strict,
-              .help = "Write nothing if anything of the edit would be lost"},
+             strictOption(arguments->strict, "Write nothing if anything of the edit would be lost"),
              {.name = "--crlf", .value = &arguments->crlf, .help = "End the lines of an EDL with CR and LF"}},
             "Example:\n  qmedit export E0001000 reel2.edl\n\n"
             "What the form cannot hold goes to standard error, a line each.",

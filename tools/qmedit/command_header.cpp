@@ -35,12 +35,12 @@ String headerTable(const configb& header, const std::vector<String>& keys, const
 
 int runHeader(const HeaderOptions& options) {
     cookie item;
-    if (!readCookie(options.item, item)) {
-        return kWrongUsage;
-    }
     ProjectSession session(options.project);
     if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
+    if (const Qx::Status found = session.findItem(options.item, item); !found) {
+        return failed(found);
     }
     EditPtr edit;
     if (const Qx::Status read = session.readEdit(item, edit); !read) {
@@ -71,13 +71,15 @@ int runHeader(const HeaderOptions& options) {
 
 Command headerCommand() {
     const auto options = std::make_shared<HeaderOptions>();
-    return {
-        "header",
-        "Show the header properties of an edit, or one of them",
-        {cookieOption(options->item),
-         {.name = "KEY", .value = &options->key, .help = "Only this property, its value alone (in any case)"},
-         projectOption(options->project),
-         jsonOption(options->json, "Write JSON: an object of the properties")},
-        "Example:\n  qmedit header E0001000 FRAME_RATE",
-        [options] { return runHeader(*options); }};
+    return {"header",
+            "Show the header properties of an edit, or one of them",
+            {cookieOption(options->item),
+             {.name = "KEY",
+              .value = &options->key,
+              .help = "Only this property, its value alone (in any case)",
+              .completes = Completes::HeaderKeys},
+             projectOption(options->project),
+             jsonOption(options->json, "Write JSON: an object of the properties")},
+            "Example:\n  qmedit header E0001000 FRAME_RATE",
+            [options] { return runHeader(*options); }};
 }

@@ -15,12 +15,12 @@ struct HistoryArguments : EditArguments {
 
 int runHistory(const HistoryArguments& arguments) {
     cookie item;
-    if (!readCookie(arguments.item, item)) {
-        return kWrongUsage;
-    }
     ProjectSession session(arguments.project);
     if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
+    if (const Qx::Status found = session.findItem(arguments.item, item); !found) {
+        return failed(found);
     }
     session.manage();
     const RevisionList list = revisionsOf(item);

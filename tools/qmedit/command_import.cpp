@@ -13,21 +13,12 @@
 
 namespace {
 
-constexpr const char* kRates = "23.976, 24, 25, 29.97, 30, 47.952, 48, 50, 59.94 or 60";
-
 /// Tells what the import met; returns the number of losses.
 size_t reportLosses(const interchange::LossReport& report) {
     for (const String& line : report.lines()) {
         reportProgress(line);
     }
     return report.losses().size();
-}
-
-String checkRate(const std::string& rate) {
-    if (Qx::FrameRate::fromString(rate).valid()) {
-        return {};
-    }
-    return "'" + rate + "' is no frame rate; give one of " + kRates;
 }
 
 bool isLegacyText(const String& file) {
@@ -92,16 +83,16 @@ Command importCommand() {
             {{.name = "FILE",
               .value = &options->file,
               .help = "The list: an EDL, or a legacy text by its extension .ed2",
-              .required = true},
+              .required = true,
+              .completes = Completes::Files},
              projectOption(options->project),
              {.name = "--rate",
               .value = &options->rate,
               .help = "Frames a second, which an EDL does not state (else the project's; 25 in a fresh one)",
               .form = "FPS",
-              .check = checkRate},
-             {.name = "--strict",
-              .value = &options->strict,
-              .help = "Import nothing if anything of the list would be lost"}},
+              .check = checkRate,
+              .completes = Completes::Rates},
+             strictOption(options->strict, "Import nothing if anything of the list would be lost")},
             "Example:\n  qmedit import reel2.edl --rate 24 --project ~/feature\n\n"
             "The last line on standard output is the new edit's cookie; what was lost or odd goes to "
             "standard error.",

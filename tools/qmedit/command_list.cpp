@@ -89,7 +89,7 @@ Command listCommand() {
              jsonOption(options->json, "Write JSON"),
              {.name = "--type",
               .value = &options->type,
-              .help = "Only items of a type (damaged files are listed all the same)",
+              .help = "Only items of a type, and damaged files",
               .form = "TYPE",
               .choices = {"edit", "shot", "ghost", "magic", "reel", "FXT"}}},
             "Example:\n  qmedit list --project ~/feature --type edit\n\n"

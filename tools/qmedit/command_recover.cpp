@@ -119,7 +119,8 @@ Command recoverCommand() {
              {.name = "--from",
               .value = &arguments->from,
               .help = "The state to take, as 'qmedit history' names it: U1, R1, M3, CORRUPT",
-              .form = "WHICH"}},
+              .form = "WHICH",
+              .completes = Completes::States}},
             "Example:\n  qmedit recover E0001000 --from M3\n\n"
             "Without --from the sound states are listed, and the newest is taken if the edit itself "
             "cannot be read. What the edit was is kept as an undo backup, or as CORRUPT if damaged.",

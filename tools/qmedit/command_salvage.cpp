@@ -66,13 +66,15 @@ Command salvageCommand() {
             {{.name = "FILE",
               .value = &arguments->file,
               .help = "The damaged file, under any name; it is not changed",
-              .required = true},
+              .required = true,
+              .completes = Completes::Files},
              {.name = "--into",
               .value = &arguments->into,
               .help = "The project that the edit is saved to, made if it is not there",
               .form = "DIR",
               .required = true,
-              .check = checkFolder},
+              .check = checkFolder,
+              .completes = Completes::Folders},
              jsonOption(arguments->json, "Write JSON: an object with the cookie and what is lost")},
             "Example:\n  qmedit salvage E0001000.qme --into ~/rescue\n\n"
             "The last line on standard output is the edit's cookie in DIR; what is lost goes to standard "

@@ -34,8 +34,12 @@ int showEdit(const ShowOptions& options) {
     if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
     }
+    cookie item;
+    if (const Qx::Status found = session.findItem(options.item, item); !found) {
+        return failed(found);
+    }
     EditPtr edit;
-    if (const Qx::Status read = session.readEdit(options.item, edit); !read) {
+    if (const Qx::Status read = session.readEdit(item, edit); !read) {
         return failed(read);
     }
     const EditReport report = reportOf(*edit, session.sourceNamer());
@@ -64,10 +68,9 @@ void drawEdit(const EditReport& report) {
 
 Command showCommand() {
     const auto options = std::make_shared<ShowOptions>();
-    const auto text = std::make_shared<std::string>();
     return {"show",
             "Draw the tracks of an edit and list its events",
-            {cookieOption(*text),
+            {cookieOption(options->item),
              projectOption(options->project),
              jsonOption(options->json, "Write JSON: every pair of every channel"),
              {.name = "--events",
@@ -76,7 +79,5 @@ Command showCommand() {
               .excludes = "--json"}},
             "Example:\n  qmedit show E0001000 --events | less -R\n\n"
             "The picture is as wide as the terminal, or as $COLUMNS says.",
-            [options, text] {
-                return readCookie(*text, options->item) ? showEdit(*options) : static_cast<int>(kWrongUsage);
-            }};
+            [options] { return showEdit(*options); }};
 }

@@ -114,15 +114,15 @@ Qx::Status tellLeftovers(ProjectSession& session, bool clean) {
 }
 
 int runVerify(const VerifyArguments& arguments) {
-    std::vector<cookie> items;
-    for (const std::string& text : arguments.items) {
-        if (!readCookie(text, items.emplace_back())) {
-            return kWrongUsage;
-        }
-    }
     ProjectSession session(arguments.project);
     if (const Qx::Status opened = session.openExisting(); !opened) {
         return failed(opened);
+    }
+    std::vector<cookie> items;
+    for (const std::string& text : arguments.items) {
+        if (const Qx::Status found = session.findItem(text, items.emplace_back()); !found) {
+            return failed(found);
+        }
     }
     std::vector<VerifiedFile> files;
     if (const Qx::Status verified = verifyProject(session.folder(), items, files); !verified) {
@@ -158,7 +158,10 @@ Command verifyCommand() {
     const auto arguments = std::make_shared<VerifyArguments>();
     return {"verify",
             "Check every edit file, backup and milestone of a project",
-            {{.name = "COOKIE", .value = &arguments->items, .help = "Only the files of these edits"},
+            {{.name = "COOKIE",
+              .value = &arguments->items,
+              .help = "Only the files of these edits",
+              .completes = Completes::Items},
              projectOption(arguments->project),
              jsonOption(arguments->json, "Write JSON: an array of files"),
              {.name = "--clean",

@@ -7,6 +7,7 @@
 #include <vector>
 
 struct Command;
+struct CommandGroup;
 struct CommandOption;
 struct EditReport;
 
@@ -20,7 +21,11 @@ Command exportCommand();
 Command listCommand();
 Command showCommand();
 Command headerCommand();
+Command newCommand();
 Command applyCommand();
+Command renameCommand();
+Command markerCommand();
+Command purgeCommand();
 Command diffCommand();
 Command verifyCommand();
 Command salvageCommand();
@@ -32,29 +37,37 @@ Command recoverCommand();
 Command deleteCommand();
 Command flushCommand();
 Command demoCommand();
+Command helpCommand();
 Command completionCommand();
 /// @}
 
-/// Every command, in the order of the help.
-const std::vector<Command>& allCommands();
+/// Every command, in the groups and the order of the help: the one place that a command is registered at.
+const std::vector<CommandGroup>& allCommands();
 
 /// \name Shared by the commands
 /// @{
 /// --project; `project` stays empty when it is not given.
 CommandOption projectOption(String& project);
-/// The edit that a command is for, as its first word.
+/// COOKIE: the edit that a command is for, as its first word.
 CommandOption cookieOption(std::string& item);
+/// --json, on every command that lists or shows something.
 CommandOption jsonOption(bool& json, const char* help);
-/// Why a text cannot name a folder, or nothing.
+/// --dry-run, --strict and --yes, with what is said of each by the command.
+CommandOption dryRunOption(bool& dryRun);
+CommandOption strictOption(bool& strict, const char* help);
+CommandOption yesOption(bool& yes);
+/// Why a text cannot name a folder, an edit, or be a frame rate, or nothing.
+/// @{
 String checkFolder(const std::string& folder);
+String checkName(const std::string& name);
+String checkRate(const std::string& rate);
+/// @}
 /// Reports a failure and returns `kFailed`.
 int failed(const Qx::Status& status);
-/// Reads a COOKIE argument. On a text that is none, reports it and returns false.
-[[nodiscard]] bool readCookie(const String& text, cookie& item);
 /// Shows an edit of a project as `qmedit show` does.
 struct ShowOptions {
     String project;
-    cookie item;
+    String item; ///< its cookie or its name
     bool json = false;
     bool allEvents = false;
 };

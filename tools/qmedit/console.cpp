@@ -36,15 +36,20 @@ bool localeIsUtf8() {
     return false;
 }
 
+/// Columns of the terminal behind a descriptor; 0 where there is none.
+int widthOf(int descriptor) {
+    winsize size{};
+    return ioctl(descriptor, TIOCGWINSZ, &size) == 0 ? int{size.ws_col} : 0;
+}
+
 int terminalWidth(bool terminal) {
     int width = 0;
     if (const char* columns = environment("COLUMNS");
         columns != nullptr && Qx::textToInt(columns, width) && width > 0) {
         return std::clamp(width, kLeastWidth, kGreatestWidth);
     }
-    winsize size{};
-    if (terminal && ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0) {
-        return std::clamp(int{size.ws_col}, kLeastWidth, kGreatestWidth);
+    if (const int columns = terminal ? widthOf(STDOUT_FILENO) : 0; columns > 0) {
+        return std::clamp(columns, kLeastWidth, kGreatestWidth);
     }
     return kDefaultWidth;
 }
@@ -55,7 +60,12 @@ bool errorsAscii() {
 }
 
 void errorLine(std::string_view lead, std::string_view text) {
-    const String line = String(lead) + safe_text::escaped(text, errorsAscii()) + "\n";
+    String line = String(lead) + safe_text::escaped(text, errorsAscii());
+    if (const int width = widthOf(STDERR_FILENO); width > 0 && !lead.empty()) {
+        constexpr int kIndent = 4;
+        line = safe_text::wrapped(line, std::clamp(width, kLeastWidth, kGreatestWidth), 0, kIndent);
+    }
+    line += "\n";
     std::fwrite(line.data(), 1, line.size(), stderr);
 }
 
@@ -155,6 +165,21 @@ void reportWarning(std::string_view text) {
 
 void reportProgress(std::string_view text) {
     errorLine("", text);
+}
+
+bool confirmed(std::string_view question) {
+    if (isatty(STDIN_FILENO) != 1 || !Console::errorsToTerminal()) {
+        return true;
+    }
+    const String line = safe_text::escaped(question, errorsAscii()) + " [y/N] ";
+    std::fwrite(line.data(), 1, line.size(), stderr);
+    std::fflush(stdout);
+    char text[16] = {};
+    if (std::fgets(text, sizeof text, stdin) == nullptr) {
+        return false;
+    }
+    const String answer = String(text).trimmed().lower();
+    return answer == "y" || answer == "yes";
 }
 
 void showProgress(std::string_view text) {

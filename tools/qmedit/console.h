@@ -64,12 +64,16 @@ void setOutcome(String line);
 /// line says so when edits were `changed` all the same, with the line that was to tell of it.
 [[nodiscard]] bool finishOutput(bool changed = false);
 
-/// One line on standard error, "qmedit: " and the text, made fit for a terminal.
+/// One line on standard error, "qmedit: " and the text, made fit for a terminal; wrapped where it goes to one.
 void reportError(std::string_view text);
 /// One line on standard error, "qmedit: warning: " and the text.
 void reportWarning(std::string_view text);
 /// One line on standard error, as it is but made fit for a terminal.
 void reportProgress(std::string_view text);
+
+/// Asks a question on the terminal and waits for the answer: true for "y" or "yes". True without asking where
+/// standard input or standard error is no terminal.
+[[nodiscard]] bool confirmed(std::string_view question);
 
 /// Shows how far a long work is on the terminal's last line, over what was shown there before; an empty text
 /// clears the line. Does nothing where standard error is no terminal.

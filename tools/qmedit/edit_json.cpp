@@ -189,6 +189,18 @@ String listJson(const std::vector<ListedEdit>& edits) {
     return out + "]\n";
 }
 
+String markersJson(const EditReport& report) {
+    String out = "[";
+    int number = 0;
+    addLines(out, "  ", report.cues, [&](const CueReport& cue) {
+        Json json;
+        json["number"] = ++number;
+        json.update(cueJson(report, cue));
+        return dumped(json);
+    });
+    return out + "]\n";
+}
+
 String pairJsonText(const EditReport& report, const PairReport& pair) {
     return dumped(pairJson(report, pair));
 }

@@ -17,6 +17,10 @@
 /// The edits of a project: an array of objects.
 [[nodiscard]] String listJson(const std::vector<ListedEdit>& edits);
 
+/// The markers of an edit, in order: an array of the objects that `show --json` gives for them, each with its
+/// `number`.
+[[nodiscard]] String markersJson(const EditReport& report);
+
 /// Header values by key, in order: an object.
 [[nodiscard]] String headerJson(const configb& header, const std::vector<String>& keys);
 

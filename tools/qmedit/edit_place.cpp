@@ -15,21 +15,21 @@ bool isDigits(std::string_view text) {
            std::all_of(text.begin(), text.end(), [](char c) { return c >= '0' && c <= '9'; });
 }
 
+/// True for what is meant as times, or left out where they should stand.
+bool beginsTime(const String& text) {
+    return text.empty() || text.front() == '-' || isDigits(text.substr(0, 1));
+}
+
 } // namespace
 
 Qx::Status parsePlace(const String& text, EditPlace& place) {
-    const size_t at = text.find('@');
-    const String name = text.substr(0, at);
     place = {};
-    place.item = cookie(name, true);
-    if (!place.item.isStorable()) {
-        return Qx::Status::failure("'" + name +
-                                   "' is no cookie; write COOKIE, COOKIE@IN or COOKIE@IN-OUT, for example "
-                                   "E0001000@10:00:05:00-10:00:07:12");
-    }
-    if (at == String::npos) {
+    const size_t at = text.rfind('@');
+    if (at == String::npos || !beginsTime(text.substr(at + 1))) {
+        place.name = text;
         return {};
     }
+    place.name = text.substr(0, at);
     const String times = text.substr(at + 1);
     const size_t dash = times.find('-');
     place.in = times.substr(0, dash);

@@ -2,13 +2,19 @@
 
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/revision_text.h"
+#include "tools/qmedit/spare_room.h"
 
 #include "edit/manager/revision_chain.h"
+#include "edit/model/edit.h"
 #include "edit/project/permissions_manager.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
+#include "platform/store/configb.h"
 
 namespace {
+
+/// How much larger than its file an edit may be written at most by a change of its header or cues.
+constexpr uint64_t kGrowth = 65536;
 
 RevisionChain chain(const cookie& item, RevisionChain::Kind kind) {
     return {item, kind, edit_manager::backupDepth()};
@@ -48,9 +54,6 @@ ManagedEdit::ManagedEdit(const EditArguments& arguments)
     : m_arguments(arguments), m_session(arguments.project) {}
 
 int ManagedEdit::prepare(bool mayBeGone) {
-    if (!readCookie(m_arguments.item, m_item)) {
-        return kWrongUsage;
-    }
     if (const Qx::Status opened = m_session.openExisting(); !opened) {
         return failed(opened);
     }
@@ -58,6 +61,9 @@ int ManagedEdit::prepare(bool mayBeGone) {
         return failed(locked);
     }
     m_session.manage();
+    if (const Qx::Status found = m_session.findItem(m_arguments.item, m_item); !found) {
+        return failed(found);
+    }
     if (!mayBeGone && edit_manager::getEditFiles(m_item).empty()) {
         EditPtr none;
         return failed(m_session.readEdit(m_item, none));
@@ -106,6 +112,42 @@ bool ManagedEdit::open(EditPtr& edit) {
     return openManaged(m_item, edit, m_wasRestored);
 }
 
+Qx::Status ManagedEdit::change(EditPtr& edit, const String& what, const std::function<void(Edit&)>& apply) {
+    const String file = getFilenameForCookie(m_item);
+    if (edit->get_read_only()) {
+        return Qx::Status::failure(Qx::StatusCode::ReadOnly,
+                                   what + ": " + m_item.asString() + " is marked read-only in its header");
+    }
+    SpareRoom room;
+    if (const Qx::Status taken = room.take(file, 2 * Qx::askFile(file).info().size + kGrowth); !taken) {
+        return taken.retold(what + ": " + taken.reason());
+    }
+    if (!edit_manager::backup_edit(m_item)) {
+        const String cause = edit->lastFileError();
+        return Qx::Status::failure(
+            what + (cause.empty() ? "" : ": " + cause) + "; " + putFileBack(m_item, edit) +
+            "; see whether the project can be written and has room (QMEDIT_LOG=1 tells more)");
+    }
+    room.giveBack();
+    if (apply) {
+        apply(*edit);
+    }
+    // The backup was the edit's file: it is written again, so that other programs find the edit.
+    edit->init_dirty();
+    if (!edit_manager::flush_edit(m_item)) {
+        const String cause = edit->lastFileError();
+        return Qx::Status::failure(what + ", as " + file + " could not be written: " + cause + "; " +
+                                   putFileBack(m_item, edit));
+    }
+    return {};
+}
+
+String undoText(const ManagedEdit& managed, size_t numRedo) {
+    return String::format("; %zu to undo", managed.numUndo()) +
+           (numRedo == 0 ? String()
+                         : String::format("; %zu redo backup%s went", numRedo, numRedo == 1 ? "" : "s"));
+}
+
 size_t ManagedEdit::numUndo() const {
     return chain(m_item, RevisionChain::Undo).numbers().size();
 }
@@ -141,7 +183,7 @@ int stepRevision(const EditArguments& arguments, bool redo) {
             String("there is nothing to ") + verb + ": " + item.asString() + " has no " + verb + " backup; " +
             (redo ? "an undo makes one" : "'qmedit backup " + item.asString() + "' makes one")));
     }
-    String change = changeText(edit->getChangeDescription());
+    String change = changeText(ownChangeOf(std::as_const(*edit).Opts()));
     edit.invalidate();
     String notice;
     if (!(redo ? edit_manager::redoRequest(item, &notice) : edit_manager::undoRequest(item, &notice))) {

@@ -1,7 +1,10 @@
 #pragma once
 
+#include "platform/base/status.h"
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/project_session.h"
+
+#include <functional>
 
 /// What the commands on one edit are given.
 struct EditArguments {
@@ -24,7 +27,7 @@ class ManagedEdit {
 public:
     explicit ManagedEdit(const EditArguments& arguments);
 
-    /// Reads the cookie, opens the project and takes the lock; the item must not be marked read-only, and
+    /// Opens the project, takes the lock and finds the item; it must not be marked read-only, and
     /// must have a file or a backup unless it `mayBeGone`. An `ExitCode`; what is wrong is reported.
     int prepare(bool mayBeGone = false);
     /// Opens the edit, by `openManaged`.
@@ -33,6 +36,10 @@ public:
 
     [[nodiscard]] const cookie& item() const { return m_item; }
     [[nodiscard]] ProjectSession& session() { return m_session; }
+    /// Keeps the edit's state as undo backup 1, changes the edit and writes it. `apply`, which may be empty,
+    /// cannot fail; it describes what it does. A failure names `what` was not done and says where the edit
+    /// is.
+    Qx::Status change(EditPtr& edit, const String& what, const std::function<void(Edit&)>& apply);
     /// How many undo and redo backups there are.
     [[nodiscard]] size_t numUndo() const;
     [[nodiscard]] size_t numRedo() const;
@@ -43,6 +50,10 @@ private:
     cookie m_item;
     bool m_wasRestored = false;
 };
+
+/// "; 3 to undo", and how many redo backups went of the `numRedo` that there were: the end of the line that a
+/// change is told with.
+[[nodiscard]] String undoText(const ManagedEdit& managed, size_t numRedo);
 
 /// Steps an edit one revision back, or with `redo` forward, and prints what happened. An `ExitCode`.
 int stepRevision(const EditArguments& arguments, bool redo);

@@ -1,29 +1,13 @@
 #pragma once
 
 #include "edit/inspect/edit_report.h"
+#include "edit/manager/project_items.h"
 #include "edit/manager/session.h"
-#include "edit/model/edit.h"
-#include "edit/project/projdb.h"
 #include "platform/base/status.h"
 #include "tools/qmedit/interrupts.h"
 
-#include <memory>
 #include <optional>
-#include <unordered_map>
-#include <unordered_set>
 #include <vector>
-
-/// What a listing says of one edit file.
-struct ListedEdit {
-    cookie item;
-    String type; ///< "edit", "shot", ...; empty for an item without a class
-    String name; ///< any bytes
-    Qx::FrameRate rate;
-    double duration = 0; ///< seconds
-    int channels = 0;
-    int64_t modified = 0; ///< seconds since 1970, UTC
-    String damage;        ///< why the file cannot be read; empty for a good one
-};
 
 /// The project that a command works on: a folder, given by --project, else by $QMEDIT_PROJECT, else
 /// ./quillmarch-project, with the project's own folder (named by its cookie, P0001000) in it. The project's
@@ -57,54 +41,28 @@ public:
     Qx::Status lockForWriting();
     static constexpr int kLockPatience = 2;
 
-    /// Reads an edit. While its file is away, as a writer leaves it for a moment (or for good, when it dies),
-    /// the newest undo backup answers, with one warning for each edit; nothing is moved. A failure names the
-    /// file and says what to do.
+    /// \name The project's items
+    /// As `ProjectItems` has them; failures say what to do, and warnings go to standard error.
+    /// @{
+    /// The item that a COOKIE argument means: its cookie, or its name.
+    Qx::Status findItem(const String& text, cookie& item);
     Qx::Status readEdit(const cookie& item, EditPtr& edit) const;
-    /// Reads a file of an edit under any name: a backup, a milestone, a copy. A failure names the file.
     static Qx::Status readRevision(const String& path, EditPtr& edit);
-    /// The file that `readEdit` reads.
-    [[nodiscard]] static String fileOf(const cookie& item);
-    /// What there is to say of every edit file, in order of their cookies, by `readEdit` where it is away; an
-    /// edit of which neither its file nor an undo backup is there counts as damaged. `others` gets the names
-    /// of files with the edits' extension that are no cookie's. Where the project has a record ("Project.db")
-    /// only the files that it does not tell of are read, and it learns of them; without one every file is.
-    /// What comes out is the same. Fails only when the folder cannot be read.
+    [[nodiscard]] static String fileOf(const cookie& item) { return ProjectItems::fileOf(item); }
     Qx::Status list(std::vector<ListedEdit>& edits, std::vector<String>& others);
-    /// How many files the last listing had to read.
-    [[nodiscard]] size_t numRead() const { return m_numRead; }
+    [[nodiscard]] size_t numRead() const { return m_items.numRead(); }
     /// Looks names up in the project's files, each file read once a session.
     [[nodiscard]] SourceNamer sourceNamer();
+    /// @}
 
 private:
-    /// What the file of a source says of it.
-    struct Known {
-        String name;
-        String problem;
-        bool dropFrame = false;
-    };
-
-    using Records = std::unordered_map<cookie, projdb::Record>;
-
     void useUnwritten(Qx::FrameRate rate);
-    /// The project's record; null when it has none or it cannot be used.
-    [[nodiscard]] projdb* openRecords();
-    [[nodiscard]] projdb::Record recordOf(const cookie& item, const Records& known, Records& fresh);
-    [[nodiscard]] Known look(const cookie& item) const;
-    [[nodiscard]] bool isListed(const cookie& item) const;
     /// Removes what killed programs left, once, under the writers' lock.
     void cleanUp();
-    /// Reads the newest undo backup of an edit whose file is away. True if that settles the matter: `status`
-    /// is how it went. False when there is none, or the file is back.
-    [[nodiscard]] bool readBackup(const cookie& item, EditPtr& edit, Qx::Status& status) const;
-    [[nodiscard]] ListedEdit listedAway(const cookie& item) const;
 
     Qx::FrameRate m_rateOfFresh;
-    std::unordered_map<cookie, Known> m_known;
-    mutable std::optional<std::unordered_set<cookie>> m_listed; ///< when an item was first missing
-    mutable std::unordered_set<cookie> m_toldAway;              ///< of which a warning told
-    size_t m_numRead = 0;
     bool m_isClean = false;
     std::optional<interrupts::Hold> m_uninterrupted; ///< goes last: from the lock until all is closed
-    Session m_session; ///< goes first: what it writes at its end is written locked
+    Session m_session;                               ///< what it writes at its end is written locked
+    ProjectItems m_items;
 };

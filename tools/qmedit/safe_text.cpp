@@ -134,4 +134,24 @@ String padded(std::string_view utf8, int width, std::string_view ellipsis, bool 
     return text;
 }
 
+String wrapped(std::string_view utf8, int width, int used, int indent) {
+    String out;
+    bool isFirstOfLine = true;
+    while (!utf8.empty()) {
+        const size_t blank = std::min(utf8.find(' '), utf8.size());
+        const std::string_view word = utf8.substr(0, blank);
+        const int wide = columns(word);
+        if (!isFirstOfLine && used + 1 + wide > width) {
+            out += "\n" + String(static_cast<size_t>(indent), ' ');
+            used = indent;
+            isFirstOfLine = true;
+        }
+        used += wide + (isFirstOfLine ? 0 : 1);
+        out += (isFirstOfLine ? "" : " ") + String(word);
+        isFirstOfLine = false;
+        utf8.remove_prefix(std::min(blank + 1, utf8.size()));
+    }
+    return out;
+}
+
 } // namespace safe_text

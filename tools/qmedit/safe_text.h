@@ -24,4 +24,9 @@ namespace safe_text {
 /// `fitted`, and blanks up to `width`, before the text when `right`.
 [[nodiscard]] String padded(std::string_view utf8, int width, std::string_view ellipsis, bool right = false);
 
+/// `utf8` on lines of at most `width` columns, broken at blanks; a longer word stands on a line of its own.
+/// `used` columns of the first line are taken already, and every other line is indented by `indent`. Without
+/// a line end behind the last line.
+[[nodiscard]] String wrapped(std::string_view utf8, int width, int used, int indent);
+
 } // namespace safe_text

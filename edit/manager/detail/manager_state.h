@@ -12,7 +12,6 @@
 #include <atomic>
 #include <map>
 #include <memory>
-#include <optional>
 #include <set>
 
 /// What the manager holds. One object for the process, never destroyed, so that a handle dropped while the
@@ -58,13 +57,6 @@ struct ManagerState {
         }
         /// Its file became a backup and was not written since: nothing lies under the edit's name.
         [[nodiscard]] bool isAway() const { return hadFile && file.kind == Qx::FileKind::Missing; }
-        /// What the revision that an undo or redo brought back said of itself, and what is said of the step
-        /// in its place, until it is changed.
-        struct Step {
-            EditModification own;
-            EditModification said;
-        };
-        std::optional<Step> step;
         /// What could be redone before the last backup. It goes for good when the edit is written or dropped,
         /// and comes back when the backup is taken back.
         std::unique_ptr<Qx::FileMoves> endedRedo;
