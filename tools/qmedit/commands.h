@@ -3,6 +3,7 @@
 #include "platform/base/cookie.h"
 #include "platform/base/qx_string.h"
 #include "platform/base/status.h"
+#include "tools/qmedit/console.h"
 
 #include <vector>
 
@@ -57,6 +58,7 @@ struct ShowOptions {
     cookie item;
     bool json = false;
     bool allEvents = false;
+    Console::Wish console;
 };
 int showEdit(const ShowOptions& options);
 /// Draws an edit on standard output, without its table of events.

@@ -55,6 +55,9 @@ Json pairJson(const EditReport& report, const PairReport& pair) {
     json["speed"] = pair.velocity;
     json["fade_in"] = report.frames(pair.fadeIn);
     json["fade_out"] = report.frames(pair.fadeOut);
+    json["transition"] = transitionText(pair.transition);
+    json["reel"] = textOrNull(source.reel, !source.reel.empty());
+    json["event"] = textOrNull(pair.event, !pair.event.empty());
     return json;
 }
 

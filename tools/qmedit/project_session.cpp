@@ -365,6 +365,7 @@ SourceNamer ProjectSession::sourceNamer() {
         source.problem = place->second.problem;
         if (source.problem.empty()) {
             source.dropFrame = place->second.dropFrame;
+            source.reel = place->second.reel;
         }
     };
 }
@@ -372,7 +373,8 @@ SourceNamer ProjectSession::sourceNamer() {
 ProjectSession::Known ProjectSession::look(const cookie& item) const {
     EditPtr edit;
     if (const Qx::Status read = readEdit(item, edit); !read) {
-        return {{}, read.reason(), false};
+        return {{}, read.reason(), {}, false};
     }
-    return {edit->getName(), {}, edit->isDropFrame(false)};
+    return {
+        edit->getName(), {}, edit->Opts().getString(interchange::EdlKey::kReel), edit->isDropFrame(false)};
 }

@@ -81,6 +81,7 @@ private:
     struct Known {
         String name;
         String problem;
+        String reel;
         bool dropFrame = false;
     };
 
