@@ -35,6 +35,21 @@ Json listJson(const Range& range, const ToJson& toJson) {
     return list;
 }
 
+/// Things that moved, in frames and seconds of the first edit.
+template <class Element>
+Json movedJson(const std::vector<MovedRun<Element>>& moved, const EditReport& before) {
+    return listJson(moved, [&](const MovedRun<Element>& run) {
+        return Json{{"count", run.count},
+                    {"from", before.frames(run.from)},
+                    {"to", before.frames(run.to)},
+                    {"by", before.frames(run.by)},
+                    {"from_s", run.from},
+                    {"to_s", run.to},
+                    {"by_s", run.by},
+                    {"rest", run.isRest}};
+    });
+}
+
 Json channelJson(const ChannelDiff& channel, const EditReport& before, const EditReport& after) {
     Json its;
     its["channel"] = static_cast<const std::string&>(channel.name);
@@ -52,6 +67,7 @@ Json channelJson(const ChannelDiff& channel, const EditReport& before, const Edi
     its["removed"] =
         listJson(channel.removed, [&](const PairReport& pair) { return pairJson(before, pair); });
     its["added"] = listJson(channel.added, [&](const PairReport& pair) { return pairJson(after, pair); });
+    its["moved"] = movedJson(channel.moved, before);
     return its;
 }
 
@@ -84,6 +100,7 @@ Json levelsJson(const LevelsDiff& levels, const EditReport& before, const EditRe
     its["nodes_after"] = levels.nodesAfter;
     its["removed"] = listJson(levels.removed, nodeJson(before));
     its["added"] = listJson(levels.added, nodeJson(after));
+    its["moved"] = movedJson(levels.moved, before);
     return its;
 }
 

@@ -5,7 +5,6 @@
 #include "tools/qmedit/track_picture.h"
 
 #include <charconv>
-#include <cmath>
 
 using Qx::kTimeTolerance;
 
@@ -71,6 +70,12 @@ String pairText(char sign, const PairReport& pair, const EditReport& report, con
     return text + "  " + sourceLabel(source, console) + pairNotes(report, pair) + endNotes(pair) + "\n";
 }
 
+String movedLine(const MovedRun<PairReport>& run, const EditReport& before, const Console& console) {
+    const bool isNamed = run.count == 1;
+    return "  > " + movedText(run, "clip", before) +
+           (isNamed ? "  " + sourceLabel(before.sources[run.first.source], console) : String()) + "\n";
+}
+
 String cuesText(const EditDiff& diff) {
     return diff.cuesDiffer
                ? String::format("cues  changed; %zu before, %zu after\n", diff.cuesBefore, diff.cuesAfter)
@@ -97,6 +102,9 @@ String diffPairsText(const EditDiff& diff, const EditReport& before, const EditR
         }
         for (const PairReport& pair : channel.added) {
             text += pairText('+', pair, after, console);
+        }
+        for (const MovedRun<PairReport>& run : channel.moved) {
+            text += movedLine(run, before, console);
         }
     }
     return text + cuesText(diff);
