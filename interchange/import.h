@@ -14,8 +14,9 @@
 namespace interchange {
 
 struct ImportOptions {
-    Qx::FrameRate rate;  ///< of the timeline, where its form does not state one
-    bool strict = false; ///< overlaps and the like are failures instead of warnings
+    Qx::FrameRate rate;   ///< of the timeline, where its form does not state one
+    bool strict = false;  ///< overlaps and the like are failures instead of warnings
+    bool skipBad = false; ///< what of it cannot be read is left out, a loss each, instead of a failure
 };
 
 /// A sequence and the shots that it plays, not yet part of a project.

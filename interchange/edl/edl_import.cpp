@@ -284,6 +284,7 @@ Qx::Status importEdlList(const EdlList& list, const String& name, const ImportOp
     built.report = result.report;
     EdlProgramme programme;
     if (Qx::Status status = layTracks(list, options.strict, programme, built.report); !status) {
+        result.report = std::move(built.report);
         return status;
     }
     EdlImporter(list, programme, built).build(name);
@@ -294,11 +295,14 @@ Qx::Status importEdlList(const EdlList& list, const String& name, const ImportOp
 Qx::Status importEdl(const String& path, const ImportOptions& options, Import& result) {
     Import built;
     EdlList list;
-    if (Qx::Status status = readEdlFile(path, options.rate, list, built.report); !status) {
+    const BadLines bad = options.skipBad ? BadLines::Skip : BadLines::Refuse;
+    if (Qx::Status status = readEdlFile(path, options.rate, list, built.report, bad); !status) {
+        result.report = std::move(built.report);
         return status;
     }
     const String name = Qx::withoutExtension(Qx::fileNameOf(path));
     if (Qx::Status status = importEdlList(list, name, options, built); !status) {
+        result.report = std::move(built.report);
         return status;
     }
     result = std::move(built);
