@@ -251,6 +251,10 @@ void EdlImporter::buildChannels(Edit& edit) {
 }
 
 void EdlImporter::addCues(Edit& edit) {
+    Vector<cel*> cels;
+    for (int chan = 0; chan < edit.getNumChans(); ++chan) {
+        cels.push_back(edit.get_edit_cel_p(chan));
+    }
     for (const EdlMarker& marker : m_list.markers) {
         const int64_t position = markerPosition(m_list, m_programme, marker);
         if (position < 0) {
@@ -263,7 +267,7 @@ void EdlImporter::addCues(Edit& edit) {
             text = marker.colour + (text.empty() ? "" : " ") + text;
         }
         edit.get_cues().add_cue_point(
-            cue_point(text.c_str(), m_list.rate.toSeconds(position), kAnyCueChan, colour, {}, false));
+            cue_point(text.c_str(), m_list.rate.toSeconds(position), kAnyCueChan, colour, cels, true));
     }
     edit.get_cues().sort();
 }
