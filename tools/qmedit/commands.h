@@ -63,13 +63,16 @@ struct ShowOptions {
 int showEdit(const ShowOptions& options);
 /// Draws an edit on standard output, without its table of events.
 void drawEdit(const EditReport& report);
-/// Imports a file as `qmedit import` does and sets `item` to the edit that was made. The cookie is not
-/// printed.
 struct ImportOptions {
-    String file;
+    std::vector<std::string> files; ///< "-" is standard input
     String project;
     String rate; ///< empty for the project's
     bool strict = false;
+    bool skipBad = false;
+    bool newShots = false;
+    bool json = false;
 };
+/// Imports the only one of the files as `qmedit import` does and sets `item` to the edit that was made. The
+/// cookie is not printed.
 int importFile(const ImportOptions& options, cookie& item);
 /// @}

@@ -210,6 +210,32 @@ String headerJson(const configb& header, const std::vector<String>& keys) {
     return String(json.dump(2, ' ', false, Json::error_handler_t::replace)) + "\n";
 }
 
+String reportJson(const std::vector<std::pair<const char*, String>>& texts,
+                  const std::vector<std::pair<const char*, size_t>>& numbers,
+                  const interchange::LossReport& report) {
+    Json json;
+    for (const auto& [key, text] : texts) {
+        json[key] = textOrNull(text, !text.empty());
+    }
+    for (const auto& [key, number] : numbers) {
+        json[key] = number;
+    }
+    const auto add = [&json](const char* key, const std::vector<interchange::Loss>& all) {
+        json[key] = Json::array();
+        for (const interchange::Loss& loss : all) {
+            Json one;
+            one["line"] = loss.line > 0 ? Json(loss.line) : Json();
+            one["what"] = loss.what;
+            json[key].push_back(std::move(one));
+        }
+    };
+    add("errors", report.errors());
+    add("losses", report.losses());
+    add("warnings", report.warnings());
+    add("notes", report.notes());
+    return dumped(json);
+}
+
 String isoTime(int64_t seconds) {
     const auto time = static_cast<std::time_t>(seconds);
     std::tm fields{};
