@@ -147,15 +147,29 @@ String placeOf(const EditReport& report, int channel) {
     return channel >= 0 && index < report.channels.size() ? report.channels[index].place : String();
 }
 
-bool sameCues(const EditReport& before, const EditReport& after) {
-    return std::equal(before.cues.begin(), before.cues.end(), after.cues.begin(), after.cues.end(),
-                      [&](const CueReport& a, const CueReport& b) {
-                          return std::abs(a.time - b.time) <= kTimeTolerance &&
-                                 std::abs(a.length - b.length) <= kTimeTolerance && a.text == b.text &&
-                                 a.code == b.code && a.attached == b.attached &&
-                                 placeOf(before, a.channel) == placeOf(after, b.channel);
-                      });
-}
+/// How the markers of two edits are compared (see `RowComparison`).
+struct CueRules {
+    const EditReport& before;
+    const EditReport& after;
+
+    [[nodiscard]] static double begin(const CueReport& cue) { return cue.time; }
+    [[nodiscard]] static double end(const CueReport& cue) { return cue.time + cue.length; }
+    [[nodiscard]] bool same(size_t i, size_t j) const {
+        return std::abs(before.cues[i].time - after.cues[j].time) <= kTimeTolerance && alike(i, j);
+    }
+    [[nodiscard]] bool alike(size_t i, size_t j) const {
+        const CueReport& a = before.cues[i];
+        const CueReport& b = after.cues[j];
+        return std::abs(a.length - b.length) <= kTimeTolerance && a.text == b.text && a.code == b.code &&
+               a.attached == b.attached && placeOf(before, a.channel) == placeOf(after, b.channel);
+    }
+    [[nodiscard]] size_t hash(WhichRow row, size_t i) const {
+        const CueReport& cue = (row == WhichRow::Was ? before : after).cues[i];
+        const size_t hash = mixedHash(std::hash<std::string>()(cue.text), static_cast<size_t>(cue.code));
+        return mixedHash(hash, timeHash(cue.length));
+    }
+    [[nodiscard]] static bool isAnchor(WhichRow, size_t) { return true; }
+};
 
 } // namespace
 
@@ -195,6 +209,9 @@ EditDiff diffOf(const EditReport& before, const EditReport& after) {
     }
     diff.cuesBefore = before.cues.size();
     diff.cuesAfter = after.cues.size();
-    diff.cuesDiffer = !sameCues(before, after);
+    RowDiff<CueReport> cues = rowDiffOf(before.cues, after.cues, CueRules{before, after});
+    diff.cuesRemoved = std::move(cues.removed);
+    diff.cuesAdded = std::move(cues.added);
+    diff.cuesMoved = std::move(cues.moved);
     return diff;
 }

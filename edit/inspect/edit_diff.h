@@ -33,8 +33,13 @@ struct EditDiff {
     std::vector<ChannelDiff> channels; ///< those that differ, in the order of the channel index
     size_t cuesBefore = 0;
     size_t cuesAfter = 0;
-    bool cuesDiffer = false;
-    [[nodiscard]] bool same() const { return channels.empty() && !cuesDiffer; }
+    std::vector<CueReport> cuesRemoved;         ///< markers that only the first has, in order
+    std::vector<CueReport> cuesAdded;           ///< and those that only the second has
+    std::vector<MovedRun<CueReport>> cuesMoved; ///< those that both have, at other times
+    [[nodiscard]] bool cuesDiffer() const {
+        return !cuesRemoved.empty() || !cuesAdded.empty() || !cuesMoved.empty();
+    }
+    [[nodiscard]] bool same() const { return channels.empty() && !cuesDiffer(); }
 };
 
 /// Compares two edits, of one project or of two. Sources are told apart by their cookies alone: neither names

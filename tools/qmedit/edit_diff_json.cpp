@@ -126,7 +126,15 @@ String diffJson(const EditDiff& diff, const ContentDiff& content, const EditRepo
     json["after"] = after.item.asString();
     json["channels"] = listJson(
         diff.channels, [&](const ChannelDiff& channel) { return channelJson(channel, before, after); });
-    json["cues"] = {{"changed", diff.cuesDiffer}, {"before", diff.cuesBefore}, {"after", diff.cuesAfter}};
+    const auto cueJson = [](const EditReport& report) {
+        return [&report](const CueReport& cue) { return Json::parse(cueJsonText(report, cue)); };
+    };
+    json["cues"] = {{"changed", diff.cuesDiffer()},
+                    {"before", diff.cuesBefore},
+                    {"after", diff.cuesAfter},
+                    {"removed", listJson(diff.cuesRemoved, cueJson(before))},
+                    {"added", listJson(diff.cuesAdded, cueJson(after))},
+                    {"moved", movedJson(diff.cuesMoved, before)}};
     json["levels"] =
         listJson(content.levels, [&](const LevelsDiff& levels) { return levelsJson(levels, before, after); });
     json["properties"] = listJson(content.properties, [](const PropertiesDiff& properties) {

@@ -196,6 +196,10 @@ String pairJsonText(const EditReport& report, const PairReport& pair) {
     return dumped(pairJson(report, pair));
 }
 
+String cueJsonText(const EditReport& report, const CueReport& cue) {
+    return dumped(cueJson(report, cue));
+}
+
 String valueJsonText(const configb::Value& value) {
     return dumped(headerValue(value));
 }

@@ -22,6 +22,9 @@
 /// Header values by key, in order: an object.
 [[nodiscard]] String headerJson(const configb& header, const std::vector<String>& keys);
 
+/// One marker of an edit: the object that `show --json` gives for it, without a line end.
+[[nodiscard]] String cueJsonText(const EditReport& report, const CueReport& cue);
+
 /// One header value: a JSON value, without a line end.
 [[nodiscard]] String valueJsonText(const configb::Value& value);
 

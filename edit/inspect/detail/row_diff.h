@@ -139,8 +139,11 @@ private:
             }
             const size_t last = i + count - 1;
             const bool isRest = m_left[last] + 1 == m_was.size() && m_came[j + count - 1] + 1 == m_now.size();
-            diff.moved.push_back({m_was[m_left[i]], count, m_rules.begin(m_was[m_left[i]]),
-                                  m_rules.end(m_was[m_left[last]]), by, isRest});
+            // Two at one time that change places have not moved.
+            if (std::abs(by) > kNear) {
+                diff.moved.push_back({m_was[m_left[i]], count, m_rules.begin(m_was[m_left[i]]),
+                                      m_rules.end(m_was[m_left[last]]), by, isRest});
+            }
             i += count;
         }
         for (size_t j = 0; j < m_came.size(); ++j) {

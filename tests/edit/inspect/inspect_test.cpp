@@ -104,6 +104,18 @@ TEST(Inspect, TellsOfWhatMovedByHowFar) {
         }
         EXPECT_EQ(told, its.told) << its.what;
     }
+    EditContent levels[2];
+    levels[0].levels = {{"A1 levels", {{1, 0.5F}, {2, 1}, {3, 0.5F}, {5, 1}}}};
+    levels[1].levels = {{"A1 levels", {{1, 0.5F}, {6, 1}, {7, 0.5F}, {9, 1}}}};
+    const LevelsDiff nodes = contentDiffOf(levels[0], levels[1]).levels.at(0);
+    ASSERT_EQ(nodes.moved.size(), 1U);
+    EXPECT_TRUE(nodes.moved[0].count == 3 && nodes.moved[0].by == 4 && nodes.removed.empty());
+    EditReport cues[2] = {rowOf({}), rowOf({})};
+    cues[0].cues = {{1, 0, "a", 0, -1, false}, {2, 0, "b", 0, -1, false}, {3, 0, "b", 0, -1, false}};
+    cues[1].cues = {{4, 0, "b", 0, -1, false}, {5, 0, "b", 0, -1, false}};
+    const EditDiff markers = diffOf(cues[0], cues[1]);
+    ASSERT_TRUE(markers.cuesMoved.size() == 1 && markers.cuesRemoved.size() == 1);
+    EXPECT_TRUE(markers.cuesMoved[0].count == 2 && markers.cuesMoved[0].by == 2 && markers.cuesDiffer());
     std::vector<int> long1(20000);
     std::iota(long1.begin(), long1.end(), 1);
     std::vector<int> long2(long1.rbegin(), long1.rend());
