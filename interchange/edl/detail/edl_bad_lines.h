@@ -18,11 +18,13 @@ public:
     void leaveOut(LossReport& report);
 
 private:
-    /// The lines in order, each handed to `tell`; of very many the first, then one that counts the others.
+    /// The lines in order, each handed to `tell`, then one that counts the others.
     template <class Tell>
     void tellAll(const Tell& tell);
 
-    std::vector<Loss> m_lines;
+    std::vector<Loss> m_lines; ///< the first that were met
+    size_t m_more = 0;         ///< how many others there are
+    int m_firstMore = 0;       ///< the line of the first of these
 };
 
 } // namespace interchange::detail
