@@ -157,8 +157,8 @@ std::vector<ObjectDiff> objectsDiff(const EditContent& before, const EditContent
         }
     };
     forEachPair(
-        before.objects, after.objects, [](const ObjectContent& its) { return std::string_view(its.name); },
-        compare);
+        before.objects, after.objects,
+        [](const ObjectContent& object) { return std::string_view(object.name); }, compare);
     return diffs;
 }
 
