@@ -3,7 +3,7 @@
 #include <cstddef>
 #include <cstdint>
 
-// The first byte chooses the frame rate and the mode, the rest is a list.
+// The first byte chooses the frame rate, the mode and whether bad lines are left out, the rest is a list.
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     if (size == 0) {
         return 0;
@@ -13,7 +13,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     interchange::EdlList list;
     interchange::Import import;
     import.report.setFile("fuzz.edl");
-    if (interchange::readEdl(text, options.rate, list, import.report)) {
+    const auto bad = (data[0] & 0x40) != 0 ? interchange::BadLines::Skip : interchange::BadLines::Refuse;
+    if (interchange::readEdl(text, options.rate, list, import.report, bad)) {
         static_cast<void>(interchange::importEdlList(list, "fuzz", options, import).isOk());
     }
     return 0;

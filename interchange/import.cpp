@@ -4,12 +4,15 @@
 #include "edit/manager/import_note.h"
 #include "edit/model/cel.h"
 #include "edit/model/channel_event.h"
+#include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_registry.h"
 #include "edit/project/cookie_allocator.h"
+#include "interchange/detail/strip_map.h"
 #include "platform/services/atomic_batch.h"
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"
+#include "platform/services/files.h"
 #include "platform/store/configb.h"
 
 #include <unordered_map>
@@ -19,27 +22,11 @@ namespace interchange {
 
 namespace {
 
-using CookieMap = std::unordered_map<cookie, cookie>;
+using detail::CookieMap;
+using detail::mapStrips;
 
 cookie ofKind(Cookie_Type kind, const cookie& words) {
     return cookie::fromWords(words.word(0), words.word(1), static_cast<uint32_t>(kind));
-}
-
-void mapStrips(Edit& edit, const CookieMap& map) {
-    for (int chan = 0; chan < edit.getNumChans(); ++chan) {
-        cel* const content = edit.get_edit_cel_p(chan);
-        if (content == nullptr) {
-            continue;
-        }
-        for (int i = 0; i < content->numEvents(); ++i) {
-            channel_event event = content->get_event(i);
-            const auto found = map.find(event.strip);
-            if (found != map.end()) {
-                event.strip = found->second;
-                content->setEvent(i, event);
-            }
-        }
-    }
 }
 
 // The edits of an import in the order of writing, so that no sequence names a shot without a file.
@@ -67,6 +54,11 @@ void giveCookies(const std::vector<Edit*>& edits, const std::vector<cookie>& coo
     }
     mapStrips(*edits.back(), shots);
     edits.back()->set_cookie(cookies.back());
+    // Attached cues know the strip that they follow.
+    cue_list& cues = edits.back()->get_cues();
+    for (size_t i = 0; i < cues.get_num_cue_points(CueFlag::kAttached); ++i) {
+        cues.get_cue_point(i, CueFlag::kAttached)->update_strip_time();
+    }
 }
 
 /// What the events and headers of the edits name that comes from elsewhere, as cookies of edits: an edit of
@@ -102,11 +94,19 @@ std::vector<cookie> namedElsewhere(const std::vector<Edit*>& edits) {
 }
 
 /// Gives all files of a batch their names. On a failure those that have theirs go again.
-Qx::Status putInPlace(Qx::AtomicBatch& batch, const std::vector<cookie>& cookies) {
+Qx::Status putInPlace(Qx::AtomicBatch& batch, const std::vector<cookie>& cookies,
+                      const std::vector<cookie>& reused) {
     const String folder = Qx::currentProject().folder();
     EditManagerLock writers(folder);
     if (Qx::Status taken = writers.take(true); !taken) {
         return taken;
+    }
+    for (const cookie& shot : reused) {
+        if (!Qx::askFile(getFilenameForCookie(shot)).isRegular()) {
+            return Qx::Status::failure(Qx::StatusCode::NotFound, "the shot " + shot.asString() +
+                                                                     " of the project was to be played and "
+                                                                     "is gone; import again");
+        }
     }
     UnfinishedImport unfinished;
     // A single edit has its name or has not.
@@ -128,7 +128,7 @@ Qx::Status putInPlace(Qx::AtomicBatch& batch, const std::vector<cookie>& cookies
 }
 
 Qx::Status writeAll(const std::vector<Edit*>& edits, const std::vector<cookie>& cookies,
-                    const std::function<bool()>& cancelled) {
+                    const std::vector<cookie>& reused, const std::function<bool()>& cancelled) {
     Qx::AtomicBatch batch;
     const auto isCancelled = [&] { return cancelled && cancelled(); };
     for (Edit* const edit : edits) {
@@ -141,10 +141,27 @@ Qx::Status writeAll(const std::vector<Edit*>& edits, const std::vector<cookie>& 
     }
     return isCancelled()
                ? Qx::Status::failure(Qx::StatusCode::Cancelled, "nothing was imported, as it was interrupted")
-               : putInPlace(batch, cookies);
+               : putInPlace(batch, cookies, reused);
 }
 
 } // namespace
+
+void detail::mapStrips(Edit& edit, const CookieMap& map) {
+    for (int chan = 0; chan < edit.getNumChans(); ++chan) {
+        cel* const content = edit.get_edit_cel_p(chan);
+        if (content == nullptr) {
+            continue;
+        }
+        for (int i = 0; i < content->numEvents(); ++i) {
+            channel_event event = content->get_event(i);
+            const auto found = map.find(event.strip);
+            if (found != map.end()) {
+                event.strip = found->second;
+                content->setEvent(i, event);
+            }
+        }
+    }
+}
 
 cookie provisionalCookie(size_t index) {
     return {Cookie_Type::Transient, static_cast<int>(index), 0};
@@ -169,7 +186,7 @@ Qx::Status saveImport(Import& result, const std::function<bool()>& cancelled) {
         return status;
     }
     giveCookies(edits, cookies);
-    if (Qx::Status status = writeAll(edits, cookies, cancelled); !status) {
+    if (Qx::Status status = writeAll(edits, cookies, result.reused, cancelled); !status) {
         giveCookies(edits, before);
         for (Edit* const edit : edits) {
             edit->init_dirty();

@@ -14,8 +14,9 @@
 namespace interchange {
 
 struct ImportOptions {
-    Qx::FrameRate rate;  ///< of the timeline, where its form does not state one
-    bool strict = false; ///< overlaps and the like are failures instead of warnings
+    Qx::FrameRate rate;   ///< of the timeline, where its form does not state one
+    bool strict = false;  ///< overlaps and the like are failures instead of warnings
+    bool skipBad = false; ///< what of it cannot be read is left out, a loss each, instead of a failure
 };
 
 /// A sequence and the shots that it plays, not yet part of a project.
@@ -26,8 +27,18 @@ struct ImportOptions {
 struct Import {
     EditPtr sequence;
     std::vector<EditPtr> shots;
+    std::vector<cookie> reused; ///< items of the project that the sequence plays (`reuseShots`)
     LossReport report;
 };
+
+/// Looks up the shots of a project that bear a name.
+using ShotsOfName = std::function<std::vector<EditPtr>(const String& name)>;
+
+/// Lets the sequence play shots that the project has in the place of those that would repeat them: of the same
+/// name, reel, file, media path, frame rate and counting of frames, and holding at least the span that is
+/// used of it, on the same tracks. A source that bears the reel "AX" and no other name is never taken for
+/// another. The shots that were found go from `result.shots` to `result.reused`; answers how many.
+QM_INTERCHANGE_API size_t reuseShots(Import& result, const ShotsOfName& shotsOfName);
 
 /// The cookie of shot `index` of an import that is not saved: of kind 'F', so that nothing stores it.
 QM_INTERCHANGE_API cookie provisionalCookie(size_t index);
@@ -37,6 +48,8 @@ QM_INTERCHANGE_API cookie provisionalCookie(size_t index);
 /// name as a source from elsewhere is given to one of them, nor to an edit made later. The edits take their
 /// names under the writers' lock of the project; what a process that dies on the way leaves,
 /// `unfinishedImports` finds.
+///
+/// A shot that was to be reused and is gone meanwhile is a failure.
 ///
 /// On failure the project is as it was and the import is too, so that the call can be repeated. `cancelled`
 /// is asked between the edits, until the first takes its name; once it says true the call fails.

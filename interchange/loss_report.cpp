@@ -15,13 +15,16 @@ struct Entry {
 
 std::vector<String> LossReport::lines() const {
     std::vector<Entry> entries;
-    entries.reserve(m_losses.size() + m_warnings.size());
-    for (const Loss& loss : m_losses) {
-        entries.push_back({&loss, "loss"});
-    }
-    for (const Loss& warning : m_warnings) {
-        entries.push_back({&warning, "warning"});
-    }
+    entries.reserve(m_losses.size() + m_warnings.size() + m_notes.size() + m_errors.size());
+    const auto add = [&entries](const std::vector<Loss>& all, const char* kind) {
+        for (const Loss& loss : all) {
+            entries.push_back({&loss, kind});
+        }
+    };
+    add(m_errors, "error");
+    add(m_losses, "loss");
+    add(m_warnings, "warning");
+    add(m_notes, "note");
     std::stable_sort(entries.begin(), entries.end(),
                      [](const Entry& a, const Entry& b) { return a.loss->line < b.loss->line; });
     std::vector<String> texts;

@@ -15,7 +15,9 @@ struct Loss {
 };
 
 /// What an import or export reports besides its result. A loss is something that the other side cannot hold;
-/// a warning is something that was read by a guess or that its author should look at. Not thread-safe.
+/// a warning is something that was read by a guess or that its author should look at; a note tells of what is
+/// kept, in another form; an error is why a line cannot be read, where several are told of at once. Not
+/// thread-safe.
 class QM_INTERCHANGE_API LossReport {
 public:
     /// The name that stands before each line.
@@ -24,8 +26,12 @@ public:
 
     void addLoss(int line, String what) { m_losses.push_back({line, std::move(what)}); }
     void addWarning(int line, String what) { m_warnings.push_back({line, std::move(what)}); }
+    void addNote(int line, String what) { m_notes.push_back({line, std::move(what)}); }
+    void addError(int line, String what) { m_errors.push_back({line, std::move(what)}); }
     [[nodiscard]] const std::vector<Loss>& losses() const { return m_losses; }
     [[nodiscard]] const std::vector<Loss>& warnings() const { return m_warnings; }
+    [[nodiscard]] const std::vector<Loss>& notes() const { return m_notes; }
+    [[nodiscard]] const std::vector<Loss>& errors() const { return m_errors; }
 
     /// Everything as lines in the file's order: "cut.edl:12: loss: a dissolve of 24 frames became a cut",
     /// "cut.edl:14: warning: ...".
@@ -35,6 +41,8 @@ private:
     String m_file;
     std::vector<Loss> m_losses;
     std::vector<Loss> m_warnings;
+    std::vector<Loss> m_notes;
+    std::vector<Loss> m_errors;
 };
 
 } // namespace interchange

@@ -1,6 +1,6 @@
 #include "edit/inspect/content_diff.h"
 
-#include "edit/inspect/detail/diff_walk.h"
+#include "edit/inspect/detail/row_diff.h"
 #include "edit/model/edit_keys.h"
 #include "platform/base/num_range.h"
 
@@ -83,9 +83,25 @@ std::vector<PropertiesDiff> propertiesDiff(const EditContent& before, const Edit
     return diffs;
 }
 
-bool sameNode(const Node& a, const Node& b) {
-    return std::abs(a.time - b.time) <= Qx::kTimeTolerance && a.level == b.level;
-}
+/// How the nodes of two levels are compared (see `RowComparison`). A level comes again and again: a node is
+/// known by how far it is from the one before it as well.
+struct NodeRules {
+    const std::vector<Node>& was;
+    const std::vector<Node>& now;
+
+    [[nodiscard]] static double begin(const Node& node) { return node.time; }
+    [[nodiscard]] static double end(const Node& node) { return node.time; }
+    [[nodiscard]] bool same(size_t i, size_t j) const {
+        return std::abs(was[i].time - now[j].time) <= Qx::kTimeTolerance && alike(i, j);
+    }
+    [[nodiscard]] bool alike(size_t i, size_t j) const { return was[i].level == now[j].level; }
+    [[nodiscard]] size_t hash(WhichRow row, size_t i) const {
+        const std::vector<Node>& nodes = row == WhichRow::Was ? was : now;
+        const double pause = i > 0 ? nodes[i].time - nodes[i - 1].time : 0;
+        return mixedHash(std::hash<float>()(nodes[i].level), timeHash(pause));
+    }
+    [[nodiscard]] static bool isAnchor(WhichRow, size_t) { return true; }
+};
 
 std::vector<LevelsDiff> levelsDiff(const EditContent& before, const EditContent& after) {
     std::vector<LevelsDiff> diffs;
@@ -98,10 +114,14 @@ std::vector<LevelsDiff> levelsDiff(const EditContent& before, const EditContent&
                          old.size(),
                          young.size(),
                          {},
+                         {},
                          {}};
-        walkDifference(
-            old, young, sameNode, [](const Node& node) { return node.time; }, found.removed, found.added);
-        if (found.kind != DiffKind::Changed || !found.removed.empty() || !found.added.empty()) {
+        RowDiff<Node> rows = rowDiffOf(old, young, NodeRules{old, young});
+        found.removed = std::move(rows.removed);
+        found.added = std::move(rows.added);
+        found.moved = std::move(rows.moved);
+        if (found.kind != DiffKind::Changed || !found.removed.empty() || !found.added.empty() ||
+            !found.moved.empty()) {
             diffs.push_back(std::move(found));
         }
     };
@@ -137,8 +157,8 @@ std::vector<ObjectDiff> objectsDiff(const EditContent& before, const EditContent
         }
     };
     forEachPair(
-        before.objects, after.objects, [](const ObjectContent& its) { return std::string_view(its.name); },
-        compare);
+        before.objects, after.objects,
+        [](const ObjectContent& object) { return std::string_view(object.name); }, compare);
     return diffs;
 }
 

@@ -25,8 +25,9 @@ struct LevelsDiff {
     DiffKind kind = DiffKind::Changed;
     size_t nodesBefore = 0;
     size_t nodesAfter = 0;
-    std::vector<Aud::DynamicLevelControl::Node> removed; ///< nodes that only the first has, in order
-    std::vector<Aud::DynamicLevelControl::Node> added;   ///< and those that only the second has
+    std::vector<Aud::DynamicLevelControl::Node> removed;         ///< nodes that only the first has, in order
+    std::vector<Aud::DynamicLevelControl::Node> added;           ///< and those that only the second has
+    std::vector<MovedRun<Aud::DynamicLevelControl::Node>> moved; ///< those that both have, at other times
 };
 
 struct GroupsDiff {

@@ -95,23 +95,24 @@ Qx::Status addObjects(EditContent& content, const EditReport& report, const Stri
     if (Qx::Status status = examineStore(path, stored, damage); !status) {
         return status;
     }
-    std::erase_if(stored, [&](const StoredObjectInfo& its) { return isPartOfEdit(its.name, report); });
+    std::erase_if(stored, [&](const StoredObjectInfo& object) { return isPartOfEdit(object.name, report); });
     String bytes;
     if (!stored.empty()) {
         if (const Qx::FileError error = Qx::readWholeFile(path, bytes, UINT64_MAX)) {
             return Qx::Status::failure(error.text());
         }
     }
-    for (const StoredObjectInfo& its : stored) {
+    for (const StoredObjectInfo& object : stored) {
         // Somebody may have replaced the file since it was examined.
-        if (!its.sound || its.offset > bytes.size() || its.length > bytes.size() - its.offset) {
-            return Qx::Status::failure("object " + its.name + " of " + path + " cannot be read: " +
-                                       (its.sound ? String("the file changed; try again") : its.reason));
+        if (!object.sound || object.offset > bytes.size() || object.length > bytes.size() - object.offset) {
+            return Qx::Status::failure(
+                "object " + object.name + " of " + path +
+                " cannot be read: " + (object.sound ? String("the file changed; try again") : object.reason));
         }
-        content.objects.push_back({its.name,
-                                   its.layer,
-                                   {its.revisionMajor, its.revisionMinor},
-                                   bytes.substr(its.offset, its.length)});
+        content.objects.push_back({object.name,
+                                   object.layer,
+                                   {object.revisionMajor, object.revisionMinor},
+                                   bytes.substr(object.offset, object.length)});
     }
     return {};
 }

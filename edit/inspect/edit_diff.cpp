@@ -1,6 +1,6 @@
 #include "edit/inspect/edit_diff.h"
 
-#include "edit/inspect/detail/diff_walk.h"
+#include "edit/inspect/detail/row_diff.h"
 #include "platform/base/num_range.h"
 
 #include <algorithm>
@@ -70,22 +70,55 @@ std::vector<ChannelDiff::Span> spansOf(const EditReport& before, const ChannelRe
     return spans;
 }
 
-bool isSamePair(const EditReport& before, const PairReport& a, const EditReport& after, const PairReport& b) {
-    const auto near = [](double x, double y) { return std::abs(x - y) <= 1e-5; };
-    return near(a.in, b.in) && near(a.out, b.out) && near(a.stripIn, b.stripIn) &&
-           near(a.stripOut, b.stripOut) && near(a.fadeIn, b.fadeIn) && near(a.fadeOut, b.fadeOut) &&
-           a.velocity == b.velocity && a.begin == b.begin && a.end == b.end &&
-           isSameSource(before.sources[a.source], after.sources[b.source]);
+bool isNear(double x, double y) {
+    return std::abs(x - y) <= 1e-5;
 }
 
-/// Fills in which pairs only one of the two channels has.
+/// How the pairs of two channels are compared (see `RowComparison`).
+struct PairRules {
+    const EditReport& before;
+    const EditReport& after;
+    const std::vector<PairReport>& was;
+    const std::vector<PairReport>& now;
+
+    [[nodiscard]] static double begin(const PairReport& pair) { return pair.in; }
+    [[nodiscard]] static double end(const PairReport& pair) { return pair.out; }
+    [[nodiscard]] bool same(size_t i, size_t j) const { return isNear(was[i].in, now[j].in) && alike(i, j); }
+    [[nodiscard]] bool alike(size_t i, size_t j) const {
+        const PairReport& a = was[i];
+        const PairReport& b = now[j];
+        return isNear(a.out - a.in, b.out - b.in) && isNear(a.stripIn, b.stripIn) &&
+               isNear(a.stripOut, b.stripOut) && isNear(a.fadeIn, b.fadeIn) && isNear(a.fadeOut, b.fadeOut) &&
+               a.velocity == b.velocity && a.begin == b.begin && a.end == b.end &&
+               isSameSource(before.sources[a.source], after.sources[b.source]);
+    }
+    [[nodiscard]] const PairReport& pair(WhichRow row, size_t i) const {
+        return row == WhichRow::Was ? was[i] : now[i];
+    }
+    [[nodiscard]] const SourceReport& sourceOf(WhichRow row, size_t i) const {
+        return (row == WhichRow::Was ? before : after).sources[pair(row, i).source];
+    }
+    [[nodiscard]] size_t hash(WhichRow row, size_t i) const {
+        const SourceReport& source = sourceOf(row, i);
+        size_t hash = mixedHash(std::hash<cookie>()(source.strip), std::hash<std::string>()(source.place));
+        hash = mixedHash(hash, timeHash(pair(row, i).stripIn));
+        return mixedHash(hash, timeHash(pair(row, i).out - pair(row, i).in));
+    }
+    [[nodiscard]] bool isAnchor(WhichRow row, size_t i) const {
+        return sourceOf(row, i).kind != SourceKind::Black;
+    }
+};
+
+/// Fills in which pairs only one of the two channels has, and which have moved.
 void comparePairs(const EditReport& before, const ChannelReport* a, const EditReport& after,
                   const ChannelReport* b, ChannelDiff& diff) {
     static const std::vector<PairReport> none;
-    walkDifference(
-        a != nullptr ? a->pairs : none, b != nullptr ? b->pairs : none,
-        [&](const PairReport& was, const PairReport& now) { return isSamePair(before, was, after, now); },
-        [](const PairReport& pair) { return pair.in; }, diff.removed, diff.added);
+    const std::vector<PairReport>& was = a != nullptr ? a->pairs : none;
+    const std::vector<PairReport>& now = b != nullptr ? b->pairs : none;
+    RowDiff<PairReport> found = rowDiffOf(was, now, PairRules{before, after, was, now});
+    diff.removed = std::move(found.removed);
+    diff.added = std::move(found.added);
+    diff.moved = std::move(found.moved);
 }
 
 /// The channels by their places; levels channels, which have no pairs, are left out.
@@ -114,15 +147,29 @@ String placeOf(const EditReport& report, int channel) {
     return channel >= 0 && index < report.channels.size() ? report.channels[index].place : String();
 }
 
-bool sameCues(const EditReport& before, const EditReport& after) {
-    return std::equal(before.cues.begin(), before.cues.end(), after.cues.begin(), after.cues.end(),
-                      [&](const CueReport& a, const CueReport& b) {
-                          return std::abs(a.time - b.time) <= kTimeTolerance &&
-                                 std::abs(a.length - b.length) <= kTimeTolerance && a.text == b.text &&
-                                 a.code == b.code && a.attached == b.attached &&
-                                 placeOf(before, a.channel) == placeOf(after, b.channel);
-                      });
-}
+/// How the markers of two edits are compared (see `RowComparison`).
+struct CueRules {
+    const EditReport& before;
+    const EditReport& after;
+
+    [[nodiscard]] static double begin(const CueReport& cue) { return cue.time; }
+    [[nodiscard]] static double end(const CueReport& cue) { return cue.time + cue.length; }
+    [[nodiscard]] bool same(size_t i, size_t j) const {
+        return std::abs(before.cues[i].time - after.cues[j].time) <= kTimeTolerance && alike(i, j);
+    }
+    [[nodiscard]] bool alike(size_t i, size_t j) const {
+        const CueReport& a = before.cues[i];
+        const CueReport& b = after.cues[j];
+        return std::abs(a.length - b.length) <= kTimeTolerance && a.text == b.text && a.code == b.code &&
+               a.attached == b.attached && placeOf(before, a.channel) == placeOf(after, b.channel);
+    }
+    [[nodiscard]] size_t hash(WhichRow row, size_t i) const {
+        const CueReport& cue = (row == WhichRow::Was ? before : after).cues[i];
+        const size_t hash = mixedHash(std::hash<std::string>()(cue.text), static_cast<size_t>(cue.code));
+        return mixedHash(hash, timeHash(cue.length));
+    }
+    [[nodiscard]] static bool isAnchor(WhichRow, size_t) { return true; }
+};
 
 } // namespace
 
@@ -145,7 +192,8 @@ EditDiff diffOf(const EditReport& before, const EditReport& after) {
             found.spans = spansOf(before, *was, after, *channel);
             found.endBefore = endOf(*was);
         }
-        if (was == nullptr || !found.spans.empty() || !found.removed.empty() || !found.added.empty()) {
+        if (was == nullptr || !found.spans.empty() || !found.removed.empty() || !found.added.empty() ||
+            !found.moved.empty()) {
             diff.channels.push_back(std::move(found));
         }
     }
@@ -161,6 +209,9 @@ EditDiff diffOf(const EditReport& before, const EditReport& after) {
     }
     diff.cuesBefore = before.cues.size();
     diff.cuesAfter = after.cues.size();
-    diff.cuesDiffer = !sameCues(before, after);
+    RowDiff<CueReport> cues = rowDiffOf(before.cues, after.cues, CueRules{before, after});
+    diff.cuesRemoved = std::move(cues.removed);
+    diff.cuesAdded = std::move(cues.added);
+    diff.cuesMoved = std::move(cues.moved);
     return diff;
 }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "edit/inspect/edit_report.h"
+#include "edit/inspect/moved_run.h"
 
 #include <vector>
 
@@ -21,9 +22,10 @@ struct ChannelDiff {
     String name; ///< kind letter and place: "V1"
     DiffKind kind = DiffKind::Changed;
     std::vector<Span> spans; ///< edit times at which the two play something else, in order; of a changed one
-    std::vector<PairReport> removed; ///< pairs that the first has and the second has not, in order
-    std::vector<PairReport> added;   ///< and the other way round
-    double endBefore = 0;            ///< seconds at which the last pair ends
+    std::vector<PairReport> removed;         ///< pairs that the first has and the second has not, in order
+    std::vector<PairReport> added;           ///< and the other way round
+    std::vector<MovedRun<PairReport>> moved; ///< pairs that both have, at other times
+    double endBefore = 0;                    ///< seconds at which the last pair ends
     double endAfter = 0;
 };
 
@@ -31,8 +33,13 @@ struct EditDiff {
     std::vector<ChannelDiff> channels; ///< those that differ, in the order of the channel index
     size_t cuesBefore = 0;
     size_t cuesAfter = 0;
-    bool cuesDiffer = false;
-    [[nodiscard]] bool same() const { return channels.empty() && !cuesDiffer; }
+    std::vector<CueReport> cuesRemoved;         ///< markers that only the first has, in order
+    std::vector<CueReport> cuesAdded;           ///< and those that only the second has
+    std::vector<MovedRun<CueReport>> cuesMoved; ///< those that both have, at other times
+    [[nodiscard]] bool cuesDiffer() const {
+        return !cuesRemoved.empty() || !cuesAdded.empty() || !cuesMoved.empty();
+    }
+    [[nodiscard]] bool same() const { return channels.empty() && !cuesDiffer(); }
 };
 
 /// Compares two edits, of one project or of two. Sources are told apart by their cookies alone: neither names

@@ -49,7 +49,7 @@ public:
         }
         const auto [place, added] = m_strips.try_emplace(event.strip, m_sources.size());
         if (added) {
-            m_sources.push_back({event.strip, kindOf(event.strip), {}, {}, m_dropFrame, {}});
+            m_sources.push_back({event.strip, kindOf(event.strip), {}, {}, m_dropFrame, {}, {}});
             if (m_namer && m_sources.back().kind == SourceKind::Shot) {
                 m_namer(m_sources.back());
             }
@@ -70,6 +70,7 @@ private:
                                  m_edit.getChanDisplayName(event.id),
                                  {},
                                  m_dropFrame,
+                                 {},
                                  index != NO_CHAN ? m_places[static_cast<size_t>(index)] : String()});
         }
         return place->second;
@@ -104,7 +105,10 @@ void takePairs(const cel& content, double quarterFrame, SourceTable& table, std:
                          out->rampQFrames * quarterFrame,
                          table.indexOf(*in),
                          {in->level, in->code, in->rampCurve},
-                         {out->level, out->code, out->rampCurve}});
+                         {out->level, out->code, out->rampCurve},
+                         in->id,
+                         TransitionKind::Cut,
+                         {}});
     }
 }
 
@@ -217,6 +221,14 @@ EditReport reportOf(const Edit& edit, const SourceNamer& namer) {
     takeCues(edit, report.cues);
     takeGroups(edit, report.groups);
     return report;
+}
+
+const char* transitionText(TransitionKind kind) {
+    switch (kind) {
+    case TransitionKind::Cut:
+        return "cut";
+    }
+    return "cut";
 }
 
 const char* sourceKindText(SourceKind kind) {

@@ -27,8 +27,12 @@ struct SourceReport {
     String name;            ///< the item's own name, any bytes; empty for what has none
     String problem;         ///< why the name could not be read; empty if it could
     bool dropFrame = false; ///< its timecode is counted in drop frame
+    String reel;            ///< the tape or file it was taken from, any bytes; empty where none is known
     String place;           ///< of an alias: `ChannelReport::place` of the channel it shows
 };
+
+/// How a pair begins where another one ends.
+enum class TransitionKind { Cut };
 
 /// One pair of a channel.
 struct PairReport {
@@ -50,6 +54,9 @@ struct PairReport {
     };
     End begin;
     End end;
+    IdStamp id; ///< of its in event; it stays through trims and moves
+    TransitionKind transition = TransitionKind::Cut;
+    String event; ///< its number in the list that it was imported from; empty where there is none
 };
 
 struct QM_API ChannelReport {
@@ -103,13 +110,16 @@ struct QM_API EditReport {
     [[nodiscard]] String lengthText(double seconds) const;
 };
 
-/// Looks up what its own file says of a source: fills `name` and `dropFrame`, or `problem`. Asked once a
-/// source.
+/// Looks up what its own file says of a source: fills `name`, `dropFrame` and `reel`, or `problem`. Asked once
+/// a source.
 using SourceNamer = std::function<void(SourceReport&)>;
 
 /// Takes out everything. `namer` may be empty: then no name is looked up. The edit is not changed; who shares
 /// it with other threads holds its section.
 [[nodiscard]] QM_API EditReport reportOf(const Edit& edit, const SourceNamer& namer);
+
+/// "cut".
+[[nodiscard]] QM_API const char* transitionText(TransitionKind kind);
 
 /// A word for the kind: "shot", "media", "black", "effect", "alias", "input", "magic".
 [[nodiscard]] QM_API const char* sourceKindText(SourceKind kind);

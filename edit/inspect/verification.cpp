@@ -29,8 +29,9 @@ bool itemOfFile(const String& name, cookie& item) {
 
 class Verifier {
 public:
-    Verifier(const String& folder, const std::vector<cookie>& items, std::vector<VerifiedFile>& files)
-        : m_folder(folder), m_items(items), m_files(files) {}
+    Verifier(const String& folder, const std::vector<cookie>& items, std::vector<VerifiedFile>& files,
+             const std::function<void(const String&)>& checking)
+        : m_folder(folder), m_items(items), m_files(files), m_checking(checking) {}
 
     Qx::Status addEdits();
     Qx::Status addMilestones();
@@ -41,6 +42,7 @@ private:
     const String& m_folder;
     const std::vector<cookie>& m_items;
     std::vector<VerifiedFile>& m_files;
+    const std::function<void(const String&)>& m_checking;
 };
 
 void Verifier::add(const cookie& item, const String& name) {
@@ -51,6 +53,9 @@ void Verifier::add(const cookie& item, const String& name) {
     file.name = name;
     file.item = item;
     const String path = Qx::joinPath(m_folder, name);
+    if (m_checking) {
+        m_checking(name);
+    }
     // A writer may move or replace it at that moment: then what is there afterwards counts.
     constexpr int kTries = 5;
     for (int tries = 0; tries < kTries; ++tries) {
@@ -111,8 +116,9 @@ Qx::Status Verifier::addMilestones() {
 } // namespace
 
 Qx::Status verifyProject(const String& folder, const std::vector<cookie>& items,
-                         std::vector<VerifiedFile>& files) {
-    Verifier verifier(folder, items, files);
+                         std::vector<VerifiedFile>& files,
+                         const std::function<void(const String&)>& checking) {
+    Verifier verifier(folder, items, files, checking);
     Qx::Status status = verifier.addEdits();
     return status ? verifier.addMilestones() : status;
 }

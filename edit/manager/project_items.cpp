@@ -3,6 +3,7 @@
 #include "edit/manager/edit_record.h"
 #include "edit/manager/revision_chain.h"
 #include "edit/model/edit.h"
+#include "edit/model/edit_keys.h"
 #include "edit/persist/edit_salvage.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
@@ -324,7 +325,7 @@ const SourceFacts& ProjectItems::factsOf(const cookie& source) {
     if (added) {
         EditPtr edit;
         if (const Qx::Status found = read(source, edit); found) {
-            place->second = {edit->getName(), {}, edit->isDropFrame(false)};
+            place->second = {edit->getName(), {}, edit->Opts().getString(EditKeys::kReel), edit->isDropFrame(false)};
         } else {
             place->second.problem = found.reason();
         }

@@ -27,6 +27,7 @@ struct ListedEdit {
 struct SourceFacts {
     String name;            ///< any bytes; empty for what has none
     String problem;         ///< why the file could not be read; empty if it could
+    String reel;            ///< as its log says; empty for what has none
     bool dropFrame = false; ///< its timecode is counted in drop frame
 };
 

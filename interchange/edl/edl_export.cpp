@@ -57,6 +57,7 @@ struct Lead {
     bool black = false;
     size_t source = kNoClip; ///< of a line of no length that is not black
     int64_t sourceFrame = 0;
+    bool asWritten = true; ///< a line of no length says what it said in the list
     size_t clip = kNoClip;
 };
 
@@ -78,6 +79,7 @@ private:
     void addEvent(size_t clip);
     void addLead(std::vector<ExportLine>& lines, const ExportClip& clip, const Lead& lead);
     void addCues();
+    [[nodiscard]] bool isAsImported(const ExportClip& clip) const;
     [[nodiscard]] ExportLine lineOf(const ExportClip& clip, const EdlSource& source) const;
     [[nodiscard]] String numberOf(const ExportClip& clip);
     void keepNotes(ExportLine& line, size_t record, bool first);
@@ -178,6 +180,7 @@ bool EdlExporter::outgoingFrame(const ExportClip& clip, Lead& lead) const {
             return false;
         }
         found |= other.channels;
+        lead.asWritten = lead.asWritten && isAsImported(other);
         lead.sourceFrame = other.sourceNext();
         lead.source = other.source;
     }
@@ -200,7 +203,9 @@ void EdlExporter::findTransition(size_t index, const KeptType& type) {
     } else {
         lead.zeroLength = true;
         lead.black = m_records[record - 1].reel == "BL" || m_records[record - 1].reel == "BLACK";
-        good = good && (lead.black || outgoingFrame(clip, lead));
+        const bool isHanging = m_records[record - 1].isHanging;
+        good = good && (lead.black || isHanging || outgoingFrame(clip, lead));
+        lead.asWritten = lead.black || isHanging || lead.asWritten;
     }
     if (!good) {
         m_report.addLoss(0,
@@ -266,6 +271,20 @@ void EdlExporter::findLeads() {
     }
 }
 
+// True for the clip of a record that plays what the record says, at its speed and as long.
+bool EdlExporter::isAsImported(const ExportClip& clip) const {
+    if (clip.record == kNoRecord || !m_records[clip.record].times) {
+        return false;
+    }
+    const EdlRecord& record = m_records[clip.record];
+    const bool isBlack = m_sources[clip.source].black;
+    const bool sameSpeed =
+        isBlack || (record.speedDigits.empty() ? clip.velocity == 1.0
+                                               : detail::speedIs(record.speedDigits, clip.velocity, m_rate));
+    return sameSpeed && clip.recordOut - clip.recordIn == record.times->length &&
+           (isBlack || clip.sourceIn == record.times->shown);
+}
+
 ExportLine EdlExporter::lineOf(const ExportClip& clip, const EdlSource& source) const {
     ExportLine line;
     EdlEvent& event = line.event;
@@ -280,13 +299,20 @@ ExportLine EdlExporter::lineOf(const ExportClip& clip, const EdlSource& source) 
     const int64_t length = clip.recordOut - clip.recordIn;
     event.sourceIn = clip.sourceIn;
     event.sourceOut = clip.sourceIn + length;
+    const bool asImported = isAsImported(clip);
+    if (asImported) {
+        event.sourceIn = m_records[clip.record].times->sourceIn;
+        event.sourceOut = m_records[clip.record].times->sourceOut;
+    }
     if (clip.velocity == 1.0 || source.black) {
         return line;
     }
     const int64_t span =
         std::max<int64_t>(1, std::llround(std::abs(clip.velocity) * static_cast<double>(length)));
-    event.sourceOut = clip.sourceIn + span;
-    if (clip.velocity < 0) {
+    if (!asImported) {
+        event.sourceOut = clip.sourceIn + span;
+    }
+    if (clip.velocity < 0 && !asImported) {
         event.sourceIn = std::max<int64_t>(0, clip.sourceIn + 1 - span);
         event.sourceOut = clip.sourceIn + 1;
     }
@@ -345,6 +371,10 @@ void EdlExporter::addLead(std::vector<ExportLine>& lines, const ExportClip& clip
     event.recordIn = event.recordOut = m_start + clip.recordIn;
     event.recordDrop = m_drop;
     event.sourceDrop = m_drop;
+    if (lead.named && lead.asWritten && m_records[clip.record - 1].times) {
+        event.sourceIn = m_records[clip.record - 1].times->sourceIn;
+        event.sourceOut = m_records[clip.record - 1].times->sourceOut;
+    }
     if (lead.source != kNoClip) {
         line.source = &m_sources[lead.source];
         line.name = line.source->name;

@@ -28,7 +28,8 @@ struct EdlExportOptions {
 /// duration times the factor, in reverse the span from its lowest frame.
 ///
 /// What an imported list said (`EdlKey::kEvents`, `kNotes`) is given back for every event that is still
-/// there, known by its stamp: its number, its reel, its notes in their order, the digits of its speed. Notes
+/// there, known by its stamp: its number, its reel, its notes in their order, the digits of its speed, and,
+/// where it plays what it played, its source times as they were written. Notes
 /// are written as they were if the event then reads as the edit has it; else its names, tracks and speed are
 /// noted afresh, and notes of other kinds stay. Number and markers are given back once: a piece that was cut
 /// off is an event with a number of its own. Fresh events are numbered on from the greatest number. More than

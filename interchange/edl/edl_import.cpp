@@ -34,6 +34,8 @@ public:
 
 private:
     void findSources();
+    void addOutgoingSides();
+    [[nodiscard]] std::string keyOf(size_t index) const;
     size_t sourceOf(const EdlClip& clip);
     void buildShot(size_t index);
     void buildSequence(const String& name);
@@ -122,20 +124,25 @@ EditPtr EdlImporter::newEdit(const cookie& item, bool original) const {
     return edit;
 }
 
+// What tells the source of an event.
+std::string EdlImporter::keyOf(size_t index) const {
+    const EdlEvent& event = m_list.events[index];
+    // Line feeds cannot occur in the names.
+    std::string key = event.reel + "\n" + event.clipName + "\n" + event.sourceFile;
+    const bool nameless = event.clipName.empty() && event.sourceFile.empty();
+    if (nameless && String::equalNoCase(event.reel, "AX")) {
+        key += "\n" + std::to_string(index);
+    }
+    return key;
+}
+
 // The number of the source that an event plays.
 size_t EdlImporter::sourceOf(const EdlClip& clip) {
     size_t& known = m_sourceOfEvent[clip.event];
     if (known != kNoSource) {
         return known;
     }
-    const EdlEvent& event = m_list.events[clip.event];
-    // Line feeds cannot occur in the names.
-    std::string key = event.reel + "\n" + event.clipName + "\n" + event.sourceFile;
-    const bool nameless = event.clipName.empty() && event.sourceFile.empty();
-    if (nameless && String::equalNoCase(event.reel, "AX")) {
-        key += "\n" + std::to_string(clip.event);
-    }
-    known = m_byName.try_emplace(std::move(key), m_sources.size()).first->second;
+    known = m_byName.try_emplace(keyOf(clip.event), m_sources.size()).first->second;
     if (known == m_sources.size()) {
         m_sources.push_back({clip.event, 0, INFINITY, -INFINITY});
     }
@@ -155,6 +162,24 @@ void EdlImporter::findSources() {
             const double last = clip.sourceOut();
             source.in = std::min({source.in, clip.sourceIn, last + (clip.velocity < 0 ? 1.0 : 0.0)});
             source.out = std::max({source.out, clip.sourceIn + (clip.velocity > 0 ? 0.0 : 1.0), last});
+        }
+    }
+    addOutgoingSides();
+}
+
+// The outgoing side of a transition runs on under it, behind its source out.
+void EdlImporter::addOutgoingSides() {
+    for (size_t i = 1; i < m_list.events.size(); ++i) {
+        const EdlEvent& event = m_list.events[i];
+        const EdlEvent& outgoing = m_list.events[i - 1];
+        const bool isTransition = event.type == EdlType::Dissolve || event.type == EdlType::Wipe;
+        if (event.role != EdlRole::Incoming || !isTransition || outgoing.isBlack() || outgoing.speed) {
+            continue;
+        }
+        if (const auto known = m_byName.find(keyOf(i - 1)); known != m_byName.end()) {
+            Source& source = m_sources[known->second];
+            source.in = std::min(source.in, static_cast<double>(outgoing.sourceIn));
+            source.out = std::max(source.out, static_cast<double>(outgoing.sourceOut + event.duration));
         }
     }
 }
@@ -226,6 +251,10 @@ void EdlImporter::buildChannels(Edit& edit) {
 }
 
 void EdlImporter::addCues(Edit& edit) {
+    Vector<cel*> cels;
+    for (int chan = 0; chan < edit.getNumChans(); ++chan) {
+        cels.push_back(edit.get_edit_cel_p(chan));
+    }
     for (const EdlMarker& marker : m_list.markers) {
         const int64_t position = markerPosition(m_list, m_programme, marker);
         if (position < 0) {
@@ -238,7 +267,7 @@ void EdlImporter::addCues(Edit& edit) {
             text = marker.colour + (text.empty() ? "" : " ") + text;
         }
         edit.get_cues().add_cue_point(
-            cue_point(text.c_str(), m_list.rate.toSeconds(position), kAnyCueChan, colour, {}, false));
+            cue_point(text.c_str(), m_list.rate.toSeconds(position), kAnyCueChan, colour, cels, true));
     }
     edit.get_cues().sort();
 }
@@ -252,6 +281,9 @@ void EdlImporter::buildSequence(const String& name) {
         m_records[i].reel = event.reel;
         m_records[i].speedDigits = event.speed ? event.speed->digits : String();
         m_records[i].notes = event.notes;
+        m_records[i].times = {event.sourceIn, event.sourceOut, event.recordOut - event.recordIn,
+                              m_programme.firstFrames[i]};
+        m_records[i].isHanging = m_programme.hanging[i];
     }
     EditPtr sequence = newEdit(provisionalCookie(m_sources.size()), false);
     buildChannels(*sequence);
@@ -284,6 +316,7 @@ Qx::Status importEdlList(const EdlList& list, const String& name, const ImportOp
     built.report = result.report;
     EdlProgramme programme;
     if (Qx::Status status = layTracks(list, options.strict, programme, built.report); !status) {
+        result.report = std::move(built.report);
         return status;
     }
     EdlImporter(list, programme, built).build(name);
@@ -294,11 +327,14 @@ Qx::Status importEdlList(const EdlList& list, const String& name, const ImportOp
 Qx::Status importEdl(const String& path, const ImportOptions& options, Import& result) {
     Import built;
     EdlList list;
-    if (Qx::Status status = readEdlFile(path, options.rate, list, built.report); !status) {
+    const BadLines bad = options.skipBad ? BadLines::Skip : BadLines::Refuse;
+    if (Qx::Status status = readEdlFile(path, options.rate, list, built.report, bad); !status) {
+        result.report = std::move(built.report);
         return status;
     }
     const String name = Qx::withoutExtension(Qx::fileNameOf(path));
     if (Qx::Status status = importEdlList(list, name, options, built); !status) {
+        result.report = std::move(built.report);
         return status;
     }
     result = std::move(built);

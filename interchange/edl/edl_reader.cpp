@@ -1,6 +1,7 @@
 #include "interchange/edl/edl_reader.h"
 
 #include "interchange/edl/detail/edl_reading.h"
+#include "interchange/text_encoding.h"
 #include "platform/base/text_lines.h"
 #include "platform/media/timecode.h"
 #include "platform/services/files.h"
@@ -32,8 +33,9 @@ String EdlEvent::typeText() const {
     return {};
 }
 
-Qx::Status readEdl(std::string_view text, Qx::FrameRate rate, EdlList& list, LossReport& report) {
-    detail::EdlReader reading(rate, report);
+Qx::Status readEdl(std::string_view text, Qx::FrameRate rate, EdlList& list, LossReport& report,
+                   BadLines bad) {
+    detail::EdlReader reading(rate, report, bad);
     Qx::Status status = reading.read(text);
     if (status) {
         list = std::move(reading.list());
@@ -41,7 +43,8 @@ Qx::Status readEdl(std::string_view text, Qx::FrameRate rate, EdlList& list, Los
     return status;
 }
 
-Qx::Status readEdlFile(const String& path, Qx::FrameRate rate, EdlList& list, LossReport& report) {
+Qx::Status readEdlFile(const String& path, Qx::FrameRate rate, EdlList& list, LossReport& report,
+                       BadLines bad) {
     report.setFile(path);
     String text;
     if (const Qx::FileError error = Qx::readWholeFile(path, text, kMaxEdlBytes)) {
@@ -52,7 +55,7 @@ Qx::Status readEdlFile(const String& path, Qx::FrameRate rate, EdlList& list, Lo
         }
         return error.status();
     }
-    return readEdl(text, rate, list, report);
+    return readEdl(text, rate, list, report, bad);
 }
 
 namespace detail {
@@ -80,15 +83,6 @@ void EdlReader::warnOnce(Once once, const String& what) {
     }
 }
 
-String EdlReader::name(std::string_view text) {
-    bool replaced = false;
-    String result = utf8Name(text, replaced);
-    if (replaced) {
-        warnOnce(kBadUtf8, "names hold bytes that are not UTF-8, read as U+FFFD");
-    }
-    return result;
-}
-
 bool EdlReader::paired() const {
     return !m_list.events.empty() && m_list.events.back().role == EdlRole::Incoming;
 }
@@ -103,10 +97,21 @@ Qx::Status EdlReader::read(std::string_view text) {
     if (text.starts_with("\xEF\xBB\xBF")) {
         text.remove_prefix(3);
     }
+    const bool isUtf8 = Qx::isUtf8(text);
     while (!text.empty()) {
         ++m_line;
-        if (Qx::Status status = readLine(Qx::takeLine(text)); !status) {
-            return status;
+        std::string_view line = Qx::takeLine(text);
+        if (!isUtf8 && !Qx::isUtf8(line)) {
+            warnOnce(kNotUtf8, "the list is not UTF-8 here; such lines are read as Windows-1252");
+            m_converted = utf8OfWindows1252(line);
+            line = m_converted;
+        }
+        if (Qx::Status status = readLine(line); !status) {
+            m_badLines.add(m_line, status.reason());
+            m_skipsNotes = true;
+        }
+        if (m_list.events.size() > kMaxEdlEvents) {
+            return failure(m_line, "a list holds at most 999999 event lines; split it");
         }
     }
     return finish();
@@ -128,10 +133,10 @@ Qx::Status EdlReader::readLine(std::string_view whole) {
             return readEvent(whole);
         }
         if (end == std::string_view::npos && !m_inSourceTable) {
-            return failure(m_line, "the event line has a number only; complete or delete it");
+            return Qx::Status::failure("the event line has a number only; complete or delete it");
         }
     }
-    if (!m_inSourceTable && !readStatement(line)) {
+    if (!m_inSourceTable && !readStatement(line) && !m_skipsNotes) {
         readNote(line);
     }
     return {};
@@ -140,7 +145,7 @@ Qx::Status EdlReader::readLine(std::string_view whole) {
 bool EdlReader::readStatement(std::string_view line) {
     if (beginsNoCase(line, "TITLE:")) {
         if (!m_titleSeen) {
-            m_list.title = name(trimBlanks(line.substr(6)));
+            m_list.title = trimBlanks(line.substr(6));
             m_titleSeen = true;
         } else {
             m_report.addWarning(m_line, "a second TITLE is not used");
@@ -167,20 +172,17 @@ Qx::Status EdlReader::readEvent(std::string_view line) {
     EdlLine parsed;
     if (Qx::Status status = parseEventLine(line, m_fields, parsed); !status) {
         // In a source table a line that begins with digits is a row of it.
-        return m_inSourceTable ? Qx::Status() : failure(m_line, status.reason());
+        return m_inSourceTable ? Qx::Status() : status;
     }
     m_inSourceTable = false;
-    if (m_list.events.size() == kMaxEdlEvents) {
-        return failure(m_line, "a list holds at most 999999 event lines; split it");
-    }
     EdlEvent& event = parsed.event;
     event.line = m_line;
-    event.reel = name(event.reel);
     if (Qx::Status status = readTimes(parsed, event); !status) {
         return status;
     }
     placeSpeeds();
     pairWithLineBefore(event);
+    m_skipsNotes = false;
     m_nameIsFrom = false;
     m_sourceForIncoming = event.role == EdlRole::Incoming && !m_list.events.empty() &&
                           m_list.events.back().recordIn == m_list.events.back().recordOut;
@@ -227,13 +229,13 @@ Qx::Status EdlReader::readTime(std::string_view text, Qx::TimecodeFields& fields
     if (text.find_first_of(":;,.") == std::string_view::npos) {
         count = digitsValue(text);
         return count >= 0 ? Qx::Status()
-                          : failure(m_line, "frame count " + quotedText(text) +
+                          : Qx::Status::failure("frame count " + quotedText(text) +
                                                 " has more than nine digits; correct it");
     }
     if (Qx::Status status = Qx::parseTimecode(text, m_list.rate, fields); !status) {
         const bool frame = status.code() == Qx::StatusCode::Unsupported;
-        return failure(m_line, status.reason() + (frame ? "; give the frame rate that the list was made at"
-                                                        : "; correct it"));
+        return Qx::Status::failure(
+            status.reason() + (frame ? "; give the frame rate that the list was made at" : "; correct it"));
     }
     return {};
 }
@@ -265,17 +267,52 @@ Qx::Status EdlReader::readTimes(const EdlLine& parsed, EdlEvent& event) {
 }
 
 Qx::Status EdlReader::finish() {
-    if (m_list.events.empty()) {
-        return failure(std::max(m_line, 1), "the list has no events; export it again from its source");
-    }
     placeSpeeds();
-    for (EdlEvent& event : m_list.events) {
-        if (Qx::Status status = finishEvent(event); !status) {
-            return status;
+    std::vector<bool> isBad(m_list.events.size());
+    bool anyBad = false;
+    for (size_t i = 0; i < isBad.size(); ++i) {
+        if (Qx::Status status = finishEvent(m_list.events[i]); !status) {
+            m_badLines.add(m_list.events[i].line, status.reason());
+            isBad[i] = anyBad = true;
         }
     }
+    if (!m_badLines.empty() && m_bad == BadLines::Refuse) {
+        return m_badLines.refuse(m_report);
+    }
     checkSplits();
+    if (anyBad) {
+        dropEvents(isBad);
+    }
+    if (m_list.events.empty()) {
+        return failure(std::max(m_line, 1), m_badLines.empty()
+                                                ? "the list has no events; export it again from its source"
+                                                : "no event of the list can be read; export it again from "
+                                                  "its source");
+    }
+    m_badLines.leaveOut(m_report);
     return {};
+}
+
+// What stands with a line that goes, its markers and the other line of its event, is none of its own.
+void EdlReader::dropEvents(const std::vector<bool>& isBad) {
+    std::vector<EdlEvent> kept;
+    std::vector<size_t> placeOf(isBad.size(), SIZE_MAX);
+    for (size_t i = 0; i < isBad.size(); ++i) {
+        EdlEvent& event = m_list.events[i];
+        if (isBad[i]) {
+            continue;
+        }
+        const bool losesPair = (event.role == EdlRole::Incoming && i > 0 && isBad[i - 1]) ||
+                               (event.role == EdlRole::Outgoing && i + 1 < isBad.size() && isBad[i + 1]);
+        event.role = losesPair ? EdlRole::Alone : event.role;
+        placeOf[i] = kept.size();
+        kept.push_back(std::move(event));
+    }
+    m_list.events = std::move(kept);
+    std::erase_if(m_list.markers, [&](const EdlMarker& marker) { return isBad[marker.event]; });
+    for (EdlMarker& marker : m_list.markers) {
+        marker.event = placeOf[marker.event];
+    }
 }
 
 Qx::Status EdlReader::finishEvent(EdlEvent& event) {
@@ -288,16 +325,15 @@ Qx::Status EdlReader::finishEvent(EdlEvent& event) {
         const int64_t hour = int64_t{3600} * m_list.rate.nominal();
         const int64_t length = out - event.recordIn;
         if (length <= 0 || std::abs(length - std::abs(event.sourceOut - event.sourceIn)) > hour) {
-            return failure(event.line, "record out " +
-                                           Qx::timecodeText(event.recordOut, m_list.rate, event.recordDrop) +
-                                           " lies before record in " +
-                                           Qx::timecodeText(event.recordIn, m_list.rate, event.recordDrop) +
-                                           "; correct one of them");
+            return Qx::Status::failure(
+                "record out " + Qx::timecodeText(event.recordOut, m_list.rate, event.recordDrop) +
+                " lies before record in " + Qx::timecodeText(event.recordIn, m_list.rate, event.recordDrop) +
+                "; correct one of them");
         }
         event.recordOut = out;
     }
     if (event.sourceOut < event.sourceIn && !reverse) {
-        return failure(event.line, "source out lies before source in; correct one of them");
+        return Qx::Status::failure("source out lies before source in; correct one of them");
     }
     if (event.freeze && !event.speed) {
         event.speed = EdlSpeed{event.reel, "000.0", 0.0, event.sourceIn, event.line};

@@ -67,6 +67,7 @@ struct QM_INTERCHANGE_API EdlEvent {
     String clipName;   ///< UTF-8
     String sourceFile; ///< the full name behind a shortened reel, UTF-8
     String mediaPath;  ///< text only: nothing ever opens it
+    String effectName; ///< of its transition, or of an effect on it, UTF-8
     std::optional<EdlSpeed> speed;
     /// The note lines below the event, as written without the blanks at their ends, joined by line feeds. A
     /// first line that begins with "SPLIT" stood above it.
@@ -80,9 +81,10 @@ struct QM_INTERCHANGE_API EdlEvent {
 /// A `LOC` note.
 struct EdlMarker {
     int line = 0;
-    int64_t at = 0; ///< record time, frames from midnight
-    String colour;  ///< one word, may be empty
-    String text;    ///< UTF-8, may be empty
+    size_t event = 0; ///< index of the event that it stands below
+    int64_t at = 0;   ///< record time, frames from midnight
+    String colour;    ///< one word, may be empty
+    String text;      ///< UTF-8, may be empty
 };
 
 struct EdlList {
@@ -97,19 +99,28 @@ struct EdlList {
 inline constexpr uint64_t kMaxEdlBytes = uint64_t{64} << 20;
 inline constexpr size_t kMaxEdlEvents = 999'999;
 
+/// What becomes of event lines that cannot be read.
+enum class BadLines {
+    Refuse, ///< the list is refused
+    Skip    ///< the list is read without them
+};
+
 /// Reads a list of a frame rate, which the text does not state. `report` names the file in messages and
 /// receives warnings. A failure is one sentence that names file, line and remedy; `list` is then as it was.
 ///
-/// What is decided here: names that are not UTF-8 have U+FFFD in the place of the wrong bytes, notes keep
-/// their bytes. A drop-frame label that does not exist moves up to the next that does. A list that says drop
+/// Lines that cannot be read are all met before the first is told of: a failure has each as an error in
+/// `report`. With `BadLines::Skip` each is a loss, what stands below it up to the next event goes with it, and
+/// only a list of which nothing is left is refused.
+///
+/// What is decided here: a line that is not UTF-8 is read as Windows-1252. A drop-frame label that does not exist moves up to the next that does. A list that says drop
 /// frame at a rate which has none is read as non-drop. The lines of a source table (">>>") are skipped. All
 /// four draw a warning.
 QM_INTERCHANGE_API Qx::Status readEdl(std::string_view text, Qx::FrameRate rate, EdlList& list,
-                                      LossReport& report);
+                                      LossReport& report, BadLines bad = BadLines::Refuse);
 
 /// The same for a file of at most `kMaxEdlBytes`, refused unread when it is larger. Sets the report's file
 /// name, without its folder.
 QM_INTERCHANGE_API Qx::Status readEdlFile(const String& path, Qx::FrameRate rate, EdlList& list,
-                                          LossReport& report);
+                                          LossReport& report, BadLines bad = BadLines::Refuse);
 
 } // namespace interchange

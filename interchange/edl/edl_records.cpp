@@ -2,6 +2,8 @@
 
 #include "platform/base/text_lines.h"
 
+#include <charconv>
+
 namespace interchange {
 
 namespace {
@@ -10,6 +12,21 @@ void appendLine(String& text, char tag, std::string_view line) {
     text += tag;
     text += line;
     text += '\n';
+}
+
+/// Nothing for a text that is not four whole numbers.
+std::optional<EdlRecord::Times> timesOf(std::string_view text) {
+    EdlRecord::Times times;
+    const char* at = text.data();
+    const char* const end = at + text.size();
+    for (int64_t* const number : {&times.sourceIn, &times.sourceOut, &times.length, &times.shown}) {
+        const auto [next, error] = std::from_chars(at, end, *number);
+        if (error != std::errc()) {
+            return std::nullopt;
+        }
+        at = next != end && *next == ' ' ? next + 1 : next;
+    }
+    return at == end ? std::optional(times) : std::nullopt;
 }
 
 void readField(EdlRecord& record, char tag, std::string_view value) {
@@ -24,6 +41,12 @@ void readField(EdlRecord& record, char tag, std::string_view value) {
         break;
     case 'V':
         record.speedDigits = value;
+        break;
+    case 'T':
+        record.times = timesOf(value);
+        break;
+    case 'H':
+        record.isHanging = true;
         break;
     case 'N':
         record.notes += record.notes.empty() ? "" : "\n";
@@ -46,6 +69,15 @@ String packEdlRecords(const std::vector<EdlRecord>& records) {
         }
         if (!record.speedDigits.empty()) {
             appendLine(text, 'V', record.speedDigits);
+        }
+        if (record.times) {
+            const EdlRecord::Times& times = *record.times;
+            appendLine(text, 'T',
+                       std::to_string(times.sourceIn) + " " + std::to_string(times.sourceOut) + " " +
+                           std::to_string(times.length) + " " + std::to_string(times.shown));
+        }
+        if (record.isHanging) {
+            appendLine(text, 'H', "");
         }
         Qx::forEachLine(record.notes, [&](std::string_view line) { appendLine(text, 'N', line); });
     }

@@ -1,9 +1,12 @@
 #pragma once
 
+#include "edit/model/edit_keys.h"
 #include "interchange/export.h"
 #include "platform/base/id_stamp.h"
 #include "platform/base/qx_string.h"
 
+#include <cstdint>
+#include <optional>
 #include <string_view>
 #include <vector>
 
@@ -16,7 +19,7 @@ namespace EdlKey {
 inline constexpr const char* kEvents = "EDL_EVENTS"; ///< string: `packEdlRecords`
 inline constexpr const char* kNotes = "EDL_NOTES";   ///< string: the notes above the first event
 // Of an imported shot.
-inline constexpr const char* kReel = "REEL";                  ///< string
+inline constexpr const char* kReel = EditKeys::kReel;         ///< string
 inline constexpr const char* kSourceFile = "EDL_SOURCE_FILE"; ///< string: the full name behind the reel
 inline constexpr const char* kMediaPath = "EDL_MEDIA_PATH";   ///< string: text, never opened
 } // namespace EdlKey
@@ -30,6 +33,17 @@ struct EdlRecord {
     String speedDigits; ///< of its M2; empty for none
     String notes;       ///< `EdlEvent::notes`
     std::vector<IdStamp> events;
+    /// What the list said in times, for an event that is still as it was. Frames, those of the source from
+    /// midnight.
+    struct Times {
+        int64_t sourceIn = 0;
+        int64_t sourceOut = 0;
+        int64_t length = 0; ///< of the record side
+        int64_t shown = 0;  ///< the source frame that is shown first
+        bool operator==(const Times&) const = default;
+    };
+    std::optional<Times> times;
+    bool isHanging = false; ///< names an outgoing side that nothing before it plays
     bool operator==(const EdlRecord&) const = default;
 };
 
@@ -39,6 +53,8 @@ struct EdlRecord {
 ///     RA013C001                           reel
 ///     S00000000-00000000-00000000         an event's stamp, in any number
 ///     V047.6                              the digits of its speed
+///     T90000 90025 25 90000               source in, source out, record length, first frame shown
+///     H                                   a hanging outgoing side
 ///     N* FROM CLIP NAME: x                a note line, in any number
 QM_INTERCHANGE_API String packEdlRecords(const std::vector<EdlRecord>& records);
 

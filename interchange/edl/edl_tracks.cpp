@@ -1,5 +1,6 @@
 #include "interchange/edl/edl_tracks.h"
 
+#include "interchange/edl/detail/edl_bad_lines.h"
 #include "platform/media/timecode.h"
 
 #include <algorithm>
@@ -17,6 +18,27 @@ int64_t recordLength(const EdlEvent& event) {
 // Source frames a record frame. The speed counts the labels of a second, as timecode does: 24 at 23.976.
 double velocityOf(const EdlEvent& event, Qx::FrameRate rate) {
     return event.speed ? event.speed->framesPerSecond / rate.nominal() : 1.0;
+}
+
+// The source frame that an event shows first. At a speed the M2 names it where it names one of the span.
+// Failing that, in reverse it is the highest of the span.
+int64_t firstFrameOf(const EdlEvent& event, Qx::FrameRate rate) {
+    if (!event.speed || event.speed->framesPerSecond > 0) {
+        return event.sourceIn;
+    }
+    const int64_t low = std::min(event.sourceIn, event.sourceOut);
+    const int64_t high = std::max(event.sourceIn, event.sourceOut);
+    const int64_t at = event.speed->at;
+    if (event.speed->framesPerSecond == 0) {
+        return at >= low && at < high ? at : event.sourceIn;
+    }
+    const auto played = static_cast<double>(recordLength(event)) * std::abs(velocityOf(event, rate));
+    // What begins with the lowest frame plays what lies below, if there is that much.
+    const bool hasRoom = at > low || std::llround(played) <= low + 1;
+    if (at >= low && at <= high && hasRoom) {
+        return at;
+    }
+    return event.sourceIn > event.sourceOut ? event.sourceIn : std::max(low, high - 1);
 }
 
 // One track while it is laid: clips by record in, none overlapping.
@@ -48,8 +70,10 @@ public:
         return covered;
     }
     [[nodiscard]] bool empty() const { return m_clips.empty(); }
-    /// The end of the last clip; -1 for none.
-    [[nodiscard]] int64_t end() const { return m_clips.empty() ? -1 : m_clips.rbegin()->second.recordOut; }
+    /// The last clip; null for none.
+    [[nodiscard]] const EdlClip* last() const {
+        return m_clips.empty() ? nullptr : &m_clips.rbegin()->second;
+    }
     [[nodiscard]] std::vector<EdlClip> clips() const {
         std::vector<EdlClip> result;
         result.reserve(m_clips.size());
@@ -80,21 +104,18 @@ private:
     void findPositions();
     [[nodiscard]] bool runsOverMidnight();
     [[nodiscard]] int64_t startOfDay() const;
-    Qx::Status layEvent(size_t index);
-    Qx::Status layOn(EdlChannels channel, const EdlClip& clip);
-    Qx::Status checkTransition(size_t index);
+    void layEvent(size_t index);
+    void layOn(EdlChannels channel, const EdlClip& clip);
+    void checkTransition(size_t index);
     void reportTransition(const EdlEvent& event, const EdlEvent* outgoing);
     void checkDurations(const EdlEvent& event);
     void checkJoin(size_t index, EdlChannels channels);
     [[nodiscard]] EdlClip clipOf(size_t index) const;
     [[nodiscard]] const EdlEvent* outgoingOf(size_t index) const;
-    [[nodiscard]] Qx::Status failure(int line, const String& what) const {
-        return Qx::Status::failure(m_report.file() + ":" + std::to_string(line) + ": " + what);
-    }
-
     const EdlList& m_list;
     bool m_strict;
     LossReport& m_report;
+    detail::EdlBadLines m_badLines;
     EdlProgramme m_programme;
     std::map<EdlChannels, Lane> m_lanes; // by bit, so in the order of the tracks
 };
@@ -189,15 +210,8 @@ EdlClip TrackBuilder::clipOf(size_t index) const {
     clip.black = event.isBlack();
     clip.velocity = clip.black ? 1.0 : velocityOf(event, m_list.rate);
     clip.sourceIn = static_cast<double>(event.sourceIn);
-    if (event.speed && event.speed->framesPerSecond < 0) {
-        // The first frame shown is the one that the M2 names; failing that, the highest of the span.
-        const int64_t low = std::min(event.sourceIn, event.sourceOut);
-        const int64_t high = std::max(event.sourceIn, event.sourceOut);
-        const bool named = event.speed->at >= low && event.speed->at <= high && event.speed->at != low;
-        const bool descending = event.sourceIn > event.sourceOut;
-        clip.sourceIn = static_cast<double>(named        ? event.speed->at
-                                            : descending ? event.sourceIn
-                                                         : std::max(low, high - 1));
+    if (!clip.black) {
+        clip.sourceIn = static_cast<double>(firstFrameOf(event, m_list.rate));
     }
     return clip;
 }
@@ -250,67 +264,68 @@ void TrackBuilder::reportTransition(const EdlEvent& event, const EdlEvent* outgo
     m_report.addLoss(event.line, std::move(what));
 }
 
-Qx::Status TrackBuilder::checkTransition(size_t index) {
+void TrackBuilder::checkTransition(size_t index) {
     const EdlEvent& event = m_list.events[index];
     if (event.duration <= recordLength(event)) {
-        return {};
+        return;
     }
     const String what = String::format("the transition of %d frames is longer than its clip", event.duration);
     if (m_strict) {
-        return failure(event.line, what + "; shorten it or import without the strict mode");
+        m_badLines.add(event.line, what + "; shorten it or import without the strict mode");
+    } else {
+        m_report.addWarning(event.line, what);
     }
-    m_report.addWarning(event.line, what);
-    return {};
 }
 
-// A line of no length says where the outgoing side goes on: that should be where a clip ends.
+// A line of no length says what goes on under the transition: that should be what ends there.
 void TrackBuilder::checkJoin(size_t index, EdlChannels channels) {
-    for (EdlChannels bits = channels; bits != 0; bits &= bits - 1) {
-        const EdlChannels channel = bits & ~(bits - 1);
-        const auto lane = m_lanes.find(channel);
-        const int64_t end = lane == m_lanes.end() ? -1 : lane->second.end();
-        if (!m_list.events[index].isBlack() && end != m_programme.positions[index]) {
-            m_report.addWarning(m_list.events[index].line,
-                                "the outgoing side does not start where the event before it ends");
+    const EdlEvent& event = m_list.events[index];
+    for (EdlChannels bits = channels; bits != 0 && !event.isBlack(); bits &= bits - 1) {
+        const auto lane = m_lanes.find(bits & ~(bits - 1));
+        const EdlClip* const last = lane == m_lanes.end() ? nullptr : lane->second.last();
+        const bool meets = last != nullptr && last->recordOut == m_programme.positions[index];
+        if (!meets || m_list.events[last->event].reel != event.reel) {
+            m_programme.hanging[index] = true;
+            m_report.addWarning(event.line,
+                                meets ? "the outgoing side is of another reel than what plays before it"
+                                      : "the outgoing side does not start where the event before it ends");
             return;
         }
     }
 }
 
-Qx::Status TrackBuilder::layOn(EdlChannels channel, const EdlClip& clip) {
+void TrackBuilder::layOn(EdlChannels channel, const EdlClip& clip) {
     const size_t covered = m_lanes[channel].lay(clip);
     const EdlEvent& event = m_list.events[clip.event];
     const EdlEvent& below = m_list.events[covered];
     const bool ownOutgoing = event.role == EdlRole::Incoming && covered + 1 == clip.event;
     if (covered == clip.event || ownOutgoing) {
-        return {};
+        return;
     }
     const String lines = String::format("the event overlaps the one at line %d", below.line);
     if (m_strict) {
-        return failure(event.line, lines + "; correct the record times or import without the strict mode");
+        m_badLines.add(event.line, lines + "; correct the record times or import without the strict mode");
+    } else {
+        m_report.addWarning(event.line, lines + ", which is trimmed");
     }
-    m_report.addWarning(event.line, lines + ", which is trimmed");
-    return {};
 }
 
-Qx::Status TrackBuilder::layEvent(size_t index) {
+void TrackBuilder::layEvent(size_t index) {
     const EdlEvent& event = m_list.events[index];
     if (event.role == EdlRole::Outgoing && recordLength(event) == 0) {
         checkJoin(index, event.channels);
-        return {};
+        return;
     }
     checkDurations(event);
-    if (Qx::Status status = checkTransition(index); !status) {
-        return status;
-    }
+    checkTransition(index);
     reportTransition(event, outgoingOf(index));
     if (event.channels == 0) {
         m_report.addLoss(event.line, "the event is on no track and is left out");
-        return {};
+        return;
     }
     if (recordLength(event) == 0) {
         m_report.addLoss(event.line, "the event has no length and is left out");
-        return {};
+        return;
     }
     const bool foreground = event.type == EdlType::Key || event.type == EdlType::KeyOut;
     const EdlClip clip = clipOf(index);
@@ -319,15 +334,16 @@ Qx::Status TrackBuilder::layEvent(size_t index) {
         if (foreground && channel == kEdlPicture) {
             channel = kEdlPicture2;
         }
-        if (Qx::Status status = layOn(channel, clip); !status) {
-            return status;
-        }
+        layOn(channel, clip);
     }
-    return {};
 }
 
 Qx::Status TrackBuilder::lay(EdlProgramme& programme) {
     findPositions();
+    m_programme.hanging.assign(m_list.events.size(), false);
+    for (const EdlEvent& event : m_list.events) {
+        m_programme.firstFrames.push_back(firstFrameOf(event, m_list.rate));
+    }
     std::vector<size_t> order(m_list.events.size());
     for (size_t i = 0; i < order.size(); ++i) {
         order[i] = i;
@@ -336,9 +352,10 @@ Qx::Status TrackBuilder::lay(EdlProgramme& programme) {
     std::stable_sort(order.begin(), order.end(),
                      [&](size_t a, size_t b) { return positions[a] < positions[b]; });
     for (const size_t index : order) {
-        if (Qx::Status status = layEvent(index); !status) {
-            return status;
-        }
+        layEvent(index);
+    }
+    if (!m_badLines.empty()) {
+        return m_badLines.refuse(m_report);
     }
     for (const auto& [channel, lane] : m_lanes) {
         if (!lane.empty()) {

@@ -32,6 +32,10 @@ struct EdlProgramme {
     std::vector<EdlTrack> tracks; ///< V, V2, A1 and on; no track is empty
     /// For each event of the list its record in, in frames from the start.
     std::vector<int64_t> positions;
+    /// Likewise the source frame that is shown first.
+    std::vector<int64_t> firstFrames;
+    /// Likewise true for the line of an outgoing side that names other than what ends there.
+    std::vector<bool> hanging;
 };
 
 /// Lays every event on its tracks in record order.

@@ -171,6 +171,45 @@ TEST(EdlExport, AnImportedListIsGivenBack) {
     EXPECT_FALSE(list.exported().empty()) << list.status.reason();
 }
 
+// Written otherwise than an export of their edit would by itself.
+TEST(EdlExport, WhatWritersDoDifferentlyIsGivenBack) {
+    const char* const events[] = {
+        // A source out as at normal speed, one that is a frame off, one without M2 that does not agree.
+        "002 R2 V C 00:00:10:00 00:00:12:00 10:00:02:00 10:00:04:00\nM2 R2 050.0 00:00:10:00\n",
+        "002 R2 V C 00:00:10:00 00:00:14:01 10:00:02:00 10:00:04:00\nM2 R2 050.0 00:00:10:00\n",
+        "002 R2 V C 00:00:10:00 00:00:12:02 10:00:02:00 10:00:04:00\n",
+        // Reverse that says its first frame first, and last.
+        "002 R2 V C 00:00:12:00 00:00:10:00 10:00:02:00 10:00:04:00\nM2 R2 -025.0 00:00:12:00\n",
+        "002 R2 V C 00:00:10:00 00:00:12:00 10:00:02:00 10:00:04:00\nM2 R2 -025.0 00:00:11:24\n",
+        // A freeze of a frame inside the span that it names.
+        "002 R2 V C 00:00:10:00 00:00:12:00 10:00:02:00 10:00:04:00\nM2 R2 000.0 00:00:11:00\n",
+        // A dissolve that hangs: from another source, and from another frame, than plays before it.
+        "002 R9 V C 00:00:10:00 00:00:10:00 10:00:02:00 10:00:02:00\n"
+        "002 R2 V D 010 00:00:10:00 00:00:12:00 10:00:02:00 10:00:04:00\n",
+        "002 R1 V C 00:00:30:00 00:00:30:00 10:00:02:12 10:00:02:12\n"
+        "002 R2 V D 010 00:00:10:00 00:00:12:00 10:00:02:12 10:00:04:12\n",
+        // What goes on is named by the list's source out, which does not agree with the record side.
+        "002 R2 V C 00:00:10:00 00:00:12:01 10:00:02:00 10:00:04:00\n"
+        "003 R2 V C 00:00:12:01 00:00:12:01 10:00:04:00 10:00:04:00\n"
+        "003 R3 V D 010 00:00:10:00 00:00:12:00 10:00:04:00 10:00:06:00\n",
+        // Black that counts.
+        "002 BL V C 00:00:10:00 00:00:12:00 10:00:02:00 10:00:04:00\n",
+    };
+    for (const std::string event : events) {
+        const std::string text = "TITLE: x\nFCM: NON-DROP FRAME\n"
+                                 "001 R1 V C 00:00:00:00 00:00:02:00 10:00:00:00 10:00:02:00\n" +
+                                 event;
+        ImportedList list(text);
+        EXPECT_EQ(folded(list.exported()), text);
+        EXPECT_TRUE(list.report.losses().empty()) << list.report.lines().front();
+        // Trimmed, it says what it plays.
+        list.content(0).remove({3.0, 3.04});
+        const String trimmed = list.exported();
+        ImportedList again(trimmed);
+        EXPECT_EQ(again.exported(), trimmed);
+    }
+}
+
 TEST(EdlExport, DropFrameIsGivenBack) {
     const std::string text = "TITLE: drop\nFCM: DROP FRAME\n"
                              "001  R1       V     C        00:00:59;28 00:01:00;04 01:00:59;28 01:01:00;04\n"

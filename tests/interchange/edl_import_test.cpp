@@ -17,6 +17,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
+#include <cstring>
 #include <filesystem>
 
 using namespace interchange;
@@ -141,6 +142,10 @@ TEST(EdlImport, MarkersBecomeCues) {
     EXPECT_EQ(cues.get_cue_point(0, 0)->editTime(), 1.0);
     EXPECT_EQ(cues.get_cue_point(1, 0)->text(), "LILAC");
     EXPECT_EQ(cues.get_cue_point(1, 0)->editTime(), 1.48);
+    // They follow the clip they lie on.
+    ASSERT_TRUE(celOf(sequence(import), 0).remove({0.0, 0.4}));
+    EXPECT_TRUE(sequence(import).updateCues());
+    EXPECT_NEAR(cues.get_cue_point(0, 0)->editTime(), 0.6, 1e-6);
     ASSERT_EQ(import.report.losses().size(), 1U);
     EXPECT_EQ(import.report.lines().front(),
               import.report.file() + ":8: loss: the marker lies before the programme and is left out");
@@ -209,7 +214,7 @@ TEST(EdlImport, AFailureLeavesTheResult) {
     EXPECT_FALSE(importEdl(folder.write("bad.edl", "001 R V\n"), {Qx::FrameRate(3), false}, import).isOk());
     EXPECT_FALSE(importEdl(folder.path("none.edl"), {Qx::FrameRate(3), false}, import).isOk());
     EXPECT_TRUE(import.sequence == before);
-    EXPECT_EQ(Qx::fileNameOf(import.report.file()), "list.edl");
+    EXPECT_EQ(Qx::fileNameOf(import.report.file()), "none.edl") << "what was met is told of";
 }
 
 TEST(EdlImport, TenThousandEventsAreNotFelt) {
@@ -251,6 +256,62 @@ TEST(SaveImport, WritesTheShotsThenTheSequence) {
     EXPECT_TRUE(celOf(edit, 0).get_event(2).strip.isBlack());
     EXPECT_EQ(edit.get_cues().get_num_cue_points(0), 2U);
     EXPECT_EQ(unpackEdlRecords(edit.Opts().getString(EdlKey::kEvents)).size(), 3U);
+}
+
+TEST(SaveImport, ASecondImportPlaysTheShotsThatAreThere) {
+    const Project project;
+    const String event = "001 R1 V C 00:00:10:00 00:00:12:00 00:00:00:00 00:00:02:00\n* FROM CLIP NAME: a\n";
+    const auto save = [&](const std::string& text, size_t reused, size_t made) {
+        Import import = importText(text);
+        const size_t found = reuseShots(import, [](const String& name) {
+            std::vector<EditPtr> shots;
+            for (int number = 1; number < 30; ++number) {
+                EditPtr shot(new Edit);
+                if (shot->read_file(cookie(Cookie_Type::Edit, number, 0), eOpenExisting) == Edit::kReadOk &&
+                    shot->getName() == name) {
+                    shots.push_back(shot);
+                }
+            }
+            return shots;
+        });
+        EXPECT_EQ(found, reused) << text;
+        EXPECT_EQ(import.shots.size(), made) << text;
+        EXPECT_TRUE(saveImport(import).isOk());
+        return import;
+    };
+    const Import first = save(event, 0, 1);
+    const cookie known = shot(first, 0).get_cookie();
+    const Import again = save(event + "* LOC: 00:00:01:00 RED x\n", 1, 0);
+    EXPECT_EQ(celOf(sequence(again), 0).get_event(0).strip, known);
+    EXPECT_EQ(sequence(again).get_cues().get_cue_point(0, 0)->stripCookie(), known);
+    // Another source, more of it, another track of it, and a reel that says nothing.
+    const struct {
+        const char* from;
+        const char* to;
+        bool isOther;
+    } changes[] = {
+        {"R1", "R2", true},
+        {": a", ": b", true},
+        {"12:00 00", "13:00 00", false},
+        {"00:12:00 00:00:00:00 00:00:02", "00:13:00 00:00:00:00 00:00:03", true},
+        {" V ", " B ", true},
+        {"* FROM", "* SOURCE FILE: f\n* FROM", true},
+        {"10:00 00:00:12:00 00:00:00:00 00:00:02:00", "11:00 00:00:12:00 00:00:00:00 00:00:01:00", false}};
+    for (const auto& change : changes) {
+        String text = event;
+        ASSERT_NE(text.find(change.from), String::npos) << change.from;
+        text.replace(text.find(change.from), std::strlen(change.from), change.to);
+        save(text, change.isOther ? 0 : 1, change.isOther ? 1 : 0);
+    }
+    const std::string nameless = "001 AX V C 00:00:10:00 00:00:12:00 00:00:00:00 00:00:02:00\n";
+    save(nameless, 0, 1);
+    save(nameless, 0, 1);
+
+    Import late = importText(event);
+    reuseShots(late, [&](const String&) { return std::vector<EditPtr>{first.shots[0]}; });
+    std::filesystem::remove(getFilenameForCookie(known).c_str());
+    const Qx::Status gone = saveImport(late);
+    EXPECT_EQ(gone.code(), Qx::StatusCode::NotFound) << gone.reason();
 }
 
 TEST(SaveImport, AFailureLeavesTheProjectAndCanBeRepeated) {

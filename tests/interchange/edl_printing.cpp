@@ -31,6 +31,7 @@ std::string printClip(const EdlList& list, const EdlClip& clip) {
     line += clip.velocity == 1.0 ? "" : " at x" + Qx::doubleToText(clip.velocity);
     line += event.clipName.empty() ? "" : " \"" + event.clipName + "\"";
     line += event.sourceFile.empty() ? "" : " of " + event.sourceFile;
+    line += event.effectName.empty() ? "" : " by " + event.effectName;
     line += event.mediaPath.empty() ? "" : " in " + event.mediaPath;
     return line + "\n";
 }

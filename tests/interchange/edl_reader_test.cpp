@@ -143,12 +143,15 @@ TEST(EdlReader, FilesThatAreRefusedUnread) {
     EXPECT_TRUE(list.events.empty());
 }
 
-TEST(EdlReader, NotesKeepTheirBytesAndOrder) {
-    const EdlList list = readGood("* above\nSPLIT: AUDIO DELAY= 00:00:00:00\n" + lineWith("R", "V") +
-                                  "  * first\xE9  \n\n*second\nUNKNOWN third\t\n" + lineWith("R", "A"));
+TEST(EdlReader, NotesKeepTheirWordsAndOrder) {
+    const EdlList list =
+        readGood("* above\nSPLIT: AUDIO DELAY= 00:00:00:00\n" + lineWith("R", "V") +
+                 "  * first\x93\xE9\x94  \n\n*caf\xC3\xA9\n*second\nUNKNOWN third\t\n" + lineWith("R", "A"));
     EXPECT_EQ(list.notes, "* above");
-    EXPECT_EQ(list.events.at(0).notes,
-              "SPLIT: AUDIO DELAY= 00:00:00:00\n* first\xE9\n*second\nUNKNOWN third");
+    EXPECT_EQ(
+        list.events.at(0).notes,
+        "SPLIT: AUDIO DELAY= 00:00:00:00\n* first\u201c\u00e9\u201d\n*caf\u00e9\n*second\nUNKNOWN third")
+        << "a line that is not UTF-8 is Windows-1252";
     EXPECT_EQ(list.events.at(1).notes, "");
 }
 

@@ -22,8 +22,9 @@ struct ProgramResult {
 
 /// How a program is run.
 struct ProgramSettings {
-    std::vector<std::string> environment; ///< "NAME=value"; nothing else is in the environment
-    std::string standardOutput;           ///< a path to write to in the place of `ProgramResult::out`
+    std::vector<std::string> environment;    ///< "NAME=value"; nothing else is in the environment
+    std::string standardOutput;              ///< a path to write to in the place of `ProgramResult::out`
+    std::string standardInput = "/dev/null"; ///< a path
 };
 
 namespace detail {
@@ -66,7 +67,7 @@ inline ProgramResult runProgram(const std::string& program, std::vector<std::str
     FILE* const err = detail::namelessFile();
     posix_spawn_file_actions_t actions;
     posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, settings.standardInput.c_str(), O_RDONLY, 0);
     if (settings.standardOutput.empty()) {
         posix_spawn_file_actions_adddup2(&actions, fileno(out), STDOUT_FILENO);
     } else {

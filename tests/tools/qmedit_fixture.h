@@ -23,6 +23,11 @@ protected:
         return test::runProgram(QMEDIT_PROGRAM, std::move(arguments),
                                 {std::move(environment), standardOutput});
     }
+    /// The same with a file on its standard input.
+    test::ProgramResult runOn(const std::string& input, std::vector<std::string> arguments) {
+        return test::runProgram(QMEDIT_PROGRAM, std::move(arguments),
+                                {{"LANG=C.UTF-8", "QMEDIT_PROJECT=" + project()}, {}, input});
+    }
     [[nodiscard]] String project() const { return folder.path("project"); }
     [[nodiscard]] std::map<std::string, std::string> snapshot() const {
         return test::treeSnapshot(project());

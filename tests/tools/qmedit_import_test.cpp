@@ -68,6 +68,41 @@ TEST_F(Qmedit, LossesGoToStandardErrorAndStrictRefusesThem) {
     EXPECT_EQ(lines(result.out), 1u);
 }
 
+TEST_F(Qmedit, ManyListsGoThroughPipesAndScripts) {
+    const String good = folder.write("good.edl", kShortList);
+    const String bad =
+        folder.write("bad.edl", "001  R7 V C\n002  R7 V\n"
+                                "003  R7 V C 00:00:00:00 00:00:02:00 00:00:00:00 00:00:02:00\n");
+    const test::ProgramResult several = run({"import", good, bad, good});
+    EXPECT_EQ(several.code, 1);
+    EXPECT_EQ(several.out, "E0003000\nE0004000\n")
+        << "the shots of the first are played again: " << several.err;
+    for (const char* told :
+         {"bad.edl:1: error", "bad.edl:2: error", "--skip-bad", "2 shots of the project"}) {
+        EXPECT_NE(several.err.find(told), String::npos) << told << several.err;
+    }
+    const auto json =
+        nlohmann::json::parse(run({"import", bad, good, "--json", "--skip-bad", "--new-shots"}).out);
+    EXPECT_EQ(json.at(0).at("losses").size(), 2u);
+    EXPECT_EQ(json.at(0).at("losses").at(1).at("line"), 2);
+    EXPECT_EQ(json.at(1).at("shots"), 2);
+    const auto refused = nlohmann::json::parse(run({"import", bad, "--json"}).out);
+    EXPECT_EQ(refused.at(0).at("errors").size(), 2u);
+    EXPECT_TRUE(refused.at(0).at("cookie").is_null());
+
+    const test::ProgramResult exported = run({"export", "E0003000", "-"});
+    const test::ProgramResult piped = runOn(folder.write("list", exported.out), {"import", "-"});
+    ASSERT_EQ(piped.code, 0) << piped.err;
+    EXPECT_EQ(run({"export", piped.out.trimmed(), "-"}).out, exported.out);
+    EXPECT_EQ(runOn(folder.write("letter", "Dear editor,\n"), {"import", "-"}).code, 1);
+
+    const test::ProgramResult all =
+        run({"export", "E0003000", "E0004000", "--into", folder.path(), "--json"});
+    EXPECT_EQ(nlohmann::json::parse(all.out).at(1).at("file"), folder.path("E0004000.edl"));
+    EXPECT_TRUE(std::filesystem::exists(folder.path("E0003000.edl").c_str()));
+    EXPECT_EQ(run({"export", "E0003000", "-", "--json"}).code, 2);
+}
+
 TEST_F(Qmedit, BadFilesFailInOneLineAndLeaveTheProjectAsItWas) {
     namespace fs = std::filesystem;
     const String folderPath = folder.path("folder.edl");

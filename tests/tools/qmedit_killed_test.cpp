@@ -48,7 +48,7 @@ protected:
                       {"redo", m_item},
                       {"recover", m_item, "--from", "U1"},
                       {"delete", m_item},
-                      {"import", folder.path("list.edl")}};
+                      {"import", folder.path("list.edl"), "--new-shots"}};
     }
 
     void restart() {

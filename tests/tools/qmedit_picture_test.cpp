@@ -34,9 +34,13 @@ TEST_F(Qmedit, DrawsTracksToScale) {
 
 TEST_F(Qmedit, NoLineOfThePictureIsWiderThanTheConsole) {
     const String item = imported(kShortList);
-    for (const int width : {40, 56, 80, 120, 333}) {
-        const String columns = "COLUMNS=" + std::to_string(width);
-        for (const String& row : pictureOf(run({"show", item}, {"LC_ALL=C", columns}).out).split('\n'))
+    for (const int width : {30, 40, 56, 80, 120, 333}) {
+        const String columns = std::to_string(width);
+        for (const String& row :
+             run({"show", item, "--events", "--width", columns}, {"LC_ALL=C", "COLUMNS=9"}).out.split('\n'))
+            EXPECT_LE(row.size(), static_cast<size_t>(width)) << row;
+        for (const String& row :
+             pictureOf(run({"show", item}, {"LC_ALL=C", "COLUMNS=" + columns}).out).split('\n'))
             EXPECT_LE(row.size(), static_cast<size_t>(width)) << row;
     }
     const auto widest = [&](std::vector<std::string> environment) {
@@ -53,6 +57,7 @@ TEST_F(Qmedit, NoLineOfThePictureIsWiderThanTheConsole) {
 TEST_F(Qmedit, NoColourWhereOutputIsNoTerminal) {
     const String item = imported(kShortList);
     EXPECT_EQ(run({"show", item}, {"TERM=xterm-256color"}).out.find('\x1b'), String::npos);
+    EXPECT_NE(run({"show", item, "--colour", "always"}, {"NO_COLOR=1"}).out.find('\x1b'), String::npos);
 }
 
 TEST_F(Qmedit, ListsEventsWithTimecodesAndGaps) {
@@ -67,6 +72,20 @@ TEST_F(Qmedit, ListsEventsWithTimecodesAndGaps) {
          })
         EXPECT_NE(out.find(line), String::npos) << line << out;
     EXPECT_NE(out.find("harbour (50%)"), String::npos) << out;
+
+    const String later = imported("008  TAPE7 V C 00:00:10:00 00:00:13:00 10:00:00:00 10:00:03:00\n"
+                                  "011  TAPE8 V C 00:00:10:00 00:00:13:00 18:24:11:15 18:24:14:15\n");
+    const String events = run({"show", later, "--events", "--width", "120"}).out;
+    for (const char* line : {
+             " 10:00:03:00  18:24:11:15                            8:24:08:15                     gap\n",
+             "  2  011    18:24:11:15  18:24:14:15  00:00:10:00  00:00:13:00        3:00  cut         TAPE8  "
+             "TAPE8\n",
+         })
+        EXPECT_NE(events.find(line), String::npos) << line << events;
+    const auto pair = shown(later).at("channels").at(0).at("pairs").at(1);
+    EXPECT_EQ(pair.at("event").get<std::string>() + pair.at("reel").get<std::string>() +
+                  pair.at("transition").get<std::string>(),
+              "011TAPE8cut");
 }
 
 } // namespace

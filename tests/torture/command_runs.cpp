@@ -103,7 +103,7 @@ void Workplace::prepare() {
     for (int edit = 0; edit < 3; ++edit) {
         const std::string list = replaced(kList, "%s", "REEL " + std::to_string(edit + 1));
         folder.write("list.edl", list);
-        original->cookies[edit] = succeed({"import", "$D/list.edl"});
+        original->cookies[edit] = succeed({"import", "$D/list.edl", "--new-shots"});
     }
     for (const char* place : {"$1@1s-2s", "$1@3s-4s", "$1@2s-3s", "$2@1s-2s", "$3@1s-2s"}) {
         succeed({"apply", "remove", "--to", place});

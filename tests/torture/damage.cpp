@@ -56,7 +56,7 @@ public:
             {"redo", "$1"},
             {"backup", "$1"},
             {"flush"},
-            {"import", "$D/list.edl"},
+            {"import", "$D/list.edl", "--new-shots"},
             {"apply", "remove", "--to", "$1@0s-1s"},
             {"salvage", "$D/project/P0001000/$1.qme", "--into", "$D/saved"},
             {"delete", "$2"}};

@@ -21,7 +21,7 @@ struct Command {
 };
 
 const std::vector<Command> kCommands = {
-    {"import", {"import", "$D/list.edl"}, true, 0},
+    {"import", {"import", "$D/list.edl", "--new-shots"}, true, 0},
     {"apply", {"apply", "remove", "--to", "$1@1s-2s"}, true, 1},
     {"backup", {"backup", "$1"}, true, 1},
     {"undo", {"undo", "$1"}, true, 1},

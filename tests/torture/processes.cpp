@@ -68,7 +68,7 @@ public:
             {"undo", "$1"},
             {"redo", "$1"},
             {"flush"},
-            {"import", "$D/list.edl"}};
+            {"import", "$D/list.edl", "--new-shots"}};
         for (size_t i = 0; i < rounds; ++i) {
             plans[0].push_back(m_case.oneOf(kReaders));
             plans[1].push_back(m_case.oneOf(kReaders));

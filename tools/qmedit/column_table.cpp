@@ -38,7 +38,7 @@ String ColumnTable::text(const Console& console, bool fitLast) const {
             line += kBetween;
             used += widths[i] + static_cast<int>(kBetween.size());
         }
-        line += fitLast && console.terminal()
+        line += fitLast && console.fitted()
                     ? safe_text::fitted(row.cells[last], std::max(console.width() - used, kLeastLast),
                                         console.ellipsis())
                     : row.cells[last];

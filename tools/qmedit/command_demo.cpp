@@ -74,10 +74,12 @@ int runStep(const std::vector<String>& arguments) {
 int importExample(const char* name, const String& project, cookie& item) {
     ImportOptions importing;
     importing.project = project;
-    if (const Qx::Status found = findExample(name, importing.file); !found) {
+    String file;
+    if (const Qx::Status found = findExample(name, file); !found) {
         return failed(found);
     }
-    reportProgress("Importing " + importing.file);
+    importing.files = {file};
+    reportProgress("Importing " + file);
     const int code = importFile(importing, item);
     if (code == kDone) {
         reportProgress("Saved as edit " + item.asString() + " in " + project);

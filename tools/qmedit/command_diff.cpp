@@ -3,6 +3,7 @@
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_diff_json.h"
 #include "tools/qmedit/edit_diff_text.h"
+#include "tools/qmedit/event_numbers.h"
 #include "tools/qmedit/project_session.h"
 
 #include "platform/services/edit_filenames.h"
@@ -94,6 +95,7 @@ int runDiff(const DiffOptions& options) {
             return failed(read);
         }
         reports[i] = reportOf(*edits[i], hasProject ? session.sourceNamer() : SourceNamer());
+        addEventNumbers(reports[i], *edits[i]);
         reportUnreadable(reports[i]);
         contents[i] = contentOf(*edits[i], reports[i]);
         const Qx::Status added = store.empty() ? Qx::Status() : addObjects(contents[i], reports[i], store);

@@ -2,11 +2,11 @@
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
+#include "tools/qmedit/event_numbers.h"
 #include "tools/qmedit/event_table.h"
 #include "tools/qmedit/project_session.h"
 #include "tools/qmedit/track_picture.h"
 
-#include <limits>
 #include <memory>
 
 namespace {
@@ -42,21 +42,17 @@ int showEdit(const ShowOptions& options) {
     if (const Qx::Status read = session.readEdit(item, edit); !read) {
         return failed(read);
     }
-    const EditReport report = reportOf(*edit, session.sourceNamer());
+    EditReport report = reportOf(*edit, session.sourceNamer());
+    addEventNumbers(report, *edit);
     reportMissingShots(report);
     if (options.json) {
         writeOut(editJson(report));
         return kDone;
     }
-    const Console console = Console::forStandardOutput();
-    EventTableOptions table;
-    table.fitToWidth = console.terminal();
-    if (options.allEvents) {
-        table.eventsPerChannel = std::numeric_limits<size_t>::max();
-    }
+    const Console console = Console::forStandardOutput(options.console);
     writeOut("\n" + editSummary(report, console) + "\n");
     writeOut(trackPicture(report, console));
-    writeOut(eventTable(report, console, table));
+    writeOut(eventTable(report, console, options.allEvents));
     writeOut("\n");
     return kDone;
 }
@@ -68,16 +64,19 @@ void drawEdit(const EditReport& report) {
 
 Command showCommand() {
     const auto options = std::make_shared<ShowOptions>();
-    return {"show",
-            "Draw the tracks of an edit and list its events",
-            {cookieOption(options->item),
-             projectOption(options->project),
-             jsonOption(options->json, "Write JSON: every pair of every channel"),
-             {.name = "--events",
-              .value = &options->allEvents,
-              .help = "List every event, however many there are",
-              .excludes = "--json"}},
-            "Example:\n  qmedit show E0001000 --events | less -R\n\n"
-            "The picture is as wide as the terminal, or as $COLUMNS says.",
+    std::vector<CommandOption> given = {
+        cookieOption(options->item),
+        projectOption(options->project),
+        jsonOption(options->json, "Write JSON: every pair of every channel"),
+        {.name = "--events",
+         .value = &options->allEvents,
+         .help = "List every event, however many there are, with its number in an imported list and its reel",
+         .excludes = "--json"}};
+    for (CommandOption& option : options->console.options()) {
+        given.push_back(std::move(option));
+    }
+    return {"show", "Draw the tracks of an edit and list its events", std::move(given),
+            "Example:\n  qmedit show E0001000 --events --colour always | less -R\n\n"
+            "On a terminal, and with --width or --colour always, lines are no longer than the width.",
             [options] { return showEdit(*options); }};
 }

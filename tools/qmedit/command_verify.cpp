@@ -125,7 +125,16 @@ int runVerify(const VerifyArguments& arguments) {
         }
     }
     std::vector<VerifiedFile> files;
-    if (const Qx::Status verified = verifyProject(session.folder(), items, files); !verified) {
+    size_t checked = 0;
+    const auto checking = [&checked](const String& name) {
+        constexpr size_t kStep = 20;
+        if (++checked % kStep == 0) {
+            showProgress(String::format("checking file %zu, ", checked) + name);
+        }
+    };
+    const Qx::Status verified = verifyProject(session.folder(), items, files, checking);
+    showProgress("");
+    if (!verified) {
         return failed(verified);
     }
     if (arguments.json) {

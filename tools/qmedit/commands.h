@@ -3,6 +3,7 @@
 #include "platform/base/cookie.h"
 #include "platform/base/qx_string.h"
 #include "platform/base/status.h"
+#include "tools/qmedit/console.h"
 
 #include <vector>
 
@@ -70,17 +71,21 @@ struct ShowOptions {
     String item; ///< its cookie or its name
     bool json = false;
     bool allEvents = false;
+    Console::Wish console;
 };
 int showEdit(const ShowOptions& options);
 /// Draws an edit on standard output, without its table of events.
 void drawEdit(const EditReport& report);
-/// Imports a file as `qmedit import` does and sets `item` to the edit that was made. The cookie is not
-/// printed.
 struct ImportOptions {
-    String file;
+    std::vector<std::string> files; ///< "-" is standard input
     String project;
     String rate; ///< empty for the project's
     bool strict = false;
+    bool skipBad = false;
+    bool newShots = false;
+    bool json = false;
 };
+/// Imports the only one of the files as `qmedit import` does and sets `item` to the edit that was made. The
+/// cookie is not printed.
 int importFile(const ImportOptions& options, cookie& item);
 /// @}

@@ -1,6 +1,7 @@
 #include "tools/qmedit/console.h"
 
 #include "platform/services/log.h"
+#include "tools/qmedit/command_line.h"
 #include "tools/qmedit/safe_text.h"
 
 #include <algorithm>
@@ -14,7 +15,7 @@
 namespace {
 
 constexpr int kDefaultWidth = 100;
-constexpr int kLeastWidth = 40;
+constexpr int kLeastWidth = 30;
 constexpr int kGreatestWidth = 500;
 
 int outputError = 0;
@@ -37,21 +38,35 @@ bool localeIsUtf8() {
 }
 
 /// Columns of the terminal behind a descriptor; 0 where there is none.
-int widthOf(int descriptor) {
+int columnsOf(int descriptor) {
     winsize size{};
     return ioctl(descriptor, TIOCGWINSZ, &size) == 0 ? int{size.ws_col} : 0;
 }
 
-int terminalWidth(bool terminal) {
-    int width = 0;
-    if (const char* columns = environment("COLUMNS");
-        columns != nullptr && Qx::textToInt(columns, width) && width > 0) {
-        return std::clamp(width, kLeastWidth, kGreatestWidth);
+int widthOf(const std::string& wished) {
+    const char* const columns = environment("COLUMNS");
+    for (const std::string& text : {wished, std::string(columns != nullptr ? columns : "")}) {
+        int width = 0;
+        if (Qx::textToInt(text, width) && width > 0) {
+            return std::clamp(width, kLeastWidth, kGreatestWidth);
+        }
     }
-    if (const int columns = terminal ? widthOf(STDOUT_FILENO) : 0; columns > 0) {
-        return std::clamp(columns, kLeastWidth, kGreatestWidth);
+    // A pager shows standard output on the terminal that the other streams still have.
+    for (const int stream : {STDOUT_FILENO, STDERR_FILENO, STDIN_FILENO}) {
+        if (const int width = columnsOf(stream); width > 0) {
+            return std::clamp(width, kLeastWidth, kGreatestWidth);
+        }
     }
     return kDefaultWidth;
+}
+
+String checkWidth(const std::string& text) {
+    int width = 0;
+    if (Qx::textToInt(text, width) && width >= kLeastWidth && width <= kGreatestWidth) {
+        return {};
+    }
+    return String::format("'%s' is no width; give a number of columns from %d to %d", text.c_str(),
+                          kLeastWidth, kGreatestWidth);
 }
 
 bool errorsAscii() {
@@ -61,7 +76,7 @@ bool errorsAscii() {
 
 void errorLine(std::string_view lead, std::string_view text) {
     String line = String(lead) + safe_text::escaped(text, errorsAscii());
-    if (const int width = widthOf(STDERR_FILENO); width > 0 && !lead.empty()) {
+    if (const int width = columnsOf(STDERR_FILENO); width > 0 && !lead.empty()) {
         constexpr int kIndent = 4;
         line = safe_text::wrapped(line, std::clamp(width, kLeastWidth, kGreatestWidth), 0, kIndent);
     }
@@ -72,11 +87,30 @@ void errorLine(std::string_view lead, std::string_view text) {
 } // namespace
 
 Console Console::forStandardOutput() {
+    return forStandardOutput(Wish());
+}
+
+Console Console::forStandardOutput(const Wish& wish) {
     const bool terminal = isatty(STDOUT_FILENO) == 1;
     const char* term = environment("TERM");
     const bool dumb = term == nullptr || std::strcmp(term, "dumb") == 0;
-    return {terminal && !dumb && environment("NO_COLOR") == nullptr, localeIsUtf8(), terminalWidth(terminal),
-            terminal};
+    const bool always = wish.colour == "always";
+    const bool automatic = !always && wish.colour != "never";
+    return {always || (automatic && terminal && !dumb && environment("NO_COLOR") == nullptr), localeIsUtf8(),
+            widthOf(wish.width), terminal || always || !wish.width.empty()};
+}
+
+std::vector<CommandOption> Console::Wish::options() {
+    return {{.name = "--width",
+             .value = &width,
+             .help = "Columns to draw in (else $COLUMNS, else the terminal's, else 100)",
+             .form = "N",
+             .check = checkWidth},
+            {.name = "--colour",
+             .value = &colour,
+             .help = "Colours: auto (on a terminal), always, never",
+             .form = "WHEN",
+             .choices = {"auto", "always", "never"}}};
 }
 
 bool Console::errorsToTerminal() {

@@ -2,7 +2,11 @@
 
 #include "platform/base/qx_string.h"
 
+#include <string>
 #include <string_view>
+#include <vector>
+
+struct CommandOption;
 
 /// How standard output shows a text, and the ways that qmedit writes: results to standard output, everything
 /// else to standard error.
@@ -24,20 +28,32 @@ public:
         Cue
     };
 
+    /// What a user asked for, whatever standard output is.
+    struct Wish {
+        std::string colour; ///< "always", "never"; else "auto"
+        std::string width;  ///< columns as digits; empty for those that standard output has
+
+        /// The options that set them, for the commands that draw.
+        [[nodiscard]] std::vector<CommandOption> options();
+    };
+
     /// What standard output can show: colours on a terminal unless NO_COLOR is set or TERM is "dumb"; UTF-8
-    /// by LC_ALL, LC_CTYPE or LANG, the first that is set; the width by COLUMNS, else by the terminal, else
-    /// 100.
+    /// by LC_ALL, LC_CTYPE or LANG, the first that is set; the width by COLUMNS, else by the terminal of
+    /// standard output or, as behind a pager, of standard error or input, else 100.
     [[nodiscard]] static Console forStandardOutput();
+    [[nodiscard]] static Console forStandardOutput(const Wish& wish);
     /// True if standard error is a terminal, where progress can be shown as it goes.
     [[nodiscard]] static bool errorsToTerminal();
     /// A console of given abilities.
-    Console(bool colour, bool utf8, int width, bool terminal)
-        : m_colour(colour), m_utf8(utf8), m_terminal(terminal), m_width(width) {}
+    Console(bool colour, bool utf8, int width, bool fitted)
+        : m_colour(colour), m_utf8(utf8), m_fitted(fitted), m_width(width) {}
 
     [[nodiscard]] bool colour() const { return m_colour; }
     [[nodiscard]] bool utf8() const { return m_utf8; }
-    [[nodiscard]] bool terminal() const { return m_terminal; }
-    /// Columns, 40 to 500.
+    /// True where lines are cut at the width, as somebody looks at them: on a terminal, or where a width or
+    /// colours were asked for. Otherwise names stay whole, for the programs that read them.
+    [[nodiscard]] bool fitted() const { return m_fitted; }
+    /// Columns, 30 to 500.
     [[nodiscard]] int width() const { return m_width; }
     /// The sign, one column wide, that something was cut off.
     [[nodiscard]] const char* ellipsis() const { return m_utf8 ? "…" : "~"; }
@@ -52,7 +68,7 @@ public:
 private:
     bool m_colour;
     bool m_utf8;
-    bool m_terminal;
+    bool m_fitted;
     int m_width;
 };
 

@@ -110,7 +110,9 @@ String levelsText(const LevelsDiff& levels, const EditReport& before, const Edit
     return levels.place + "  " + diffKindText(levels.kind) +
            String::format("; nodes: %zu before, %zu after\n", levels.nodesBefore, levels.nodesAfter) +
            firstOf(levels.removed, [&](const Node& node) { return nodeText('-', node, before); }) +
-           firstOf(levels.added, [&](const Node& node) { return nodeText('+', node, after); });
+           firstOf(levels.added, [&](const Node& node) { return nodeText('+', node, after); }) +
+           firstOf(levels.moved,
+                   [&](const MovedRun<Node>& run) { return line('>', movedText(run, "node", before)); });
 }
 
 String groupText(const GroupContent& group) {

@@ -35,24 +35,40 @@ Json listJson(const Range& range, const ToJson& toJson) {
     return list;
 }
 
+/// Things that moved, in frames and seconds of the first edit.
+template <class Element>
+Json movedJson(const std::vector<MovedRun<Element>>& moved, const EditReport& before) {
+    return listJson(moved, [&](const MovedRun<Element>& run) {
+        return Json{{"count", run.count},
+                    {"from", before.frames(run.from)},
+                    {"to", before.frames(run.to)},
+                    {"by", before.frames(run.by)},
+                    {"from_s", run.from},
+                    {"to_s", run.to},
+                    {"by_s", run.by},
+                    {"rest", run.isRest}};
+    });
+}
+
 Json channelJson(const ChannelDiff& channel, const EditReport& before, const EditReport& after) {
-    Json its;
-    its["channel"] = static_cast<const std::string&>(channel.name);
-    its["change"] = diffKindText(channel.kind);
-    its["end_before"] = before.frames(channel.endBefore);
-    its["end_before_s"] = channel.endBefore;
-    its["end_after"] = after.frames(channel.endAfter);
-    its["end_after_s"] = channel.endAfter;
-    its["spans"] = listJson(channel.spans, [&](const ChannelDiff::Span& span) {
+    Json json;
+    json["channel"] = static_cast<const std::string&>(channel.name);
+    json["change"] = diffKindText(channel.kind);
+    json["end_before"] = before.frames(channel.endBefore);
+    json["end_before_s"] = channel.endBefore;
+    json["end_after"] = after.frames(channel.endAfter);
+    json["end_after_s"] = channel.endAfter;
+    json["spans"] = listJson(channel.spans, [&](const ChannelDiff::Span& span) {
         return Json{{"from", after.frames(span.from)},
                     {"to", after.frames(span.to)},
                     {"from_s", span.from},
                     {"to_s", span.to}};
     });
-    its["removed"] =
+    json["removed"] =
         listJson(channel.removed, [&](const PairReport& pair) { return pairJson(before, pair); });
-    its["added"] = listJson(channel.added, [&](const PairReport& pair) { return pairJson(after, pair); });
-    return its;
+    json["added"] = listJson(channel.added, [&](const PairReport& pair) { return pairJson(after, pair); });
+    json["moved"] = movedJson(channel.moved, before);
+    return json;
 }
 
 Json valueJson(const std::optional<configb::Value>& value) {
@@ -61,12 +77,12 @@ Json valueJson(const std::optional<configb::Value>& value) {
 
 Json valuesJson(const std::vector<ValueDiff>& values, const char* key) {
     return listJson(values, [&](const ValueDiff& value) {
-        Json its;
-        its[key] = value.key;
-        its["change"] = diffKindText(diffKind(value.before.has_value(), value.after.has_value()));
-        its["before"] = valueJson(value.before);
-        its["after"] = valueJson(value.after);
-        return its;
+        Json json;
+        json[key] = value.key;
+        json["change"] = diffKindText(diffKind(value.before.has_value(), value.after.has_value()));
+        json["before"] = valueJson(value.before);
+        json["after"] = valueJson(value.after);
+        return json;
     });
 }
 
@@ -77,14 +93,15 @@ Json levelsJson(const LevelsDiff& levels, const EditReport& before, const EditRe
                 {"time", report.frames(node.time)}, {"time_s", node.time}, {"level", levelJson(node.level)}};
         };
     };
-    Json its;
-    its["channel"] = levels.place;
-    its["change"] = diffKindText(levels.kind);
-    its["nodes_before"] = levels.nodesBefore;
-    its["nodes_after"] = levels.nodesAfter;
-    its["removed"] = listJson(levels.removed, nodeJson(before));
-    its["added"] = listJson(levels.added, nodeJson(after));
-    return its;
+    Json json;
+    json["channel"] = levels.place;
+    json["change"] = diffKindText(levels.kind);
+    json["nodes_before"] = levels.nodesBefore;
+    json["nodes_after"] = levels.nodesAfter;
+    json["removed"] = listJson(levels.removed, nodeJson(before));
+    json["added"] = listJson(levels.added, nodeJson(after));
+    json["moved"] = movedJson(levels.moved, before);
+    return json;
 }
 
 Json groupsJson(const GroupsDiff& groups) {
@@ -109,7 +126,15 @@ String diffJson(const EditDiff& diff, const ContentDiff& content, const EditRepo
     json["after"] = after.item.asString();
     json["channels"] = listJson(
         diff.channels, [&](const ChannelDiff& channel) { return channelJson(channel, before, after); });
-    json["cues"] = {{"changed", diff.cuesDiffer}, {"before", diff.cuesBefore}, {"after", diff.cuesAfter}};
+    const auto cueJson = [](const EditReport& report) {
+        return [&report](const CueReport& cue) { return Json::parse(cueJsonText(report, cue)); };
+    };
+    json["cues"] = {{"changed", diff.cuesDiffer()},
+                    {"before", diff.cuesBefore},
+                    {"after", diff.cuesAfter},
+                    {"removed", listJson(diff.cuesRemoved, cueJson(before))},
+                    {"added", listJson(diff.cuesAdded, cueJson(after))},
+                    {"moved", movedJson(diff.cuesMoved, before)}};
     json["levels"] =
         listJson(content.levels, [&](const LevelsDiff& levels) { return levelsJson(levels, before, after); });
     json["properties"] = listJson(content.properties, [](const PropertiesDiff& properties) {

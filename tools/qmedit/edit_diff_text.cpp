@@ -1,11 +1,11 @@
 #include "tools/qmedit/edit_diff_text.h"
 
+#include "interchange/marker_colour.h"
 #include "platform/base/num_range.h"
 #include "tools/qmedit/event_table.h"
 #include "tools/qmedit/track_picture.h"
 
 #include <charconv>
-#include <cmath>
 
 using Qx::kTimeTolerance;
 
@@ -71,10 +71,42 @@ String pairText(char sign, const PairReport& pair, const EditReport& report, con
     return text + "  " + sourceLabel(source, console) + pairNotes(report, pair) + endNotes(pair) + "\n";
 }
 
+String movedLine(const MovedRun<PairReport>& run, const EditReport& before, const Console& console) {
+    const bool isNamed = run.count == 1;
+    return "  > " + movedText(run, "clip", before) +
+           (isNamed ? "  " + sourceLabel(before.sources[run.first.source], console) : String()) + "\n";
+}
+
 String cuesText(const EditDiff& diff) {
-    return diff.cuesDiffer
+    return diff.cuesDiffer()
                ? String::format("cues  changed; %zu before, %zu after\n", diff.cuesBefore, diff.cuesAfter)
                : String();
+}
+
+String cueText(char sign, const CueReport& cue, const EditReport& report, const Console& console) {
+    String text = String("  ") + sign + " " + report.recordTimecode(cue.time);
+    if (cue.length > kTimeTolerance) {
+        text += "-" + report.recordTimecode(cue.time + cue.length);
+    }
+    const String colour(interchange::markerColourName(cue.code));
+    return text + "  " + console.safe(cue.text) + (colour.empty() ? "" : " (" + colour.lower() + ")") + "\n";
+}
+
+/// Each marker that went, came or moved.
+String cueLines(const EditDiff& diff, const EditReport& before, const EditReport& after,
+                const Console& console) {
+    String text = cuesText(diff);
+    for (const CueReport& cue : diff.cuesRemoved) {
+        text += cueText('-', cue, before, console);
+    }
+    for (const CueReport& cue : diff.cuesAdded) {
+        text += cueText('+', cue, after, console);
+    }
+    for (const MovedRun<CueReport>& run : diff.cuesMoved) {
+        text += "  > " + movedText(run, "marker", before) +
+                (run.count == 1 ? "  " + console.safe(run.first.text) : String()) + "\n";
+    }
+    return text;
 }
 
 } // namespace
@@ -98,6 +130,9 @@ String diffPairsText(const EditDiff& diff, const EditReport& before, const EditR
         for (const PairReport& pair : channel.added) {
             text += pairText('+', pair, after, console);
         }
+        for (const MovedRun<PairReport>& run : channel.moved) {
+            text += movedLine(run, before, console);
+        }
     }
-    return text + cuesText(diff);
+    return text + cueLines(diff, before, after, console);
 }

@@ -55,6 +55,9 @@ Json pairJson(const EditReport& report, const PairReport& pair) {
     json["speed"] = pair.velocity;
     json["fade_in"] = report.frames(pair.fadeIn);
     json["fade_out"] = report.frames(pair.fadeOut);
+    json["transition"] = transitionText(pair.transition);
+    json["reel"] = textOrNull(source.reel, !source.reel.empty());
+    json["event"] = textOrNull(pair.event, !pair.event.empty());
     return json;
 }
 
@@ -205,6 +208,10 @@ String pairJsonText(const EditReport& report, const PairReport& pair) {
     return dumped(pairJson(report, pair));
 }
 
+String cueJsonText(const EditReport& report, const CueReport& cue) {
+    return dumped(cueJson(report, cue));
+}
+
 String valueJsonText(const configb::Value& value) {
     return dumped(headerValue(value));
 }
@@ -217,6 +224,32 @@ String headerJson(const configb& header, const std::vector<String>& keys) {
         }
     }
     return String(json.dump(2, ' ', false, Json::error_handler_t::replace)) + "\n";
+}
+
+String reportJson(const std::vector<std::pair<const char*, String>>& texts,
+                  const std::vector<std::pair<const char*, size_t>>& numbers,
+                  const interchange::LossReport& report) {
+    Json json;
+    for (const auto& [key, text] : texts) {
+        json[key] = textOrNull(text, !text.empty());
+    }
+    for (const auto& [key, number] : numbers) {
+        json[key] = number;
+    }
+    const auto add = [&json](const char* key, const std::vector<interchange::Loss>& all) {
+        json[key] = Json::array();
+        for (const interchange::Loss& loss : all) {
+            Json one;
+            one["line"] = loss.line > 0 ? Json(loss.line) : Json();
+            one["what"] = loss.what;
+            json[key].push_back(std::move(one));
+        }
+    };
+    add("errors", report.errors());
+    add("losses", report.losses());
+    add("warnings", report.warnings());
+    add("notes", report.notes());
+    return dumped(json);
 }
 
 String isoTime(int64_t seconds) {

@@ -4,6 +4,9 @@
 #include "platform/services/files.h"
 
 #include <algorithm>
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
 #include <filesystem>
 #include <vector>
 
@@ -29,7 +32,7 @@ Qx::FileError readStart(const String& path, String& start) {
     return {};
 }
 
-int lineOf(const String& text, size_t position) {
+int lineOf(std::string_view text, size_t position) {
     return 1 + static_cast<int>(
                    std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(position), '\n'));
 }
@@ -63,7 +66,7 @@ Qx::Status failure(const String& path, int line, const String& what) {
     return Qx::Status::failure(path + (line > 0 ? ":" + std::to_string(line) : "") + ": " + what);
 }
 
-Qx::Status checkContent(const String& path, const String& start) {
+Qx::Status checkContent(const String& path, std::string_view start) {
     const String extension = Qx::extensionOf(Qx::fileNameOf(path)).lower();
     if (extension == getEditFilenameExt() || start.starts_with("QME")) {
         return failure(path, 0,
@@ -73,12 +76,12 @@ Qx::Status checkContent(const String& path, const String& start) {
     if (start.empty()) {
         return failure(path, 1, "the file is empty; export the list again and import that");
     }
-    if (const size_t zero = start.find('\0'); zero != String::npos) {
+    if (const size_t zero = start.find('\0'); zero != std::string_view::npos) {
         return failure(path, lineOf(start, zero),
                        "not text but binary data; import reads CMX 3600 edit decision lists (.edl) and "
                        "legacy text (.ed2)");
     }
-    if (extension != ".edl" && extension != ".ed2" && !looksLikeEdl(start)) {
+    if (extension != ".edl" && extension != ".ed2" && !looksLikeEdl(String(start))) {
         return failure(path, 1,
                        "no EDL: it has no TITLE, FCM or event line; import reads CMX 3600 edit decision "
                        "lists (.edl) and "
@@ -119,4 +122,19 @@ Qx::Status checkImportSource(const String& path, String& resolved) {
         return Qx::Status::failure(error.text());
     }
     return checkContent(path, start);
+}
+
+Qx::Status readStandardInput(const String& name, uint64_t most, String& text) {
+    text.clear();
+    char buffer[65536];
+    for (size_t got = 0; (got = std::fread(buffer, 1, sizeof buffer, stdin)) > 0;) {
+        if (text.size() + got > most) {
+            return failure(name, 0, "larger than 64 MiB, which no edit list is; check where it comes from");
+        }
+        text.append(buffer, got);
+    }
+    if (std::ferror(stdin) != 0) {
+        return failure(name, 0, String("cannot be read: ") + std::strerror(errno));
+    }
+    return checkContent(name, std::string_view(text).substr(0, kSniffedBytes));
 }

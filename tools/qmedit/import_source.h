@@ -7,3 +7,7 @@
 /// of an EDL (a TITLE, FCM or event line near its start). Sets `resolved` to the file that a link leads to. A
 /// failure is one line that names the file, the line where there is one, and what to do.
 [[nodiscard]] Qx::Status checkImportSource(const String& path, String& resolved);
+
+/// Reads standard input to its end, refusing more than `most` bytes and what does not look like an EDL. `name`
+/// stands for it in messages.
+[[nodiscard]] Qx::Status readStandardInput(const String& name, uint64_t most, String& text);

@@ -150,6 +150,7 @@ SourceNamer ProjectSession::sourceNamer() {
         source.problem = facts.problem;
         if (source.problem.empty()) {
             source.dropFrame = facts.dropFrame;
+            source.reel = facts.reel;
         }
     };
 }

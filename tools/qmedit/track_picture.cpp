@@ -443,6 +443,9 @@ String editSummary(const EditReport& report, const Console& console) {
         parts.push_back("no channels");
     }
     const String lines = joined(parts, console.utf8() ? " · " : ", ", console.width() - 1);
-    const String name = report.name.empty() ? String("(no name)") : console.safe(report.name);
+    String name = report.name.empty() ? String("(no name)") : console.safe(report.name);
+    if (console.fitted()) {
+        name = safe_text::fitted(name, console.width() - 1, console.ellipsis());
+    }
     return " " + console.inked(Ink::Bold, name) + "\n" + lines;
 }

@@ -124,7 +124,7 @@ void sortNotes(const String& notes, String& above, String& others) {
         const NoteKind kind = parseNote(line).kind;
         if (kind == NoteKind::Split) {
             append(above, line);
-        } else if (kind == NoteKind::Other || kind == NoteKind::Marker) {
+        } else if (kind == NoteKind::Other || kind == NoteKind::Marker || kind == NoteKind::EffectName) {
             append(others, line);
         }
     });

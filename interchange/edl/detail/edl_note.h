@@ -16,6 +16,7 @@ enum class NoteKind {
     FullReel, ///< "FINAL CUT PRO REEL: long-name REPLACED BY: SHORT"
     Marker,
     FreezeFrame,
+    EffectName, ///< of a transition or another effect
     Audio,
     Speed,
     Split

@@ -44,10 +44,10 @@ void EdlReader::applyNote(const Note& note) {
         nameTo(note.value);
         break;
     case NoteKind::MediaFrom:
-        (paired() && !outgoing().isBlack() ? outgoing() : last()).mediaPath = name(note.value);
+        (paired() && !outgoing().isBlack() ? outgoing() : last()).mediaPath = note.value;
         break;
     case NoteKind::MediaTo:
-        last().mediaPath = name(note.value);
+        last().mediaPath = note.value;
         break;
     case NoteKind::SourceFile:
         applySourceFile(note.value);
@@ -67,6 +67,9 @@ void EdlReader::applyNote(const Note& note) {
     case NoteKind::Speed:
         applySpeed(note.value);
         break;
+    case NoteKind::EffectName:
+        last().effectName = note.value;
+        break;
     case NoteKind::Split:
     case NoteKind::Other:
         break;
@@ -79,13 +82,13 @@ void EdlReader::nameFrom(std::string_view text) {
     m_sourceForIncoming = false;
     if (paired() && !outgoing().isBlack()) {
         if (outgoing().clipName.empty()) {
-            outgoing().clipName = name(text);
+            outgoing().clipName = text;
         }
         return;
     }
     m_sourceForIncoming = true;
     if (last().clipName.empty()) {
-        last().clipName = name(text);
+        last().clipName = text;
         m_nameIsFrom = true;
     }
 }
@@ -93,7 +96,7 @@ void EdlReader::nameFrom(std::string_view text) {
 void EdlReader::nameTo(std::string_view text) {
     m_sourceForIncoming = true;
     if (last().clipName.empty() || (m_nameIsFrom && last().type != EdlType::Cut)) {
-        last().clipName = name(text);
+        last().clipName = text;
         m_nameIsFrom = false;
     }
 }
@@ -102,7 +105,7 @@ void EdlReader::applySourceFile(std::string_view text) {
     const bool toOutgoing = paired() && !m_sourceForIncoming && !outgoing().isBlack();
     EdlEvent& side = toOutgoing && outgoing().sourceFile.empty() ? outgoing() : last();
     if (side.sourceFile.empty()) {
-        side.sourceFile = name(text);
+        side.sourceFile = text;
     }
     m_sourceForIncoming = true;
 }
@@ -113,8 +116,8 @@ void EdlReader::applyFullReel(std::string_view value) {
     if (at == std::string_view::npos) {
         return;
     }
-    const String shortName = name(trimBlanks(value.substr(at + replaced.size())));
-    const String longName = name(trimBlanks(value.substr(0, at)));
+    const String shortName = String(trimBlanks(value.substr(at + replaced.size())));
+    const String longName = String(trimBlanks(value.substr(0, at)));
     EdlEvent* sides[] = {&last(), paired() ? &outgoing() : nullptr};
     for (EdlEvent* side : sides) {
         if (side != nullptr && side->reel == shortName && side->sourceFile.empty()) {
@@ -160,7 +163,8 @@ void EdlReader::applySpeed(std::string_view value) {
     }
     speed.digits = m_fields[count - 2];
     const char* const start = m_fields[0].data();
-    speed.reel = name({start, size_t(m_fields[count - 3].data() - start) + m_fields[count - 3].size()});
+    speed.reel =
+        std::string_view(start, size_t(m_fields[count - 3].data() - start) + m_fields[count - 3].size());
     const bool drop = !fields.dropSeparator && !fields.nonDropSeparator
                           ? last().sourceDrop
                           : resolveDrop(fields.dropSeparator, fields.nonDropSeparator);
@@ -209,6 +213,7 @@ void EdlReader::applyMarker(std::string_view value) {
     }
     EdlMarker marker;
     marker.line = m_line;
+    marker.event = m_list.events.size() - 1;
     const bool drop = !fields.dropSeparator && !fields.nonDropSeparator
                           ? last().recordDrop
                           : resolveDrop(fields.dropSeparator, fields.nonDropSeparator);
@@ -218,7 +223,7 @@ void EdlReader::applyMarker(std::string_view value) {
     const bool isColour = !colour.empty() && std::all_of(colour.begin(), colour.end(),
                                                          [](char c) { return c >= 'A' && c <= 'Z'; });
     marker.colour = isColour ? colour : std::string_view();
-    marker.text = name(isColour ? rest : value);
+    marker.text = isColour ? rest : value;
     m_list.markers.push_back(std::move(marker));
 }
 

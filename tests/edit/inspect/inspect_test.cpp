@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <gtest/gtest.h>
+#include <numeric>
 
 // What an application asks of edits without the command line.
 
@@ -46,6 +47,81 @@ TEST(Inspect, TellsWhereTwoEditsDiffer) {
 
     EXPECT_TRUE(diffOf(reports[0], reports[0]).same());
     EXPECT_TRUE(contentDiffOf(contents[1], contents[1]).same());
+}
+
+/// A row of clips, each known by a number and one second long but for every third; 0 is a gap, below 0 black.
+EditReport rowOf(const std::vector<int>& clips) {
+    EditReport report;
+    ChannelReport channel;
+    channel.place = "V1";
+    channel.type = VideoChan;
+    report.sources = {{black_cookie, SourceKind::Black, {}, {}, false, {}, {}},
+                      {cookie("E0001000"), SourceKind::Shot, {}, {}, false, {}, {}}};
+    double time = 0;
+    for (const int clip : clips) {
+        const double length = clip % 3 == 0 ? 2 : 1;
+        PairReport pair;
+        pair.in = time;
+        pair.out = time += length;
+        pair.stripIn = clip > 0 ? clip * 10 : 0;
+        pair.stripOut = pair.stripIn + length;
+        pair.source = clip > 0 ? 1 : 0;
+        if (clip != 0) {
+            channel.pairs.push_back(pair);
+        }
+    }
+    report.channels.push_back(channel);
+    return report;
+}
+
+TEST(Inspect, TellsOfWhatMovedByHowFar) {
+    const struct {
+        const char* what;
+        std::vector<int> before;
+        std::vector<int> after;
+        const char* told; ///< -removed +added, then of each run its count, from, to and by; "!" for the rest
+    } cases[] = {
+        {"nothing", {1, 2, 3}, {1, 2, 3}, "-0 +0"},
+        {"one taken out", {1, 2, -1, 4, 5}, {1, -1, 4, 5}, "-1 +0 3 2-5 -1!"},
+        {"one put in", {1, 2, 4, 5}, {1, 7, 2, 4, 5}, "-0 +1 3 1-4 1!"},
+        {"two that change places", {1, 2, 4, 5, 7}, {1, 5, 4, 2, 7}, "-0 +0 1 1-2 2 1 3-4 -2"},
+        {"a block that moves", {1, 2, 3, 4, 5}, {4, 5, 1, 2, 3}, "-0 +0 3 0-4 2 2 4-6 -4"},
+        {"a clip that is played again and again", {1, 1, 1, 2}, {2, 1, 1, 1}, "-0 +0 1 0-1 3 1 3-4 -3"},
+        {"black alone is no clue", {-1, 2, 0, 4}, {0, 4, -1}, "-2 +1 1 4-5 -2"},
+        {"a clip more of those that are alike", {1, 2, 1, 4}, {1, 1, 2, 1, 4}, "-0 +1 3 1-4 1!"},
+        {"trimmed", {1, 3, 2}, {1, 4, 2}, "-1 +1 1 3-4 -1!"},
+    };
+    for (const auto& its : cases) {
+        const EditDiff diff = diffOf(rowOf(its.before), rowOf(its.after));
+        String told = "-0 +0";
+        if (!diff.channels.empty()) {
+            const ChannelDiff& channel = diff.channels[0];
+            told = String::format("-%zu +%zu", channel.removed.size(), channel.added.size());
+            for (const MovedRun<PairReport>& run : channel.moved) {
+                told += String::format(" %zu %g-%g %g%s", run.count, run.from, run.to, run.by,
+                                       run.isRest ? "!" : "");
+            }
+        }
+        EXPECT_EQ(told, its.told) << its.what;
+    }
+    EditContent levels[2];
+    levels[0].levels = {{"A1 levels", {{1, 0.5F}, {2, 1}, {3, 0.5F}, {5, 1}}}};
+    levels[1].levels = {{"A1 levels", {{1, 0.5F}, {6, 1}, {7, 0.5F}, {9, 1}}}};
+    const LevelsDiff nodes = contentDiffOf(levels[0], levels[1]).levels.at(0);
+    ASSERT_EQ(nodes.moved.size(), 1U);
+    EXPECT_TRUE(nodes.moved[0].count == 3 && nodes.moved[0].by == 4 && nodes.removed.empty());
+    EditReport cues[2] = {rowOf({}), rowOf({})};
+    cues[0].cues = {{1, 0, "a", 0, -1, false}, {2, 0, "b", 0, -1, false}, {3, 0, "b", 0, -1, false}};
+    cues[1].cues = {{4, 0, "b", 0, -1, false}, {5, 0, "b", 0, -1, false}};
+    const EditDiff markers = diffOf(cues[0], cues[1]);
+    ASSERT_TRUE(markers.cuesMoved.size() == 1 && markers.cuesRemoved.size() == 1);
+    EXPECT_TRUE(markers.cuesMoved[0].count == 2 && markers.cuesMoved[0].by == 2 && markers.cuesDiffer());
+    std::vector<int> long1(20000);
+    std::iota(long1.begin(), long1.end(), 1);
+    std::vector<int> long2(long1.rbegin(), long1.rend());
+    const EditDiff turned = diffOf(rowOf(long1), rowOf(long2));
+    EXPECT_EQ(turned.channels.at(0).removed.size() + turned.channels.at(0).added.size(), 0U)
+        << "every clip is known again, in no more steps than a test has time for";
 }
 
 TEST(Inspect, VerifiesAProjectAndTellsWhoPlaysWhat) {
