@@ -6,8 +6,8 @@
 
 #include "edit/manager/edit_manager.h"
 #include "platform/services/config_int.h"
+#include "recording_file_system.h"
 #include "tests/edit/manager/managed_project.h"
-#include "tests/support/recording_file_system.h"
 
 #include <algorithm>
 #include <filesystem>

@@ -102,18 +102,6 @@ TEST(Undo, GoesBackToTheStartAndOnToTheEnd) {
     }
 }
 
-TEST(Undo, AnEditThatWasNotChangedSinceItsBackupIsWrittenFirst) {
-    ManagedProject project;
-    ManagedProject::save("a");
-    for (int i = 1; i <= 3; ++i) {
-        ASSERT_TRUE(edit_manager::backup_edit(kEdit));
-        EXPECT_TRUE(project.has("E0001000.qme.U" + std::to_string(i)));
-    }
-    ASSERT_TRUE(edit_manager::undoRequest(kEdit));
-    EXPECT_TRUE(project.has("E0001000.qme"));
-    EXPECT_EQ(ManagedProject::nameOf(), "a");
-}
-
 TEST(Undo, TellsThoseWhoHoldTheEditAndThoseWhoOpenItAgain) {
     ManagedProject project;
     ManagedProject::save("a");
