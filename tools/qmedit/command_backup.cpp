@@ -25,7 +25,7 @@ int runBackup(const EditArguments& arguments) {
         return kFailed;
     }
     const cookie& item = managed.item();
-    const size_t numRedo = managed.numRedo();
+    const std::optional<size_t> numRedo = managed.numRedo();
     const String change = changeText(edit->getChangeDescription());
     const String file = getFilenameForCookie(item);
     SpareRoom room;
@@ -50,9 +50,9 @@ int runBackup(const EditArguments& arguments) {
                                           putFileBack(item, edit)));
     }
     writeOut(item.asString() + ": kept as undo backup 1" +
-             (change.empty() ? String() : " (last change: " + change + ")") +
-             String::format("; %zu to undo", managed.numUndo()) +
-             (numRedo == 0 ? String() : String::format("; %zu redo backups went", numRedo)) + "\n");
+             (change.empty() ? String() : " (last change: " + change + ")") + "; " +
+             countText(managed.numUndo()) + " to undo" +
+             (numRedo == size_t{0} ? String() : "; " + countText(numRedo) + " redo backups went") + "\n");
     return kDone;
 }
 

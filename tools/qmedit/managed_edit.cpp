@@ -58,7 +58,11 @@ int ManagedEdit::prepare(bool mayBeGone) {
         return failed(locked);
     }
     m_session.manage();
-    if (!mayBeGone && edit_manager::getEditFiles(m_item).empty()) {
+    Vector<String> files;
+    if (const Qx::Status listed = edit_manager::getEditFiles(m_item, files); !listed) {
+        return failed(listed);
+    }
+    if (!mayBeGone && files.empty()) {
         EditPtr none;
         return failed(m_session.readEdit(m_item, none));
     }
@@ -106,12 +110,25 @@ bool ManagedEdit::open(EditPtr& edit) {
     return openManaged(m_item, edit, m_wasRestored);
 }
 
-size_t ManagedEdit::numUndo() const {
-    return chain(m_item, RevisionChain::Undo).numbers().size();
+namespace {
+
+std::optional<size_t> numBackups(const cookie& item, RevisionChain::Kind kind) {
+    std::vector<int> numbers;
+    return chain(item, kind).numbers(numbers) ? std::optional(numbers.size()) : std::nullopt;
 }
 
-size_t ManagedEdit::numRedo() const {
-    return chain(m_item, RevisionChain::Redo).numbers().size();
+} // namespace
+
+std::optional<size_t> ManagedEdit::numUndo() const {
+    return numBackups(m_item, RevisionChain::Undo);
+}
+
+std::optional<size_t> ManagedEdit::numRedo() const {
+    return numBackups(m_item, RevisionChain::Redo);
+}
+
+String countText(std::optional<size_t> count) {
+    return count ? std::to_string(*count) : "an unknown number";
 }
 
 int stepRevision(const EditArguments& arguments, bool redo) {
@@ -156,10 +173,10 @@ int stepRevision(const EditArguments& arguments, bool redo) {
     if (redo && edit.valid()) {
         change = changeText(edit->getChangeDescription());
     }
-    writeOut(
-        item.asString() + ": " + done + " " + quotedChange(change) +
-        String::format("; the edit is what %s backup %d was, last changed %s; %zu to undo, %zu to redo\n",
-                       verb, number, localTimeText(edit.valid() ? edit->getModificationTime() : 0).c_str(),
-                       managed.numUndo(), managed.numRedo()));
+    writeOut(item.asString() + ": " + done + " " + quotedChange(change) +
+             String::format("; the edit is what %s backup %d was, last changed %s; %s to undo, %s to redo\n",
+                            verb, number,
+                            localTimeText(edit.valid() ? edit->getModificationTime() : 0).c_str(),
+                            countText(managed.numUndo()).c_str(), countText(managed.numRedo()).c_str()));
     return kDone;
 }

@@ -3,6 +3,8 @@
 #include "tools/qmedit/commands.h"
 #include "tools/qmedit/project_session.h"
 
+#include <optional>
+
 /// What the commands on one edit are given.
 struct EditArguments {
     std::string item;
@@ -17,6 +19,9 @@ struct EditArguments {
 /// After a write that failed: lets go of the changes, and brings the file of an edit that lies as its newest
 /// undo backup back under its name, under the writers' lock. Says in one clause where the edit is.
 [[nodiscard]] String putFileBack(const cookie& item, EditPtr& edit);
+
+/// A number of backups for people, also one that the system could not tell.
+[[nodiscard]] String countText(std::optional<size_t> count);
 
 /// One edit of a project that a command changes through the edit manager, under the project's writers' lock
 /// from before it is opened until the object goes. What the user must know is told on standard error.
@@ -34,8 +39,8 @@ public:
     [[nodiscard]] const cookie& item() const { return m_item; }
     [[nodiscard]] ProjectSession& session() { return m_session; }
     /// How many undo and redo backups there are.
-    [[nodiscard]] size_t numUndo() const;
-    [[nodiscard]] size_t numRedo() const;
+    [[nodiscard]] std::optional<size_t> numUndo() const;
+    [[nodiscard]] std::optional<size_t> numRedo() const;
 
 private:
     const EditArguments& m_arguments;

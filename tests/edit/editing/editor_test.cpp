@@ -99,6 +99,7 @@ TEST_F(EditorTest, ARefusedOperationHasChangedNothing) {
         const Editor::Result result = apply(from, its.source, edit, its.destination, its.op, its.flags);
         EXPECT_FALSE(result.valid());
         EXPECT_NE(result.reason().find(its.reason), String::npos) << result.reason();
+        EXPECT_EQ(result.status().code(), Qx::StatusCode::BadArgument);
         EXPECT_TRUE(editState(*edit) == before);
         EXPECT_TRUE(editState(*clipboard()) == kept);
         EXPECT_TRUE(treeSnapshot(folder().path()) == files);
@@ -111,7 +112,7 @@ TEST_F(EditorTest, AReadOnlyOrUnsafeEditIsRefused) {
     EXPECT_NE(apply({}, {}, edit, {1, 2}, Op::Lift).reason().find("read-only"), String::npos);
     ASSERT_TRUE(PermissionsManager::setReadOnly(edit->get_cookie(), false));
     edit->set_read_only(true);
-    EXPECT_NE(apply({}, {}, edit, {1, 2}, Op::Lift).reason().find("read-only"), String::npos);
+    EXPECT_EQ(apply({}, {}, edit, {1, 2}, Op::Lift).status().code(), Qx::StatusCode::ReadOnly);
 
     // Without channels an edit cannot be written, so there is nothing that undo could go back to.
     const EditPtr bare = make({"V "}, 101);
@@ -418,6 +419,7 @@ TEST_F(EditorTest, WhateverTheDiskDoesTheEditIsTheOldOrTheNew) {
     String before;
     String after;
     cookie item;
+    Qx::Status refusal;
     const auto setUp = [&] {
         const EditPtr edit = make({"V AAAABBB", "A CCCCDDD"}, ++number);
         item = edit->get_cookie();
@@ -426,13 +428,15 @@ TEST_F(EditorTest, WhateverTheDiskDoesTheEditIsTheOldOrTheNew) {
     };
     const auto act = [&](const EditPtr& edit, const auto& arm) {
         arm();
-        const bool done = apply({}, {}, edit, {2, 5}, Op::Remove).valid();
+        const Editor::Result result = apply({}, {}, edit, {2, 5}, Op::Remove);
         after = contentState(*edit);
-        return done;
+        refusal = result.status();
+        return result.valid();
     };
     const auto check = [&](EditPtr& edit, const Met& met) {
         EXPECT_EQ(drawRows(*edit).front(), met.done ? "V AABB" : "V AAAABBB");
         EXPECT_TRUE(met.done || after == before);
+        EXPECT_EQ(refusal.systemError(), met.done ? 0 : EIO) << refusal.reason();
         EXPECT_TRUE(edit_manager::flush_changes());
         edit.invalidate();
         ASSERT_TRUE(edit_manager::invalidateCache(item));

@@ -48,13 +48,13 @@ void addOne(const cookie& item) {
 void actOn(const cookie& item, unsigned action) {
     switch (action % 16) {
     case 0:
-        edit_manager::backup_edit(item);
+        static_cast<void>(edit_manager::backup_edit(item).isOk());
         break;
     case 1:
-        edit_manager::undoRequest(item);
+        static_cast<void>(edit_manager::undoRequest(item).isOk());
         break;
     case 2:
-        edit_manager::redoRequest(item);
+        static_cast<void>(edit_manager::redoRequest(item).isOk());
         break;
     case 3:
         edit_manager::reloadRequest(item, true);
@@ -190,7 +190,7 @@ TEST(Concurrency, ThreadsInsideEditsThatNeedEachOthersGoOn) {
             edit_manager::flush_edit(itemAt(other));
             break;
         case 1:
-            edit_manager::backup_edit(itemAt(other));
+            static_cast<void>(edit_manager::backup_edit(itemAt(other)).isOk());
             break;
         case 2:
             edit_manager::reloadRequest(itemAt(other), true);

@@ -50,7 +50,7 @@ TEST(Keeping, AFileThatIsAwayForAnInstantIsFound) {
     if (writer == 0) {
         for (int i = 1; std::chrono::steady_clock::now() < end; ++i) {
             ManagedProject::save(String::format("%d", i));
-            edit_manager::backup_edit(kEdit);
+            static_cast<void>(edit_manager::backup_edit(kEdit).isOk());
         }
         ::_exit(0);
     }
@@ -95,7 +95,7 @@ TEST(Keeping, WhatCouldNotBeWrittenWaitsToBe) {
         {
             test::FaultyFileSystem system;
             system.fullAfter(100);
-            EXPECT_FALSE(byItself ? edit->write_file() : edit_manager::backup_edit(kEdit));
+            EXPECT_FALSE(byItself ? edit->write_file() : edit_manager::backup_edit(kEdit).isOk());
             ManagedProject::change("changed later");
             EXPECT_EQ(edit_manager::numDirty(), 1U);
             EXPECT_FALSE(edit_manager::flush_changes());
