@@ -60,7 +60,8 @@ void backup(benchmark::State& state) {
     for (auto _ : state) {
         touchChannels(edit);
         bool done = false;
-        state.SetIterationTime(secondsOf([&] { done = edit_manager::backup_edit(edit->get_cookie()); }));
+        state.SetIterationTime(
+            secondsOf([&] { done = edit_manager::backup_edit(edit->get_cookie()).isOk(); }));
         if (failed(state, !done, "the edit could not be backed up")) {
             break;
         }
@@ -74,7 +75,7 @@ void step(benchmark::State& state, bool redo) {
     const cookie item = edit->get_cookie();
     settleDisk();
     for (auto _ : state) {
-        bool done = edit_manager::backup_edit(item);
+        bool done = edit_manager::backup_edit(item).isOk();
         touchChannels(edit);
         edit.invalidate();
         const double undone = secondsOf([&] { done = edit_manager::undoRequest(item) && done; });

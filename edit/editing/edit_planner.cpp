@@ -47,8 +47,8 @@ Editor::Planner::Planner(const EditModule& source, const EditModule& destination
     }
 }
 
-bool Editor::Planner::refuse(String reason) {
-    m_reason = std::move(reason);
+bool Editor::Planner::refuse(String reason, Qx::StatusCode code) {
+    m_refusal = Qx::Status::failure(code, std::move(reason));
     return false;
 }
 
@@ -75,10 +75,11 @@ bool Editor::Planner::checkOperation() {
         return refuse("EditOpPerformer::doEdit() : Unhandled EditOperation");
     }
     if (edit.isBad()) {
-        return refuse("the edit " + edit.get_cookie_str() + " could not be read and cannot be changed");
+        return refuse("the edit " + edit.get_cookie_str() + " could not be read and cannot be changed",
+                      Qx::StatusCode::Damaged);
     }
     if (!editing_detail::isWritable(edit)) {
-        return refuse("the edit " + edit.get_cookie_str() + " is read-only");
+        return refuse("the edit " + edit.get_cookie_str() + " is read-only", Qx::StatusCode::ReadOnly);
     }
     return true;
 }
@@ -273,7 +274,7 @@ bool Editor::Planner::addSourceSteps(Target target, const EditModule& destinatio
             addStep(kCoreRemove, index, end, events->get_end_time() - end);
         }
     }
-    return m_reason.empty();
+    return m_refusal.isOk();
 }
 
 /// A channel opens by the one length that every channel does; what a channel's own marks leave out is black.

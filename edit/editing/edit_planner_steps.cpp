@@ -232,7 +232,7 @@ void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, co
 }
 
 bool Editor::Planner::checkSteps() {
-    if (!m_reason.empty()) {
+    if (!m_refusal) {
         return false;
     }
     Plan& plan = *m_plan;

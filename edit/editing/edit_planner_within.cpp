@@ -97,7 +97,7 @@ bool Editor::Planner::addFittingStep(const IdStamp& from, const IdStamp& to, con
     if (reach - region.start() > kTimeTolerance) {
         addCopyStep(addTarget(target), region.start(), edit, from, Range(region.start(), reach));
     }
-    return m_reason.empty();
+    return m_refusal.isOk();
 }
 
 bool Editor::Planner::addSwap(const Vector<IdStamp>& chans) {
@@ -123,5 +123,5 @@ bool Editor::Planner::addCopies(const Vector<IdStamp>& chans) {
         first.chan = chans[0];
         addBlackStep(kCoreReplace, addTarget(first), region.start(), length);
     }
-    return m_reason.empty();
+    return m_refusal.isOk();
 }

@@ -39,7 +39,7 @@ Editor::Result Editor::applyInternal(const EditModule& source, const EditModule&
                                      edit_operation op) {
     Result result;
     if (!checkMarks(destination)) {
-        result.m_reason = "there is no destination edit";
+        result.m_status = Qx::Status::failure(Qx::StatusCode::BadArgument, "there is no destination edit");
         return result;
     }
     m_destination = destination;
@@ -48,7 +48,7 @@ Editor::Result Editor::applyInternal(const EditModule& source, const EditModule&
     const std::lock_guard<criticalSection> hold(edit.section());
     const int numChans = edit.getNumChans();
     if (!doPreEditTasks(source, op)) {
-        result.m_reason = m_refusal;
+        result.m_status = m_refusal;
         return result;
     }
     if (editOpRequiresSourceAndDest(op)) {
@@ -92,7 +92,7 @@ bool Editor::makePlan(const EditModule& source, edit_operation op) {
     m_destination.verify();
     Planner planner(source, m_destination, op, m_flags);
     m_plan = planner.plan();
-    m_refusal = planner.reason();
+    m_refusal = planner.refusal();
     m_notice = m_plan != nullptr ? planner.notice(*m_plan) : String();
     return m_plan != nullptr;
 }
@@ -104,9 +104,12 @@ bool Editor::backUp() {
     const cookie item = edit->get_cookie();
     const bool managed = edit_manager::theEditManager() != nullptr && edit_manager::get_present(item) &&
                          edit_manager::openEdit(item, eOpenExisting) == edit;
-    if (managed && (m_flags & NoBackup) == 0 && !edit_manager::backup_edit(item)) {
-        m_refusal = "the edit " + item.asString() + " cannot be backed up; nothing was changed";
-        return false;
+    if (managed && (m_flags & NoBackup) == 0) {
+        if (const Qx::Status kept = edit_manager::backup_edit(item); !kept) {
+            m_refusal = kept.retold("the edit " + item.asString() +
+                                    " cannot be backed up, so nothing was changed: " + kept.reason());
+            return false;
+        }
     }
     const bool together = config_int("undo_clipboard", 1) != 0;
     if (m_clipboardReady && together) {

@@ -115,8 +115,12 @@ public:
         [[nodiscard]] EditModificationType notificationType() const { return m_type; }
         /// True if the operation was done.
         [[nodiscard]] bool valid() const { return m_type != kNoModification; }
-        /// Why it was refused: one line for a person, empty when it was done.
-        [[nodiscard]] const String& reason() const { return m_reason; }
+        /// Why it was refused, with its kind: `BadArgument` for what the marks, channels or flags do not
+        /// allow, `ReadOnly`, `Damaged` for a destination that could not be read; else why it could not be
+        /// backed up. A success when it was done, and for the default.
+        [[nodiscard]] const Qx::Status& status() const { return m_status; }
+        /// Its sentence: one line for a person, empty when it was done.
+        [[nodiscard]] const String& reason() const { return m_status.reason(); }
         /// What a person should know of an operation that was done: one line; empty when it was done just as
         /// asked. It tells that cuts were moved to whole frames (see Frames).
         [[nodiscard]] const String& notice() const { return m_notice; }
@@ -127,7 +131,7 @@ public:
         bool m_markValid = true;
         bool m_syncLoss = false;
         EditModificationType m_type = kNoModification;
-        String m_reason;
+        Qx::Status m_status;
         String m_notice;
     };
 
@@ -213,7 +217,7 @@ private:
     IdStamp m_firstLevelsAdded;
     EditModificationType m_type = kNoModification;
     bool m_clipboardReady = false;
-    String m_refusal;
+    Qx::Status m_refusal;
     String m_notice;
     String m_clipboardNotice;
 };

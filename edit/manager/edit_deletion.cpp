@@ -92,7 +92,15 @@ bool mayBeDeleted(const cookie& item, bool force) {
         herc_printf("edit_manager: %s is in use and was not deleted\n", item.asString().c_str());
         return false;
     }
-    return edit.valid() || !edit_manager::getEditFiles(item).empty();
+    if (edit.valid()) {
+        return true;
+    }
+    Vector<String> files;
+    if (const Qx::Status found = edit_manager::getEditFiles(item, files); !found) {
+        herc_printf("edit_manager: %s was not deleted: %s\n", item.asString().c_str(),
+                    found.reason().c_str());
+    }
+    return !files.empty();
 }
 
 /// Deletes an item's files and drops it from the cache. `names` are those of its folder, listed under the
@@ -172,10 +180,28 @@ bool edit_manager::deleteEditFilesAndBackups(const CookieVec& items, bool force)
     return gone.size() == items.size();
 }
 
-Vector<String> edit_manager::getEditFiles(const cookie& item) {
+Qx::Status edit_manager::getEditFiles(const cookie& item, Vector<String>& files) {
     const String file = getFilenameForCookie(item);
-    return file.empty() ? Vector<String>()
-                        : editFiles(file, chainOf(file, RevisionChain::Undo).namesInFolder());
+    std::vector<String> names;
+    if (file.empty()) {
+        files.clear();
+        return {};
+    }
+    if (const Qx::FileError error = Qx::fileSystem().list(Qx::folderOf(file), names);
+        error && error.code != ENOENT) {
+        return error.status();
+    }
+    files = editFiles(file, names);
+    return {};
+}
+
+Vector<String> edit_manager::getEditFiles(const cookie& item) {
+    Vector<String> files;
+    if (const Qx::Status status = getEditFiles(item, files); !status) {
+        herc_printf("edit_manager::getEditFiles( %s ) : %s\n", item.asString().c_str(),
+                    status.reason().c_str());
+    }
+    return files;
 }
 
 void edit_manager::issuePreDeletionNotifications(const cookie& item) {

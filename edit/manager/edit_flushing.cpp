@@ -124,7 +124,8 @@ bool edit_manager::flush_edit(const cookie& item) {
 bool edit_manager::flush_changes() {
     ManagerState& state = managerState();
     state.notifier.notify(NotifyMsg(flushChangesMsgType(), String()));
-    // The number of the next cookie is stored whenever one is handed out: there is nothing to advance.
+    // The number of the next cookie is stored whenever one is handed out (`CookieAllocator`'s
+    // `update_cookie_number`): there is nothing to advance.
     const MilestoneRing milestones;
     bool allWritten = true;
     {

@@ -142,11 +142,12 @@ public:
     /// Makes an undo backup of the edit's present state: what the edit is in memory, also when its file went
     /// bad or was replaced meanwhile. The edit stays in memory; its file goes until it is written next. An
     /// edit whose file is missing because it was not changed since its last backup is written first, so that
-    /// every call leaves one more file. What could be redone is deleted, last. False for an edit that is
-    /// read-only, does not open, or whose files could not be written or moved (the log names path and cause):
-    /// the edit is under its name and both chains are as they were, but what could be redone may be gone when
-    /// a deletion or the last sync failed.
-    static bool backup_edit(const cookie& item);
+    /// every call leaves one more file. What could be redone is deleted, last. Fails for an edit that is
+    /// read-only (`ReadOnly`), does not open (with the kind that `openEdit` reports), is being dropped or
+    /// whose section cannot be had (`Locked`), or whose files could not be written or moved (with what the
+    /// system said): the edit is under its name and both chains are as they were, but what could be redone
+    /// may be gone when a deletion or the last sync failed.
+    static Qx::Status backup_edit(const cookie& item);
     /// Takes back what the last `backup_edit` did to the files of an edit that was not written since, because
     /// it could not be: the edit's file comes back under its name, what could be redone into its chain. The
     /// edit in memory, with its changes, is dropped. (A backup beyond the depth that went stays away.) False,
@@ -163,13 +164,14 @@ public:
     /// sound. Observers hear "editmanInvalidateCache" after the moves, and those who watch either object are
     /// told of the step. The edit then gets the owner that it had and, through
     /// `Edit::setChangeDescription`, the description of the change that was undone, inverted, or of the one
-    /// that was redone: it is dirty and counts one change more. False, with everything as it was, if there is
-    /// no such revision (for a redo: no backup 1), none is sound, the edit is read-only for the user, a file
-    /// could not be written or moved, or the revision does not open.
+    /// that was redone: it is dirty and counts one change more. Fails, with everything as it was, if there is
+    /// no such revision (`NotFound`; for a redo: no backup 1), none is sound (`Damaged`; `Refused` when one
+    /// could not be read, or a later version of this program wrote it), the edit is read-only for the user (`ReadOnly`), another thread has it (`Locked`), a file could not be written
+    /// or moved (with what the system said), or the revision does not open.
     /// `notice`, when given, receives a sentence when the clipboard edit should have gone with it and could
     /// not; it is left empty otherwise.
-    static bool undoRequest(const cookie& item, String* notice = nullptr);
-    static bool redoRequest(const cookie& item, String* notice = nullptr);
+    static Qx::Status undoRequest(const cookie& item, String* notice = nullptr);
+    static Qx::Status redoRequest(const cookie& item, String* notice = nullptr);
     /// Delete backup `keep` + 1, `keep` + 2, ... up to the depth, and stop at the first that is not there or
     /// cannot be deleted.
     static void delete_redo_edits(const cookie& item, int keep);
@@ -190,6 +192,9 @@ public:
     /// gone through once. True if all were deleted.
     static bool deleteEditFilesAndBackups(const CookieVec& items, bool force);
     /// The paths of an edit's file and all its backups that are there, the file first, then undo, then redo.
+    /// Fails, leaving `files`, when the system could not tell.
+    static Qx::Status getEditFiles(const cookie& item, Vector<String>& files);
+    /// The same; empty also when the system could not tell, which is logged.
     [[nodiscard]] static Vector<String> getEditFiles(const cookie& item);
     /// Tells the edit's observers, and those of "editDeleted", that it is about to go. A hidden edit's
     /// deletion is told only with the setting "notify_hidden_deleted".

@@ -15,12 +15,12 @@ namespace {
 
 /// The leaving of a project that has begun. Whatever keeps another one from being adopted, edits can be
 /// opened again afterwards.
-class Leaving {
+class ProjectExit {
 public:
-    Leaving() = default;
-    ~Leaving() { end(); }
-    Leaving(const Leaving&) = delete;
-    Leaving& operator=(const Leaving&) = delete;
+    ProjectExit() = default;
+    ~ProjectExit() { end(); }
+    ProjectExit(const ProjectExit&) = delete;
+    ProjectExit& operator=(const ProjectExit&) = delete;
     void end() {
         if (!std::exchange(m_isOver, true)) {
             managerState().setLeaving(false);
@@ -32,7 +32,7 @@ private:
 };
 
 /// Takes a project in the place of the one that was left, and lets edits be opened again.
-eStatus adoptProject(const Qx::CurrentProject* wanted, Leaving& leaving) {
+eStatus adoptProject(const Qx::CurrentProject* wanted, ProjectExit& projectExit) {
     ManagerState& state = managerState();
     Qx::CurrentProject current;
     String folder;
@@ -51,7 +51,7 @@ eStatus adoptProject(const Qx::CurrentProject* wanted, Leaving& leaving) {
         if (!folder.empty()) {
             state.records.use(folder);
         }
-        leaving.end();
+        projectExit.end();
     }
     if (folder.empty()) {
         return eStatus::NoProject;
@@ -126,7 +126,7 @@ eStatus edit_manager::check_current_project(eEditOpenBehaviour) {
         }
         left = state.project;
     }
-    Leaving leaving;
+    ProjectExit projectExit;
     // Rates are asked of the project that is current already: what would be recorded may be wrong.
     state.records.close();
     if (left.is_valid()) {
@@ -134,7 +134,7 @@ eStatus edit_manager::check_current_project(eEditOpenBehaviour) {
     }
     Vector<UnwrittenEdit> lost; // told of on the log
     dropProject(lost);
-    return adoptProject(nullptr, leaving);
+    return adoptProject(nullptr, projectExit);
 }
 
 eStatus edit_manager::set_current_project(const cookie& project, eEditOpenBehaviour behaviour) {
@@ -182,10 +182,10 @@ eStatus edit_manager::set_current_project(const cookie& project, eEditOpenBehavi
     while (!beginToLeave()) {
         std::this_thread::sleep_for(std::chrono::milliseconds(1));
     }
-    Leaving leaving;
+    ProjectExit projectExit;
     Vector<UnwrittenEdit> lost; // told of on the log
     dropProject(lost);
-    return adoptProject(&wanted, leaving);
+    return adoptProject(&wanted, projectExit);
 }
 
 void edit_manager::exitProject() {
@@ -195,7 +195,7 @@ void edit_manager::exitProject() {
 
 void edit_manager::exitProject(Vector<UnwrittenEdit>& lost) {
     if (beginToLeave()) {
-        const Leaving leaving;
+        const ProjectExit projectExit;
         dropProject(lost);
     }
 }

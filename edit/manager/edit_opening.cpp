@@ -19,9 +19,9 @@ namespace {
 /// One opening of an item that is not in the cache, with its turn on the access queue. What it moves is moved
 /// under the writers' lock of the project, which is not held while a file is read, and not needed where
 /// nothing is moved.
-class Opening {
+class EditOpener {
 public:
-    Opening(const cookie& item, eEditOpenBehaviour behaviour);
+    EditOpener(const cookie& item, eEditOpenBehaviour behaviour);
 
     EditPtr run();
     /// What was done; complete after `run`.
@@ -81,12 +81,12 @@ int depthAndEpoch(unsigned& epoch, unsigned& generation) {
     return state.backupDepth;
 }
 
-Opening::Opening(const cookie& item, eEditOpenBehaviour behaviour)
+EditOpener::EditOpener(const cookie& item, eEditOpenBehaviour behaviour)
     : m_item(item), m_behaviour(behaviour), m_file(getFilenameForCookie(item)),
       m_undo(m_file, RevisionChain::Undo, depthAndEpoch(m_epoch, m_generation)),
       m_redo(m_file, RevisionChain::Redo, m_undo.depth()), m_writers(Qx::folderOf(m_file)) {}
 
-void Opening::complain(const Qx::Status& why) {
+void EditOpener::complain(const Qx::Status& why) {
     m_fault = why;
     if (m_report.status) {
         m_report.status = why;
@@ -94,7 +94,7 @@ void Opening::complain(const Qx::Status& why) {
     herc_printf("edit_manager::open( %s ) : %s\n", cookie_string(m_item).c_str(), why.reason().c_str());
 }
 
-void Opening::refuse(const Qx::Status& why) {
+void EditOpener::refuse(const Qx::Status& why) {
     m_refused = true;
     if (!m_report.status) {
         m_report.recovery = why;
@@ -102,14 +102,14 @@ void Opening::refuse(const Qx::Status& why) {
     complain(why);
 }
 
-void Opening::foundMissing() {
+void EditOpener::foundMissing() {
     m_report.wasMissing = true;
     if (m_report.status) {
         m_report.status = Qx::Status::failure(Qx::StatusCode::NotFound, m_file + " does not exist");
     }
 }
 
-EditPtr Opening::fromCache(const ManagerState::CachedEdit& entry) {
+EditPtr EditOpener::fromCache(const ManagerState::CachedEdit& entry) {
     if (entry.failure != nullptr) {
         m_report = *entry.failure;
     } else {
@@ -123,20 +123,20 @@ Qx::Status isBeingLeft() {
                                "the project is being left, or the edits were closed; open a project first");
 }
 
-EditPtr Opening::cancelled() {
+EditPtr EditOpener::cancelled() {
     m_report = {};
     m_report.status = isBeingLeft();
     return {};
 }
 
 /// Under the lock: the file that was named when this began is that of the project whose edits are cached.
-bool Opening::isOfThisProject() const {
+bool EditOpener::isOfThisProject() const {
     const ManagerState& state = managerState();
     return state.instance.load() != nullptr && !state.isLeaving && state.epoch == m_epoch &&
            Qx::currentProjectGeneration() == m_generation;
 }
 
-EditPtr Opening::run() {
+EditPtr EditOpener::run() {
     ManagerState& state = managerState();
     static Qx::TimedTask::Counter& counter = Qx::TimedTask::named("editman").section("open");
     const Qx::TimedTask::Section timed(counter);
@@ -177,7 +177,7 @@ EditPtr Opening::run() {
     return cache({});
 }
 
-EditPtr Opening::makeNew() {
+EditPtr EditOpener::makeNew() {
     EditPtr edit(new Edit);
     try {
         edit->read_file(m_item, eOpenNew);
@@ -192,7 +192,7 @@ EditPtr Opening::makeNew() {
 
 /// The edit of the file, else of the newest backup that reads; with `eOpenOrCreate` a fresh one when there is
 /// neither for certain.
-EditPtr Opening::openFile() {
+EditPtr EditOpener::openFile() {
     // Other processes back the edit up, restore and write it meanwhile: then its file is looked at again.
     constexpr int kMostTurns = 100;
     int counter = 0;
@@ -234,7 +234,7 @@ Qx::Status noMemory(const String& what) {
     return Qx::Status::failure(Qx::StatusCode::Refused, what, ENOMEM);
 }
 
-Opening::Outcome Opening::read(EditPtr& edit) {
+EditOpener::Outcome EditOpener::read(EditPtr& edit) {
     const Qx::FileAnswer present = Qx::askFile(m_file);
     if (const Qx::FileError error = present.obstacle("open")) {
         refuse(error.status());
@@ -256,7 +256,7 @@ Opening::Outcome Opening::read(EditPtr& edit) {
         complain(edit->lastFileStatus());
         // What the system refuses (no permission, too many open files), and what a later version of this
         // program wrote, is not damaged: it stays where it is.
-        m_refused = result == TagBag::NotOpened || result == TagBag::Newer;
+        m_refused = result == TagBag::NotOpened || edit->lastFileStatus().code() == Qx::StatusCode::Newer;
     } catch (const std::bad_alloc&) {
         refuse(noMemory("there is not enough memory to read it"));
     } catch (const std::exception& error) {
@@ -267,7 +267,7 @@ Opening::Outcome Opening::read(EditPtr& edit) {
 }
 
 /// A fresh edit in the place of one of which nothing is left.
-EditPtr Opening::create() {
+EditPtr EditOpener::create() {
     for (const RevisionChain* const chain : {&m_undo, &m_redo}) {
         bool found = false;
         const Qx::Status status = chain->exists(found);
@@ -295,7 +295,7 @@ EditPtr Opening::create() {
     return {};
 }
 
-int Opening::shuffleUndoChain() {
+int EditOpener::shuffleUndoChain() {
     if (m_numRestored == 0) {
         m_backups = m_undo.numbers();
     }
@@ -313,7 +313,7 @@ int Opening::shuffleUndoChain() {
 
 /// Looks for what a missing file left, first without keeping others away: a sequence may play very many shots
 /// that are not there.
-Opening::Search Opening::restoreMissing() {
+EditOpener::Search EditOpener::restoreMissing() {
     bool hasBackups = false;
     if (const Qx::Status status = m_undo.exists(hasBackups); !status) {
         refuse(status);
@@ -346,7 +346,7 @@ Opening::Search Opening::restoreMissing() {
 }
 
 /// The same while others are kept away, as far as that is possible.
-Opening::Search Opening::lookAgain() {
+EditOpener::Search EditOpener::lookAgain() {
     const Qx::FileAnswer present = Qx::askFile(m_file);
     if (const Qx::FileError error = present.obstacle("open")) {
         refuse(error.status());
@@ -375,7 +375,7 @@ Opening::Search Opening::lookAgain() {
 /// Puts the next backup in the place of the file that was read last and is damaged, and counts it. True too
 /// when another file is there meanwhile. False when there is none, or with `m_refused` when nothing could be
 /// moved.
-bool Opening::replaceDamaged(int& counter) {
+bool EditOpener::replaceDamaged(int& counter) {
     if (!moveAside()) {
         return !m_refused;
     }
@@ -404,7 +404,7 @@ bool Opening::replaceDamaged(int& counter) {
 /// Moves the file that was read last to a name for what does not read; none that is there is replaced. The
 /// writers' lock is held afterwards. False, and it is not, if another file is there meanwhile, or with
 /// `m_refused` if it could not be moved.
-bool Opening::moveAside() {
+bool EditOpener::moveAside() {
     if (Qx::Status taken = takeWritersLock(m_writers); !taken) {
         m_refused = true;
         m_report.recovery = std::move(taken);
@@ -430,7 +430,7 @@ bool Opening::moveAside() {
 
 /// Makes the edit, or with a null one the failure, the item's, and returns it. A failure that says nothing of
 /// the file, or leaves backups of it, is not remembered.
-EditPtr Opening::cache(EditPtr edit) {
+EditPtr EditOpener::cache(EditPtr edit) {
     ManagerState& state = managerState();
     const String owner = edit.valid() ? edit->getOwner() : String();
     const bool isEdit = edit.valid() && edit->isEdit();
@@ -450,7 +450,7 @@ EditPtr Opening::cache(EditPtr edit) {
     return edit;
 }
 
-EditPtr Opening::succeed(EditPtr edit) {
+EditPtr EditOpener::succeed(EditPtr edit) {
     // The time of last access is a convenience: a file system that refuses it does no harm, nor does a file
     // that is not there yet.
     static_cast<void>(Qx::fileSystem().touch(m_file, true).code);
@@ -532,11 +532,11 @@ EditPtr openReported(const cookie& item, eEditOpenBehaviour behaviour, OpenRepor
             }
             return std::move(cached.edit);
         }
-        Opening opening(item, behaviour);
-        EditPtr edit = opening.run();
-        if (!opening.isOver()) {
+        EditOpener opener(item, behaviour);
+        EditPtr edit = opener.run();
+        if (!opener.isOver()) {
             if (report != nullptr) {
-                *report = opening.report();
+                *report = opener.report();
             }
             return edit;
         }

@@ -35,12 +35,31 @@ void writeAgain(ManagerState::CachedEdit& entry) {
 
 /// Makes the edit's file say what the edit is, also when nothing was changed since it went with the last
 /// backup, was replaced or went bad. Under the scope of the edit.
-bool writeWhole(ManagerState::CachedEdit& entry) {
+Qx::Status writeWhole(ManagerState::CachedEdit& entry) {
     ManagerState& state = managerState();
     if (!entry.edit->isDirty(true) && !fileIsAsKnown(entry)) {
         writeAgain(entry);
     }
-    return state.write(entry) && Qx::askFile(entry.path).isRegular();
+    const bool written = state.write(entry);
+    const String text = entry.path + " could not be written";
+    if (!entry.written) {
+        return entry.written.retold(text + ": " + entry.written.reason());
+    }
+    const Qx::FileAnswer present = Qx::askFile(entry.path);
+    if (const Qx::FileError error = present.obstacle("keep")) {
+        return error.status();
+    }
+    return written && present.isRegular() ? Qx::Status() : Qx::Status::failure(text);
+}
+
+Qx::Status isReadOnly(const cookie& item) {
+    return Qx::Status::failure(Qx::StatusCode::ReadOnly, item.asString() + " is read-only");
+}
+
+/// The edit left the cache meanwhile, or others could not be kept away from it.
+Qx::Status isInUse(const cookie& item) {
+    return Qx::Status::failure(Qx::StatusCode::Locked,
+                               item.asString() + " is in use by another thread or program; try again");
 }
 
 /// A step of an edit from its present revision to the newest of one chain; the present one goes onto the
@@ -53,15 +72,15 @@ public:
           m_moves(Qx::folderOf(m_from.file())),
           m_code(from == RevisionChain::Undo ? kRevisionUndo : kRevisionRedo) {}
 
-    bool run(String* notice = nullptr);
+    Qx::Status run(String* notice = nullptr);
 
 private:
-    [[nodiscard]] bool hasRevision() const;
-    [[nodiscard]] bool moveFiles();
+    [[nodiscard]] Qx::Status checkRevision() const;
+    Qx::Status moveFiles();
     Qx::Status step();
     Qx::Status findSound(int& number);
     void moveFilesBack();
-    [[nodiscard]] bool remember();
+    Qx::Status remember();
     void carryOver();
     void describe();
     void report(const String& reason) const {
@@ -88,32 +107,33 @@ private:
     std::unique_ptr<ManagerState::CachedEdit> m_dropped;
 };
 
-bool RevisionStep::run(String* notice) {
-    if (!hasRevision()) {
-        return false;
+Qx::Status RevisionStep::run(String* notice) {
+    if (Qx::Status there = checkRevision(); !there) {
+        return there;
     }
     if (PermissionsManager::getReadOnly(m_item)) {
         herc_printf("Attempt to %s read-only edit\n", m_code == kRevisionUndo ? "undo" : "redo");
-        return false;
+        return isReadOnly(m_item);
     }
-    m_before = edit_manager::openEdit(m_item, eOpenExisting);
+    OpenReport opened;
+    m_before = edit_manager::openEdit(m_item, eOpenExisting, opened);
     if (!m_before.valid()) {
-        return false;
+        return opened.status;
     }
     m_before->notifyImpendingRevisionChange(m_code);
-    if (!remember()) {
-        return false;
+    if (Qx::Status remembered = remember(); !remembered) {
+        return remembered;
     }
     bool takesClipboard = m_code == kRevisionUndo && clipboardFollows(m_before);
     edit_manager::flush_changes();
-    if (!moveFiles()) {
-        return false;
+    if (Qx::Status moved = moveFiles(); !moved) {
+        return moved;
     }
     managerState().tell(edit_manager::invalidateCacheMsgType(), m_item);
-    m_after = edit_manager::openEdit(m_item, eOpenExisting);
+    m_after = edit_manager::openEdit(m_item, eOpenExisting, opened);
     if (!m_after.valid()) {
         moveFilesBack();
-        return false;
+        return opened.status;
     }
     m_moves.keep();
     m_dropped.reset();
@@ -134,42 +154,47 @@ bool RevisionStep::run(String* notice) {
             *notice = text;
         }
     }
-    return true;
+    return {};
 }
 
 /// An undo finds the newest backup, a redo takes backup 1 or none.
-bool RevisionStep::hasRevision() const {
+Qx::Status RevisionStep::checkRevision() const {
     int number = 0;
-    const Qx::Status status = m_from.findNewest(number);
-    if (!status) {
+    if (Qx::Status status = m_from.findNewest(number); !status) {
         report(status.reason());
+        return status;
     }
-    return status && (m_code == kRevisionUndo ? number != 0 : number == 1);
+    if (m_code == kRevisionUndo ? number != 0 : number == 1) {
+        return {};
+    }
+    return Qx::Status::failure(Qx::StatusCode::NotFound,
+                               m_item.asString() + " has no revision to " +
+                                   (m_code == kRevisionUndo ? "go back to" : "bring back"));
 }
 
 /// What is carried over from the edit before the step.
-bool RevisionStep::remember() {
+Qx::Status RevisionStep::remember() {
     const SectionHold section(m_before);
     if (!section.isHeld()) {
-        return false;
+        return isInUse(m_item);
     }
     m_celCuesLoaded = m_before->get_cel_cues_loaded();
     m_owner = m_before->getOwner();
     m_description = ownChangeOf(std::as_const(*m_before).Opts());
-    return true;
+    return {};
 }
 
-bool RevisionStep::moveFiles() {
+Qx::Status RevisionStep::moveFiles() {
     const CachedEditScope scope(m_item, m_before);
     // Another project may have become the current one since the step began.
     if (scope.entry() == nullptr || scope.entry()->path != m_from.file()) {
-        return false;
+        return scope.isWritable() ? isInUse(m_item) : scope.obstacle();
     }
     ManagerState::CachedEdit& entry = *scope.entry();
     // Who asks for the edit from here on gets the revision that comes: a change to this one would be lost.
     managerState().setLeaving(entry, true);
-    const bool written = writeWhole(entry);
-    const Qx::Status status = written ? step() : Qx::Status::failure(entry.path + " could not be written");
+    const Qx::Status written = writeWhole(entry);
+    Qx::Status status = written ? step() : written;
     if (!status) {
         const bool isBack = m_moves.takeBack();
         report(status.reason());
@@ -178,11 +203,11 @@ bool RevisionStep::moveFiles() {
             writeAgain(entry);
         }
         managerState().setLeaving(entry, false);
-        return false;
+        return status;
     }
     m_moved = Qx::askFile(m_from.file()).info();
     m_dropped = managerState().removeCacheEntry(m_item);
-    return true;
+    return {};
 }
 
 /// Moves the present revision onto one chain and the next of the other into its place. On a failure some
@@ -211,7 +236,7 @@ Qx::Status RevisionStep::findSound(int& number) {
         String fault;
         int next = 0;
         if (Qx::Status status = m_from.findNewest(next, number); !status || next == 0) {
-            return status ? Qx::Status::failure(why) : status;
+            return status ? Qx::Status::failure(Qx::StatusCode::Damaged, why) : status;
         }
         number = next;
         const EditFileState state = examineEditFile(m_from.path(number), fault);
@@ -219,7 +244,7 @@ Qx::Status RevisionStep::findSound(int& number) {
             break;
         }
         if (state == EditFileState::Refused) {
-            return Qx::Status::failure(fault);
+            return Qx::Status::failure(Qx::StatusCode::Refused, fault);
         }
         why = fault;
         damaged.push_back(number);
@@ -318,27 +343,31 @@ Qx::Status keepRevision(ManagerState::CachedEdit& entry) {
 
 } // namespace
 
-bool edit_manager::backup_edit(const cookie& item) {
+Qx::Status edit_manager::backup_edit(const cookie& item) {
     if (PermissionsManager::getReadOnly(item)) {
         herc_printf("Attempt to backup read-only edit\n");
-        return false;
+        return isReadOnly(item);
     }
-    const EditPtr edit = openEdit(item, eOpenExisting);
+    OpenReport opened;
+    const EditPtr edit = openEdit(item, eOpenExisting, opened);
     if (!edit.valid()) {
-        return false;
+        return opened.status;
     }
     edit->notifyImpendingRevisionChange(kRevisionBackup);
     {
         const CachedEditScope scope(item, edit);
-        if (scope.entry() == nullptr || !writeWhole(*scope.entry())) {
-            return false;
+        if (scope.entry() == nullptr) {
+            return scope.isWritable() ? isInUse(item) : scope.obstacle();
         }
-        const Qx::Status kept = keepRevision(*scope.entry());
+        if (Qx::Status written = writeWhole(*scope.entry()); !written) {
+            return written;
+        }
+        Qx::Status kept = keepRevision(*scope.entry());
         managerState().noteFile(*scope.entry());
         if (!kept) {
             herc_printf("edit_manager::backup_edit( %s ) : %s\n", cookie_string(item).c_str(),
                         kept.reason().c_str());
-            return false;
+            return kept;
         }
         if (EditKeys::kClipboardUsed.get(edit->Opts()) != 0) {
             EditKeys::kClipboardUsed.set(edit->Opts(), 0);
@@ -346,7 +375,7 @@ bool edit_manager::backup_edit(const cookie& item) {
         edit->resetChangeDescription();
     }
     storeRecords();
-    return true;
+    return {};
 }
 
 bool edit_manager::takeBackBackup(const cookie& item) {
@@ -386,11 +415,11 @@ bool edit_manager::redoExists(const cookie& item) {
     return !chainOf(item, RevisionChain::Redo).ask(1).isMissing();
 }
 
-bool edit_manager::undoRequest(const cookie& item, String* notice) {
+Qx::Status edit_manager::undoRequest(const cookie& item, String* notice) {
     return RevisionStep(item, RevisionChain::Undo).run(notice);
 }
 
-bool edit_manager::redoRequest(const cookie& item, String* notice) {
+Qx::Status edit_manager::redoRequest(const cookie& item, String* notice) {
     return RevisionStep(item, RevisionChain::Redo).run(notice);
 }
 

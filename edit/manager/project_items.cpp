@@ -325,7 +325,8 @@ const SourceFacts& ProjectItems::factsOf(const cookie& source) {
     if (added) {
         EditPtr edit;
         if (const Qx::Status found = read(source, edit); found) {
-            place->second = {edit->getName(), {}, edit->Opts().getString(EditKeys::kReel), edit->isDropFrame(false)};
+            place->second = {
+                edit->getName(), {}, edit->Opts().getString(EditKeys::kReel), edit->isDropFrame(false)};
         } else {
             place->second.problem = found.reason();
         }

@@ -12,9 +12,9 @@ Qx::FileError moveFile(const String& from, const String& to) {
 }
 
 /// One recovery, with other processes and threads kept away.
-class Recovering {
+class EditRecovery {
 public:
-    Recovering(const cookie& item, const Revision& taken, const Revision* present)
+    EditRecovery(const cookie& item, const Revision& taken, const Revision* present)
         : m_undo(item, RevisionChain::Undo, edit_manager::backupDepth()), m_taken(taken), m_present(present) {
     }
 
@@ -31,7 +31,7 @@ private:
     const Revision* m_present; ///< null when the edit has no file
 };
 
-Qx::Status Recovering::objection() const {
+Qx::Status EditRecovery::objection() const {
     const String& file = m_undo.file();
     if (m_taken.kind == Revision::Itself || !m_taken.isSound()) {
         return Qx::Status::failure(m_taken.path + " cannot be taken" +
@@ -53,7 +53,7 @@ Qx::Status Recovering::objection() const {
     return {};
 }
 
-Qx::Status Recovering::keepPresent(String& kept) {
+Qx::Status EditRecovery::keepPresent(String& kept) {
     if (m_present == nullptr) {
         return {};
     }
@@ -67,7 +67,7 @@ Qx::Status Recovering::keepPresent(String& kept) {
 }
 
 /// A failure is told of by the caller, who looks where the file is.
-void Recovering::putPresentBack(const String& kept) {
+void EditRecovery::putPresentBack(const String& kept) {
     if (kept.empty() || !Qx::askFile(m_undo.file()).isMissing()) {
         return;
     }
@@ -79,7 +79,7 @@ void Recovering::putPresentBack(const String& kept) {
     }
 }
 
-Qx::Status Recovering::run(String& kept) {
+Qx::Status EditRecovery::run(String& kept) {
     const String& file = m_undo.file();
     // Copied first: keeping the present state may move the one that is taken to another name.
     const String copy = file + kRecoveryCopy;
@@ -115,8 +115,8 @@ Qx::Status recover(const cookie& item, const RevisionList& list, const Revision&
         return locked;
     }
     const ManagerState::Hold hold(state.lock);
-    Recovering recovering(item, taken, list.itself());
-    if (Qx::Status objection = recovering.objection(); !objection) {
+    EditRecovery recovery(item, taken, list.itself());
+    if (Qx::Status objection = recovery.objection(); !objection) {
         return objection;
     }
     // Nobody may open it from here on: who asks for it waits for the end of this.
@@ -124,7 +124,7 @@ Qx::Status recover(const cookie& item, const RevisionList& list, const Revision&
     if (dropped == nullptr && state.findCacheEntry(item) != nullptr) {
         return Qx::Status::failure(item.asString() + " is open; close it first");
     }
-    return recovering.run(kept);
+    return recovery.run(kept);
 }
 
 } // namespace

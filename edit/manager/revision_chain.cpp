@@ -69,16 +69,20 @@ Qx::Status RevisionChain::exists(bool& found) const {
     return behind.obstacle().status();
 }
 
-std::vector<String> RevisionChain::namesInFolder() const {
-    std::vector<String> names;
-    if (m_file.empty() || Qx::fileSystem().list(Qx::folderOf(m_file), names)) {
-        return {};
-    }
-    return names;
+std::vector<int> RevisionChain::numbers() const {
+    std::vector<int> found;
+    static_cast<void>(numbers(found).isOk());
+    return found;
 }
 
-std::vector<int> RevisionChain::numbers() const {
-    return numbers(namesInFolder());
+Qx::Status RevisionChain::numbers(std::vector<int>& found) const {
+    std::vector<String> names;
+    if (const Qx::FileError error =
+            m_file.empty() ? Qx::FileError() : Qx::fileSystem().list(Qx::folderOf(m_file), names)) {
+        return error.status();
+    }
+    found = numbers(names);
+    return {};
 }
 
 std::vector<int> RevisionChain::numbers(const std::vector<String>& names) const {
@@ -259,6 +263,10 @@ EditFileState examineEditFile(const String& path, String& why) {
     why = bag.openError();
     switch (result) {
     case TagBag::Opened:
+        if (const Qx::Status status = bag.checkRevisions(); !status) {
+            why = status.reason();
+            return EditFileState::Refused;
+        }
         return EditFileState::Sound;
     case TagBag::Damaged:
     case TagBag::Foreign:

@@ -47,9 +47,9 @@ public:
     /// longer the more edits are in it: who asks for many chains of one folder lists it once and hands in its
     /// names, in order of their bytes.
     [[nodiscard]] std::vector<int> numbers() const;
+    /// The same; fails, leaving `found`, when the folder cannot be listed.
+    Qx::Status numbers(std::vector<int>& found) const;
     [[nodiscard]] std::vector<int> numbers(const std::vector<String>& names) const;
-    /// The names in the chain's folder, in order of their bytes; none when it cannot be listed.
-    [[nodiscard]] std::vector<String> namesInFolder() const;
     /// The number of the newest backup in the depth, or of the newest behind `after`; 0 if there is none. A
     /// failure, and 0, when that could not be told, or something else than a file lies at the name of one.
     Qx::Status findNewest(int& number, int after = 0) const;

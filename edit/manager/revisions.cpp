@@ -44,9 +44,9 @@ void readHeader(Revision& revision) {
 }
 
 /// Gathers the states of one edit.
-class Gathering {
+class RevisionCollector {
 public:
-    explicit Gathering(const cookie& item)
+    explicit RevisionCollector(const cookie& item)
         : m_item(item), m_redo(item, RevisionChain::Redo, edit_manager::backupDepth()),
           m_undo(item, RevisionChain::Undo, edit_manager::backupDepth()) {}
 
@@ -66,7 +66,8 @@ private:
     RevisionList m_list;
 };
 
-void Gathering::add(std::vector<Revision>& to, Revision::Kind kind, String which, const String& path) {
+void RevisionCollector::add(std::vector<Revision>& to, Revision::Kind kind, String which,
+                            const String& path) {
     const Qx::FileAnswer found = Qx::askFile(path);
     if (found.isMissing()) {
         return;
@@ -91,8 +92,8 @@ void Gathering::add(std::vector<Revision>& to, Revision::Kind kind, String which
     readHeader(revision);
 }
 
-void Gathering::addOthers(Revision::Kind kind, const String& folder, const std::vector<String>& names,
-                          const String& lead, const char* letter) {
+void RevisionCollector::addOthers(Revision::Kind kind, const String& folder, const std::vector<String>& names,
+                                  const String& lead, const char* letter) {
     std::vector<Revision> found;
     for (const String& name : names) {
         if (name.starts_with(lead)) {
@@ -104,7 +105,7 @@ void Gathering::addOthers(Revision::Kind kind, const String& folder, const std::
     m_list.revisions.insert(m_list.revisions.end(), found.begin(), found.end());
 }
 
-std::vector<String> Gathering::namesIn(const String& folder, FolderLink link) {
+std::vector<String> RevisionCollector::namesIn(const String& folder, FolderLink link) {
     std::vector<String> names;
     if (const Qx::Status listed = namesOfFolder(folder, link, names); !listed) {
         m_list.unanswered.push_back(listed.reason());
@@ -112,7 +113,7 @@ std::vector<String> Gathering::namesIn(const String& folder, FolderLink link) {
     return names;
 }
 
-RevisionList Gathering::run() {
+RevisionList RevisionCollector::run() {
     const String& file = m_undo.file();
     if (file.empty()) {
         return {};
@@ -168,7 +169,7 @@ const Revision* RevisionList::newestSound() const {
 }
 
 RevisionList revisionsOf(const cookie& item) {
-    return Gathering(item).run();
+    return RevisionCollector(item).run();
 }
 
 EditModification ownChangeOf(const configb& header) {

@@ -12,31 +12,47 @@ namespace {
 constexpr cookie kUsualProject{Cookie_Type::Project, 1, 0};
 constexpr const char* kSettings = "Project.txt";
 
-/// The project that a folder is named by, with settings in it.
-cookie projectOfFolder(const String& folder) {
-    const cookie project(std::string_view(Qx::fileNameOf(folder)));
-    const bool isProject = project.isStorable() && project.type() == Cookie_Type::Project &&
-                           Qx::askFile(Qx::joinPath(folder, kSettings)).isRegular();
-    return isProject ? project : invalid_cookie;
+/// The project that a folder is named by, with settings in it; invalid if it is none. A failure if the
+/// system could not tell.
+Qx::Status projectOfFolder(const String& folder, cookie& project) {
+    project = invalid_cookie;
+    const cookie named(std::string_view(Qx::fileNameOf(folder)));
+    if (!named.isStorable() || named.type() != Cookie_Type::Project) {
+        return {};
+    }
+    const Qx::FileAnswer settings = Qx::askFile(Qx::joinPath(folder, kSettings));
+    project = settings.isRegular() ? named : invalid_cookie;
+    return settings.isUnknown() ? settings.obstacle().status() : Qx::Status();
 }
 
-/// The project in a folder of projects: the usual one if it is there, else the only one.
-cookie projectIn(const String& root) {
+/// The project in a folder of projects: the usual one if it is there, else the only one. A failure if the
+/// system could not tell what is there.
+Qx::Status projectIn(const String& root, cookie& project) {
+    project = kUsualProject;
+    const Qx::FileAnswer usual = Qx::askFile(Qx::joinPath(root, kUsualProject.asString()));
+    if (!usual.isMissing()) {
+        return usual.isUnknown() ? usual.obstacle().status() : Qx::Status();
+    }
     std::vector<String> names;
-    if (!Qx::askFile(Qx::joinPath(root, kUsualProject.asString())).isMissing() ||
-        Qx::fileSystem().list(root, names)) {
-        return kUsualProject;
+    if (const Qx::FileError error = Qx::fileSystem().list(root, names)) {
+        const bool isNone = error.code == ENOENT || error.code == ENOTDIR;
+        return isNone ? Qx::Status() : error.status();
     }
     cookie found;
     for (const String& name : names) {
-        if (const cookie project = projectOfFolder(Qx::joinPath(root, name)); project.is_valid()) {
+        cookie its;
+        if (Qx::Status status = projectOfFolder(Qx::joinPath(root, name), its); !status) {
+            return status;
+        }
+        if (its.is_valid()) {
             if (found.is_valid()) {
-                return kUsualProject;
+                return {};
             }
-            found = project;
+            found = its;
         }
     }
-    return found.is_valid() ? found : kUsualProject;
+    project = found.is_valid() ? found : kUsualProject;
+    return {};
 }
 
 /// One sentence on edits that are not on the disk.
@@ -61,10 +77,11 @@ Session::Session(const String& folder) : m_root(folder) {
     while (m_root.size() > 1 && m_root.back() == '/') {
         m_root.pop_back();
     }
-    if (m_project = projectOfFolder(m_root); m_project.is_valid()) {
+    m_found = projectOfFolder(m_root, m_project);
+    if (m_project.is_valid()) {
         m_root = Qx::folderOf(m_root);
-    } else {
-        m_project = projectIn(m_root);
+    } else if (const Qx::Status found = projectIn(m_root, m_project); m_found) {
+        m_found = found;
     }
 }
 
@@ -82,6 +99,9 @@ bool Session::exists() const {
 }
 
 Qx::Status Session::open(const SessionOptions& options) {
+    if (!m_found) {
+        return m_found;
+    }
     if (options.behaviour == eOpenNew && exists()) {
         return Qx::Status::failure(Qx::StatusCode::BadArgument,
                                    "there is a project in " + m_root +

@@ -102,6 +102,7 @@ private:
 
     String m_root;
     cookie m_project;
+    Qx::Status m_found; ///< why the system could not tell which project the folder means
     bool m_isOpen = false;
     std::unique_ptr<EditManagerLock> m_writers;
     edit_manager* m_manager = nullptr; ///< the one that was made here

@@ -233,7 +233,7 @@ void spliceShifted(EventArray& events, size_t first, size_t last, std::span<cons
         apart = apart && (events[next].editTime == ahead || !isNotPast(events[next].editTime, ahead));
     }
     if (!apart) {
-        settle(EventArray::Rewriting(events).events());
+        settle(EventArray::Rewrite(events).events());
     }
 }
 

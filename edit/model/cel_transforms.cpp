@@ -175,7 +175,7 @@ std::unique_ptr<cel> cel::add_black_to_ends(int seconds, char ends) const {
 std::unique_ptr<cel> cel::quantise() const {
     auto rounded = copy();
     if (m_events.size() % 2 != 0 ||
-        !quantiseEvents(EventArray::Rewriting(rounded->m_events).events(), m_resolution)) {
+        !quantiseEvents(EventArray::Rewrite(rounded->m_events).events(), m_resolution)) {
         return nullptr;
     }
     rounded->changedNow();
@@ -306,8 +306,8 @@ bool cel::simplify(Simplification::Type type, const MayMerge& mayMerge) {
     if (first >= m_events.size()) {
         return false;
     }
-    EventArray::Rewriting rewriting(m_events);
-    Events& events = rewriting.events();
+    EventArray::Rewrite rewrite(m_events);
+    Events& events = rewrite.events();
     size_t last = first - 2;
     for (size_t i = first; i < events.size(); i += 2) {
         channel_event* const pair = &events[last];

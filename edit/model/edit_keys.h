@@ -219,8 +219,10 @@ inline constexpr Key<String> kLabel{"LABEL"};
 
 /// The name of the header and the line that ends it in a text.
 inline constexpr const char* kHeaderName = "EDIT";
-inline constexpr const char* kReel = "REEL"; ///< of a shot: the reel it is on
 inline constexpr const char* kHeaderEnd = "END_EDIT_HEADER";
+
+/// Of a shot: the reel it is on.
+inline constexpr const char* kReel = "REEL";
 
 /// Names of objects in an edit's store.
 inline constexpr const char* kCelid = "Celid";    ///< a cel, followed by a number

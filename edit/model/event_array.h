@@ -94,12 +94,12 @@ public:
     [[nodiscard]] channel_event& change(size_t index) { return own()[index]; }
 
     /// The whole array for changes of every kind; the array is as the events are when the rewriting ends.
-    class Rewriting {
+    class Rewrite {
     public:
-        explicit Rewriting(EventArray& array) : m_array(array), m_events(array.own()) {}
-        ~Rewriting() { m_array.settle(); }
-        Rewriting(const Rewriting&) = delete;
-        Rewriting& operator=(const Rewriting&) = delete;
+        explicit Rewrite(EventArray& array) : m_array(array), m_events(array.own()) {}
+        ~Rewrite() { m_array.settle(); }
+        Rewrite(const Rewrite&) = delete;
+        Rewrite& operator=(const Rewrite&) = delete;
         [[nodiscard]] Events& events() { return m_events; }
 
     private:

@@ -1,6 +1,6 @@
 #include "edit/model/channel_group_list.h"
 #include "edit/model/edit_registry.h"
-#include "edit/persist/detail/edit_salvaging.h"
+#include "edit/persist/detail/edit_salvager.h"
 #include "edit/persist/detail/stored_channels.h"
 #include "platform/base/attrib_value_pair.h"
 #include "platform/services/log.h"
@@ -73,33 +73,33 @@ static Qx::Status loadCel(TagBag& store, const configb& header, int number, Edit
     return findKind(header, number, loaded);
 }
 
-std::vector<EditFile::LoadedCel> EditFile::loadCels(Edit& edit, Salvaging* salvaging) {
+std::vector<EditFile::LoadedCel> EditFile::loadCels(Edit& edit, Salvager* salvager) {
     std::vector<LoadedCel> cels;
-    const int last = salvaging == nullptr ? -1 : salvaging->lastCel();
+    const int last = salvager == nullptr ? -1 : salvager->lastCel();
     for (int n = 0; n <= last || edit.m_store.contains(EditKeys::numbered(EditKeys::kCelid, n)); ++n) {
         LoadedCel& loaded = cels.emplace_back();
         const String object = EditKeys::numbered(EditKeys::kCelid, n);
         const bool missing = !edit.m_store.contains(object);
         Qx::Status status = loadCel(edit.m_store, edit.m_header, n, loaded);
-        if (loaded.content != nullptr && salvaging != nullptr && salvaging->guessKind(loaded)) {
+        if (loaded.content != nullptr && salvager != nullptr && salvager->guessKind(loaded)) {
             status = {};
         }
         if (status) {
-            if (salvaging != nullptr) {
-                salvaging->celRead(loaded);
+            if (salvager != nullptr) {
+                salvager->celRead(loaded);
             }
             continue;
         }
         loaded.content.reset();
-        if (salvaging == nullptr) {
+        if (salvager == nullptr) {
             setAside(edit, object, status.reason());
         } else if (missing) {
-            salvaging->celMissing(n);
+            salvager->celMissing(n);
         } else {
-            salvaging->celFailed(n, status.reason());
+            salvager->celFailed(n, status.reason());
         }
     }
-    for (const String& name : salvaging == nullptr ? edit.m_store.names() : std::vector<String>()) {
+    for (const String& name : salvager == nullptr ? edit.m_store.names() : std::vector<String>()) {
         int number = 0;
         if (name.starts_with(EditKeys::kCelid) &&
             Qx::textToInt(std::string_view(name).substr(std::strlen(EditKeys::kCelid)), number) &&
@@ -111,7 +111,7 @@ std::vector<EditFile::LoadedCel> EditFile::loadCels(Edit& edit, Salvaging* salva
 }
 
 std::vector<EditFile::LoadedLevels> EditFile::loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
-                                                         Salvaging* salvaging) {
+                                                         Salvager* salvager) {
     std::vector<LoadedLevels> all;
     for (int m = 0;; ++m) {
         const Qx::AttribValuePair pair = levelsPair(edit.m_header, m);
@@ -128,8 +128,8 @@ std::vector<EditFile::LoadedLevels> EditFile::loadLevels(Edit& edit, const std::
                    candidate.content->editChannelId() == loaded.audio;
         });
         if (!hasAudio || !edit.m_store.contains(pair.attrib())) {
-            if (salvaging != nullptr) {
-                salvaging->levelsMissing(m, hasAudio);
+            if (salvager != nullptr) {
+                salvager->levelsMissing(m, hasAudio);
                 continue;
             }
             herc_printf("EditFile::loadLevels( %s ) - levels %d have no audio channel or no nodes\n",
@@ -142,8 +142,8 @@ std::vector<EditFile::LoadedLevels> EditFile::loadLevels(Edit& edit, const std::
         }
         const String why =
             "object " + pair.attrib() + " is not a level envelope that reads (" + whyNot(edit.m_store) + ")";
-        if (salvaging != nullptr) {
-            salvaging->levelsFailed(m, why);
+        if (salvager != nullptr) {
+            salvager->levelsFailed(m, why);
             continue;
         }
         herc_printf("EditFile::loadLevels( %s ) - %s; it is passed over and kept\n",
@@ -248,9 +248,9 @@ static String limitMessage(int audio, int levels, int video) {
 
 // Telecine and pulldown are settled by the source media and change no event here, so a read ends with the
 // limits.
-Qx::Status EditFile::readCels(Edit& edit, Salvaging* salvaging) {
-    std::vector<LoadedCel> cels = loadCels(edit, salvaging);
-    std::vector<LoadedLevels> levels = loadLevels(edit, cels, salvaging);
+Qx::Status EditFile::readCels(Edit& edit, Salvager* salvager) {
+    std::vector<LoadedCel> cels = loadCels(edit, salvager);
+    std::vector<LoadedLevels> levels = loadLevels(edit, cels, salvager);
     int audio = 0;
     int video = 0;
     for (const LoadedCel& loaded : cels) {
@@ -276,7 +276,7 @@ Qx::Status EditFile::readCels(Edit& edit, Salvaging* salvaging) {
     }
     setupLevels(edit, levels, file);
     const auto unread = [](const LoadedLevels& loaded) { return !loaded.levels.valid(); };
-    if (salvaging == nullptr && std::any_of(levels.begin(), levels.end(), unread)) {
+    if (salvager == nullptr && std::any_of(levels.begin(), levels.end(), unread)) {
         setLevelsAside(edit, levels);
     }
     edit.m_cues = cues;
@@ -285,7 +285,7 @@ Qx::Status EditFile::readCels(Edit& edit, Salvaging* salvaging) {
     return {};
 }
 
-void EditFile::readGroups(Edit& edit, Salvaging* salvaging) {
+void EditFile::readGroups(Edit& edit, Salvager* salvager) {
     for (const char* name : {ChannelGroupList::Id, ChannelGroupList::IdForDefaultGrouping}) {
         if (!edit.m_store.contains(name) ||
             dynamic_cast<ChannelGroupList*>(edit.m_store.openObject(name)) != nullptr) {
@@ -293,10 +293,10 @@ void EditFile::readGroups(Edit& edit, Salvaging* salvaging) {
         }
         const String why =
             "object " + String(name) + " is not a list of groups that reads (" + whyNot(edit.m_store) + ")";
-        if (salvaging == nullptr) {
+        if (salvager == nullptr) {
             setAside(edit, name, why);
         } else {
-            salvaging->lose("the channel groups: " + why);
+            salvager->lose("the channel groups: " + why);
             edit.m_store.removeObject(name);
         }
     }

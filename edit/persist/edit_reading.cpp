@@ -22,12 +22,12 @@ bool isNoItem(const cookie& item) {
 }
 
 /// Keeps an edit from going while it is read; it is destroyed by nobody else than its holder afterwards.
-class Reading {
+class ReadReference {
 public:
-    explicit Reading(Edit& edit) : m_edit(edit) { edit.incRefCount(); }
-    ~Reading() { m_edit.decRefCount(); }
-    Reading(const Reading&) = delete;
-    Reading& operator=(const Reading&) = delete;
+    explicit ReadReference(Edit& edit) : m_edit(edit) { edit.incRefCount(); }
+    ~ReadReference() { m_edit.decRefCount(); }
+    ReadReference(const ReadReference&) = delete;
+    ReadReference& operator=(const ReadReference&) = delete;
 
 private:
     Edit& m_edit;
@@ -71,7 +71,7 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
                                       "\": its name is not that of an item; rename the file to its cookie"));
         return kReadFailed;
     }
-    const Reading reading(*this);
+    const ReadReference reference(*this);
     const EditFile::Raised loading(m_loading);
     m_cookie = item;
     if (getNumChans() > 0 &&
@@ -123,8 +123,10 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
 
 bool Edit::retrieve() {
     EditFile::reset(*this);
-    Qx::Status status;
-    {
+    // What this program would not read of the edit is nothing that it may drop.
+    Qx::Status status = m_store.checkRevisions();
+    const bool isNewer = !status;
+    if (!isNewer) {
         const EditFile::Quiet quiet(*this);
         status = EditFile::readHeader(*this);
         if (status) {
@@ -142,7 +144,8 @@ bool Edit::retrieve() {
         m_store.close();
         m_bad = true;
         return EditFile::fail(*this, status.retold("cannot read " + path + ": " + status.reason() +
-                                                   "; restore a backup of the edit"));
+                                                   (isNewer ? "; open it with that version"
+                                                            : "; restore a backup of the edit")));
     }
     EditFile::markWritten(*this);
     return true;

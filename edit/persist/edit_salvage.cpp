@@ -1,7 +1,7 @@
 #include "edit/persist/edit_salvage.h"
 
 #include "edit/model/channel_group_list.h"
-#include "edit/persist/detail/edit_salvaging.h"
+#include "edit/persist/detail/edit_salvager.h"
 #include "platform/base/attrib_value_pair.h"
 #include "platform/store/edit_header_proxy.h"
 
@@ -9,18 +9,18 @@
 
 // ---- what is lost
 
-void EditFile::Salvaging::setUnsound(const std::vector<StoredObjectInfo>& objects) {
+void EditFile::Salvager::setUnsound(const std::vector<StoredObjectInfo>& objects) {
     for (const StoredObjectInfo& object : objects) {
         m_unsound.emplace(object.name, object.reason);
     }
 }
 
-void EditFile::Salvaging::begin(Edit& edit, bool headerLost) {
+void EditFile::Salvager::begin(Edit& edit, bool headerLost) {
     m_edit = &edit;
     m_headerLost = headerLost;
 }
 
-bool EditFile::Salvaging::loseIfUnsound(const String& object, const String& part) {
+bool EditFile::Salvager::loseIfUnsound(const String& object, const String& part) {
     const auto found = m_unsound.find(object);
     if (found == m_unsound.end()) {
         return false;
@@ -30,7 +30,7 @@ bool EditFile::Salvaging::loseIfUnsound(const String& object, const String& part
     return true;
 }
 
-int EditFile::Salvaging::lastCel() const {
+int EditFile::Salvager::lastCel() const {
     int last = -1;
     const String prefix = EditKeys::kCelid;
     const auto look = [&](const String& name) {
@@ -54,13 +54,13 @@ int EditFile::Salvaging::lastCel() const {
     return last;
 }
 
-char EditFile::Salvaging::kindOf(int number) const {
+char EditFile::Salvager::kindOf(int number) const {
     const String kind = m_edit->m_header.getString(EditKeys::numbered(EditKeys::kCelKind, number));
     return kind.empty() ? '?' : kind.front();
 }
 
 // The number from 1 of an audio channel among its kind.
-int EditFile::Salvaging::audioIndex(int number) const {
+int EditFile::Salvager::audioIndex(int number) const {
     int index = 1;
     for (int n = 0; n < number; ++n) {
         index += kindOf(n) == 'A' ? 1 : 0;
@@ -69,7 +69,7 @@ int EditFile::Salvaging::audioIndex(int number) const {
 }
 
 // The name that a channel has by its place. One of its own lies in its cel.
-String EditFile::Salvaging::channelName(int number) const {
+String EditFile::Salvager::channelName(int number) const {
     switch (kindOf(number)) {
     case 'V':
         // Both are of this kind, so that the number of neither is known from its place.
@@ -85,7 +85,7 @@ String EditFile::Salvaging::channelName(int number) const {
     }
 }
 
-void EditFile::Salvaging::celMissing(int number) {
+void EditFile::Salvager::celMissing(int number) {
     const String object = EditKeys::numbered(EditKeys::kCelid, number);
     const String part = channelName(number) + " (object " + object + ")";
     m_celsLost = true;
@@ -94,17 +94,17 @@ void EditFile::Salvaging::celMissing(int number) {
     }
 }
 
-void EditFile::Salvaging::celFailed(int number, const String& why) {
+void EditFile::Salvager::celFailed(int number, const String& why) {
     m_celsLost = true;
     lose(channelName(number) + ": " + why);
 }
 
-String EditFile::Salvaging::levelsName(int number) const {
+String EditFile::Salvager::levelsName(int number) const {
     const String own = m_edit->m_header.getString(EditKeys::numbered(EditKeys::kLevelsName, number));
     return own.empty() ? "levels " + std::to_string(number + 1) : "levels \"" + own + "\"";
 }
 
-void EditFile::Salvaging::levelsMissing(int number, bool hasAudio) {
+void EditFile::Salvager::levelsMissing(int number, bool hasAudio) {
     const Qx::AttribValuePair pair(
         std::string_view(m_edit->m_header.getString(EditKeys::numbered(EditKeys::kLevels, number))));
     const String part = levelsName(number);
@@ -114,15 +114,15 @@ void EditFile::Salvaging::levelsMissing(int number, bool hasAudio) {
     }
 }
 
-void EditFile::Salvaging::levelsFailed(int number, const String& why) {
+void EditFile::Salvager::levelsFailed(int number, const String& why) {
     lose(levelsName(number) + ": " + why);
 }
 
-void EditFile::Salvaging::celRead(const LoadedCel& loaded) {
+void EditFile::Salvager::celRead(const LoadedCel& loaded) {
     m_audioSeen = m_audioSeen || loaded.type.type == AudioChan;
 }
 
-bool EditFile::Salvaging::guessKind(LoadedCel& loaded) {
+bool EditFile::Salvager::guessKind(LoadedCel& loaded) {
     const cel& content = *loaded.content;
     const String& name = content.editChannelName();
     const bool byPlace = name.size() > 1 && (name.front() == 'V' || name.front() == 'A') &&
@@ -139,7 +139,7 @@ bool EditFile::Salvaging::guessKind(LoadedCel& loaded) {
     return true;
 }
 
-void EditFile::Salvaging::finish() {
+void EditFile::Salvager::finish() {
     while (!m_unsound.empty()) {
         loseIfUnsound(String(m_unsound.begin()->first), "object " + m_unsound.begin()->first);
     }
@@ -173,7 +173,7 @@ TagBag::ScanLabel labelOf(std::string_view form, size_t before) {
 } // namespace
 
 // Opens the store with what can be had of it.
-static Qx::Status openDamaged(TagBag& store, const String& path, EditFile::Salvaging& salvaging) {
+static Qx::Status openDamaged(TagBag& store, const String& path, EditFile::Salvager& salvager) {
     std::vector<StoredObjectInfo> objects;
     const TagBag::OpenResult result = store.openSalvaging(path, objects);
     if (result == TagBag::Opened) {
@@ -181,66 +181,68 @@ static Qx::Status openDamaged(TagBag& store, const String& path, EditFile::Salva
         String damage;
         const Qx::Status examined = examineStore(path, all, damage);
         if (examined && !damage.empty() && objects.empty()) {
-            salvaging.lose(damage); // what is wrong is no object's
+            salvager.lose(damage); // what is wrong is no object's
         }
-        salvaging.setUnsound(objects);
-        return {};
+        salvager.setUnsound(objects);
+        const Qx::Status read = store.checkRevisions();
+        salvager.setRefused(!read);
+        return read;
     }
-    salvaging.setRefused(result == TagBag::NotOpened || result == TagBag::Newer);
+    salvager.setRefused(result == TagBag::NotOpened || result == TagBag::Newer);
     const Qx::Status damage = store.openStatus();
-    if (result != TagBag::Damaged || !salvaging.mayScan()) {
+    if (result != TagBag::Damaged || !salvager.mayScan()) {
         return damage;
     }
     const String& why = damage.reason();
     if (store.openScanning(path, labelOf, objects) != TagBag::Opened) {
         return damage.retold(why + "; no object could be found in it either");
     }
-    salvaging.lose("the table of the objects: " + why);
+    salvager.lose("the table of the objects: " + why);
     for (const StoredObjectInfo& object : objects) {
-        salvaging.lose("object " + object.name + " is doubtful: it was found by its form, and " +
-                       object.reason);
+        salvager.lose("object " + object.name + " is doubtful: it was found by its form, and " +
+                      object.reason);
     }
     return {};
 }
 
-Qx::Status EditFile::salvage(Edit& edit, const String& path, Salvaging& salvaging) {
+Qx::Status EditFile::salvage(Edit& edit, const String& path, Salvager& salvager) {
     const Quiet quiet(edit);
     reset(edit);
     edit.m_initialising = true;
-    if (Qx::Status opened = openDamaged(edit.m_store, path, salvaging); !opened) {
+    if (Qx::Status opened = openDamaged(edit.m_store, path, salvager); !opened) {
         return opened;
     }
     const Qx::Status header = readHeader(edit);
-    salvaging.begin(edit, !header);
-    if (!header && !salvaging.loseIfUnsound(EditHeaderProxy::EditHeaderId, "the header")) {
-        salvaging.lose("the header: " + header.reason());
+    salvager.begin(edit, !header);
+    if (!header && !salvager.loseIfUnsound(EditHeaderProxy::EditHeaderId, "the header")) {
+        salvager.lose("the header: " + header.reason());
     }
-    if (!salvaging.loseIfUnsound(EditKeys::kCues, "the cues")) {
+    if (!salvager.loseIfUnsound(EditKeys::kCues, "the cues")) {
         if (!edit.retrieveCues()) {
             const String& why = edit.m_store.objectError();
-            salvaging.lose("the cues: " + (why.empty() ? String("the object is of another class") : why));
+            salvager.lose("the cues: " + (why.empty() ? String("the object is of another class") : why));
             edit.m_store.removeObject(EditKeys::kCues);
         }
     }
-    if (Qx::Status cels = readCels(edit, &salvaging); !cels) {
+    if (Qx::Status cels = readCels(edit, &salvager); !cels) {
         return cels;
     }
     // The cels have other numbers where some are lost: none is to be taken over as the bytes it was.
     edit.m_storedCels.reset();
     for (const String& name : edit.m_store.names()) {
         if (name.ends_with(EditKeys::kUnread)) {
-            salvaging.lose("object " + name + " did not read when the edit was opened, and was set aside");
+            salvager.lose("object " + name + " did not read when the edit was opened, and was set aside");
         } else if (name.starts_with(EditKeys::kCelid)) {
             edit.m_store.removeObject(name);
         }
     }
     for (const char* name : {ChannelGroupList::Id, ChannelGroupList::IdForDefaultGrouping}) {
-        salvaging.loseIfUnsound(name, name == ChannelGroupList::Id ? "the channel groups"
-                                                                   : "the default channel groups");
+        salvager.loseIfUnsound(name, name == ChannelGroupList::Id ? "the channel groups"
+                                                                  : "the default channel groups");
     }
-    readGroups(edit, &salvaging);
+    readGroups(edit, &salvager);
     EditFile::leaveLostChannelsOut(edit);
-    salvaging.finish();
+    salvager.finish();
     edit.getInfoFromHeader();
     return {};
 }
@@ -248,10 +250,10 @@ Qx::Status EditFile::salvage(Edit& edit, const String& path, Salvaging& salvagin
 static Qx::Status salvageInto(const String& path, EditPtr& edit, std::vector<String>& lost, bool mayScan,
                               bool* isRefused = nullptr) {
     EditPtr read(new Edit);
-    EditFile::Salvaging salvaging(lost, mayScan);
-    if (Qx::Status status = EditFile::salvage(*read, path, salvaging); !status) {
+    EditFile::Salvager salvager(lost, mayScan);
+    if (Qx::Status status = EditFile::salvage(*read, path, salvager); !status) {
         if (isRefused != nullptr) {
-            *isRefused = salvaging.isRefused();
+            *isRefused = salvager.isRefused();
         }
         return status;
     }

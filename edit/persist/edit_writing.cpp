@@ -107,12 +107,12 @@ bool Edit::store(const WString& path) {
             EditFile::renumberFor(*this, EditFile::storedChannels(*this), *cues);
         }
         const EditHeaderProxy header(m_header);
-        EditFile::Lending lending(*this);
+        EditFile::CelLoan loan(*this);
         EditFile::lendCels(*this);
         m_store.lendObject(EditHeaderProxy::EditHeaderId, header, true);
         status = m_store.flush();
         if (status) {
-            lending.setWritten();
+            loan.setWritten();
         }
         if (m_debug) {
             herc_printf(status ? "Stored the configb \n" : "Failed to store the configb \n");

@@ -106,6 +106,15 @@ int startWithoutCount(const Numbers& named, unsigned count) {
     return static_cast<unsigned>(kLastEditNumber - last) < count ? 1 : last + 1;
 }
 
+/// Advances the stored number of the next cookie, durably; numbers that are taken are remembered until it has
+/// passed them.
+Qx::Status update_cookie_number(const String& path, configb& settings, int next, Numbers taken) {
+    settings.setInt(kNextEditKey, next);
+    taken.erase(taken.begin(), std::lower_bound(taken.begin(), taken.end(), next));
+    setTakenNumbers(settings, taken);
+    return writeStore(path, settings);
+}
+
 } // namespace
 
 CookieAllocator::CookieAllocator(String projectFolder) : m_folder(std::move(projectFolder)) {}
@@ -155,10 +164,7 @@ Qx::Status CookieAllocator::allocate(unsigned count, std::vector<cookie>& out,
     if (status = choose(m_folder, count, all, choice); !status) {
         return status;
     }
-    settings.setInt(kNextEditKey, choice.next);
-    reserved.erase(reserved.begin(), std::lower_bound(reserved.begin(), reserved.end(), choice.next));
-    setTakenNumbers(settings, reserved);
-    if (status = writeStore(path, settings); !status) {
+    if (status = update_cookie_number(path, settings, choice.next, std::move(reserved)); !status) {
         return status;
     }
     lock.release();

@@ -24,12 +24,12 @@ projdb::Record recordOf(const std::vector<String>& fields) {
     return record;
 }
 
-/// Moves a damaged file out of the way, and what the table keeps beside it.
-Qx::Status setAside(const String& path) {
+/// Moves a damaged file out of the way, and removes what the table keeps beside it.
+Qx::Status setAside(const String& path, const std::vector<String>& companions) {
     if (const Qx::FileError error = Qx::fileSystem().rename(path, path + ".DAMAGED")) {
         return error.status();
     }
-    for (const char* const beside : {"-wal", "-shm", "-journal"}) {
+    for (const String& beside : companions) {
         const Qx::FileAnswer found = Qx::askFile(path + beside);
         Qx::FileError error = found.obstacle("remove");
         if (found.isRegular()) {
@@ -44,6 +44,8 @@ Qx::Status setAside(const String& path) {
 
 } // namespace
 
+projdb::projdb(std::unique_ptr<RecordTable> table) : m_table(std::move(table)) {}
+
 const char* projdb::columnName(Column column) {
     return kNames[column];
 }
@@ -53,27 +55,27 @@ Qx::Status projdb::open(const String& folder) {
         return Qx::Status::failure("there is no project folder to keep records in");
     }
     const String path = Qx::joinPath(folder, kFileName);
-    oledb::OpenResult result = m_table.open(path, columnNames());
-    if (result == oledb::Damaged) {
-        const String damage = m_table.lastError();
-        if (Qx::Status status = setAside(path); !status) {
+    RecordTable::OpenResult result = m_table->open(path, columnNames());
+    if (result == RecordTable::Damaged) {
+        const String damage = m_table->lastError();
+        if (Qx::Status status = setAside(path, m_table->companions()); !status) {
             return status;
         }
         herc_printf("projdb: %s; it was set aside as %s.DAMAGED and is made again from the edits\n",
                     damage.c_str(), kFileName);
-        result = m_table.open(path, columnNames());
+        result = m_table->open(path, columnNames());
     }
-    m_isNew = result == oledb::Made;
-    return m_table.isOpen() ? Qx::Status() : Qx::Status::failure(m_table.lastError());
+    m_isNew = result == RecordTable::Made;
+    return m_table->isOpen() ? Qx::Status() : Qx::Status::failure(m_table->lastError());
 }
 
 void projdb::close() {
-    m_table.close();
+    m_table->close();
 }
 
 bool projdb::find(const cookie& item, Record& record) const {
     std::vector<String> fields;
-    if (!m_table.findRecord(item.asString(), fields)) {
+    if (!m_table->findRecord(item.asString(), fields)) {
         return false;
     }
     record = recordOf(fields);
@@ -81,7 +83,7 @@ bool projdb::find(const cookie& item, Record& record) const {
 }
 
 bool projdb::getField(const cookie& item, int column, String& text) const {
-    return m_table.getField(item.asString(), column, text);
+    return m_table->getField(item.asString(), column, text);
 }
 
 Qx::Status projdb::put(const cookie& item, const Record& record) {
@@ -92,19 +94,19 @@ Qx::Status projdb::put(const cookie& item, const Record& record) {
     for (int i = 0; i < kNumColumns; ++i) {
         fields[static_cast<size_t>(i)] = record[static_cast<Column>(i)];
     }
-    return m_table.putRecord(item.asString(), fields);
+    return m_table->putRecord(item.asString(), fields);
 }
 
 Qx::Status projdb::remove(const cookie& item) {
-    return m_table.removeRecord(item.asString());
+    return m_table->removeRecord(item.asString());
 }
 
 Qx::Status projdb::removeAll() {
-    return m_table.removeAllRecords();
+    return m_table->removeAllRecords();
 }
 
 void projdb::forEach(const std::function<bool(const cookie& item, const Record& record)>& callback) const {
-    m_table.forEachRecord([&](const String& key, const std::vector<String>& fields) {
+    m_table->forEachRecord([&](const String& key, const std::vector<String>& fields) {
         const cookie item{std::string_view(key)};
         return !item.is_valid() || callback(item, recordOf(fields));
     });
@@ -115,5 +117,5 @@ Qx::Status projdb::setValue(const String& name, const String& value) {
     if (getValue(name, before) && before == value) {
         return {};
     }
-    return m_table.setValue(name, value);
+    return m_table->setValue(name, value);
 }

@@ -3,7 +3,7 @@
 #include "platform/base/cookie.h"
 #include "platform/base/export.h"
 #include "platform/base/status.h"
-#include "platform/database/oledb.h"
+#include "platform/database/record_table.h"
 
 #include <array>
 #include <functional>
@@ -53,20 +53,21 @@ public:
 
     static constexpr const char* kFileName = "Project.db";
 
-    projdb() = default;
+    /// With another kind of table than the platform's own, which is closed.
+    explicit projdb(std::unique_ptr<RecordTable> table = RecordTable::make());
 
     /// Opens the records of the project in a folder, or makes them. A file that is damaged, or of another
     /// version, is set aside as "Project.db.DAMAGED", over an earlier one, and an empty one made: `isNew` is
     /// then true. Fails, with nothing open, when the file system refuses; the text says why.
     Qx::Status open(const String& folder);
     void close();
-    [[nodiscard]] bool isOpen() const { return m_table.isOpen(); }
+    [[nodiscard]] bool isOpen() const { return m_table->isOpen(); }
     /// True if the records were made empty when they were opened, so that they say nothing yet.
     [[nodiscard]] bool isNew() const { return m_isNew; }
 
     /// A column's name, as the file has it, and the column of a name without regard to case; -1 if none.
     [[nodiscard]] static const char* columnName(Column column);
-    [[nodiscard]] int columnIndex(std::string_view name) const { return m_table.columnIndex(name); }
+    [[nodiscard]] int columnIndex(std::string_view name) const { return m_table->columnIndex(name); }
 
     /// False, leaving `record`, if there is none.
     [[nodiscard]] bool find(const cookie& item, Record& record) const;
@@ -78,28 +79,32 @@ public:
     Qx::Status remove(const cookie& item);
     /// Removes every record; the named values stay.
     Qx::Status removeAll();
-    [[nodiscard]] size_t numRecords() const { return m_table.numRecords(); }
+    [[nodiscard]] size_t numRecords() const { return m_table->numRecords(); }
     /// Every record, by cookies, until the callback answers false. It must not use the records.
     void forEach(const std::function<bool(const cookie& item, const Record& record)>& callback) const;
 
     /// Named values. False, leaving `value`, if there is none of that name.
     [[nodiscard]] bool getValue(const String& name, String& value) const {
-        return m_table.getValue(name, value);
+        return m_table->getValue(name, value);
     }
     /// A value that is the same already is not written.
     Qx::Status setValue(const String& name, const String& value);
 
+    /// A number that is another one than before when another process has changed the records since; what is
+    /// changed through this object leaves it.
+    [[nodiscard]] int64_t versionOfOthers() const { return m_table->versionOfOthers(); }
+
     /// Many changes as one, kept or dropped as a whole.
     class QM_API Transaction {
     public:
-        explicit Transaction(projdb& records) : m_inner(records.m_table) {}
+        explicit Transaction(projdb& records) : m_inner(*records.m_table) {}
         Qx::Status commit() { return m_inner.commit(); }
 
     private:
-        oledb::Transaction m_inner;
+        RecordTable::Transaction m_inner;
     };
 
 private:
-    oledb m_table;
+    std::unique_ptr<RecordTable> m_table;
     bool m_isNew = false;
 };

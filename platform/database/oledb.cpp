@@ -314,8 +314,7 @@ size_t oledb::numRecords() const {
     return static_cast<size_t>(count.number(0));
 }
 
-void oledb::forEachRecord(
-    const std::function<bool(const String& key, const std::vector<String>& fields)>& callback) const {
+void oledb::forEachRecord(const Visitor& callback) const {
     const Hold hold(m_section);
     if (m_connection == nullptr) {
         return;
@@ -358,26 +357,47 @@ Qx::Status oledb::setValue(const String& name, const String& value) {
     return outcome(*m_connection->m_setValue, m_connection->m_database, "store a value");
 }
 
-oledb::Transaction::Transaction(oledb& table) : m_table(table) {
-    m_table.m_section.lock();
-    m_open = m_table.m_connection != nullptr && m_table.m_connection->execute("BEGIN IMMEDIATE");
+int64_t oledb::versionOfOthers() const {
+    const Hold hold(m_section);
+    Statement version;
+    const bool known = m_connection != nullptr &&
+                       version.prepare(m_connection->m_database, "PRAGMA data_version") && version.step();
+    return known ? version.number(0) : 0;
 }
 
-oledb::Transaction::~Transaction() {
-    if (m_open) {
-        m_table.m_connection->execute("ROLLBACK");
+std::vector<String> oledb::companions() const {
+    return {"-wal", "-shm", "-journal"};
+}
+
+bool oledb::begin() {
+    m_section.lock();
+    return m_connection != nullptr && m_connection->execute("BEGIN IMMEDIATE");
+}
+
+Qx::Status oledb::commit() {
+    return m_connection->execute("COMMIT")
+               ? Qx::Status()
+               : Qx::Status::failure("cannot keep the changes: " + m_connection->message());
+}
+
+void oledb::end(bool drops) {
+    if (drops) {
+        m_connection->execute("ROLLBACK");
     }
-    m_table.m_section.unlock();
+    m_section.unlock();
 }
 
-Qx::Status oledb::Transaction::commit() {
-    if (!m_open) {
+std::unique_ptr<RecordTable> RecordTable::make() {
+    return std::make_unique<oledb>();
+}
+
+Qx::Status RecordTable::Transaction::commit() {
+    if (!m_isOpen) {
         return Qx::Status::failure(
+            Qx::StatusCode::Locked,
             "the table could not be locked for changing; another program may be writing to it");
     }
-    if (!m_table.m_connection->execute("COMMIT")) {
-        return Qx::Status::failure("cannot keep the changes: " + m_table.m_connection->message());
-    }
-    m_open = false;
-    return {};
+    Qx::Status kept = m_table.commit();
+    m_isOpen = !kept;
+    return kept;
 }

@@ -2,6 +2,7 @@
 
 #include "platform/base/ole_splat.h"
 #include "platform/store/detail/header_values.h"
+#include "platform/store/detail/layer_revision.h"
 #include "platform/store/detail/salvage.h"
 #include "platform/store/detail/tag_bag_contents.h"
 #include "platform/store/tag.h"
@@ -395,6 +396,23 @@ bool TagBag::removeObject(std::string_view name) {
     const bool there = m_contents->find(name) != nullptr;
     m_contents->erase(name);
     return there;
+}
+
+Qx::Status TagBag::checkRevisions() const {
+    std::map<std::string_view, int> known; // the major revision of a class; that of no object if it is not
+    for (const Contents::Entry& entry : m_contents->entries) {
+        const auto [place, isNew] = known.try_emplace(entry.layer, UINT8_MAX);
+        if (isNew) {
+            if (const std::unique_ptr<Streamable> object = Streamable::build(entry.layer)) {
+                place->second = currentRevision(*object).major;
+            }
+        }
+        if (Qx::Status status = m_contents->checkRevision(entry, static_cast<uint8_t>(place->second));
+            !status) {
+            return status;
+        }
+    }
+    return {};
 }
 
 bool TagBag::renameObject(std::string_view name, std::string_view newName) {

@@ -145,6 +145,11 @@ public:
     /// program does not know, `Newer`, `Damaged`, `Locked` while it is lent.
     [[nodiscard]] const Qx::Status& objectStatus() const;
 
+    /// `Newer`, telling of the first, when the bag has an object of a class that this program knows in a
+    /// revision that only a later version of it reads; a success otherwise. Objects of other classes do not
+    /// count.
+    [[nodiscard]] Qx::Status checkRevisions() const;
+
     /// Declares a held object changed, so that the next flush packs it.
     void markChanged(std::string_view name);
     /// Removes an object and its bytes. False when there is none.

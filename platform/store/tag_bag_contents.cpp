@@ -184,20 +184,30 @@ bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
     if (object.STRM_hierarchyUnpack(stream) && stream.remaining() == 0) {
         return true;
     }
-    const String who = "object " + quoted(entry.name) + " of " + path();
-    if (entry.layer == object.layerName() &&
-        (entry.major > currentRevision(object).major || hasNewerLayer(object, bytes))) {
-        objectStatus =
-            Qx::Status::failure(Qx::StatusCode::Newer,
-                                who + " was written by a newer version of this program, in a form that this "
-                                      "version does not read");
-    } else {
+    const bool isSameClass = entry.layer == object.layerName();
+    objectStatus = isSameClass ? checkRevision(entry, currentRevision(object).major) : Qx::Status();
+    if (objectStatus && isSameClass && hasNewerLayer(object, bytes)) {
+        objectStatus = Qx::Status::failure(
+            Qx::StatusCode::Newer, "object " + quoted(entry.name) + " of " + path() +
+                                       " was written by a newer version of this program, in a form that this "
+                                       "version does not read");
+    } else if (objectStatus) {
         objectStatus =
             Qx::Status::failure(Qx::StatusCode::Damaged,
                                 who + " does not hold what an object of class " + quoted(object.layerName()) +
                                     " is made of; it was written by another program or another class");
     }
     return false;
+}
+
+Qx::Status TagBag::Contents::checkRevision(const Entry& entry, uint8_t current) const {
+    return entry.major <= current
+               ? Qx::Status()
+               : Qx::Status::failure(Qx::StatusCode::Newer,
+                                     "object " + quoted(entry.name) + " of " + path() +
+                                         " was written by a newer version of this program: it has revision " +
+                                         std::to_string(entry.major) + ", this version reads " +
+                                         std::to_string(current));
 }
 
 std::unique_ptr<Streamable> TagBag::Contents::build(const Entry& entry) {

@@ -6,8 +6,8 @@
 
 #include "edit/manager/edit_manager.h"
 #include "platform/services/config_int.h"
+#include "recording_file_system.h"
 #include "tests/edit/manager/managed_project.h"
-#include "tests/support/recording_file_system.h"
 
 #include <algorithm>
 #include <filesystem>
@@ -76,7 +76,7 @@ private:
         // What is left unwritten is written when the manager closes, also after a backup alone.
         Made last{"a backup and the shut-down", m_system->size(), 0, revisions, revisions, batch};
         if (!revisions.current.empty()) {
-            m_case.expect(edit_manager::backup_edit(kItem),
+            m_case.expect(edit_manager::backup_edit(kItem).isOk(),
                           "a last backup fails although nothing stands in its way");
             revisions.undo.insert(revisions.undo.begin(), revisions.current);
             revisions.redo.clear();

@@ -37,7 +37,7 @@ namespace {
             const EditPtr edit(item, eOpenExisting);
             if (edit.valid()) {
                 if (i % 3 == 0) {
-                    static_cast<void>(edit_manager::backup_edit(item));
+                    static_cast<void>(edit_manager::backup_edit(item).isOk());
                 }
                 edit->setName(String::format("writer %d", number));
             }

@@ -73,13 +73,13 @@ const std::vector<Step> kSteps = {
      }},
     {"flush all", [](const String& fresh) { return changeName(fresh) && edit_manager::flush_changes(); },
      [](Revisions& its, const String& fresh) { return become(its, fresh, false), true; }},
-    {"undo", [](const String&) { return edit_manager::undoRequest(kItem); },
+    {"undo", [](const String&) { return edit_manager::undoRequest(kItem).isOk(); },
      [](Revisions& its, const String&) { return go(its, its.undo, its.redo); }},
-    {"redo", [](const String&) { return edit_manager::redoRequest(kItem); },
+    {"redo", [](const String&) { return edit_manager::redoRequest(kItem).isOk(); },
      [](Revisions& its, const String&) { return go(its, its.redo, its.undo); }},
     {"backup, leave project",
      [](const String&) {
-         const bool done = edit_manager::backup_edit(kItem);
+         const bool done = edit_manager::backup_edit(kItem).isOk();
          edit_manager::exitProject();
          return done && edit_manager::set_current_project(cookie("P0001000"), eOpenExisting) == eStatus::Ok;
      },

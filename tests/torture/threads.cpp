@@ -37,13 +37,13 @@ void perform(const Act& act, size_t thread) {
         static_cast<void>(edit_manager::flush_edit(item));
         break;
     case 1:
-        static_cast<void>(edit_manager::backup_edit(item));
+        static_cast<void>(edit_manager::backup_edit(item).isOk());
         break;
     case 2:
-        static_cast<void>(edit_manager::undoRequest(item));
+        static_cast<void>(edit_manager::undoRequest(item).isOk());
         break;
     case 3:
-        static_cast<void>(edit_manager::redoRequest(item));
+        static_cast<void>(edit_manager::redoRequest(item).isOk());
         break;
     case 4:
         static_cast<void>(edit_manager::flush_changes());
@@ -64,7 +64,7 @@ void perform(const Act& act, size_t thread) {
             const std::lock_guard<criticalSection> hold(edit->section());
             const cookie other = itemOf(act.item + 1 + act.other % (kItems - 1));
             static_cast<void>(act.other % 2 == 0 ? edit_manager::flush_edit(other)
-                                                 : edit_manager::backup_edit(other));
+                                                 : edit_manager::backup_edit(other).isOk());
             edit_manager::reloadRequest(other, true);
         }
         break;

@@ -18,7 +18,7 @@ int runBackup(const EditArguments& arguments) {
         return kFailed;
     }
     const cookie& item = managed.item();
-    const size_t numRedo = managed.numRedo();
+    const std::optional<size_t> numRedo = managed.numRedo();
     const String change = changeText(edit->getChangeDescription());
     if (const Qx::Status kept = managed.change(edit, "no backup of " + item.asString() + " was made", {});
         !kept) {

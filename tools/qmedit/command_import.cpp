@@ -13,7 +13,7 @@
 #include <memory>
 #include <unordered_map>
 
-namespace {}
+namespace {
 
 bool isLegacyText(const String& file) {
     return String::equalNoCase(Qx::extensionOf(Qx::fileNameOf(file)), ".ed2");

@@ -113,7 +113,7 @@ int changeMarkers(const MarkerArguments& arguments,
     if (const Qx::Status prepared = prepare(*edit, place, change, told); !prepared) {
         return failed(prepared);
     }
-    const size_t numRedo = managed.numRedo();
+    const std::optional<size_t> numRedo = managed.numRedo();
     const auto described = [&change](Edit& changed) {
         change(changed);
         changed.setChangeDescription(kCuesChanged, true);

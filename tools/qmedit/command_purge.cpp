@@ -62,7 +62,7 @@ void show(const std::vector<ListedEdit>& shots) {
     }
 }
 
-String countText(size_t count) {
+String shotsText(size_t count) {
     return String::format("%zu shot%s", count, count == 1 ? "" : "s");
 }
 
@@ -93,7 +93,7 @@ int deleteShots(const PurgeArguments& arguments, const std::vector<ListedEdit>& 
             ++deleted;
         }
     }
-    writeOut(countText(deleted) + " deleted\n");
+    writeOut(shotsText(deleted) + " deleted\n");
     return deleted == shown.size() ? kDone : kFailed;
 }
 
@@ -115,10 +115,10 @@ int runPurge(const PurgeArguments& arguments) {
     }
     if (arguments.dryRun || unused.empty()) {
         reportProgress(unused.empty() ? String("every shot is played by an edit or a state of one")
-                                      : countText(unused.size()) + " would be deleted");
+                                      : shotsText(unused.size()) + " would be deleted");
         return kDone;
     }
-    if (!arguments.yes && !confirmed("Delete " + countText(unused.size()) + "?")) {
+    if (!arguments.yes && !confirmed("Delete " + shotsText(unused.size()) + "?")) {
         return failed(Qx::Status::failure("nothing was deleted"));
     }
     return deleteShots(arguments, unused);

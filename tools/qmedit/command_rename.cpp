@@ -28,7 +28,7 @@ int runRename(const RenameArguments& arguments) {
         reportProgress(cookie + " has that name already");
         return kDone;
     }
-    const size_t numRedo = managed.numRedo();
+    const std::optional<size_t> numRedo = managed.numRedo();
     if (const Qx::Status changed = managed.change(edit, cookie + " was not renamed",
                                                   [&](Edit& renamed) { renamed.setName(arguments.name); });
         !changed) {

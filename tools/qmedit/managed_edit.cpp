@@ -64,7 +64,11 @@ int ManagedEdit::prepare(bool mayBeGone) {
     if (const Qx::Status found = m_session.findItem(m_arguments.item, m_item); !found) {
         return failed(found);
     }
-    if (!mayBeGone && edit_manager::getEditFiles(m_item).empty()) {
+    Vector<String> files;
+    if (const Qx::Status listed = edit_manager::getEditFiles(m_item, files); !listed) {
+        return failed(listed);
+    }
+    if (!mayBeGone && files.empty()) {
         EditPtr none;
         return failed(m_session.readEdit(m_item, none));
     }
@@ -122,11 +126,9 @@ Qx::Status ManagedEdit::change(EditPtr& edit, const String& what, const std::fun
     if (const Qx::Status taken = room.take(file, 2 * Qx::askFile(file).info().size + kGrowth); !taken) {
         return taken.retold(what + ": " + taken.reason());
     }
-    if (!edit_manager::backup_edit(m_item)) {
-        const String cause = edit->lastFileError();
-        return Qx::Status::failure(
-            what + (cause.empty() ? "" : ": " + cause) + "; " + putFileBack(m_item, edit) +
-            "; see whether the project can be written and has room (QMEDIT_LOG=1 tells more)");
+    if (const Qx::Status kept = edit_manager::backup_edit(m_item); !kept) {
+        return kept.retold(what + ": " + kept.reason() + "; " + putFileBack(m_item, edit) +
+                           "; see whether the project can be written and has room");
     }
     room.giveBack();
     if (apply) {
@@ -142,18 +144,32 @@ Qx::Status ManagedEdit::change(EditPtr& edit, const String& what, const std::fun
     return {};
 }
 
-String undoText(const ManagedEdit& managed, size_t numRedo) {
-    return String::format("; %zu to undo", managed.numUndo()) +
-           (numRedo == 0 ? String()
-                         : String::format("; %zu redo backup%s went", numRedo, numRedo == 1 ? "" : "s"));
+String undoText(const ManagedEdit& managed, std::optional<size_t> numRedo) {
+    return "; " + countText(managed.numUndo()) + " to undo" +
+           (numRedo == size_t{0} ? String()
+                                 : "; " + countText(numRedo) +
+                                       (numRedo == size_t{1} ? " redo backup went" : " redo backups went"));
 }
 
-size_t ManagedEdit::numUndo() const {
-    return chain(m_item, RevisionChain::Undo).numbers().size();
+namespace {
+
+std::optional<size_t> numBackups(const cookie& item, RevisionChain::Kind kind) {
+    std::vector<int> numbers;
+    return chain(item, kind).numbers(numbers) ? std::optional(numbers.size()) : std::nullopt;
 }
 
-size_t ManagedEdit::numRedo() const {
-    return chain(m_item, RevisionChain::Redo).numbers().size();
+} // namespace
+
+std::optional<size_t> ManagedEdit::numUndo() const {
+    return numBackups(m_item, RevisionChain::Undo);
+}
+
+std::optional<size_t> ManagedEdit::numRedo() const {
+    return numBackups(m_item, RevisionChain::Redo);
+}
+
+String countText(std::optional<size_t> count) {
+    return count ? std::to_string(*count) : "an unknown number";
 }
 
 int stepRevision(const EditArguments& arguments, bool redo) {
@@ -198,10 +214,10 @@ int stepRevision(const EditArguments& arguments, bool redo) {
     if (redo && edit.valid()) {
         change = changeText(edit->getChangeDescription());
     }
-    writeOut(
-        item.asString() + ": " + done + " " + quotedChange(change) +
-        String::format("; the edit is what %s backup %d was, last changed %s; %zu to undo, %zu to redo\n",
-                       verb, number, localTimeText(edit.valid() ? edit->getModificationTime() : 0).c_str(),
-                       managed.numUndo(), managed.numRedo()));
+    writeOut(item.asString() + ": " + done + " " + quotedChange(change) +
+             String::format("; the edit is what %s backup %d was, last changed %s; %s to undo, %s to redo\n",
+                            verb, number,
+                            localTimeText(edit.valid() ? edit->getModificationTime() : 0).c_str(),
+                            countText(managed.numUndo()).c_str(), countText(managed.numRedo()).c_str()));
     return kDone;
 }

@@ -5,6 +5,7 @@
 #include "tools/qmedit/project_session.h"
 
 #include <functional>
+#include <optional>
 
 /// What the commands on one edit are given.
 struct EditArguments {
@@ -20,6 +21,9 @@ struct EditArguments {
 /// After a write that failed: lets go of the changes, and brings the file of an edit that lies as its newest
 /// undo backup back under its name, under the writers' lock. Says in one clause where the edit is.
 [[nodiscard]] String putFileBack(const cookie& item, EditPtr& edit);
+
+/// A number of backups for people, also one that the system could not tell.
+[[nodiscard]] String countText(std::optional<size_t> count);
 
 /// One edit of a project that a command changes through the edit manager, under the project's writers' lock
 /// from before it is opened until the object goes. What the user must know is told on standard error.
@@ -41,8 +45,8 @@ public:
     /// is.
     Qx::Status change(EditPtr& edit, const String& what, const std::function<void(Edit&)>& apply);
     /// How many undo and redo backups there are.
-    [[nodiscard]] size_t numUndo() const;
-    [[nodiscard]] size_t numRedo() const;
+    [[nodiscard]] std::optional<size_t> numUndo() const;
+    [[nodiscard]] std::optional<size_t> numRedo() const;
 
 private:
     const EditArguments& m_arguments;
@@ -53,7 +57,7 @@ private:
 
 /// "; 3 to undo", and how many redo backups went of the `numRedo` that there were: the end of the line that a
 /// change is told with.
-[[nodiscard]] String undoText(const ManagedEdit& managed, size_t numRedo);
+[[nodiscard]] String undoText(const ManagedEdit& managed, std::optional<size_t> numRedo);
 
 /// Steps an edit one revision back, or with `redo` forward, and prints what happened. An `ExitCode`.
 int stepRevision(const EditArguments& arguments, bool redo);

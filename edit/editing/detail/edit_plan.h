@@ -48,9 +48,9 @@ class Editor::Planner {
 public:
     Planner(const EditModule& source, const EditModule& destination, edit_operation op, unsigned flags);
 
-    /// Null with `reason()` set when the operation is refused.
+    /// Null with `refusal()` set when the operation is refused.
     [[nodiscard]] std::unique_ptr<Plan> plan();
-    [[nodiscard]] const String& reason() const { return m_reason; }
+    [[nodiscard]] const Qx::Status& refusal() const { return m_refusal; }
     /// What is to be told of a plan that was made (`Result::notice`).
     [[nodiscard]] String notice(const Plan& plan) const;
 
@@ -64,7 +64,7 @@ private:
         double open = 0; ///< where an insert opens the channel
     };
 
-    bool refuse(String reason);
+    bool refuse(String reason, Qx::StatusCode code = Qx::StatusCode::BadArgument);
     // edit_planner.cpp
     bool checkOperation();
     bool planWithSource();
@@ -115,7 +115,7 @@ private:
     Range m_span;              ///< the module's source region
     double m_markedLength = 0; ///< of the destination's region, for the operations that fill it
     std::unique_ptr<Plan> m_plan;
-    String m_reason;
+    Qx::Status m_refusal;
 };
 
 namespace editing_detail {

@@ -252,10 +252,13 @@ SectionHold::~SectionHold() {
 
 CachedEditScope::CachedEditScope(const cookie& item, const EditPtr& edit)
     : m_section(edit), m_turn(managerState().queue, item), m_writers(folderOfCached(item)),
-      m_isWritable(m_section.isHeld() && takeWritersLock(m_writers)), m_lock(managerState().lock),
-      m_entry(nullptr) {
+      m_taken(m_section.isHeld()
+                  ? takeWritersLock(m_writers)
+                  : Qx::Status::failure(Qx::StatusCode::Locked,
+                                        item.asString() + " is in use by a thread that waits for this one")),
+      m_lock(managerState().lock), m_entry(nullptr) {
     ManagerState::CachedEdit* const found = managerState().findCacheEntry(item);
-    if (m_isWritable && found != nullptr && found->edit == edit) {
+    if (isWritable() && found != nullptr && found->edit == edit) {
         m_entry = found;
     }
 }

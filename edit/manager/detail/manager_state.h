@@ -206,13 +206,15 @@ public:
     /// (logged).
     [[nodiscard]] ManagerState::CachedEdit* entry() const { return m_entry; }
     /// False in the second case.
-    [[nodiscard]] bool isWritable() const { return m_isWritable; }
+    [[nodiscard]] bool isWritable() const { return m_taken.isOk(); }
+    /// What kept them from being kept away.
+    [[nodiscard]] const Qx::Status& obstacle() const { return m_taken; }
 
 private:
     SectionHold m_section;
     Qx::AccessScope<cookie> m_turn;
     EditManagerLock m_writers;
-    bool m_isWritable;
+    Qx::Status m_taken;
     ManagerState::Hold m_lock;
     ManagerState::CachedEdit* m_entry;
 };

@@ -10,8 +10,8 @@
 /// a step that fails says why in one sentence.
 class EditFile {
 public:
-    /// What a salvage does with the parts that fail (edit_salvaging.h).
-    class Salvaging;
+    /// What a salvage does with the parts that fail (edit_salvager.h).
+    class Salvager;
 
     /// While it lives, changes of the header and of channels do not dirty the edit: for changes that a load
     /// or a save itself makes.
@@ -42,13 +42,13 @@ public:
     };
 
     /// Ends the lending of cels and header to the store, on whatever way they are left.
-    class Lending {
+    class CelLoan {
     public:
-        explicit Lending(Edit& edit) : m_edit(edit) {}
-        ~Lending() { m_edit.extractCelsFromStore(m_isWritten); }
+        explicit CelLoan(Edit& edit) : m_edit(edit) {}
+        ~CelLoan() { m_edit.extractCelsFromStore(m_isWritten); }
         void setWritten() { m_isWritten = true; }
-        Lending(const Lending&) = delete;
-        Lending& operator=(const Lending&) = delete;
+        CelLoan(const CelLoan&) = delete;
+        CelLoan& operator=(const CelLoan&) = delete;
 
     private:
         Edit& m_edit;
@@ -75,8 +75,8 @@ public:
     static Qx::Status readHeader(Edit& edit);
     static void readCues(Edit& edit);
     /// Fails for an edit without channels or with too many.
-    static Qx::Status readCels(Edit& edit, Salvaging* salvaging = nullptr);
-    static void readGroups(Edit& edit, Salvaging* salvaging = nullptr);
+    static Qx::Status readCels(Edit& edit, Salvager* salvager = nullptr);
+    static void readGroups(Edit& edit, Salvager* salvager = nullptr);
     /// Gives an object that does not read a name that no part of an edit has, and tells why on the log.
     static void setAside(Edit& edit, const String& object, const String& why);
     /// @}
@@ -98,7 +98,7 @@ public:
     /// @}
 
     /// Reads all that is sound of a file into an edit without a file. Fails when that makes no edit.
-    static Qx::Status salvage(Edit& edit, const String& path, Salvaging& salvaging);
+    static Qx::Status salvage(Edit& edit, const String& path, Salvager& salvager);
     /// Takes stamps of channels that could not be read out of the groups of an edit that was salvaged.
     static void leaveLostChannelsOut(Edit& edit);
     /// Brings an edit that was salvaged up to date; what fails is told in `lost`.
@@ -133,9 +133,9 @@ public:
 private:
     static Qx::Status addLegacyChannel(Edit& edit, Edit_Chan_Type type, const std::vector<String>& fields,
                                        std::unique_ptr<cel> content, IdStamp& added);
-    static std::vector<LoadedCel> loadCels(Edit& edit, Salvaging* salvaging);
+    static std::vector<LoadedCel> loadCels(Edit& edit, Salvager* salvager);
     static std::vector<LoadedLevels> loadLevels(Edit& edit, const std::vector<LoadedCel>& cels,
-                                                Salvaging* salvaging);
+                                                Salvager* salvager);
     static Qx::Status setupChannels(Edit& edit, std::vector<LoadedCel>& cels, std::vector<FileChannel>& file);
     static void setLevelsAside(Edit& edit, const std::vector<LoadedLevels>& levels);
     static void setupLevels(Edit& edit, std::vector<LoadedLevels>& levels, std::vector<FileChannel>& file);

@@ -65,6 +65,8 @@ public:
     bool unpack(const Entry& entry, Streamable& object);
     /// A live object from an object's bytes; null with `objectStatus` set.
     std::unique_ptr<Streamable> build(const Entry& entry);
+    /// A failure if a later version of this program wrote the object, whose class writes `current` here.
+    [[nodiscard]] Qx::Status checkRevision(const Entry& entry, uint8_t current) const;
     /// Forgets an object's bytes in memory if the file has them.
     void dropMemory(Entry& entry);
     /// Forgets an object's bytes wherever they are.

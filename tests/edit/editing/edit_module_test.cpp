@@ -32,16 +32,6 @@ TEST_F(EditModuleTest, OfWhatDoesNotOpenIsEmpty) {
     EXPECT_EQ(empty.numRecords(), 0u);
 }
 
-TEST_F(EditModuleTest, OfACookieIsMarkedThroughout) {
-    const EditModule module(m_edit->get_cookie(), 1.01, 2, 3);
-    EXPECT_EQ(module.getEdit(), m_edit);
-    EXPECT_EQ(module.curTime(EditModule::ExactTimes), 1.01);
-    EXPECT_EQ(module.curTime(EditModule::WholeFrames), 1.0);
-    EXPECT_EQ(module.numRecords(), 4u);
-    EXPECT_EQ(module.getMarkTimes(chan(3)), std::pair(2.0, 3.0));
-    EXPECT_EQ(module.getMarkTime(chan(3), static_cast<Qx::MarkTypes::MarkType>(3)), kNoTime);
-}
-
 TEST_F(EditModuleTest, RegionsOfTwoMarksAndACurrentTime) {
     struct Case {
         double in;

@@ -29,17 +29,23 @@ inline void addRows(Edit& edit, const Rows& rows) {
     edit.set_dirty(true);
 }
 
+/// 'E', 'V' or 'A' for each channel but the levels.
+inline std::string kindsOf(const Edit& edit) {
+    std::string kinds;
+    for (int i = 0; i < edit.getNumChans() && edit.get_edit_cel_p(i) != nullptr; ++i) {
+        const bool effects = edit.getChanSubtype(i) == Edit_Chan_SubType::ALIAS;
+        kinds += effects ? 'E' : edit.getChanType(i) == AudioChan ? 'A' : 'V';
+    }
+    return kinds;
+}
+
 /// The channels of an edit but its levels, as `addRows` reads them.
 inline Rows drawRows(const Edit& edit) {
     Rows rows;
-    for (int i = 0; i < edit.getNumChans(); ++i) {
-        if (const cel* const its = edit.get_edit_cel_p(i)) {
-            const bool effects = edit.getChanSubtype(i) == Edit_Chan_SubType::ALIAS;
-            rows.push_back(std::string(effects                            ? "E "
-                                       : edit.getChanType(i) == AudioChan ? "A "
-                                                                          : "V ") +
-                           layout::draw(*its));
-        }
+    const std::string kinds = kindsOf(edit);
+    for (size_t i = 0; i < kinds.size(); ++i) {
+        rows.push_back(std::string(1, kinds[i]) + " " +
+                       layout::draw(*edit.get_edit_cel_p(static_cast<int>(i))));
     }
     return rows;
 }

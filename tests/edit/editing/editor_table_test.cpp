@@ -174,36 +174,6 @@ TEST_F(EditorTable, OperationsBetweenChannels) {
     }
 }
 
-TEST_F(EditorTable, EffectsChannelsKeepTheirGapsAndLengths) {
-    const EditPtr from = editOf({"E  dd", "V ffff"});
-    const EditModule source = moduleOf(from, span(0, 3));
-    const Rows before{"E EE", "V AAAABBB"};
-    run(before, source, in(1), Op::Insert, {"E E ddE", "V AfffAAABBB"});
-    run(before, source, in(1), Op::Replace, {"E E dd", "V AfffBBB"});
-    run(before, source, in(4), Op::Replace, {"E EE   dd", "V AAAAfff"});
-    run(before, source, span(0, 1), Op::Lift, {"E  E", "V .AAABBB"});
-    run(before, source, span(1, 2), Op::Lift, {"E E.", "V A.AABBB"});
-    run(before, source, span(1, 3), Op::Remove, {"E E", "V A|ABBB"});
-}
-
-TEST_F(EditorTable, WhatIsLaidPlaysTheMarkedPartOfTheSource) {
-    const EditPtr from = editOf({"V dddddddd"});
-    const EditPtr edit = make({"V AAAAAAAAA"});
-    struct StripCase {
-        Op op;
-        Marks marks;
-        const char* strips;
-    };
-    for (const StripCase& its : {StripCase{Op::Replace, in(1), "034567678"}, // source seconds 3 to 7 at 1
-                                 StripCase{Op::InsertMarked, span(2, 4), "01342345678"}}) {
-        const EditPtr copy = edit->copy();
-        ASSERT_TRUE(Editor::apply(moduleOf(from, span(3, its.op == Op::Replace ? 8 : 7)),
-                                  moduleOf(copy, its.marks), its.op)
-                        .valid());
-        EXPECT_EQ(layout::drawStrips(*copy->get_edit_cel_p(0)), its.strips);
-    }
-}
-
 TEST_F(EditorTable, CutsOfASourceOfAnotherRateComeOntoTheFramesAndThatIsTold) {
     const EditPtr from = editOf({"V ", "A "});
     from->setFrameRate(Qx::FrameRate(Qx::FrameRate::Fps24));

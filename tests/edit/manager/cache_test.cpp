@@ -251,6 +251,13 @@ TEST(Deleting, TakesTheFileWithItsBackupsUnlessTheEditIsInUse) {
     make();
     const Vector<String> files = edit_manager::getEditFiles(kEdit);
     ASSERT_EQ(files.size(), 3U);
+    {
+        test::FaultyFileSystem system;
+        system.failWhere("list P0001000", EIO);
+        Vector<String> untold{"as it was"};
+        EXPECT_EQ(edit_manager::getEditFiles(kEdit, untold).code(), Qx::StatusCode::Refused);
+        EXPECT_EQ(untold, Vector<String>{"as it was"});
+    }
     EXPECT_TRUE(files[0].ends_with(".qme") && files[1].ends_with(".U1") && files[2].ends_with(".R1"));
     {
         const EditPtr held(kEdit, eOpenExisting);

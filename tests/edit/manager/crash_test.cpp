@@ -1,11 +1,11 @@
-// A process that is killed at any of its file operations, or to which any of them fails, leaves a project
-// that opens, with every revision in reach; so does a file system that loses the order of names.
+// A process that is killed at any of its file operations, or to which any of them fails or any question about
+// a name stays unanswered, leaves a project that opens, with every revision in reach; so does a file system
+// that loses the order of names.
 
 #include "edit/manager/edit_manager.h"
 #include "platform/services/config_int.h"
 #include "tests/edit/manager/managed_project.h"
-#include "tests/support/child_process.h"
-#include "tests/support/faulty_file_system.h"
+#include "tests/support/every_fault.h"
 
 #include <gtest/gtest.h>
 
@@ -15,34 +15,46 @@
 
 namespace {
 
+using test::Fault;
 using test::kEdit;
 using test::ManagedProject;
 using Files = std::map<std::string, std::string>;
 using Names = std::set<String>;
 
-void saveRevision(const char* name) {
-    ASSERT_TRUE(edit_manager::backup_edit(kEdit));
-    ASSERT_TRUE(ManagedProject::save(name));
+std::vector<std::string> namesIn(const String& folder) {
+    std::vector<std::string> names;
+    for (const auto& entry : std::filesystem::directory_iterator(folder.c_str())) {
+        names.push_back(entry.path().filename().string());
+    }
+    return names;
 }
 
 /// The edit files after saving "0", "1", "2" with backups between, and `undos` steps back.
 Files prepare(int undos) {
     ManagedProject project;
-    ManagedProject::save("0");
-    saveRevision("1");
-    saveRevision("2");
+    for (const char* const name : {"0", "1", "2"}) {
+        EXPECT_TRUE(*name == '0' || edit_manager::backup_edit(kEdit));
+        EXPECT_TRUE(ManagedProject::save(name));
+    }
     for (int i = 0; i < undos; ++i) {
         EXPECT_TRUE(edit_manager::undoRequest(kEdit));
     }
     ManagedProject::stopManager();
     Files files;
-    for (const auto& entry : std::filesystem::directory_iterator(std::filesystem::path(project.folder()))) {
-        const std::string name = entry.path().filename().string();
+    for (const std::string& name : namesIn(project.folder())) {
         if (name.starts_with("E0001000.qme")) {
             files[name] = project.read(name);
         }
     }
     return files;
+}
+
+std::unique_ptr<ManagedProject> projectOf(const Files& files) {
+    auto project = std::make_unique<ManagedProject>(false);
+    for (const auto& [name, bytes] : files) {
+        project->write(name, bytes);
+    }
+    return project;
 }
 
 /// Every revision that undo and redo reach.
@@ -57,32 +69,36 @@ Names reachable() {
     return names;
 }
 
-bool includes(const Names& all, const Names& some) {
-    return std::includes(all.begin(), all.end(), some.begin(), some.end());
-}
+enum class File { Sound, Cut, Missing };
 
-struct Killing {
+struct Action {
     const char* what;
     int undos; ///< in the preparation
     bool changes;
-    std::function<bool()> action;
+    std::function<bool()> act;
     Names survive; ///< what must be reached afterwards
     Names opened;  ///< what the edit may be when it opens next
+    File file = File::Sound;
     int depth = 10;
-    bool damaged = false; ///< the edit file is, before the action
+    bool withQuestions = false; ///< tried with unanswered questions too
+    bool withFailures = true;   ///< tried with calls that fail or kill
 };
 
 bool backUp() {
-    return edit_manager::backup_edit(kEdit);
+    return bool(edit_manager::backup_edit(kEdit));
 }
 bool undo() {
-    return edit_manager::undoRequest(kEdit);
+    return bool(edit_manager::undoRequest(kEdit));
 }
 bool redo() {
-    return edit_manager::redoRequest(kEdit);
+    return bool(edit_manager::redoRequest(kEdit));
 }
 bool openAgain() {
     return ManagedProject::nameOf() == "1";
+}
+bool openOrCreate() {
+    const EditPtr edit(kEdit, eOpenOrCreate);
+    return edit.valid() && edit->getName() == "1";
 }
 bool deleteIt() {
     return edit_manager::delete_edit_file_and_backups(kEdit, true);
@@ -90,88 +106,98 @@ bool deleteIt() {
 bool flush() {
     return edit_manager::flush_changes();
 }
+bool close() {
+    const bool done = backUp();
+    edit_manager::close_all_edits();
+    return done;
+}
 
-class Killed : public testing::TestWithParam<Killing> {};
+const Action kActions[] = {
+    {"backup", 0, false, backUp, {"0", "1", "2"}, {"2"}, File::Sound, 10, true},
+    {"backup of a changed edit", 0, true, backUp, {"0", "1"}, {"2", "new"}},
+    {"backup of a full chain", 0, false, backUp, {"1", "2"}, {"2"}, File::Sound, 2},
+    {"undo", 0, false, undo, {"0", "1", "2"}, {"1", "2"}, File::Sound, 10, true},
+    {"undo of a changed edit", 0, true, undo, {"0", "1"}, {"1", "2", "new"}},
+    {"second undo", 1, false, undo, {"0", "1", "2"}, {"0", "1"}},
+    {"redo", 1, false, redo, {"0", "1", "2"}, {"0", "1", "2"}},
+    {"redo with more to come", 2, false, redo, {"0", "1", "2"}, {"0", "1"}},
+    {"recovery of a damaged file", 0, false, openAgain, {"0", "1"}, {"1"}, File::Cut},
+    {"recovery of a missing file", 0, false, openAgain, {"0", "1"}, {"1"}, File::Missing, 10, true, false},
+    {"recovery instead of a fresh edit",
+     0,
+     false,
+     openOrCreate,
+     {"0", "1"},
+     {"1"},
+     File::Missing,
+     10,
+     true,
+     false},
+    {"deletion", 0, false, deleteIt, {}, {"2", "(null)"}},
+    {"closing after a backup", 0, false, close, {"0", "1", "2"}, {"2"}, File::Sound, 10, true, false},
+    {"flush with a milestone", 0, true, flush, {"0", "1"}, {"2", "new"}, File::Sound, 10, true},
+};
 
-TEST_P(Killed, AtAnyFileOperationLosesNoRevision) {
-    const Killing& killing = GetParam();
-    const Files files = prepare(killing.undos);
-    Qx::setConfigInt("mods_per_milestone", 1);
-    Qx::setConfigInt("backup_depth", killing.depth);
-    test::ChildEnd end = test::ChildEnd::Killed;
-    size_t at = 1;
-    for (; end == test::ChildEnd::Killed && at < 200; ++at) {
-        SCOPED_TRACE(testing::Message() << killing.what << " killed at write operation " << at);
-        const ManagedProject project(false);
-        for (const auto& [name, bytes] : files) {
-            project.write(name, killing.damaged && name == "E0001000.qme" ? bytes.substr(0, 99) : bytes);
+class FaultyStep : public testing::TestWithParam<Fault> {};
+
+TEST_P(FaultyStep, LosesNoRevision) {
+    const Fault fault = GetParam();
+    for (const Action& action : kActions) {
+        if (!(fault.kind == Fault::Unanswered ? action.withQuestions : action.withFailures)) {
+            continue;
         }
-        end = test::runInChild([&] {
+        SCOPED_TRACE(action.what);
+        Files files = prepare(action.undos);
+        if (action.file == File::Cut) {
+            files["E0001000.qme"].resize(99);
+        } else if (action.file == File::Missing) {
+            files.erase("E0001000.qme");
+        }
+        Qx::setConfigInt("mods_per_milestone", fault.kind == Fault::Killed ? 1 : 10);
+        Qx::setConfigInt("backup_depth", action.depth);
+        String before = "1";
+        const auto act = [&](const auto& /*project*/, const auto& arm) {
             ManagedProject::startManager();
-            if (!killing.damaged && ManagedProject::nameOf() == "(null)") {
-                return false;
-            }
-            if (killing.changes) {
+            before = action.file == File::Sound ? ManagedProject::nameOf() : before;
+            if (action.changes) {
                 ManagedProject::change("new");
             }
-            test::FaultyFileSystem system;
-            system.killAtWrite(at);
-            return killing.action();
-        });
-        ASSERT_NE(end, test::ChildEnd::Failed);
-        ManagedProject::startManager();
-        const String opened = ManagedProject::nameOf();
-        EXPECT_TRUE(killing.opened.contains(opened)) << opened;
-        for (const auto& entry :
-             std::filesystem::directory_iterator(std::filesystem::path(project.folder()))) {
-            const bool setAside = entry.path().string().find("CORRUPT") != std::string::npos;
-            EXPECT_TRUE(killing.damaged || !setAside) << entry.path();
-        }
-        EXPECT_TRUE(includes(reachable(), killing.survive)) << testing::PrintToString(reachable());
+            arm();
+            return before != "(null)" && action.act();
+        };
+        const auto check = [&](const auto& project, const test::Met& met) {
+            if (fault.kind != Fault::Killed) {
+                edit_manager::close_all_edits();
+                edit_manager::invalidateCache(kEdit);
+            }
+            ManagedProject::startManager();
+            const String opened = ManagedProject::nameOf();
+            EXPECT_TRUE(action.opened.contains(opened)) << opened;
+            if (!met.done && fault.kind != Fault::Killed) {
+                EXPECT_EQ(opened, action.changes ? String("new") : before);
+            }
+            for (const std::string& name : namesIn(project->folder())) {
+                EXPECT_TRUE(action.file == File::Cut || name.find("CORRUPT") == std::string::npos) << name;
+            }
+            if (fault.kind == Fault::Unanswered && met.done) {
+                return;
+            }
+            const Names names = reachable();
+            EXPECT_TRUE(
+                std::includes(names.begin(), names.end(), action.survive.begin(), action.survive.end()))
+                << testing::PrintToString(names);
+        };
+        const size_t met = test::everyFault(
+            fault, [&] { return projectOf(files); }, act, check);
+        EXPECT_GT(met, fault.kind == Fault::Unanswered ? 0U : 3U);
+        Qx::clearConfigInt("mods_per_milestone");
+        Qx::clearConfigInt("backup_depth");
     }
-    Qx::clearConfigInt("mods_per_milestone");
-    Qx::clearConfigInt("backup_depth");
-    EXPECT_EQ(end, test::ChildEnd::Succeeded);
-    EXPECT_GT(at, 4U) << "the action writes";
 }
 
-TEST_P(Killed, OrWithAFailureAtAnyFileOperationIsDoneOrIsAsBefore) {
-    const Killing& killing = GetParam();
-    const Files files = prepare(killing.undos);
-    Qx::setConfigInt("backup_depth", killing.depth);
-    bool failed = true;
-    for (size_t at = 1; failed && at < 300; ++at) {
-        SCOPED_TRACE(testing::Message() << killing.what << " with a failure at operation " << at);
-        const ManagedProject project(false);
-        for (const auto& [name, bytes] : files) {
-            project.write(name, killing.damaged && name == "E0001000.qme" ? bytes.substr(0, 99) : bytes);
-        }
-        ManagedProject::startManager();
-        const String before = killing.damaged ? String("1") : ManagedProject::nameOf();
-        if (killing.changes) {
-            ManagedProject::change("new");
-        }
-        bool done = false;
-        {
-            test::FaultyFileSystem system;
-            system.failAt(at, EIO);
-            done = killing.action();
-            failed = system.numOperations() >= at;
-            EXPECT_TRUE(done || failed);
-        }
-        edit_manager::close_all_edits();
-        edit_manager::invalidateCache(kEdit);
-        ManagedProject::startManager();
-        const String opened = ManagedProject::nameOf();
-        EXPECT_TRUE(killing.opened.contains(opened)) << opened;
-        if (!done) {
-            EXPECT_EQ(opened, killing.changes ? String("new") : before);
-        }
-        EXPECT_TRUE(includes(reachable(), killing.survive)) << testing::PrintToString(reachable());
-    }
-    Qx::clearConfigInt("backup_depth");
-    EXPECT_FALSE(failed);
-}
+INSTANTIATE_TEST_SUITE_P(Manager, FaultyStep,
+                         testing::Values(Fault{Fault::Killed}, Fault{Fault::Fails},
+                                         Fault{Fault::Unanswered, ESTALE}));
 
 /// What a folder may hold after a crash: the names as they were at the last sync, and any of the moves and
 /// deletions since.
@@ -212,68 +238,31 @@ std::set<Files> crashStates(const Files& before, const std::vector<String>& oper
 }
 
 TEST(Reordered, NamesNeverLoseTheEdit) {
-    const struct {
-        const char* what;
-        int undos;
-        std::function<bool()> action;
-        Names opened;
-    } steps[] = {
-        {"backup", 0, backUp, {"2"}},
-        {"undo", 0, undo, {"1", "2"}},
-        {"second undo", 1, undo, {"0", "1"}},
-        {"redo", 2, redo, {"0", "1"}},
-        {"delete", 0, deleteIt, {"2", "(null)"}},
-        {"recovery",
-         0,
-         [] {
-             return std::filesystem::remove(Qx::currentProject().folder() + "/E0001000.qme") &&
-                    ManagedProject::nameOf() == "1";
-         },
-         {"0", "1"}},
-    };
-    for (const auto& [what, undos, action, allowed] : steps) {
-        const Files files = prepare(undos);
+    for (const Action& action : kActions) {
+        if (action.changes || action.file == File::Cut) {
+            continue;
+        }
+        Files files = prepare(action.undos);
+        if (action.file == File::Missing) {
+            files.erase("E0001000.qme");
+        }
         std::vector<String> operations;
         {
-            const ManagedProject project(false);
-            for (const auto& [name, bytes] : files) {
-                project.write(name, bytes);
-            }
+            const auto project = projectOf(files);
             ManagedProject::startManager();
             test::FaultyFileSystem system;
-            ASSERT_TRUE(action());
+            ASSERT_TRUE(action.act()) << action.what;
             operations = system.operations();
         }
-        Files before = files;
-        if (String(what) == "recovery") {
-            before.erase("E0001000.qme");
-        }
-        for (const Files& state : crashStates(before, operations)) {
-            std::string names;
-            const ManagedProject project(false);
-            for (const auto& [name, bytes] : state) {
-                project.write(name, bytes);
-                names += name + " ";
-            }
+        Names allowed = action.opened;
+        allowed.insert(action.file == File::Missing ? "0" : *action.opened.begin());
+        for (const Files& state : crashStates(files, operations)) {
+            const auto project = projectOf(state);
             ManagedProject::startManager();
             const String opened = ManagedProject::nameOf();
-            EXPECT_TRUE(allowed.contains(opened)) << what << ": " << opened << " of " << names;
+            EXPECT_TRUE(allowed.contains(opened)) << action.what << ": " << opened;
         }
     }
 }
-
-INSTANTIATE_TEST_SUITE_P(
-    Manager, Killed,
-    testing::Values(Killing{"backup", 0, false, backUp, {"0", "1", "2"}, {"2"}},
-                    Killing{"backup of a changed edit", 0, true, backUp, {"0", "1"}, {"2", "new"}},
-                    Killing{"backup of a full chain", 0, false, backUp, {"1", "2"}, {"2"}, 2},
-                    Killing{"undo", 0, false, undo, {"0", "1", "2"}, {"1", "2"}},
-                    Killing{"undo of a changed edit", 0, true, undo, {"0", "1"}, {"1", "2", "new"}},
-                    Killing{"second undo", 1, false, undo, {"0", "1", "2"}, {"0", "1"}},
-                    Killing{"redo", 1, false, redo, {"0", "1", "2"}, {"0", "1", "2"}},
-                    Killing{"redo with more to come", 2, false, redo, {"0", "1", "2"}, {"0", "1"}},
-                    Killing{"recovery", 0, false, openAgain, {"0", "1"}, {"1"}, 10, true},
-                    Killing{"deletion", 0, false, deleteIt, {}, {"2", "(null)"}},
-                    Killing{"flush with a milestone", 0, true, flush, {"0", "1"}, {"2", "new"}}));
 
 } // namespace

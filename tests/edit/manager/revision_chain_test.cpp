@@ -5,9 +5,6 @@
 
 #include <gtest/gtest.h>
 
-#include <deque>
-#include <random>
-
 namespace {
 
 /// A chain drawn as text: the edit file's letter, then a letter a backup, '-' for none: "E:ab-d".
@@ -108,85 +105,6 @@ TEST(RevisionChain, NamesOnlyItsOwnFiles) {
     EXPECT_TRUE(deep.exists(exists) && exists && deep.push() && deep.restoreNewest(restored));
     EXPECT_EQ(system.count("list"), 0U) << "a folder may hold very many files";
     EXPECT_LT(system.numOperations(), 400U) << "nor does the depth cost anything";
-}
-
-TEST(RevisionChain, LosesNothingWhenItCannotTellWhatIsThere) {
-    for (const std::string before : {"E:ab-", "-:ab-"}) {
-        bool done = false;
-        for (size_t question = 1; !done; ++question) {
-            SCOPED_TRACE(testing::Message() << before << ", question " << question);
-            ChainFiles files(3);
-            files.draw(before);
-            test::FaultyFileSystem system;
-            system.failQuestion(question, ESTALE);
-            int restored = 0;
-            const bool answer =
-                before[0] == 'E' ? files.chain().push().isOk() : files.chain().restoreNewest(restored).isOk();
-            done = answer && system.numQuestions() < question;
-            std::string left = files.drawn(3);
-            EXPECT_TRUE(answer || left == before) << left;
-            std::sort(left.begin(), left.end());
-            std::string whole = before;
-            std::sort(whole.begin(), whole.end());
-            EXPECT_EQ(left, whole);
-            ASSERT_LT(question, 20U);
-        }
-    }
-}
-
-TEST(RevisionChain, RandomStepsMatchAModelAlsoWithFailures) {
-    for (unsigned seed = 1; seed <= 40; ++seed) {
-        SCOPED_TRACE(testing::Message() << "seed " << seed);
-        std::mt19937 random(seed);
-        const int depth = 1 + static_cast<int>(random() % 5);
-        ChainFiles files(depth);
-        test::FaultyFileSystem system;
-        std::deque<char> model;
-        char file = '-';
-        char next = 'a';
-        for (int step = 0; step < 60; ++step) {
-            const auto action = random() % 3;
-            if (file == '-' && action == 0) {
-                file = next;
-                files.draw(std::string(1, next) + ":");
-                next = next == 'z' ? 'a' : static_cast<char>(next + 1);
-            }
-            system.reset();
-            if (action == 0) {
-                if (random() % 2 == 0) {
-                    system.failAt(1 + random() % 20, EIO);
-                }
-                // What was moved before the failure is moved back.
-                if (files.chain().push()) {
-                    model.resize(std::min(model.size(), static_cast<size_t>(depth) - 1));
-                    model.push_front(file);
-                    file = '-';
-                }
-            } else if (action == 1) {
-                const bool fails = random() % 4 == 0;
-                if (fails) {
-                    system.failWhere("rename", EIO);
-                }
-                const bool restores = !fails && !model.empty() && file == '-';
-                int restored = 0;
-                EXPECT_EQ(files.chain().restoreNewest(restored).isOk(), restores || model.empty());
-                EXPECT_EQ(restored, restores ? 1 : 0);
-                if (restores) {
-                    file = model.front();
-                    model.pop_front();
-                }
-            } else if (random() % 4 == 0) {
-                const size_t keep = random() % 4;
-                EXPECT_TRUE(files.chain().deleteTail(static_cast<int>(keep)).isOk());
-                model.resize(std::min(model.size(), keep));
-            }
-            system.reset();
-            std::string expected = std::string(1, file) + ":";
-            expected.append(model.begin(), model.end());
-            expected.append(static_cast<size_t>(depth) - model.size(), '-');
-            ASSERT_EQ(files.drawn(depth), expected) << "step " << step;
-        }
-    }
 }
 
 } // namespace

@@ -71,6 +71,19 @@ TEST_F(SessionTest, AnswersOfWhatKindItsRefusalsAre) {
     EXPECT_FALSE(session.isOpen());
 }
 
+TEST_F(SessionTest, AProjectThatCouldNotBeLookedForIsNotMade) {
+    for (const char* const question : {"list", "info P0001000"}) {
+        test::FaultyFileSystem disk;
+        disk.failWhere(question, EIO);
+        Session session(root.path());
+        disk.reset();
+        SessionOptions options;
+        options.behaviour = eOpenOrCreate;
+        EXPECT_EQ(session.open(options).code(), Code::Refused) << question;
+        EXPECT_EQ(root.numNames(), 0U);
+    }
+}
+
 TEST_F(SessionTest, StaysOpenWithTheChangesWhileTheyCannotBeWritten) {
     Session session(root.path());
     ASSERT_TRUE(session.open());

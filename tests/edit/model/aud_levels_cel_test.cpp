@@ -8,17 +8,6 @@
 
 namespace {
 
-TEST(AudLevels, AnInvalidOneHasNoNodesAndTakesNone) {
-    AudLevelsCel none = AudLevelsCel::createInvalid();
-    EXPECT_FALSE(none.valid());
-    EXPECT_TRUE(none.is_dummy());
-    EXPECT_TRUE(none.getNodeStore().empty());
-    EXPECT_FALSE(none.insertNode(1, 1) || none.remove({0, 1}) || none.insert(none, {0, 1}, 0) ||
-                 none.replace(none, {0, 1}, 0) || none.simplify() || none.changed());
-    EXPECT_EQ(none.getExtents(), Editable::invalidRange());
-    EXPECT_FALSE(none.clone().valid());
-}
-
 TEST(AudLevels, CopiesShareAndClonesDoNot) {
     AudLevelsCel levels = AudLevelsCel::create();
     EXPECT_TRUE(levels.is_dummy());
@@ -76,34 +65,6 @@ public:
 };
 
 const cookie kItem(Cookie_Type::Edit, 1, 0);
-
-TEST(AudLevels, GoThroughTheObjectStore) {
-    const test::TemporaryFolder folder;
-    AudLevelsCel levels = AudLevelsCel::create();
-    levels.insertNode(1, 0.5f);
-    levels.insertNode(2, 0.75f);
-    {
-        TagBag store;
-        ASSERT_EQ(store.open(kItem, folder.path(), eOpenOrCreate, ".qme"), TagBag::NewStore);
-        levels.writeToStore(store);
-        ASSERT_TRUE(store.flush().isOk());
-        levels.extractFromStore(store);
-        levels.setChanged(false);
-        levels.writeToStore(store);
-        ASSERT_TRUE(store.flush().isOk());
-        EXPECT_EQ(store.numPacked(), 0u) << "what has not changed is not packed again";
-        levels.extractFromStore(store);
-    }
-    TagBag store;
-    ASSERT_EQ(store.open(kItem, folder.path(), eOpenExisting, ".qme"), TagBag::Opened);
-    AudLevelsCel again = AudLevelsCel::createFromStore(levels.id(), store);
-    ASSERT_TRUE(again.valid());
-    EXPECT_EQ(again.getNodeStore(), levels.getNodeStore());
-    EXPECT_EQ(again.id(), levels.id());
-    EXPECT_FALSE(again.changed());
-    EXPECT_FALSE(AudLevelsCel::createFromStore(IdStamp(9, 9, 9), store).valid());
-    EXPECT_FALSE(AudLevelsCel::createFromStore(IdStamp(), store).valid());
-}
 
 TEST(AudLevels, OfRevisionZeroGetTheNodesOfTheirClips) {
     const test::TemporaryFolder folder;

@@ -46,22 +46,6 @@ TEST_F(PairsOfAnEdit, AreFoundWhereTheyPlay) {
     EXPECT_FALSE(CelEventPair(EditPtr(), chan, 0).valid());
 }
 
-TEST_F(PairsOfAnEdit, AreMadeOfHandlesAndBareCels) {
-    cel* its = edit->getCel(chan);
-    const CelEventPair ofOut(edit, ce_handle(its, 3), index);
-    EXPECT_EQ(ofOut.getCelIdx(), 2);
-    EXPECT_EQ(ofOut.trackId(), chan);
-    EXPECT_EQ(ofOut.idx(), index);
-    EXPECT_EQ(ofOut, CelEventPair(edit, ce_handle(its, 2), chan));
-    EXPECT_FALSE(CelEventPair(EditPtr(), ce_handle(its, 2), chan).valid());
-    const CelEventPair governing(EditPtr(), its, 6.0);
-    EXPECT_EQ(governing.getCelIdx(), 2) << "a bare cel gives the pair that governs, playing or not";
-    EXPECT_FALSE(governing.trackId().valid());
-    EXPECT_EQ(governing.idx(), NO_CHAN);
-    EXPECT_FALSE(CelEventPair(EditPtr(), nullptr, 6.0).valid());
-    EXPECT_TRUE(CelEventPair(EditPtr(), its, ce_handle(its, 4)).valid());
-}
-
 TEST_F(PairsOfAnEdit, AnswerForTheirSpanAndForNone) {
     CelEventPair pair = at(3);
     EXPECT_EQ(pair.editTime(), 3);

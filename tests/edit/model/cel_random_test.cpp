@@ -1,8 +1,9 @@
-// Thousands of operations on a cel and on a model that holds what each second shows.
+// Thousands of operations on a cel and on a row that holds what each second shows.
 
 #include "edit/model/cel.h"
 #include "platform/store/pstream.h"
 #include "support/cel_layout.h"
+#include "support/row_model.h"
 
 #include <gtest/gtest.h>
 
@@ -11,104 +12,25 @@
 
 namespace {
 
-/// What one second shows: a source, the second of it, and the level in the middle.
-struct Second {
-    char letter = ' ';
-    long strip = 0;
-    double level = 0;
-};
-
-using Model = std::vector<Second>;
-
-Model part(const Model& of, size_t from, size_t to) {
-    Model taken(to - from);
-    for (size_t i = from; i < to && i < of.size(); ++i) {
-        taken[i - from] = of[i];
-    }
-    return taken;
-}
-
-void insert(Model& its, const Model& laid, size_t at) {
-    its.resize(std::max(its.size(), at));
-    its.insert(its.begin() + static_cast<std::ptrdiff_t>(at), laid.begin(), laid.end());
-}
-
-void remove(Model& its, size_t from, size_t to) {
-    from = std::min(from, its.size());
-    to = std::min(to, its.size());
-    its.erase(its.begin() + static_cast<std::ptrdiff_t>(from), its.begin() + static_cast<std::ptrdiff_t>(to));
-}
-
-void replace(Model& its, const Model& laid, size_t at, bool materialOnly) {
-    its.resize(std::max(its.size(), at + laid.size()));
-    for (size_t i = 0; i < laid.size(); ++i) {
-        Second& second = its[at + i];
-        if (!materialOnly || second.letter == ' ') {
-            second = laid[i];
-        } else {
-            second.letter = laid[i].letter == ' ' ? '.' : laid[i].letter;
-            second.strip = laid[i].strip;
-        }
-    }
-}
-
-Model modelOf(const cel& its) {
-    Model model(static_cast<size_t>(std::lround(its.get_end_time())));
-    for (size_t i = 0; i < model.size(); ++i) {
-        const double middle = static_cast<double>(i) + 0.5;
-        const CEHPair pair(its, middle);
-        if (pair.valid()) {
-            const channel_event in = pair.inH().get_channel_event();
-            model[i].letter = layout::letterOf(in.strip);
-            model[i].strip = std::lround(pair.inH().get_strip_time(middle) - 0.5);
-            model[i].level = double{pair.inH().get_strip_level(middle)};
-        }
-    }
-    return model;
-}
-
-::testing::AssertionResult same(const cel& its, Model expected) {
-    while (!expected.empty() && expected.back().letter == ' ') {
-        expected.pop_back();
-    }
-    const Model found = modelOf(its);
-    if (found.size() != expected.size()) {
-        return ::testing::AssertionFailure() << found.size() << " seconds, not " << expected.size();
-    }
-    for (size_t i = 0; i < found.size(); ++i) {
-        const bool black = expected[i].letter == '.' || expected[i].letter == ' ';
-        if (found[i].letter != expected[i].letter || (!black && found[i].strip != expected[i].strip) ||
-            std::abs(found[i].level - expected[i].level) > 1e-3) {
-            return ::testing::AssertionFailure()
-                   << "second " << i << " shows '" << found[i].letter << found[i].strip << "' at "
-                   << found[i].level << ", not '" << expected[i].letter << expected[i].strip << "' at "
-                   << expected[i].level;
-        }
-    }
-    return ::testing::AssertionSuccess();
-}
+using rows::Row;
 
 class Random {
 public:
     explicit Random(unsigned seed) : m_engine(seed) {}
-    size_t below(size_t limit) { return m_engine() % limit; }
+    int below(int limit) { return static_cast<int>(m_engine() % static_cast<unsigned>(limit)); }
     /// A whole second, or so near to one that it counts as that even when many such have added up.
-    double near(size_t second) {
+    double near(int second) {
         static constexpr double kNoise[] = {0, 0, 1e-10, -1e-10, 1e-12, -1e-12};
-        return static_cast<double>(second) + kNoise[below(6)];
+        return second + kNoise[below(6)];
     }
-
     cel freshCel() {
         cel its;
-        double time = static_cast<double>(below(3));
-        for (size_t pairs = below(6); pairs > 0; --pairs) {
-            const double length = static_cast<double>(1 + below(5));
+        double time = below(3);
+        for (int pairs = below(6); pairs > 0; --pairs) {
+            const double length = 1 + below(5);
             const char letter = below(4) == 0 ? '.' : static_cast<char>('A' + below(20));
-            const double strip = static_cast<double>(below(1000));
-            ce_handle in = its.appendEventPair(layout::sourceOf(letter), strip, time, length);
-            in.set_strip_level(static_cast<float>(below(5)) / 4);
-            in.matching_out_ceh().set_strip_level(static_cast<float>(below(5)) / 4);
-            time += length + static_cast<double>(below(8) == 0 ? below(4) : 0);
+            its.appendEventPair(layout::sourceOf(letter), below(1000), time, length);
+            time += length + (below(8) == 0 ? below(4) : 0);
         }
         return its;
     }
@@ -117,78 +39,86 @@ private:
     std::mt19937 m_engine;
 };
 
-void run(unsigned seed, int steps) {
-    SCOPED_TRACE("seed " + std::to_string(seed));
-    Random random(seed);
-    cel its;
-    Model model;
-    for (int step = 0; step < steps; ++step) {
-        const cel other = random.freshCel();
-        const bool own = random.below(4) == 0;
-        const cel* source = own ? &its : &other;
-        const Model sourceModel = own ? model : modelOf(other);
-        const size_t from = random.below(12);
-        const size_t to = from + 1 + random.below(10);
-        const size_t at = random.below(model.size() + 4);
-        const size_t operation = model.size() > 120 ? 1 : random.below(6);
-        const cel::Range range(random.near(from), random.near(to));
-        cel::IdMap ids;
-        bool done = true;
-        // A copy shares the events until one of the two is changed: every other step has one to disturb.
-        const bool copied = random.below(2) == 0;
-        const cel before(copied ? its : cel());
-        const Model modelBefore = copied ? model : Model();
-        switch (operation) {
-        case 0:
-            done = its.insert(source, range, random.near(at), ids);
-            insert(model, part(sourceModel, from, to), at);
-            break;
-        case 1:
-            done = its.remove({random.near(at), random.near(at + to - from)});
-            remove(model, at, at + to - from);
-            break;
-        case 2:
-        case 3:
-            done = its.replace(source, range, random.near(at), ids, operation == 3);
-            replace(model, part(sourceModel, from, to), at, operation == 3);
-            break;
-        case 4: {
-            const auto taken = its.extract(random.near(from), random.near(to));
-            ASSERT_NE(taken, nullptr);
-            ASSERT_TRUE(same(*taken, part(model, from, to))) << "extract in step " << step;
-            its.simplify(Simplification::MergeThrough);
-            break;
-        }
-        default: {
-            PStream packed;
-            its.STRM_hierarchyPack(packed);
-            PStream stream{std::span<const std::byte>(packed.bytes())};
-            cel again;
-            ASSERT_TRUE(again.STRM_hierarchyUnpack(stream));
-            ASSERT_EQ(again.numEvents(), its.numEvents());
-            for (int i = 0; i < its.numEvents(); ++i) {
-                ASSERT_EQ(again.get_event(i), its.get_event(i));
-            }
-        }
-        }
-        ASSERT_TRUE(done) << "operation " << operation << " in step " << step;
-        while (!model.empty() && model.back().letter == ' ') {
-            model.pop_back();
-        }
-        ASSERT_TRUE(same(its, model)) << "operation " << operation << " in step " << step;
-        ASSERT_TRUE(same(before, modelBefore)) << "the copy, operation " << operation << " in step " << step;
-        ASSERT_EQ(layout::faultOf(its, 0.9), "") << "operation " << operation << " in step " << step;
-        for (const auto& [old, fresh] : ids) {
-            ASSERT_NE(its.findId(fresh).valid(), 0) << "operation " << operation << " in step " << step;
-        }
+Row rowOf(const cel& its) {
+    std::string problem;
+    Row row = rows::rowOf(its, 1, problem);
+    EXPECT_EQ(problem, "");
+    return row;
+}
+
+void expectRepacks(const cel& its) {
+    PStream packed;
+    its.STRM_hierarchyPack(packed);
+    PStream stream{std::span<const std::byte>(packed.bytes())};
+    cel again;
+    ASSERT_TRUE(again.STRM_hierarchyUnpack(stream));
+    ASSERT_EQ(again.numEvents(), its.numEvents());
+    for (int i = 0; i < its.numEvents(); ++i) {
+        ASSERT_EQ(again.get_event(i), its.get_event(i));
     }
 }
 
-TEST(CelRandom, AgreesWithASecondBySecondModel) {
+void run(Random& random, int step, cel& its, Row& row) {
+    const cel other = random.freshCel();
+    const bool own = random.below(4) == 0;
+    const cel* const source = own ? &its : &other;
+    const int from = random.below(12);
+    const int length = 1 + random.below(10);
+    const int at = random.below(rows::lengthOf(row) + 4);
+    const Row taken = rows::part(own ? row : rowOf(other), from, length);
+    const int operation = row.size() > 120 ? 1 : random.below(6);
+    const cel::Range range(random.near(from), random.near(from + length));
+    cel::IdMap ids;
+    // A copy shares the events until one of the two is changed: every other step has one to disturb.
+    const bool copied = random.below(2) == 0;
+    const cel before(copied ? its : cel());
+    const Row rowBefore = copied ? row : Row();
+    SCOPED_TRACE(testing::Message() << "operation " << operation << " in step " << step);
+    switch (operation) {
+    case 0:
+        ASSERT_TRUE(its.insert(source, range, random.near(at), ids));
+        rows::insert(row, at, taken);
+        break;
+    case 1:
+        ASSERT_TRUE(its.remove({random.near(at), random.near(at + length)}));
+        rows::remove(row, at, at + length);
+        break;
+    case 2:
+    case 3:
+        ASSERT_TRUE(its.replace(source, range, random.near(at), ids, operation == 3));
+        rows::put(row, at, taken, operation == 3);
+        break;
+    case 4: {
+        const auto part = its.extract(random.near(from), random.near(from + length));
+        ASSERT_NE(part, nullptr);
+        Row expected = rows::part(row, from, length);
+        expected.resize(rowOf(*part).size());
+        ASSERT_EQ(rowOf(*part), expected);
+        its.simplify(Simplification::MergeThrough);
+        break;
+    }
+    default:
+        expectRepacks(its);
+    }
+    while (!row.empty() && row.back() == rows::kGap) {
+        row.pop_back();
+    }
+    ASSERT_EQ(rowOf(its), row);
+    ASSERT_EQ(rowOf(before), rowBefore) << "the copy";
+    ASSERT_EQ(layout::faultOf(its, 0.9), "");
+    for (const auto& [old, fresh] : ids) {
+        ASSERT_NE(its.findId(fresh).valid(), 0);
+    }
+}
+
+TEST(CelRandom, AgreesWithARowOfSeconds) {
     for (const unsigned seed : {1u, 2u, 3u, 5u, 8u, 13u, 21u, 34u}) {
-        run(seed, 1500);
-        if (testing::Test::HasFatalFailure()) {
-            return;
+        SCOPED_TRACE("seed " + std::to_string(seed));
+        Random random(seed);
+        cel its;
+        Row row;
+        for (int step = 0; step < 1500; ++step) {
+            ASSERT_NO_FATAL_FAILURE(run(random, step, its, row));
         }
     }
 }

@@ -1,15 +1,12 @@
 // The packed form, and streams that lie.
 
 #include "edit/model/cel.h"
-#include "platform/media/level_store.h"
 #include "platform/store/pstream.h"
 #include "support/cel_layout.h"
-#include "support/memory_meter.h"
 
 #include <gtest/gtest.h>
 
 #include <cstring>
-#include <random>
 
 namespace {
 
@@ -49,26 +46,6 @@ TEST(CelStream, CarriesEverything) {
     EXPECT_EQ(packed(again), packed(its));
     const auto built = Streamable::build(its.layerName());
     EXPECT_NE(dynamic_cast<cel*>(built.get()), nullptr);
-}
-
-TEST(CelStream, AnyCutStreamIsRefusedAndLeavesTheCel) {
-    const Bytes whole = packed(makeNamed());
-    for (size_t size = 0; size < whole.size(); ++size) {
-        cel its = layout::make("XX");
-        ASSERT_FALSE(reads(Bytes(whole.begin(), whole.begin() + static_cast<std::ptrdiff_t>(size)), its))
-            << size;
-        ASSERT_EQ(layout::draw(its), "XX");
-        ASSERT_TRUE(its.editChannelName().empty());
-    }
-}
-
-TEST(CelStream, ACountThatTheStreamCannotHoldTakesNoMemory) {
-    Bytes bytes = packed(cel());
-    const uint32_t count = 4000000000u;
-    constexpr size_t kCountAt = 4 + 12 + 4 + 4 + 8; // behind the texts, the stamp and the resolution
-    std::memcpy(bytes.data() + kCountAt, &count, 4);
-    cel its;
-    EXPECT_FALSE(reads(bytes, its));
 }
 
 TEST(CelStream, EveryFieldIsChecked) {
@@ -153,46 +130,6 @@ TEST(CelStream, ManyEventsMayStayWhereTheyLie) {
     lying.get_start_ceh().set_edit_time(0.5);
     EXPECT_EQ(lying.find_ceh(0.4, CE_IN_POINT).valid(), 0);
     EXPECT_EQ(*kept, before) << "what is kept never changes";
-}
-
-TEST(CelStream, RandomDamageNeverMakesABadCel) {
-    const Bytes whole = packed(makeNamed());
-    for (unsigned seed = 1; seed <= 4000; ++seed) {
-        std::mt19937 random(seed);
-        Bytes bytes = whole;
-        for (auto changes = 1 + random() % 4; changes > 0; --changes) {
-            bytes[random() % bytes.size()] = static_cast<std::byte>(random() & 0xff);
-        }
-        cel its;
-        if (reads(bytes, its)) {
-            ASSERT_NE(its.is_good_cel(), 0) << "seed " << seed;
-        } else {
-            ASSERT_EQ(its.numEvents(), 0) << "seed " << seed;
-        }
-    }
-}
-
-TEST(CelStream, UnpackingTakesBoundedMemory) {
-    cel its;
-    Aud::DynamicLevelControl::Store levels;
-    for (int i = 0; i < 20'000; ++i) {
-        ASSERT_NE(its.appendEventPair(cookie("E0001000"), 0, i, 1).valid(), 0);
-        levels.insertNode(i, 0.5F);
-    }
-    const auto within = [](const Bytes& bytes, auto& into) {
-        const test::MemoryMeter meter;
-        PStream stream{std::span<const std::byte>(bytes)};
-        into.unpack(stream);
-        EXPECT_TRUE(stream.good());
-        EXPECT_LE(meter.peak(), 4 * bytes.size() + (64U << 10));
-    };
-    cel readCel;
-    within(packed(its), readCel);
-    PStream stream;
-    levels.pack(stream);
-    Aud::DynamicLevelControl::Store readLevels;
-    within(stream.bytes(), readLevels);
-    EXPECT_EQ(readLevels, levels);
 }
 
 TEST(CelStream, AnOpenPairIsNotPacked) {

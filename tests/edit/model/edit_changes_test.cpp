@@ -57,30 +57,6 @@ public:
 
 using Calls = std::vector<String>;
 
-TEST(Dirt, ACleanEditGoesOntoTheDirtyListOnce) {
-    RecordingRegistry registry;
-    const EditPtr edit = EditBuilder().item(kItem).build();
-    (void)registry.take();
-    edit->set_dirty(true);
-    edit->set_dirty(true);
-    EXPECT_EQ(registry.take(), Calls{"dirty E0016001"});
-    edit->set_dirty(false);
-    edit->init_dirty();
-    EXPECT_TRUE(edit->get_dirty());
-    EXPECT_EQ(registry.take(), Calls{});
-}
-
-TEST(Dirt, TracesCleaningWhenTracing) {
-    const EditPtr edit = EditBuilder().item(kItem).build();
-    edit->init_dirty();
-    const RecordingLog log;
-    edit->set_dirty(false);
-    Qx::setTrace(true);
-    edit->set_dirty(false);
-    Qx::setTrace(false);
-    EXPECT_EQ(log.log(), "edit\"E0016001\" dirty was 0\n");
-}
-
 TEST(Dirt, OtherMachinesHearWhoChangesWhat) {
     const std::shared_ptr<RecordingNetwork> network = RecordingNetwork::install();
     const EditPtr edit = EditBuilder().item(kItem).build();
@@ -109,6 +85,10 @@ TEST(ReadOnly, AnEditStaysCleanAndSaysSo) {
     const EditPtr edit = EditBuilder().item(kItem).video(1).build();
     edit->set_read_only(true);
     EXPECT_TRUE(edit->needsToBeWritten()) << "the property itself is saved";
+    edit->setTemporary(true);
+    EXPECT_FALSE(edit->needsToBeWritten());
+    EXPECT_TRUE(edit->get_dirty()) << "a temporary edit stays as it is";
+    edit->setTemporary(false);
     EXPECT_EQ(registry.take().back(), "dirty E0016001");
     edit->set_dirty(false);
     const RecordingLog log;
@@ -133,25 +113,6 @@ TEST(ReadOnly, ForTheUserIsNeverWritten) {
     EXPECT_FALSE(edit->needsToBeWritten());
     EXPECT_FALSE(edit->get_dirty()) << "asking makes it clean";
     ASSERT_TRUE(PermissionsManager::setReadOnly(kItem, false));
-}
-
-TEST(Writing, DependsOnDirtAndOnWhatTheEditIs) {
-    const EditPtr edit = EditBuilder().video(1).audio(1).levels(1).clips({1}).build();
-    EXPECT_FALSE(edit->needsToBeWritten());
-    edit->get_edit_cel_p(0)->setChanged(true);
-    EXPECT_FALSE(edit->isDirty(false));
-    EXPECT_TRUE(edit->needsToBeWritten());
-    edit->get_edit_cel_p(0)->setChanged(false);
-    edit->getLevelsCel(edit->getId(2)).setChanged(true);
-    EXPECT_TRUE(edit->isDirty(true));
-    edit->set_dirty(true);
-    edit->setTemporary(true);
-    EXPECT_FALSE(edit->needsToBeWritten());
-    EXPECT_TRUE(edit->get_dirty()) << "a temporary edit stays as it is";
-    edit->setTemporary(false);
-    edit->setWriteSuppressed(true);
-    EXPECT_FALSE(edit->needsToBeWritten());
-    EXPECT_FALSE(edit->get_dirty());
 }
 
 TEST(Description, RecordsCountsAndMerges) {
@@ -299,42 +260,6 @@ TEST(Notification, OfTheEditItself) {
     EXPECT_EQ(Edit::getEditChangedNotifyMsgType(), NotifyMsgType("editChanged"));
 }
 
-TEST(Notification, FindsTheModelInItsNewState) {
-    const EditPtr edit = EditBuilder().item(kItem).video(1).build();
-    cel* const content = new cel;
-    bool seen = false;
-    const auto guard = edit->addListener(Edit::getChanAddedNotifyMsgType(), [&](const NotifyMsg&) {
-        seen = true;
-        EXPECT_EQ(edit->getNumChans(), 2);
-        EXPECT_EQ(edit->get_edit_cel_p(1), content);
-        EXPECT_EQ(edit->getChangeDescription().type(), kChansInserted);
-        EXPECT_TRUE(edit->get_dirty());
-    });
-    edit->addChan(AudioChan, content);
-    EXPECT_TRUE(seen);
-}
-
-TEST(Listeners, MayEditSubscribeAndUnsubscribeWhileTold) {
-    const EditPtr edit = EditBuilder().item(kItem).video(1).build();
-    Qx::Ptr<Qx::Guard> own;
-    Qx::Ptr<Qx::Guard> late;
-    int added = 0;
-    int heardLate = 0;
-    own = edit->addListener(Edit::getChanAddedNotifyMsgType(), [&](const NotifyMsg&) {
-        ++added;
-        own.reset();
-        late = edit->addListener(Edit::getChanAddedNotifyMsgType(), [&](const NotifyMsg&) { ++heardLate; });
-        EXPECT_TRUE(edit->removeChan(edit->getId(0), true));
-        EXPECT_TRUE(edit->insertChans(AudioChan, Edit_Chan_SubType::NONE, NO_CHAN, 1, false, true, 0));
-    });
-    EXPECT_TRUE(edit->insertChans(VideoChan, Edit_Chan_SubType::NONE, NO_CHAN, 1, false, true, 0));
-    EXPECT_EQ(added, 1);
-    EXPECT_EQ(heardLate, 1) << "of the insertion that the first listener made";
-    EXPECT_EQ(edit->getNumChans(), 2);
-    EXPECT_EQ(edit->getChanType(0), VideoChan);
-    EXPECT_EQ(edit->getChangeDescription().type(), kSeveral);
-}
-
 TEST(Listeners, MayDropTheLastHandleWhileTold) {
     struct Case {
         const char* what;
@@ -362,6 +287,27 @@ TEST(Listeners, MayDropTheLastHandleWhileTold) {
         EXPECT_GE(told, 1);
         EXPECT_FALSE(edit.valid());
     }
+}
+
+TEST(Listeners, MayEditSubscribeAndUnsubscribeWhileTold) {
+    const EditPtr edit = EditBuilder().item(kItem).video(1).build();
+    Qx::Ptr<Qx::Guard> own;
+    Qx::Ptr<Qx::Guard> late;
+    int added = 0;
+    int heardLate = 0;
+    own = edit->addListener(Edit::getChanAddedNotifyMsgType(), [&](const NotifyMsg&) {
+        ++added;
+        own.reset();
+        late = edit->addListener(Edit::getChanAddedNotifyMsgType(), [&](const NotifyMsg&) { ++heardLate; });
+        EXPECT_TRUE(edit->removeChan(edit->getId(0), true));
+        EXPECT_TRUE(edit->insertChans(AudioChan, Edit_Chan_SubType::NONE, NO_CHAN, 1, false, true, 0));
+    });
+    EXPECT_TRUE(edit->insertChans(VideoChan, Edit_Chan_SubType::NONE, NO_CHAN, 1, false, true, 0));
+    EXPECT_EQ(added, 1);
+    EXPECT_EQ(heardLate, 1) << "of the insertion that the first listener made";
+    EXPECT_EQ(edit->getNumChans(), 2);
+    EXPECT_EQ(edit->getChanType(0), VideoChan);
+    EXPECT_EQ(edit->getChangeDescription().type(), kSeveral);
 }
 
 } // namespace

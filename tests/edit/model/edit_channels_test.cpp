@@ -7,8 +7,6 @@
 #include <gtest/gtest.h>
 
 #include <limits>
-#include <random>
-#include <set>
 
 using test::EditBuilder;
 using test::editState;
@@ -190,65 +188,6 @@ TEST(Insertion, NoIndexReachesNoChan) {
     EXPECT_TRUE(edit->removeChans(false));
 }
 
-TEST(Insertion, OfContentHandsItOver) {
-    const EditPtr edit = EditBuilder().video(1).build();
-    auto content = std::make_unique<cel>();
-    content->appendEventPair(black_cookie, 0, 0, 3);
-    cel* const raw = content.release();
-    const int index = edit->addChan(AudioChan, raw, true, Sub::NONE, false, 10.0);
-    EXPECT_EQ(index, 1);
-    EXPECT_EQ(edit->get_edit_cel_p(index), raw);
-    EXPECT_DOUBLE_EQ(raw->get_end_time(), 3.0);
-    // 1 is "no cel" as well as null.
-    EXPECT_EQ(edit->addChan(VideoChan, reinterpret_cast<cel*>(uintptr_t{1})), 1);
-    EXPECT_NE(edit->get_edit_cel_p(1), nullptr);
-}
-
-TEST(Removal, OfAnAudioChannelTakesItsLevelsGroupsAndCues) {
-    const EditPtr edit = EditBuilder().video(1).audio(3).levels(2).clips({2, 3}).build();
-    Vector<cel*> cels;
-    for (int i = 0; i < 4; ++i) {
-        cels.push_back(edit->get_edit_cel_p(i));
-    }
-    const IdStamp a1 = edit->getId(1);
-    const IdStamp a2 = edit->getId(2);
-    edit->groupChannels({a1, a2}, ChannelGroup::eStereo);
-    for (int chan = 0; chan < 4; ++chan) {
-        edit->get_cues().add_cue_point("cue", 1.0 + chan, chan, 0, cels, true);
-    }
-    const IdStamp levels = edit->getAudCel(a1).getLevelsChanID();
-    EXPECT_TRUE(edit->removeChan(a1, true));
-    EXPECT_EQ(layout(*edit), "V1 A1 A2 L1");
-    EXPECT_EQ(edit->getIdx(levels), NO_CHAN);
-    EXPECT_EQ(edit->getIdx(a2), 1);
-    EXPECT_FALSE(edit->isGrouped(a2));
-    ASSERT_EQ(edit->get_cues().get_num_cue_points(0), 3U);
-    const int chans[] = {0, 1, 2};
-    for (size_t i = 0; i < 3; ++i) {
-        EXPECT_EQ(edit->get_cues().get_cue_point(i, 0)->channel(), chans[i]);
-    }
-    // A levels channel alone leaves its audio channel without.
-    EXPECT_TRUE(edit->removeChan(edit->getAudCel(a2).getLevelsChanID(), false));
-    EXPECT_FALSE(edit->getAudCel(a2).getLevelsChanID().valid());
-
-    EXPECT_FALSE(edit->removeChan(a1, true));
-    EXPECT_TRUE(edit->removeChans(true));
-    EXPECT_EQ(edit->getNumChans(), 0);
-    EXPECT_EQ(edit->get_cues().get_num_cue_points(0), 0U);
-    edit->set_dirty(false);
-    EXPECT_FALSE(edit->removeChans(true));
-    EXPECT_FALSE(edit->get_dirty());
-}
-
-TEST(Insertion, RenumbersTheCuesOfTheChannelsBehind) {
-    const EditPtr edit = EditBuilder().video(1).audio(1).build();
-    edit->get_cues().add_cue_point("video", 1.0, 0, 0, {}, false);
-    edit->get_cues().add_cue_point("audio", 1.0, 1, 0, {}, false);
-    ASSERT_TRUE(edit->insertChans(VideoChan, Sub::NONE, 0, 2, false, false, 0));
-    EXPECT_EQ(edit->get_cues().get_cue_point(0, 0)->channel(), 0);
-    EXPECT_EQ(edit->get_cues().get_cue_point(1, 0)->channel(), 3);
-}
-
 TEST(Channels, RefusedChangesOfThemChangeNothing) {
     const EditPtr edit = EditBuilder().video(1).audio(2).levels(1).clips({1}).build();
     const EditPtr other = EditBuilder().audio(1).levels(1).build();
@@ -353,24 +292,6 @@ TEST(Channels, KeepTheirPropertiesThroughChangesOfCelAndStamp) {
     EXPECT_EQ(edit->getCel(stamp), fresh);
 }
 
-TEST(Channels, ThatWereReadTakeTheirStampAndName) {
-    const EditPtr edit = EditBuilder().build();
-    const IdStamp stamp = IdStamp::fresh(IdStampMagic::Channel);
-    const auto read = [&](const char* name, const IdStamp& id) {
-        auto content = std::make_shared<cel>();
-        content->editChannelInfo(name, id, "SUBTYPE:NONE", "roll 4");
-        return edit->setupEditChannel({VideoChan, Sub::NONE}, content);
-    };
-    EXPECT_EQ(read("V1", stamp), stamp);
-    const IdStamp second = read("Grade", stamp);
-    EXPECT_NE(second, stamp) << "a taken stamp is replaced";
-    EXPECT_TRUE(read("V2", IdStamp()).valid());
-    EXPECT_EQ(edit->getChanName(stamp), "") << "the standard name is none of its own";
-    EXPECT_EQ(layout(*edit), "V1 Grade V2");
-    EXPECT_EQ(edit->getMaterialInfo(second), "roll 4");
-    EXPECT_FALSE(edit->get_dirty());
-}
-
 TEST(Extent, SkipsChannelsThatHoldNothing) {
     const EditPtr edit = EditBuilder().video(2).audio(1).levels(1).build();
     EXPECT_EQ(edit->getStartTime(), 0.0);
@@ -408,81 +329,6 @@ TEST(Copy, IsDeepAndKeepsStamps) {
     copy->setChanName(copy->getId(1), "other");
     EXPECT_EQ(editState(*edit), before);
     EXPECT_EQ(copy->get_cues().get_cue_point(0, 0)->event().get_its_cel(), copy->get_edit_cel_p(1));
-}
-
-/// Channels come and go at random; beside the edit runs a plain list of (kind, name).
-TEST(RandomChannels, AgreeWithAPlainList) {
-    struct Plain {
-        int kind; ///< 0 effects, 1 video, 2 audio, 3 levels
-        IdStamp id;
-    };
-    constexpr Edit::ChanType kTypes[] = {
-        {VideoChan, Sub::ALIAS}, {VideoChan, Sub::NONE}, {AudioChan, Sub::NONE}, {}};
-    for (const unsigned seed : {1U, 2U, 3U}) {
-        SCOPED_TRACE(seed);
-        std::mt19937 random(seed);
-        const EditPtr edit = EditBuilder().build();
-        std::vector<Plain> plain;
-        const test::RecordingLog log;
-        const auto count = [&](int kind) {
-            return std::count_if(plain.begin(), plain.end(), [&](const Plain& p) { return p.kind == kind; });
-        };
-        const auto firstAfter = [&](int kind) {
-            return std::find_if(plain.begin(), plain.end(), [&](const Plain& p) { return p.kind > kind; });
-        };
-        std::set<IdStamp> seen;
-        for (int step = 0; step < 600; ++step) {
-            const int kind = static_cast<int>(random() % 3);
-            const int at = static_cast<int>(random() % (plain.size() + 2));
-            if (random() % 5 < 2 && !plain.empty()) {
-                const size_t which = random() % plain.size();
-                const IdStamp gone = plain[which].id;
-                const IdStamp levels = edit->getAudCel(gone).getLevelsChanID();
-                ASSERT_TRUE(edit->removeChan(gone, random() % 2 == 0));
-                std::erase_if(plain, [&](const Plain& p) {
-                    return p.id == gone || (levels.valid() && p.id == levels);
-                });
-            } else if (random() % 4 == 0) {
-                const IdStamp audio = edit->getId(at);
-                const bool can =
-                    edit->getChanType(at) == AudioChan && !edit->getAudCel(audio).getLevelsChanID().valid();
-                const IdStamp levels = edit->addLevelsChan(audio, AudLevelsCel::create());
-                ASSERT_EQ(levels.valid(), can);
-                if (can) {
-                    plain.push_back({3, levels});
-                }
-            } else {
-                const unsigned number = static_cast<unsigned>(random() % 3) + 1;
-                const bool before = random() % 2 == 0;
-                const bool fits = kind == 0 || count(kind) + number <= (kind == 1 ? 24U : 32U);
-                auto place = firstAfter(kind);
-                const size_t wanted = static_cast<size_t>(before ? at : at + 1);
-                if (static_cast<size_t>(at) < plain.size() && wanted < plain.size() &&
-                    plain[wanted].kind == kind) {
-                    place = plain.begin() + static_cast<ptrdiff_t>(wanted);
-                }
-                const int index = static_cast<int>(place - plain.begin());
-                ASSERT_EQ(edit->insertChans(kTypes[kind].type, kTypes[kind].subtype, at, number, before,
-                                            random() % 2 == 0, 0),
-                          fits);
-                for (unsigned i = 0; fits && i < number; ++i) {
-                    const IdStamp id = edit->getId(index + static_cast<int>(i));
-                    ASSERT_TRUE(seen.insert(id).second) << "a stamp twice";
-                    plain.insert(plain.begin() + index + static_cast<int>(i), {kind, id});
-                }
-            }
-            ASSERT_EQ(edit->getNumChans(), static_cast<int>(plain.size())) << "step " << step;
-            for (size_t i = 0; i < plain.size(); ++i) {
-                const int index = static_cast<int>(i);
-                ASSERT_EQ(edit->getId(index), plain[i].id) << "step " << step;
-                ASSERT_EQ(edit->getIdx(plain[i].id), index);
-                ASSERT_EQ(edit->getChanTypeAndSubType(plain[i].id), kTypes[plain[i].kind]);
-                ASSERT_EQ(edit->getCel(plain[i].id), edit->get_edit_cel_p(index));
-                const IdStamp levels = edit->getAudCel(plain[i].id).getLevelsChanID();
-                ASSERT_TRUE(!levels.valid() || edit->getLevelsCel(levels).valid());
-            }
-        }
-    }
 }
 
 } // namespace

@@ -37,37 +37,18 @@ TEST(NewEdit, IsCleanAndHasTheDefaultsOfTheProject) {
     const uint64_t constructed = Edit::numConstructed();
     const Edit edit;
     Qx::setClock(before);
-
     EXPECT_EQ(Edit::numConstructed(), constructed + 1);
     EXPECT_EQ(edit.refCount(), 0);
-    EXPECT_EQ(test::editState(edit), "edit " + invalid_cookie.asString() +
-                                         " clean\n"
-                                         "  READ_ONLY = no\n"
-                                         "  IS_BACKUP = 0\n"
-                                         "  ORIGINAL_MATERIAL = 0\n"
-                                         "  HIDDEN = 0\n"
-                                         "  SEARCH_EDIT = 0\n"
-                                         "  UNDO_COOKIE = <" +
-                                         invalid_cookie.asString() + ">\n  REDO_COOKIE = <" +
-                                         invalid_cookie.asString() +
-                                         ">\n"
-                                         "  PROJECT_COOKIE = <P0007001>\n"
-                                         "  CREATION_TIME = 591751049\n"
-                                         "  MODIFICATION_TIME = 591751049\n"
-                                         "  MOD_TIME_V3 = 591751049\n"
-                                         "  MODIFICATION_PROGRAM = \"11.1.0.0\"\n"
-                                         "  ED2_REVISION = 602\n"
-                                         "  FRAME_RATE = 4\n"
-                                         "  SOURCE_MEDIUM = 5\n"
-                                         "  FRAME_BASED = 1\n"
-                                         "  TRANSFER = 3\n"
-                                         "  OWNER = \"Jo\"\n"
-                                         "time 0 mark 1e+99\n");
+    EXPECT_FALSE(edit.get_dirty());
+    EXPECT_EQ(edit.Opts().getCookie("PROJECT_COOKIE"), cookie("P0007001"));
+    EXPECT_EQ(edit.getCreationTime(), 0x2345'6789) << "32 bits of the clock";
+    EXPECT_EQ(edit.get_ed2_revision(), 602);
+    EXPECT_EQ(edit.Opts().getInt("SOURCE_MEDIUM"), 5);
+    EXPECT_EQ(edit.getOwner(), "Jo");
     EXPECT_TRUE(edit.isEdit());
     EXPECT_FALSE(edit.mark_is_valid());
     EXPECT_EQ(edit.getFrameRate(), Qx::FrameRate(Qx::FrameRate::Fps29_97));
     EXPECT_EQ(edit.getChangeDescription().type(), kNotDescribed);
-    EXPECT_EQ(edit.getCreationProgram(), "");
 }
 
 TEST(Header, EveryChangeOfItDirtiesTheEditAndNoOther) {
@@ -118,15 +99,6 @@ TEST(Header, DurationOfTheSourceCountsFromRevision503On) {
         edit.clear_cache_flags();
         EXPECT_EQ(edit.getSourceMediumDuration(), seconds) << revision;
     }
-}
-
-TEST(Header, RevisionIsCachedAndItsKeyGoesWithTheUnknownValue) {
-    Edit edit;
-    edit.set_ed2_revision(310);
-    EXPECT_EQ(edit.Opts().getInt("ED2_REVISION"), 310);
-    edit.set_ed2_revision(-1);
-    EXPECT_FALSE(edit.Opts().contains("ED2_REVISION"));
-    EXPECT_EQ(edit.get_ed2_revision(), 1);
 }
 
 TEST(FrameRate, OfAnOldEditComesFromItsTelevisionStandard) {
@@ -213,22 +185,6 @@ TEST(LogType, FollowsCookieAndHeader) {
     }
 }
 
-TEST(LogType, HasATextForEachKind) {
-    const struct {
-        edit_log_type_t type;
-        const char* text;
-        edit_log_type_t back;
-    } cases[] = {{kLogNone, "", kLogNone},          {kLogShot, "shot", kLogShot},
-                 {kLogEdit, "edit", kLogEdit},      {kLogGhost3, "ghost", kLogGhost3},
-                 {kLogGhost7, "ghost", kLogGhost3}, {kLogMagic, "magic", kLogMagic},
-                 {kLogReel, "reel", kLogReel},      {kLogTemplate, "FXT", kLogTemplate}};
-    for (const auto& c : cases) {
-        EXPECT_EQ(Edit::log_type_string_get_ms(c.type), c.text);
-        EXPECT_EQ(Edit::getLogTypeFromString(c.text), c.back) << c.text;
-    }
-    EXPECT_EQ(Edit::getLogTypeFromString("Shot"), kLogNone);
-}
-
 TEST(Times, SetAnEditDirtyOnlyWhenTheyChange) {
     const EditPtr edit = EditBuilder().build();
     const String before = test::editState(*edit);
@@ -250,27 +206,6 @@ TEST(Times, SetAnEditDirtyOnlyWhenTheyChange) {
     edit->set_dirty(false);
     edit->set_current_time(0, 5.0);
     EXPECT_TRUE(edit->get_dirty());
-}
-
-TEST(Conversions, BetweenKindsLettersAndTypes) {
-    EXPECT_EQ(Edit::edit_chan_type_from_cookie_type(Cookie_Type::Control), ControlChan);
-    EXPECT_EQ(Edit::edit_chan_type_from_cookie_type(Cookie_Type::Sound), AudioChan);
-    EXPECT_EQ(Edit::edit_chan_type_from_cookie_type(Cookie_Type::Edit), NoChan);
-    for (const auto& [letter, type] :
-         {std::pair('A', AudioChan), std::pair('C', ControlChan), std::pair('G', ControlChan),
-          std::pair('M', ControlChan), std::pair('T', TChan), std::pair('V', VideoChan),
-          std::pair('v', NoChan), std::pair('X', NoChan)}) {
-        EXPECT_EQ(Edit::edit_chan_type_from_name(letter), type) << letter;
-        EXPECT_EQ(Edit::edit_chan_type_from_name(static_cast<wchar_t>(letter)), type) << letter;
-    }
-    EXPECT_EQ(Edit::edit_chan_type_from_name(static_cast<wchar_t>(0x100 + 'V')), NoChan);
-    using S = Edit_Chan_SubType;
-    EXPECT_EQ(Edit::edit_chan_letter_from_type(ControlChan, S::INVALID), Edit_Chan_Letter::C);
-    EXPECT_EQ(Edit::edit_chan_letter_from_type(ControlChan, S::MIXER_CTL_TRACK), Edit_Chan_Letter::M);
-    EXPECT_EQ(Edit::edit_chan_letter_from_type(VideoChan, S::ALIAS), Edit_Chan_Letter::V);
-    EXPECT_EQ(Edit::edit_chan_letter_from_type(NoChan, S::NONE), Edit_Chan_Letter::X);
-    EXPECT_STREQ(Edit::subTypeText(S::GPI_CTL_TRACK), "SUBTYPE:NONE");
-    EXPECT_STREQ(Edit::subTypeText(S::ALIAS), "SUBTYPE:ALIAS");
 }
 
 } // namespace

@@ -4,7 +4,6 @@
 
 #include <gtest/gtest.h>
 
-#include <thread>
 #include <utility>
 
 using test::EditBuilder;
@@ -66,39 +65,6 @@ TEST(Handle, OpensThroughTheRegistryAndReleasesFirst) {
     // The item may live in the edit that is released.
     edit.open(edit->get_cookie(), eOpenExisting);
     EXPECT_TRUE(edit.valid());
-}
-
-TEST(Handle, RegistryThatGoesIsNoLongerAsked) {
-    EditRegistry* const before = EditRegistry::current();
-    { const RecordingRegistry registry; }
-    EXPECT_EQ(EditRegistry::current(), before);
-}
-
-TEST(Handle, CountsAreExactOnManyThreads) {
-    int alive = 0;
-    {
-        EditPtr shared(new MortalEdit(alive));
-        std::vector<std::thread> threads;
-        for (int t = 0; t < 8; ++t) {
-            threads.emplace_back([mine = shared]() mutable {
-                for (int i = 0; i < 5000; ++i) {
-                    EditPtr copy = mine;
-                    EditPtr second(copy);
-                    mine = second;
-                    copy.invalidate();
-                }
-            });
-        }
-        const EditPtr kept = shared;
-        shared.invalidate();
-        for (std::thread& thread : threads) {
-            thread.join();
-        }
-        threads.clear();
-        EXPECT_EQ(kept->refCount(), 1);
-        EXPECT_EQ(alive, 1);
-    }
-    EXPECT_EQ(alive, 0);
 }
 
 } // namespace

@@ -1,18 +1,16 @@
 #include "edit_samples.h"
-#include "support/child_process.h"
-#include "support/faulty_file_system.h"
+#include "support/every_fault.h"
 #include "support/temporary_folder.h"
 
-#include <chrono>
 #include <cstring>
 #include <gtest/gtest.h>
-#include <thread>
 
 namespace {
 
+using test::Fault;
 using test::stateOf;
 
-// An old edit in its file, and what a save makes of it.
+/// An old edit in its file, and what a save makes of it.
 class EditFileFaultsTest : public testing::Test {
 protected:
     void SetUp() override {
@@ -20,26 +18,32 @@ protected:
         test::fillAtRandom(edit, 12);
         edit.init_dirty();
         ASSERT_TRUE(edit.write_file(path())) << edit.lastFileError();
-        oldBytes = test::bytesOf(folder.path(kName));
+        oldBytes = folder.read(kName);
         oldState = stateOf(edit);
     }
     [[nodiscard]] WString path() const { return Qx::widen(folder.path(kName)); }
-    // The edit of the file with a change that a file shows.
-    void change(Edit& edit) const {
-        edit.setName("changed");
+    /// The old edit in its file again, open, with a change that a file shows.
+    [[nodiscard]] std::unique_ptr<Edit> changed() const {
+        for (const auto& entry : std::filesystem::directory_iterator(folder.path().c_str())) {
+            std::filesystem::remove(entry.path()); // with what a dead process left
+        }
+        folder.write(kName, oldBytes);
+        auto edit = std::make_unique<Edit>(path(), eOpenExisting);
+        edit->setName("changed");
         std::mt19937 random(1);
-        test::addPairs(edit, 0, 40, random);
+        test::addPairs(*edit, 0, 40, random);
+        return edit;
     }
-    // What the file holds: the name of the edit in it.
-    [[nodiscard]] String contents(String* state = nullptr) const {
+    /// What the file holds: "old", or the name of the edit in it.
+    [[nodiscard]] String contents() const {
         const Edit read(path(), eOpenExisting);
-        if (read.isBad()) {
-            return "bad: " + read.lastFileError();
-        }
-        if (state != nullptr) {
-            *state = stateOf(read);
-        }
-        return read.getName().empty() ? String("old") : read.getName();
+        return read.isBad()                ? "bad: " + read.lastFileError()
+               : stateOf(read) == oldState ? "old"
+                                           : read.getName();
+    }
+    void expectReason(const Edit& edit, int code) const {
+        EXPECT_NE(edit.lastFileError().find(folder.path()), String::npos) << edit.lastFileError();
+        EXPECT_NE(edit.lastFileError().find(std::strerror(code)), String::npos) << edit.lastFileError();
     }
 
     static constexpr const char* kName = "E0001000.qme";
@@ -48,160 +52,73 @@ protected:
     std::string oldState;
 };
 
-TEST_F(EditFileFaultsTest, ASaveThatFailsAnywhereLosesNothing) {
-    size_t operations = 0;
-    {
-        Edit edit(path(), eOpenExisting);
-        change(edit);
-        test::FaultyFileSystem faulty;
-        ASSERT_TRUE(edit.write_file(path()));
-        operations = faulty.numOperations();
-    }
-    ASSERT_GT(operations, 5U);
-    for (const int code : {EIO, ENOSPC, EACCES, EROFS, EINTR}) {
-        for (size_t n = 1; n <= operations; ++n) {
-            SCOPED_TRACE(String::format("error %d at operation %zu", code, n));
-            std::filesystem::remove(folder.path(kName));
-            folder.write(kName, oldBytes);
-            Edit edit(path(), eOpenExisting);
-            change(edit);
-            test::FaultyFileSystem faulty;
-            faulty.failAt(n, code);
-            const bool stored = edit.write_file(path());
-            SCOPED_TRACE(n <= faulty.numOperations() ? faulty.operations()[n - 1] : String("never reached"));
-            faulty.reset();
-            if (stored) {
-                EXPECT_EQ(contents(), "changed");
-                EXPECT_FALSE(edit.isDirty(true));
-                EXPECT_EQ(edit.lastFileError(), "");
-            } else {
-                EXPECT_TRUE(test::bytesOf(folder.path(kName)) == oldBytes || contents() == "changed");
-                EXPECT_TRUE(edit.isDirty(false));
-                EXPECT_NE(edit.lastFileError().find(folder.path()), String::npos) << edit.lastFileError();
-                EXPECT_NE(edit.lastFileError().find(std::strerror(code)), String::npos)
-                    << edit.lastFileError();
+TEST_F(EditFileFaultsTest, ASaveLosesNothing) {
+    for (const Fault& fault : {Fault{Fault::Killed}, Fault{Fault::Fails, EIO}, Fault{Fault::Fails, ENOSPC},
+                               Fault{Fault::Fails, EACCES}, Fault{Fault::Fails, EINTR}}) {
+        std::set<String> seen;
+        const auto save = [&](const std::unique_ptr<Edit>& edit, const auto& arm) {
+            arm();
+            return edit->write_file(path());
+        };
+        const auto check = [&](const std::unique_ptr<Edit>& edit, const test::Met& met) {
+            const String now = contents();
+            seen.insert(now);
+            EXPECT_TRUE(now == "changed" || (now == "old" && !met.done)) << now;
+            if (fault.kind == Fault::Killed) {
+                return;
             }
             EXPECT_EQ(folder.numNames(), 1U) << "a temporary file stayed behind";
-            edit.init_dirty();
-            ASSERT_TRUE(edit.write_file(path())) << edit.lastFileError();
-            String state;
-            EXPECT_EQ(contents(&state), "changed");
-            EXPECT_EQ(std::string(state), stateOf(edit));
-        }
+            EXPECT_EQ(edit->isDirty(true), !met.done);
+            EXPECT_EQ(edit->lastFileError().empty(), met.done);
+            if (!met.done) {
+                expectReason(*edit, fault.code);
+            }
+            edit->init_dirty();
+            ASSERT_TRUE(edit->write_file(path())) << edit->lastFileError();
+            EXPECT_EQ(stateOf(Edit(path(), eOpenExisting)), stateOf(*edit));
+        };
+        EXPECT_GT(test::everyFault(
+                      fault, [this] { return changed(); }, save, check),
+                  3U);
+        EXPECT_EQ(seen.size(), fault.code == EINTR ? 1U : 2U);
     }
 }
 
-TEST_F(EditFileFaultsTest, ADiskThatGoesOrFillsUpLosesNothing) {
+TEST_F(EditFileFaultsTest, AFullDiskOrShortWritesLoseNothing) {
     for (const size_t room : {0, 1, 64, 500, 3000}) {
-        SCOPED_TRACE(room);
-        Edit edit(path(), eOpenExisting);
-        change(edit);
+        const auto edit = changed();
         test::FaultyFileSystem faulty;
         faulty.fullAfter(room);
-        EXPECT_FALSE(edit.write_file(path()));
-        EXPECT_NE(edit.lastFileError().find(std::strerror(ENOSPC)), String::npos) << edit.lastFileError();
-        EXPECT_EQ(test::bytesOf(folder.path(kName)), oldBytes);
-        EXPECT_TRUE(edit.isDirty(false));
+        EXPECT_FALSE(edit->write_file(path())) << room;
+        expectReason(*edit, ENOSPC);
+        EXPECT_EQ(folder.read(kName), oldBytes);
         EXPECT_EQ(folder.numNames(), 1U);
+        faulty.reset();
+        faulty.shortTransfers(7);
+        EXPECT_TRUE(edit->write_file(path())) << edit->lastFileError();
+        EXPECT_EQ(contents(), "changed");
     }
-    Edit edit(path(), eOpenExisting);
-    change(edit);
-    test::FaultyFileSystem faulty;
-    faulty.failFrom(1, EIO);
-    EXPECT_FALSE(edit.write_file(path()));
-    faulty.reset();
-    EXPECT_EQ(test::bytesOf(folder.path(kName)), oldBytes);
-    faulty.shortTransfers(7);
-    EXPECT_TRUE(edit.write_file(path())) << edit.lastFileError();
-    EXPECT_EQ(contents(), "changed");
 }
 
 TEST_F(EditFileFaultsTest, AReadThatFailsAnywhereSaysWhy) {
-    size_t operations = 0;
-    {
-        test::FaultyFileSystem faulty;
-        ASSERT_EQ(contents(), "old");
-        operations = faulty.numOperations();
-    }
     for (const int code : {EIO, EACCES, EINTR}) {
-        for (size_t n = 1; n <= operations; ++n) {
-            test::FaultyFileSystem faulty;
-            faulty.failAt(n, code);
-            const Edit edit(path(), eOpenExisting);
-            SCOPED_TRACE(faulty.operations()[n - 1] + ", " + std::strerror(code));
-            if (!edit.isBad()) {
-                EXPECT_EQ(stateOf(edit), oldState);
-                continue;
+        const auto read = [&](const std::unique_ptr<Edit>& edit, const auto& arm) {
+            arm();
+            return edit->readFile(path(), eOpenExisting) == Edit::kReadOk;
+        };
+        const auto check = [&](const std::unique_ptr<Edit>& edit, const test::Met& met) {
+            EXPECT_TRUE(met.done || code != EINTR) << "an interruption is no failure";
+            if (met.done) {
+                EXPECT_EQ(stateOf(*edit), oldState);
+            } else {
+                EXPECT_EQ(edit->getNumChans(), 0);
+                expectReason(*edit, code);
             }
-            EXPECT_NE(code, EINTR) << "an interruption is no failure";
-            EXPECT_EQ(edit.getNumChans(), 0);
-            EXPECT_NE(edit.lastFileError().find(folder.path(kName)), String::npos) << edit.lastFileError();
-            EXPECT_NE(edit.lastFileError().find(std::strerror(code)), String::npos) << edit.lastFileError();
-        }
+        };
+        EXPECT_GT(test::everyFault(
+                      {Fault::Fails, code}, [] { return std::make_unique<Edit>(); }, read, check),
+                  2U);
     }
-    test::FaultyFileSystem faulty;
-    faulty.shortTransfers(7);
-    EXPECT_EQ(contents(), "old");
-}
-
-TEST_F(EditFileFaultsTest, DeathAtAnyWriteLeavesTheOldEditOrTheNewOne) {
-    size_t writes = 0;
-    {
-        Edit edit(path(), eOpenExisting);
-        change(edit);
-        test::FaultyFileSystem faulty;
-        ASSERT_TRUE(edit.write_file(path()));
-        writes = faulty.numWrites();
-    }
-    ASSERT_GT(writes, 3U);
-    bool sawOld = false;
-    bool sawNew = false;
-    for (size_t n = 1; n <= writes; ++n) {
-        SCOPED_TRACE(n);
-        std::filesystem::remove(folder.path(kName));
-        folder.write(kName, oldBytes);
-        const auto end = test::runInChild([&] {
-            Edit edit(path(), eOpenExisting);
-            change(edit);
-            test::FaultyFileSystem faulty;
-            faulty.killAtWrite(n);
-            return edit.write_file(path());
-        });
-        EXPECT_EQ(end, test::ChildEnd::Killed);
-        const String now = contents();
-        sawOld = sawOld || now == "old";
-        sawNew = sawNew || now == "changed";
-        EXPECT_TRUE(now == "old" || now == "changed") << now;
-    }
-    EXPECT_TRUE(sawOld && sawNew);
-}
-
-TEST_F(EditFileFaultsTest, DeathAtAnyMomentOfManySavesLeavesAnEdit) {
-    std::mt19937 random(99);
-    const auto until = std::chrono::steady_clock::now() + std::chrono::seconds(3);
-    int rounds = 0;
-    for (; std::chrono::steady_clock::now() < until; ++rounds) {
-        const pid_t child = ::fork();
-        ASSERT_GE(child, 0);
-        if (child == 0) {
-            Edit edit(path(), eOpenExisting);
-            for (int i = 0;; ++i) {
-                edit.setName("save " + std::to_string(i));
-                edit.init_dirty(); // the name may be that of the last save already
-                if (!edit.write_file(path())) {
-                    ::_exit(1);
-                }
-            }
-        }
-        std::this_thread::sleep_for(std::chrono::microseconds(2000 + random() % 40000));
-        ::kill(child, SIGKILL);
-        int status = 0;
-        ASSERT_EQ(::waitpid(child, &status, 0), child);
-        ASSERT_TRUE(WIFSIGNALED(status)) << "a save failed";
-        const String now = contents();
-        ASSERT_TRUE(now == "old" || now.starts_with("save ")) << now;
-    }
-    EXPECT_GT(rounds, 5);
 }
 
 } // namespace

@@ -9,6 +9,7 @@
 #include "platform/services/files.h"
 #include "platform/store/configb.h"
 #include "platform/store/text_file.h"
+#include "support/edit_state.h"
 
 #include <algorithm>
 #include <random>
@@ -23,57 +24,15 @@ inline String bytesOf(const String& path) {
     return Qx::readWholeFile(path, text, uint64_t{1} << 30) ? String("(missing)") : text;
 }
 
-inline String chanText(const Edit& edit, int index) {
-    const IdStamp id = edit.getId(index);
-    const Edit::ChanType type = edit.getChanTypeAndSubType(id);
-    String text = String::format("channel %d %u %u ", index, static_cast<unsigned>(type.type),
-                                 static_cast<unsigned>(type.subtype)) +
-                  id.asString() + " [" + edit.getChanName(id) + "] [" + edit.getChanDisplayName(id) + "] [" +
-                  edit.getMaterialInfo(id) + "] " + Qx::doubleToText(edit.getSyncLoss(id)) + "\n";
-    const AudCel audio = edit.getAudCel(id);
-    if (audio.valid()) {
-        text += String::format(" audio %d %d ", audio.getSoundOutputEnabled(), audio.getXFadesEnabled()) +
-                audio.getLevelsChanID().asString() + "\n";
-    }
-    for (const auto& node : edit.getLevelsCel(id).getNodeStore().nodes()) {
-        text += String::format(" node %a %a\n", node.time, static_cast<double>(node.level));
-    }
-    if (const cel* content = edit.getCel(id)) {
-        text += String::format(" resolution %a\n", content->resolution());
-        for (int i = 0; i < content->numEvents(); ++i) {
-            const channel_event e = content->get_event(i);
-            text += String::format(" event %d %a %a %a %a %d %u.%u.%u ", e.kind, e.editTime, e.stripTime,
-                                   e.velocity, static_cast<double>(e.level), e.code, e.strip.word(0),
-                                   e.strip.word(1), e.strip.word(2)) +
-                    e.id.asString() + String::format(" %u %u\n", e.rampQFrames, e.rampCurve);
-        }
-    }
-    return text;
-}
-
 /// Everything that a file keeps of an edit, as text.
 inline std::string stateOf(const Edit& edit) {
     TextFile header;
     edit.Opts().writeTo(header);
-    String text = edit.get_cookie_str() + "\n" + header.text();
-    text += String::format("time %a mark %a entire %d\n", edit.get_current_time(), edit.get_mark_time(),
-                           edit.get_entire_medium());
+    String text = edit.get_cookie_str() + "\n" + header.text() + contentState(edit) +
+                  String::format("entire %d\n", edit.get_entire_medium());
     for (int i = 0; i < edit.getNumChans(); ++i) {
-        text += chanText(edit, i);
-    }
-    for (size_t i = 0; i < edit.get_cues().get_num_cue_points(CueFlag::kKept); ++i) {
-        const cue_point& cue = *edit.get_cues().get_cue_point(i, CueFlag::kKept);
-        text += "cue [" + cue.text() +
-                String::format("] %a %a %d %d %d\n", cue.editTime(), cue.secondTime(), cue.channel(),
-                               cue.code(), cue.flags());
-    }
-    for (const ChannelGroupList* list : {edit.retrieveGroupsList(), edit.retrieveDefaultGroupsList()}) {
-        for (unsigned i = 0; list != nullptr && i < list->size(); ++i) {
-            text += String::format("group %d", static_cast<int>(list->getGroup(i)->getType()));
-            for (const IdStamp& chan : list->getGroup(i)->getChans()) {
-                text += " " + chan.asString();
-            }
-            text += "\n";
+        if (const cel* const content = edit.get_edit_cel_p(i)) {
+            text += String::format("resolution %a\n", content->resolution());
         }
     }
     return text;
@@ -184,7 +143,7 @@ inline void fillAtRandom(Edit& edit, unsigned seed, int mostPairs = 6) {
         cue.setSecondTime(cue.editTime());
         cue.setChannel(static_cast<int>(random() % 9));
         cue.setCode(static_cast<int>(random()));
-        cue.setFlags(random() % 4 == 0 ? CueFlag::kInside : CueFlag::kKept | CueFlag::kInside);
+        cue.setFlags(CueFlag::kKept | CueFlag::kInside);
         edit.get_cues().add_cue_point(cue);
     }
     edit.Opts().setString("a_text", "line\nend \\ \x01 \xE2\x82\xAC");

@@ -29,12 +29,6 @@ protected:
             SCOPED_TRACE(seed);
             Edit edit;
             test::fillAtRandom(edit, seed);
-            // The text holds as many cues from the front as there are kept ones, so these stand first.
-            cue_list kept;
-            for (size_t i = 0; i < edit.get_cues().get_num_cue_points(CueFlag::kKept); ++i) {
-                kept.add_cue_point(*edit.get_cues().get_cue_point(i, CueFlag::kKept));
-            }
-            edit.get_cues() = kept;
             const std::string first = textOf(edit);
             Edit read;
             ASSERT_TRUE(read.readFromLegacyFile(path())) << read.lastFileError();

@@ -2,8 +2,7 @@
 
 #include "edit/project/project_details.h"
 #include "platform/services/atomic_batch.h"
-#include "support/child_process.h"
-#include "support/faulty_file_system.h"
+#include "support/every_fault.h"
 #include "support/recording_log.h"
 #include "support/temporary_folder.h"
 
@@ -14,6 +13,7 @@
 
 namespace {
 
+using test::Fault;
 using Cookies = std::vector<cookie>;
 
 cookie edit(int number) {
@@ -126,58 +126,32 @@ TEST(CookieAllocator, IsDurableAtOnceInsideABatch) {
     EXPECT_EQ(CookieAllocator(folder.path()).allocateOne(), edit(2));
 }
 
-TEST(CookieAllocator, AProcessMayDieAtAnyOperation) {
+TEST(CookieAllocator, NoFaultHandsOutANumberTwice) {
     const test::TemporaryFolder folder;
-    int last = 0;
-    for (size_t n = 1; n < 60; ++n) {
-        const auto end = test::runInChild([&] {
-            test::FaultyFileSystem disk;
-            disk.killAtWrite(n);
-            Cookies out;
-            return bool(CookieAllocator(folder.path()).allocate(1, out));
-        });
-        ASSERT_NE(end, test::ChildEnd::Failed);
-        const cookie next = CookieAllocator(folder.path()).allocateOne();
-        ASSERT_TRUE(next.is_valid());
-        EXPECT_GT(static_cast<int>(next.word(0)), last);
-        last = static_cast<int>(next.word(0));
-        if (end == test::ChildEnd::Succeeded) {
-            EXPECT_GT(n, 4u);
-            return;
-        }
-    }
-    FAIL() << "the allocation never ended";
-}
-
-TEST(CookieAllocator, AFailureHandsOutNothing) {
-    const test::TemporaryFolder folder;
-    test::FaultyFileSystem disk;
-    Cookies out;
     CookieAllocator allocator(folder.path());
+    Cookies out;
     ASSERT_TRUE(allocator.allocate(1, out));
-    disk.reset();
-    ASSERT_TRUE(allocator.allocate(1, out));
-    const auto steps = disk.operations();
-    for (size_t n = 1; n <= steps.size(); ++n) {
-        SCOPED_TRACE(steps[n - 1]);
-        const std::string before = folder.read("Project.txt");
-        const Cookies had = out;
-        disk.reset();
-        disk.failAt(n, EIO);
-        if (allocator.allocate(1, out)) {
-            // Only the name in the lock's file is a courtesy.
-            EXPECT_TRUE(steps[n - 1].find("Project.lock") != String::npos);
-            EXPECT_EQ(out.size(), had.size() + 1);
-        } else {
-            EXPECT_EQ(out, had);
-            EXPECT_TRUE(folder.read("Project.txt") == before || steps[n - 1] == "sync folder");
-        }
-        disk.reset();
-        const cookie next = allocator.allocateOne();
-        EXPECT_GT(next, had.back());
-        out.push_back(next);
+    for (const Fault& fault : {Fault{Fault::Fails, EIO}, Fault{Fault::Killed}}) {
+        const auto allocate = [&](const Cookies& had, const auto& arm) {
+            arm();
+            out = had;
+            return allocator.allocate(1, out);
+        };
+        const auto check = [&](const Cookies& had, const test::Met& met) {
+            if (fault.kind == Fault::Fails) {
+                EXPECT_EQ(out.size(), had.size() + (met.done ? 1 : 0)) << "a failure hands out nothing";
+                EXPECT_TRUE(!met.done || !met.isMet || met.operation.find("Project.lock") != String::npos)
+                    << "only the name in the lock's file is a courtesy";
+                EXPECT_EQ(folder.numNames(), 2u);
+            }
+            const cookie next = allocator.allocateOne();
+            EXPECT_GT(next, out.back());
+            out.push_back(next);
+        };
+        EXPECT_GT(test::everyFault(
+                      fault, [&] { return out; }, allocate, check),
+                  4u);
     }
-    EXPECT_EQ(folder.numNames(), 2u);
 }
 
 TEST(CookieAllocator, RefusesDamageAndTheEndOfTheNumbers) {

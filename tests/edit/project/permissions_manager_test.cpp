@@ -56,25 +56,6 @@ TEST_F(PermissionsManagerTest, RecordsOutliveTheMemory) {
     EXPECT_FALSE(PermissionsManager::getReadOnly(kOther));
 }
 
-TEST_F(PermissionsManagerTest, AnOwnerMayStay) {
-    ASSERT_TRUE(PermissionsManager::setOwner(kEdit, "anna", true));
-    ASSERT_TRUE(PermissionsManager::setOwner(kEdit, "ben", true));
-    EXPECT_EQ(PermissionsManager::getOwner(kEdit), "anna");
-    ASSERT_TRUE(PermissionsManager::setOwner(kEdit, "ben", false));
-    EXPECT_EQ(PermissionsManager::getOwner(kEdit), "ben");
-    test::FaultyFileSystem disk;
-    ASSERT_TRUE(PermissionsManager::setOwner(kEdit, "ben", false));
-    EXPECT_EQ(disk.numOperations(), 0u) << "nothing changed, so nothing is written";
-}
-
-TEST_F(PermissionsManagerTest, EachProjectHasItsOwnRecords) {
-    ASSERT_TRUE(PermissionsManager::setReadOnly(kEdit, true));
-    open("P0002000");
-    EXPECT_FALSE(PermissionsManager::getReadOnly(kEdit));
-    open("P0001000");
-    EXPECT_TRUE(PermissionsManager::getReadOnly(kEdit));
-}
-
 TEST_F(PermissionsManagerTest, AnotherSeatsRecordsStay) {
     ASSERT_TRUE(PermissionsManager::setOwner(kEdit, "anna", false));
     ASSERT_EQ(test::runInChild([] { return bool(PermissionsManager::setOwner(kOther, "ben", false)); }),
@@ -132,13 +113,12 @@ TEST_F(PermissionsManagerTest, WhatIsNeverStoredLivesInMemory) {
     EXPECT_TRUE(PermissionsManager::getReadOnly(kEdit));
 }
 
-TEST_F(PermissionsManagerTest, TheNetworkRightIsGrantedByTheApplication) {
-    EXPECT_EQ(PermissionsManager::getCurrentUser(), "anna");
-    EXPECT_FALSE(PermissionsManager::hasRight(PermissionsManager::NetworkRight));
-    PermissionsManager::setRight(PermissionsManager::NetworkRight, true);
-    EXPECT_TRUE(PermissionsManager::hasRight(PermissionsManager::NetworkRight));
-    PermissionsManager::setRight(PermissionsManager::NetworkRight, false);
-    EXPECT_FALSE(PermissionsManager::hasRight(PermissionsManager::NetworkRight));
+TEST_F(PermissionsManagerTest, EachProjectHasItsOwnRecords) {
+    ASSERT_TRUE(PermissionsManager::setReadOnly(kEdit, true));
+    open("P0002000");
+    EXPECT_FALSE(PermissionsManager::getReadOnly(kEdit));
+    open("P0001000");
+    EXPECT_TRUE(PermissionsManager::getReadOnly(kEdit));
 }
 
 } // namespace

@@ -48,15 +48,6 @@ TEST(ProjectDetails, MakesAProjectAndReadsItBack) {
     Qx::setCurrentProject(before);
 }
 
-TEST(ProjectDetails, OpeningWritesNothing) {
-    const test::TemporaryFolder folder;
-    ProjectDetails details;
-    ASSERT_TRUE(ProjectDetails::openOrCreate(folder.path(), kProject, feature(), details));
-    test::FaultyFileSystem disk;
-    ASSERT_TRUE(ProjectDetails::openOrCreate(folder.path(), kProject, feature(), details));
-    EXPECT_EQ(disk.numWrites(), 0u);
-}
-
 TEST(ProjectDetails, SavingNeverSetsTheCountBack) {
     const test::TemporaryFolder folder;
     ProjectDetails details;

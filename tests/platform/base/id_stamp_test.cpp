@@ -9,15 +9,6 @@
 
 namespace {
 
-TEST(IdStamp, NullUntilMadeAndAfterInvalidation) {
-    IdStamp stamp;
-    EXPECT_FALSE(stamp.valid());
-    stamp = IdStamp::fresh(IdStampMagic::EffectNode);
-    EXPECT_TRUE(stamp.valid());
-    stamp.invalidate();
-    EXPECT_EQ(stamp, IdStamp());
-}
-
 TEST(IdStamp, MagicTypeSurvivesTextAndComparison) {
     for (const auto type : {IdStampMagic::EffectNode, IdStampMagic::Material, IdStampMagic::Channel,
                             IdStampMagic::ChannelNode}) {

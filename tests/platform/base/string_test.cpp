@@ -9,15 +9,6 @@
 
 namespace {
 
-TEST(String, NthIndexCountsFromOne) {
-    const String text = "a,b,,c";
-    EXPECT_EQ(text.nthIndex(1, ','), 1);
-    EXPECT_EQ(text.nthIndex(3, ','), 4);
-    EXPECT_EQ(text.nthIndex(4, ','), -1);
-    EXPECT_EQ(text.nthIndex(0, ','), -1);
-    EXPECT_EQ(text.nthIndex(-1, 'a'), -1);
-}
-
 TEST(String, CaseIsAsciiWhateverTheLocale) {
     const char* before = std::setlocale(LC_ALL, nullptr);
     const std::string saved = before == nullptr ? "C" : before;
@@ -27,20 +18,6 @@ TEST(String, CaseIsAsciiWhateverTheLocale) {
     EXPECT_TRUE(String::equalNoCase("MOD_count", "mod_COUNT"));
     EXPECT_FALSE(String::equalNoCase("mod", "mods"));
     std::setlocale(LC_ALL, saved.c_str());
-}
-
-TEST(String, SplitAndTrim) {
-    using Pieces = std::vector<String>;
-    EXPECT_EQ(String("a,,b,").split(','), (Pieces{"a", "", "b", ""}));
-    EXPECT_EQ(String("a,,b,").split(',', true), (Pieces{"a", "b"}));
-    EXPECT_EQ(String().split(','), Pieces{""});
-    EXPECT_EQ(String(" \t a b\r\n").trimmed(), "a b");
-    EXPECT_EQ(String(" \n").trimmed(), "");
-}
-
-TEST(String, FormatTakesAnyLength) {
-    const std::string longText(10000, 'x');
-    EXPECT_EQ(String::format("%s-%d", longText.c_str(), 7), longText + "-7");
 }
 
 TEST(WideText, AnyBytesComeBack) {
@@ -53,12 +30,6 @@ TEST(WideText, AnyBytesComeBack) {
         }
         ASSERT_EQ(Qx::narrow(Qx::widen(bytes)), bytes) << "round " << round;
     }
-}
-
-TEST(WideText, WellFormedTextHasItsCodePoints) {
-    EXPECT_EQ(Qx::widen("\xC3\xA9\xE2\x82\xAC\xF0\x9F\x8E\xAC"), (WString{0xE9, 0x20AC, 0x1F3AC}));
-    EXPECT_EQ(Qx::narrow(WString{static_cast<wchar_t>(0x110000), static_cast<wchar_t>(0xD800)}),
-              "\xEF\xBF\xBD\xEF\xBF\xBD");
 }
 
 TEST(WideText, Utf8IsCheckedStrictly) {

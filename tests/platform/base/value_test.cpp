@@ -1,35 +1,10 @@
-#include "platform/base/attrib_value_pair.h"
-#include "platform/base/exception.h"
 #include "platform/base/num_range.h"
 #include "platform/base/ole_splat.h"
-#include "platform/base/status.h"
+#include "platform/base/qx_string.h"
 
 #include <gtest/gtest.h>
 
 namespace {
-
-TEST(AttribValuePair, OnlyTheFirstEqualsSignDivides) {
-    const Qx::AttribValuePair pair("width=a=b");
-    EXPECT_EQ(pair.attrib(), "width");
-    EXPECT_EQ(pair.value(), "a=b");
-    EXPECT_EQ(pair.asString(), "width=a=b");
-    EXPECT_TRUE(Qx::AttribValuePair("empty=").valid());
-    for (const char* text : {"", "none", "=value"}) {
-        EXPECT_FALSE(Qx::AttribValuePair(text).valid()) << text;
-        EXPECT_EQ(Qx::AttribValuePair(text).asString(), "") << text;
-    }
-    EXPECT_EQ(Qx::AttribValuePair("a=b", "c").asString(), "") << "an attribute cannot hold the divider";
-}
-
-TEST(NumRange, OrderedRangesPutTheirEndsInOrder) {
-    const NumRange<double> range(5, 2);
-    EXPECT_EQ(range.start(), 2);
-    EXPECT_EQ(range.length(), 3);
-    EXPECT_EQ((NumRange<double, Unordered>(5, 2).start()), 5);
-    NumRange<double> wide(3, 4);
-    wide.widen(NumRange<double>(1, 3.5));
-    EXPECT_EQ(wide, NumRange<double>(1, 4));
-}
 
 TEST(NumRange, TheStartBelongsAndTheEndDoesNotWithTolerance) {
     const NumRange<double> region(10, 20);
@@ -53,24 +28,6 @@ TEST(OleSplat, ReportsToTheHandlerAndReturns) {
     ole_splat("pops: %d of %s", 3, "2");
     EXPECT_EQ(splatted, "pops: 3 of 2");
     EXPECT_NE(Qx::setSplatHandler(before), nullptr);
-}
-
-TEST(Status, AFailureIsOneEvenWithoutAReason) {
-    EXPECT_TRUE(Qx::Status().isOk());
-    EXPECT_FALSE(Qx::Status::failure("").isOk());
-    EXPECT_EQ(Qx::Status::failure("no room").reason(), "no room");
-}
-
-TEST(RuntimeError, IsCaughtAcrossTheLibraryAsAStandardException) {
-    try {
-        throw Qx::Exception::RuntimeError("lost", "queue", 12);
-    } catch (const std::runtime_error& error) {
-        const auto* own = dynamic_cast<const Qx::Exception::RuntimeError*>(&error);
-        ASSERT_NE(own, nullptr);
-        EXPECT_STREQ(own->what(), "lost");
-        EXPECT_EQ(own->source(), "queue");
-        EXPECT_EQ(own->line(), 12);
-    }
 }
 
 } // namespace

@@ -139,6 +139,12 @@ TEST_F(Oledb, SharesOneFileBetweenConnectionsAndThreads) {
     b.join();
     c.join();
     EXPECT_EQ(first.numRecords(), 150u);
+    // What others change is noticed, what one changes oneself is not.
+    const int64_t before = first.versionOfOthers();
+    ASSERT_TRUE(first.putRecord("own", {"a", "b", "c"}));
+    EXPECT_EQ(first.versionOfOthers(), before);
+    ASSERT_TRUE(second.removeRecord("own"));
+    EXPECT_NE(first.versionOfOthers(), before);
     EXPECT_EQ(second.numRecords(), 150u);
 }
 

@@ -5,7 +5,6 @@
 #include <chrono>
 #include <gtest/gtest.h>
 #include <latch>
-#include <random>
 #include <thread>
 #include <vector>
 
@@ -15,35 +14,22 @@ using namespace std::chrono_literals;
 
 const NotifyMsgType kTick("test.tick");
 
-TEST(NotifierThreads, AGuardWaitsForItsListenerOnAnotherThread) {
-    Notifier notifier;
-    std::latch running(1);
-    std::atomic<bool> finished{false};
-    auto guard = notifier.addListener(kTick, [&](const NotifyMsg&) {
-        running.count_down();
-        std::this_thread::sleep_for(50ms);
-        finished = true;
-    });
-    std::thread teller([&] { notifier.notify({kTick, ""}); });
-    running.wait();
-    guard.reset();
-    EXPECT_TRUE(finished);
-    teller.join();
-}
-
 TEST(NotifierThreads, WhatAListenerHeldIsLetGoWithItsGuard) {
     Notifier notifier;
     std::latch running(1);
+    std::atomic<bool> finished{false};
     auto held = std::make_shared<int>(0);
     const std::weak_ptr<int> watched = held;
-    auto guard = notifier.addListener(kTick, [&running, held](const NotifyMsg&) {
+    auto guard = notifier.addListener(kTick, [&running, &finished, held](const NotifyMsg&) {
         running.count_down();
-        std::this_thread::sleep_for(20ms);
+        std::this_thread::sleep_for(50ms);
+        finished = true;
     });
     held.reset();
     std::thread teller([&] { notifier.notify({kTick, ""}); });
     running.wait();
     guard.reset();
+    EXPECT_TRUE(finished) << "a guard waits for its listener on another thread";
     EXPECT_TRUE(watched.expired());
     teller.join();
 }
@@ -137,33 +123,6 @@ TEST(NotifierThreads, NoCallComesAfterTheGuard) {
     }
     EXPECT_EQ(notifier.numListeners(), 0u);
     EXPECT_GT(calls, 0);
-}
-
-TEST(NotifierThreads, ListenersEditTheListFromManyThreads) {
-    Notifier notifier;
-    std::atomic<int> calls{0};
-    std::vector<std::thread> threads;
-    for (unsigned t = 0; t < 4; ++t) {
-        threads.emplace_back([&, t] {
-            std::mt19937 random(20263 + t);
-            std::vector<Qx::Ptr<Qx::Guard>> mine(4);
-            for (int i = 0; i < 300; ++i) {
-                mine[random() % mine.size()] = notifier.addListener(kTick, [&](const NotifyMsg& m) {
-                    ++calls;
-                    if (m.text() == "outer" && calls % 16 == 0) {
-                        const auto brief = notifier.addListener(kTick, [&](const NotifyMsg&) { ++calls; });
-                        notifier.notify({kTick, "inner"});
-                    }
-                });
-                notifier.notify({kTick, "outer"});
-            }
-        });
-    }
-    for (auto& thread : threads) {
-        thread.join();
-    }
-    EXPECT_EQ(notifier.numListeners(), 0u);
-    EXPECT_GT(calls, 1000);
 }
 
 TEST(ValServerThreads, ValuesAreReadWhole) {

@@ -1,8 +1,7 @@
 #include "platform/services/atomic_batch.h"
 
 #include "platform/services/atomic_file.h"
-#include "support/child_process.h"
-#include "support/faulty_file_system.h"
+#include "support/every_fault.h"
 #include "support/temporary_folder.h"
 
 #include <filesystem>
@@ -10,6 +9,8 @@
 #include <thread>
 
 namespace {
+
+using test::Fault;
 
 Qx::FileError store(const String& path, std::string_view text) {
     Qx::AtomicFile file(path);
@@ -95,62 +96,40 @@ TEST_F(AtomicBatchTest, WithoutACommitNothingChanges) {
     EXPECT_EQ(folder.read("0"), "new") << "the thread has no batch any more";
 }
 
-TEST_F(AtomicBatchTest, AnyOperationMayFail) {
-    test::FaultyFileSystem disk;
-    fill();
-    {
+TEST_F(AtomicBatchTest, AnyFaultLeavesEachFileOldOrNewInTheOrderOfEnrolment) {
+    size_t replaced = 0;
+    Qx::FileError error;
+    const auto setUp = [&] { return fill(), 0; };
+    const auto act = [&](int, const auto& arm) {
+        arm();
         Qx::AtomicBatch batch;
-        ASSERT_FALSE(storeAll(batch));
+        error = storeAll(batch);
+        replaced = batch.numReplaced();
+        return !error;
+    };
+    for (const Fault& fault : {Fault{Fault::Fails, EIO}, Fault{Fault::Killed}}) {
+        const auto check = [&](int, const test::Met& met) {
+            const std::string found = contents();
+            const size_t numNew = static_cast<size_t>(std::count(found.begin(), found.end(), 'n'));
+            std::string expected;
+            for (size_t i = 0; i < kFiles; ++i) {
+                expected += i < numNew ? "new " : "old ";
+            }
+            EXPECT_EQ(found, expected);
+            if (fault.kind == Fault::Killed) {
+                return;
+            }
+            EXPECT_EQ(numNew, replaced);
+            EXPECT_EQ(folder.numNames(), 5u) << "a temporary file was left";
+            if (met.operation.starts_with("rename")) {
+                EXPECT_NE(error.text().find(String::format("(%zu of 5 files hold", replaced)), String::npos)
+                    << error.text();
+            } else {
+                EXPECT_EQ(replaced, met.done || met.operation == "sync folder" ? 5u : 0u);
+            }
+        };
+        EXPECT_GT(test::everyFault(fault, setUp, act, check), 15u);
     }
-    const auto steps = disk.operations();
-    for (size_t n = 1; n <= steps.size(); ++n) {
-        SCOPED_TRACE(steps[n - 1]);
-        fill();
-        disk.reset();
-        disk.failAt(n, EIO);
-        size_t replaced = 0;
-        Qx::FileError error;
-        {
-            Qx::AtomicBatch batch;
-            error = storeAll(batch);
-            replaced = batch.numReplaced();
-        }
-        EXPECT_EQ(error.code, EIO);
-        std::string expected;
-        for (size_t i = 0; i < kFiles; ++i) {
-            expected += i < replaced ? "new " : "old ";
-        }
-        EXPECT_EQ(contents(), expected);
-        EXPECT_EQ(folder.numNames(), 5u) << "a temporary file was left";
-        if (steps[n - 1].starts_with("rename")) {
-            EXPECT_NE(error.text().find(String::format("(%zu of 5 files hold", replaced)), String::npos)
-                << error.text();
-        } else {
-            EXPECT_EQ(replaced, steps[n - 1] == "sync folder" ? 5u : 0u);
-        }
-    }
-}
-
-TEST_F(AtomicBatchTest, AProcessMayDieAtAnyOperation) {
-    for (size_t n = 1; n < 100; ++n) {
-        fill();
-        const auto end = test::runInChild([&] {
-            test::FaultyFileSystem disk;
-            disk.killAtWrite(n);
-            Qx::AtomicBatch batch;
-            return !storeAll(batch);
-        });
-        ASSERT_NE(end, test::ChildEnd::Failed);
-        for (int i = 0; i < kFiles; ++i) {
-            const std::string found = folder.read(std::to_string(i));
-            EXPECT_TRUE(found == "old" || found == "new") << n << ": " << found;
-        }
-        if (end == test::ChildEnd::Succeeded) {
-            EXPECT_GT(n, 15u);
-            return;
-        }
-    }
-    FAIL() << "the work never ended";
 }
 
 TEST_F(AtomicBatchTest, AnInnerBatchHandsItsFilesOver) {

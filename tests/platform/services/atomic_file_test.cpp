@@ -1,8 +1,7 @@
 #include "platform/services/atomic_file.h"
 
 #include "platform/services/clock.h"
-#include "support/child_process.h"
-#include "support/faulty_file_system.h"
+#include "support/every_fault.h"
 #include "support/temporary_folder.h"
 
 #include <filesystem>
@@ -11,7 +10,7 @@
 
 namespace {
 
-using test::ChildEnd;
+using test::Fault;
 
 const std::string kOld = "the old edit";
 const std::string kNew = "the new edit, which is longer than the old one";
@@ -31,21 +30,15 @@ Qx::FileError store(const String& path) {
     return file.commit();
 }
 
-TEST(AtomicFile, ReplacesAndCreates) {
-    const test::TemporaryFolder folder;
-    const String path = folder.write("a.qme", kOld);
-    ASSERT_FALSE(store(path));
-    ASSERT_FALSE(store(folder.path("b.qme")));
-    EXPECT_EQ(folder.read("a.qme"), kNew);
-    EXPECT_EQ(folder.read("b.qme"), kNew);
-    EXPECT_EQ(folder.numNames(), 2u);
-}
-
 TEST(AtomicFile, SyncsTheBytesBeforeTheNameAndTheFolderAfterIt) {
     const test::TemporaryFolder folder;
+    ASSERT_EQ(::chmod(folder.write("a.qme", kOld).c_str(), 0640), 0);
     test::FaultyFileSystem disk;
     ASSERT_FALSE(store(folder.path("a.qme")));
     const auto steps = disk.operations();
+    Qx::FileInfo info;
+    ASSERT_FALSE(Qx::fileSystem().info(folder.path("a.qme"), info));
+    EXPECT_EQ(info.permissions, 0640u);
     const auto at = [&](std::string_view text) {
         return std::find(steps.begin(), steps.end(), text) - steps.begin();
     };
@@ -67,17 +60,6 @@ TEST(AtomicFile, NothingIsTouchedWithoutACommit) {
     }
     EXPECT_EQ(folder.read("a.qme"), kOld);
     EXPECT_EQ(folder.numNames(), 1u);
-}
-
-TEST(AtomicFile, CommitEndsTheObject) {
-    const test::TemporaryFolder folder;
-    Qx::AtomicFile file(folder.path("empty"));
-    ASSERT_FALSE(file.commit());
-    EXPECT_TRUE(file.replaced());
-    EXPECT_EQ(folder.read("empty"), "");
-    EXPECT_FALSE(file.commit());
-    EXPECT_TRUE(file.write("late"));
-    EXPECT_EQ(folder.read("empty"), "");
 }
 
 TEST(AtomicFile, OverwriteStaysInsideWhatWasWritten) {
@@ -123,58 +105,52 @@ TEST(AtomicFile, ATakenTemporaryNameIsLeftAlone) {
     EXPECT_EQ(folder.read("a.qme"), kNew);
 }
 
-TEST(AtomicFile, KeepsThePermissionsOfTheOldFile) {
-    const test::TemporaryFolder folder;
-    const String path = folder.write("a.qme", kOld);
-    ASSERT_EQ(::chmod(path.c_str(), 0640), 0);
-    ASSERT_FALSE(store(path));
-    Qx::FileInfo info;
-    ASSERT_FALSE(Qx::fileSystem().info(path, info));
-    EXPECT_EQ(info.permissions, 0640u);
-}
-
-TEST(AtomicFile, LongNamesAreWritten) {
-    const test::TemporaryFolder folder;
-    const std::string name(255, 'n');
-    ASSERT_FALSE(store(folder.path(name)));
-    EXPECT_EQ(folder.read(name), kNew);
-}
-
-TEST(AtomicFile, AnyOperationMayFail) {
+TEST(AtomicFile, AnyFaultLeavesTheOldFileOrTheNew) {
     const test::TemporaryFolder folder;
     const String path = folder.path("a.qme");
-    test::FaultyFileSystem disk;
-    folder.write("a.qme", kOld);
-    ASSERT_FALSE(store(path));
-    const std::vector<String> steps = disk.operations();
-    ASSERT_GT(steps.size(), 10u);
-    for (const int code : {EIO, ENOSPC, EINTR}) {
-        for (size_t n = 1; n <= steps.size(); ++n) {
-            SCOPED_TRACE(String::format("%s fails with %d", steps[n - 1].c_str(), code));
-            folder.write("a.qme", kOld);
-            disk.reset();
-            disk.failAt(n, code);
-            const Qx::FileError error = store(path);
+    const auto setUp = [&] { return folder.write("a.qme", kOld); };
+    const auto act = [](const String& file, const auto& arm) {
+        arm();
+        return !store(file);
+    };
+    for (const Fault& fault : {Fault{Fault::Fails, EIO}, Fault{Fault::Fails, EINTR}, Fault{Fault::Killed}}) {
+        const auto check = [&](const String&, const test::Met& met) {
             const std::string found = folder.read("a.qme");
-            if (code == EINTR) {
-                EXPECT_FALSE(error) << error.text();
-            } else {
-                EXPECT_EQ(error.code, code);
-                EXPECT_FALSE(error.path.empty());
+            EXPECT_TRUE(found == kNew || (found == kOld && !met.done)) << found;
+            if (fault.kind == Fault::Fails) {
+                EXPECT_TRUE(met.done || fault.code != EINTR);
+                EXPECT_EQ(found == kNew, met.done || met.operation == "sync folder");
+                EXPECT_EQ(folder.numNames(), 1u) << "a temporary file was left";
             }
-            const bool renamed = !error || n == steps.size();
-            EXPECT_EQ(found, renamed ? kNew : kOld);
-            EXPECT_EQ(folder.numNames(), 1u) << "a temporary file was left";
-            disk.reset();
+            // What a dead process left is known for what it is, and does not stand in the way.
+            for (const auto& entry : std::filesystem::directory_iterator(folder.path().c_str())) {
+                const std::string name = entry.path().filename().string();
+                EXPECT_TRUE(name == "a.qme" || Qx::isTemporaryName(name)) << name;
+            }
             EXPECT_FALSE(store(path));
             EXPECT_EQ(folder.read("a.qme"), kNew);
-        }
+        };
+        EXPECT_GE(test::everyFault(fault, setUp, act, check), 7u);
     }
+    folder.write(".a.qme.1-0123456789abcdef.tmp", "of who knows whom");
+    EXPECT_GE(Qx::removeStaleTemporaries(folder.path()), 4u) << "those of a process that is gone";
+    EXPECT_EQ(Qx::removeStaleTemporaries(folder.path()), 0u) << "the other is young";
+    const auto before = Qx::setClock([] { return INT64_MAX; });
+    EXPECT_GT(Qx::removeStaleTemporaries(folder.path()), 0u);
+    Qx::setClock(before);
+    EXPECT_EQ(folder.numNames(), 1u);
 }
 
-TEST(AtomicFile, ADiskMayFillUpAtAnyByte) {
+TEST(AtomicFile, ShortWritesAreFinishedAndADiskMayFillUpAtAnyByte) {
     const test::TemporaryFolder folder;
     test::FaultyFileSystem disk;
+    for (const size_t most : {1u, 7u}) {
+        disk.reset();
+        disk.shortTransfers(most);
+        ASSERT_FALSE(store(folder.path(std::string(255, 'n'))));
+        EXPECT_EQ(folder.read(std::string(255, 'n')), kNew);
+    }
+    std::filesystem::remove(folder.path(std::string(255, 'n')).c_str());
     for (size_t room = 0; room < kNew.size(); ++room) {
         folder.write("a.qme", kOld);
         disk.reset();
@@ -183,54 +159,6 @@ TEST(AtomicFile, ADiskMayFillUpAtAnyByte) {
         EXPECT_EQ(folder.read("a.qme"), kOld) << room;
         EXPECT_EQ(folder.numNames(), 1u) << room;
     }
-}
-
-TEST(AtomicFile, ShortWritesAreFinished) {
-    const test::TemporaryFolder folder;
-    test::FaultyFileSystem disk;
-    for (const size_t most : {1u, 2u, 7u}) {
-        disk.reset();
-        disk.shortTransfers(most);
-        ASSERT_FALSE(store(folder.path("a.qme")));
-        EXPECT_EQ(folder.read("a.qme"), kNew);
-    }
-}
-
-TEST(AtomicFile, AProcessMayDieAtAnyOperation) {
-    const test::TemporaryFolder folder;
-    const String path = folder.path("a.qme");
-    size_t killed = 0;
-    for (size_t n = 1; n < 100; ++n) {
-        folder.write("a.qme", kOld);
-        const ChildEnd end = test::runInChild([&] {
-            test::FaultyFileSystem disk;
-            disk.killAtWrite(n);
-            return !store(path);
-        });
-        const std::string found = folder.read("a.qme");
-        ASSERT_NE(end, ChildEnd::Failed);
-        EXPECT_TRUE(found == kOld || found == kNew) << "killed at write operation " << n << ": " << found;
-        if (end == ChildEnd::Succeeded) {
-            EXPECT_EQ(found, kNew);
-            break;
-        }
-        ++killed;
-        // What the dead process left behind is known for what it is, and does not stand in the way.
-        for (const auto& entry : std::filesystem::directory_iterator(folder.path().c_str())) {
-            const std::string name = entry.path().filename().string();
-            EXPECT_TRUE(name == "a.qme" || Qx::isTemporaryName(name)) << name;
-        }
-        ASSERT_FALSE(store(path));
-        EXPECT_EQ(folder.read("a.qme"), kNew);
-    }
-    EXPECT_GE(killed, 7u);
-    folder.write(".a.qme.1-0123456789abcdef.tmp", "of who knows whom");
-    EXPECT_GE(Qx::removeStaleTemporaries(folder.path()), killed / 2) << "those of a process that is gone";
-    EXPECT_EQ(Qx::removeStaleTemporaries(folder.path()), 0u) << "the other is young";
-    const auto before = Qx::setClock([] { return INT64_MAX; });
-    EXPECT_GT(Qx::removeStaleTemporaries(folder.path()), 0u);
-    Qx::setClock(before);
-    EXPECT_EQ(folder.numNames(), 1u);
 }
 
 TEST(AtomicFile, OtherNamesAreNotTemporary) {

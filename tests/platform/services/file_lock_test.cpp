@@ -4,9 +4,7 @@
 #include "support/faulty_file_system.h"
 #include "support/temporary_folder.h"
 
-#include <atomic>
 #include <gtest/gtest.h>
-#include <thread>
 
 namespace {
 
@@ -44,30 +42,6 @@ TEST(FileLock, DiesWithItsProcess) {
     ASSERT_EQ(end, test::ChildEnd::Killed);
     Qx::FileLock lock(path);
     EXPECT_TRUE(lock.take(false));
-}
-
-TEST(FileLock, KeepsThreadsApart) {
-    const test::TemporaryFolder folder;
-    std::atomic<int> inside{0};
-    std::atomic<int> most{0};
-    int counted = 0; // guarded by the lock alone
-    std::vector<std::thread> threads;
-    for (int t = 0; t < 4; ++t) {
-        threads.emplace_back([&] {
-            for (int i = 0; i < 50; ++i) {
-                Qx::FileLock lock(folder.path("lock"));
-                ASSERT_TRUE(lock.take());
-                most = std::max(most.load(), ++inside);
-                counted = counted + 1;
-                --inside;
-            }
-        });
-    }
-    for (auto& thread : threads) {
-        thread.join();
-    }
-    EXPECT_EQ(most, 1);
-    EXPECT_EQ(counted, 200);
 }
 
 TEST(FileLock, FaultsAreToldAndInterruptionsAreNot) {

@@ -13,30 +13,6 @@ namespace {
 using Qx::FileKind;
 using Qx::OpenMode;
 
-TEST(Paths, PartsOfNames) {
-    const struct {
-        const char *path, *folder, *name, *without, *extension;
-    } cases[] = {
-        {"/a/b.qme", "/a", "b.qme", "/a/b", ".qme"},
-        {"b.qme", ".", "b.qme", "b", ".qme"},
-        {"/b", "/", "b", "/b", ""},
-        {"/a.d/b", "/a.d", "b", "/a.d/b", ""},
-        {"a/.hidden", "a", ".hidden", "a/.hidden", ""},
-        {"E0001000.qme.U1", ".", "E0001000.qme.U1", "E0001000.qme", ".U1"},
-        {"a/", "a", "", "a/", ""},
-        {"", ".", "", "", ""},
-    };
-    for (const auto& c : cases) {
-        EXPECT_EQ(Qx::folderOf(c.path), c.folder) << c.path;
-        EXPECT_EQ(Qx::fileNameOf(c.path), c.name) << c.path;
-        EXPECT_EQ(Qx::withoutExtension(c.path), c.without) << c.path;
-        EXPECT_EQ(Qx::extensionOf(c.path), c.extension) << c.path;
-    }
-    EXPECT_EQ(Qx::joinPath("/a", "b"), "/a/b");
-    EXPECT_EQ(Qx::joinPath("/a/", "b"), "/a/b");
-    EXPECT_EQ(Qx::joinPath("", "b"), "b");
-}
-
 TEST(MachineFileSystem, OpensRegularFilesOnlyAndNeverWaits) {
     const test::TemporaryFolder folder;
     folder.write("file", "x");
@@ -110,18 +86,6 @@ TEST(MachineFileSystem, TouchSetsTheTimesAskedFor) {
     EXPECT_GT(info.modifiedNs, 3000 * int64_t{1000000000});
 }
 
-TEST(MachineFileSystem, ListsInOrderOfBytes) {
-    const test::TemporaryFolder folder;
-    for (const char* name : {"b", "B", "a", ".h"}) {
-        folder.write(name, "");
-    }
-    std::vector<String> names{"untouched"};
-    EXPECT_TRUE(Qx::fileSystem().list(folder.path("none"), names));
-    EXPECT_EQ(names, std::vector<String>{"untouched"});
-    ASSERT_FALSE(Qx::fileSystem().list(folder.path(), names));
-    EXPECT_EQ(names, (std::vector<String>{".h", "B", "a", "b"}));
-}
-
 TEST(FileErrors, AreOutcomesOfAKindThatKeepTheNumber) {
     using Code = Qx::StatusCode;
     const std::pair<int, Code> cases[] = {
@@ -179,17 +143,6 @@ TEST(WholeFile, TheLimitHoldsBeforeAnythingIsRead) {
     EXPECT_FALSE(Qx::readWholeFile("/proc/self/stat", text, 4096));
     EXPECT_FALSE(text.empty());
     EXPECT_EQ(Qx::readWholeFile("/proc/self/stat", text, 4).code, EFBIG);
-}
-
-TEST(Folders, MakesAllThatLeadsThere) {
-    const test::TemporaryFolder folder;
-    ASSERT_FALSE(Qx::makeFolders(folder.path("a/b//c/")));
-    ASSERT_FALSE(Qx::makeFolders(folder.path("a/b")));
-    EXPECT_TRUE(std::filesystem::is_directory(folder.path("a/b/c").c_str()));
-    folder.write("file", "");
-    EXPECT_TRUE(Qx::makeFolders(folder.path("file")));
-    EXPECT_TRUE(Qx::makeFolders(folder.path("file/x/y")));
-    EXPECT_TRUE(Qx::makeFolders(""));
 }
 
 TEST(CopyFile, CopiesWholeOrNotAtAll) {

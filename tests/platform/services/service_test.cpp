@@ -1,4 +1,3 @@
-#include "platform/services/clock.h"
 #include "platform/services/config_int.h"
 #include "platform/services/current_project.h"
 #include "platform/services/edit_filenames.h"
@@ -45,18 +44,6 @@ TEST(Log, NothingButGraveNewsReachesStandardErrorUnasked) {
     ::unsetenv("QUILLMARCH_LOG");
     Qx::setLogSink(before);
     Qx::setStandardOutputSink(outBefore);
-}
-
-TEST(Log, ASinkThatLogsDoesNotWaitForItself) {
-    String taken;
-    const auto before = Qx::setLogSink([&](std::string_view line) {
-        taken += line;
-        herc_printf("from inside\n");
-    });
-    herc_printf("once\n");
-    herc_printf("twice\n");
-    Qx::setLogSink(before);
-    EXPECT_EQ(taken, "once\ntwice\n");
 }
 
 TEST(Log, LinesOfThreadsAreNotMixed) {
@@ -110,14 +97,6 @@ TEST(CurrentProject, NamesTheFilesOfStorableItemsOnly) {
     Qx::setCurrentProject(before);
 }
 
-TEST(Clock, CanBeReplaced) {
-    EXPECT_GT(Qx::nowSeconds(), 1700000000);
-    const auto before = Qx::setClock([] { return int64_t{5000000000}; });
-    EXPECT_EQ(Qx::nowSeconds(), 5000000000);
-    Qx::setClock(before);
-    EXPECT_LT(Qx::nowSeconds(), 5000000000);
-}
-
 TEST(Network, SeatsHearEachOtherButNotThemselves) {
     const auto first = Qx::Network::LocalService::firstSeat();
     const auto second = first->anotherSeat();
@@ -133,23 +112,6 @@ TEST(Network, SeatsHearEachOtherButNotThemselves) {
     ear2.reset();
     first->send(message);
     EXPECT_EQ(heard.size(), 2u);
-}
-
-TEST(Network, MessagesGoOutInNetworkModeOnly) {
-    const auto here = Qx::Network::LocalService::firstSeat();
-    const auto there = here->anotherSeat();
-    int heard = 0;
-    const auto ear = there->listen([&](const auto&) { ++heard; });
-    const auto before = Qx::Network::setService(here);
-    Qx::Network::send({});
-    EXPECT_EQ(heard, 0);
-    Qx::Network::setNetworkMode(true);
-    Qx::Network::send({});
-    EXPECT_EQ(heard, 1);
-    EXPECT_EQ(Qx::Network::setService(before), here);
-    Qx::Network::send({});
-    EXPECT_EQ(heard, 1);
-    Qx::Network::setNetworkMode(false);
 }
 
 } // namespace

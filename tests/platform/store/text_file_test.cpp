@@ -33,22 +33,6 @@ TEST(TextFile, TakesEveryLineEnd) {
     }
 }
 
-TEST(TextFile, FindsChangesAndRemovesLines) {
-    TextFile file;
-    file.setText("LABEL one\nthe LABEL\nLABEL two");
-    EXPECT_EQ(file.find("LABEL"), 0);
-    EXPECT_EQ(file.find("LABEL", 1), 1);
-    EXPECT_EQ(file.find("LABEL", 1, true), 2);
-    EXPECT_EQ(file.find("LABEL", 3), -1);
-    EXPECT_EQ(file.find("none"), -1);
-    EXPECT_TRUE(file.changeLine(2, "END"));
-    EXPECT_TRUE(file.removeLine(0));
-    EXPECT_FALSE(file.changeLine(2, "x"));
-    EXPECT_FALSE(file.removeLine(2));
-    EXPECT_EQ(file.text(), "the LABEL\nEND\n");
-    EXPECT_EQ(file[99], "");
-}
-
 TEST(TextFile, SavesAndLoadsWhole) {
     const test::TemporaryFolder folder;
     TextFile file;

@@ -1,5 +1,7 @@
 #include "cue_fixture.h"
-#include "edit/model/edit_registry.h"
+#include "edit/model/channel_group_list.h"
+#include "platform/store/tag_bag.h"
+#include "support/recording_registry.h"
 #include "support/temporary_folder.h"
 
 #include <cmath>
@@ -26,35 +28,26 @@ cue_list threeCues() {
 
 } // namespace
 
-TEST(CueList, CountsAndFindsByFlags) {
-    EXPECT_EQ(cue_list().get_num_cue_points(0), 0u);
+TEST(CueList, FindsAndDeletesByFlagsAndChannelInOrder) {
     EXPECT_EQ(cue_list().get_cue_point(0, 0), nullptr);
-    const cue_list list = threeCues();
-    const struct {
-        int flags;
-        std::string found;
-    } cases[] = {{0, "abc"}, {2, "bc"}, {4, "c"}, {6, "c"}, {1, ""}, {8, ""}};
-    for (const auto& c : cases) {
-        ASSERT_EQ(list.get_num_cue_points(c.flags), c.found.size()) << c.flags;
-        for (size_t i = 0; i < c.found.size(); ++i) {
-            EXPECT_EQ(list.get_cue_point(i, c.flags)->text(), c.found.substr(i, 1)) << c.flags;
-        }
-        EXPECT_EQ(list.get_cue_point(c.found.size(), c.flags), nullptr) << c.flags;
-    }
-}
-
-TEST(CueList, DeletesByFlagsAndChannelInOrder) {
     const struct {
         int flags, chan;
-        const char* left;
-    } cases[] = {{0, -1, ""},   {0, kAnyCueChan, ""}, {0, 1, "b c "},     {0, 7, "a b c "},
-                 {2, -1, "a "}, {2, 2, "a b "},       {6, 65535, "a b "}, {1, -1, "a b c "}};
+        std::string found; ///< with these flags, on any channel
+        const char* left;  ///< after those on the channel were deleted
+    } cases[] = {{0, -1, "abc", ""},      {0, kAnyCueChan, "abc", ""}, {0, 1, "abc", "b c "},
+                 {0, 7, "abc", "a b c "}, {2, -1, "bc", "a "},         {2, 2, "bc", "a b "},
+                 {4, -1, "c", "a b "},    {6, 65535, "c", "a b "},     {1, -1, "", "a b c "}};
     for (const auto& c : cases) {
+        SCOPED_TRACE(testing::Message() << c.flags << " on " << c.chan);
         cue_list list = threeCues();
-        const size_t before = list.get_num_cue_points(0);
+        ASSERT_EQ(list.get_num_cue_points(c.flags), c.found.size());
+        for (size_t i = 0; i < c.found.size(); ++i) {
+            EXPECT_EQ(list.get_cue_point(i, c.flags)->text(), c.found.substr(i, 1));
+        }
+        EXPECT_EQ(list.get_cue_point(c.found.size(), c.flags), nullptr);
         const size_t gone = list.delete_matching_cues(c.flags, c.chan);
-        EXPECT_EQ(texts(list), c.left) << c.flags << " on " << c.chan;
-        EXPECT_EQ(list.get_num_cue_points(0) + gone, before);
+        EXPECT_EQ(texts(list), c.left);
+        EXPECT_EQ(list.get_num_cue_points(0) + gone, 3u);
     }
     cue_list list = threeCues();
     EXPECT_FALSE(list.delete_cue_point(3));
@@ -202,30 +195,13 @@ TEST(CueList, ConvertAttachesAgainAfterLoading) {
     EXPECT_EQ(loaded.get_cue_point(0, 0)->editTime(), 0);
 }
 
-namespace {
-
-struct OneEditRegistry : EditRegistry {
-    EditPtr held;
-    EditRegistry* before = EditRegistry::install(this);
-    OneEditRegistry() = default;
-    OneEditRegistry(const OneEditRegistry&) = delete;
-    OneEditRegistry& operator=(const OneEditRegistry&) = delete;
-    ~OneEditRegistry() override { EditRegistry::install(before); }
-    EditPtr open(const cookie& item, eEditOpenBehaviour) override {
-        return held.valid() && item == held->get_cookie() ? held : EditPtr();
-    }
-    void addToDirtyList(const cookie&) override {}
-    void updateProjdbRec(const cookie&, bool) override {}
-};
-
-} // namespace
-
 TEST(CuePoint, FindsAndDeletesItsOriginal) {
-    OneEditRegistry registry;
-    registry.held = new Edit;
-    registry.held->set_cookie(source(2));
-    registry.held->get_cues().add_cue_point(marker("other", 102));
-    registry.held->get_cues().add_cue_point(marker("slate", 102));
+    test::RecordingRegistry registry;
+    const EditPtr held(new Edit);
+    held->set_cookie(source(2));
+    registry.add(held);
+    held->get_cues().add_cue_point(marker("other", 102));
+    held->get_cues().add_cue_point(marker("slate", 102));
     const auto video = cutList(1, {10, 10});
     const cue_point cue("slate", 12, 0, 0, {video.get()}, true);
     const cue_point elsewhere("slate", 13, 0, 0, {video.get()}, true);
@@ -239,37 +215,12 @@ TEST(CuePoint, FindsAndDeletesItsOriginal) {
     ASSERT_TRUE(cue.find_original(item, index));
     EXPECT_EQ(item, source(2));
     EXPECT_EQ(index, 1);
-    registry.held->set_read_only(true);
+    held->set_read_only(true);
     EXPECT_FALSE(cue.delete_if_original());
-    registry.held->set_read_only(false);
+    held->set_read_only(false);
     EXPECT_TRUE(cue.delete_if_original());
-    EXPECT_EQ(texts(registry.held->get_cues()), "other ");
+    EXPECT_EQ(texts(held->get_cues()), "other ");
     EXPECT_FALSE(cue.delete_if_original());
-}
-
-TEST(CueFields, TextFormsReadBack) {
-    const test::TemporaryFolder folder;
-    const String path = folder.path("fields");
-    const strp_field text(String("two\nlines"));
-    cue_flags_field flags(0xABCDEF01u);
-    tc_field time;
-    ASSERT_TRUE(time.set(0.1));
-    {
-        std::ofstream file(path, std::ios::binary);
-        EXPECT_TRUE(text.write(&file) && time.write(&file) && flags.write(&file));
-    }
-    EXPECT_EQ(folder.read("fields"), "9 0\ntwo\nlines\n0.1\nabcdef01\n");
-    std::ifstream file(path, std::ios::binary);
-    strp_field textRead;
-    cue_flags_field flagsRead;
-    tc_field timeRead;
-    EXPECT_TRUE(textRead.read(&file) && timeRead.read(&file) && flagsRead.read(&file));
-    EXPECT_EQ(textRead.get(), text.get());
-    EXPECT_EQ(timeRead.get(), 0.1);
-    EXPECT_EQ(flagsRead.get(), 0xABCDEF01u);
-    EXPECT_FALSE(flagsRead.read(&file)) << "past the end";
-    EXPECT_EQ(flagsRead.get(), 0xABCDEF01u);
-    EXPECT_FALSE(flagsRead.read(nullptr));
 }
 
 TEST(CueFields, BadTextFormsAreRefused) {
@@ -285,4 +236,67 @@ TEST(CueFields, BadTextFormsAreRefused) {
         EXPECT_EQ(text.get(), "kept");
         EXPECT_FALSE(time.read(&forTime)) << bad;
     }
+}
+
+namespace {
+
+/// A video and an audio channel with a ten-second pair each, and a cel cue on the first.
+EditPtr cuedEdit() {
+    EditPtr edit(new Edit);
+    const int video = edit->addChan(VideoChan);
+    const int audio = edit->addChan(AudioChan);
+    for (const int chan : {video, audio}) {
+        edit->get_edit_cel_p(chan)->appendEventPair(test::source(chan + 1), 100, 0, 10);
+    }
+    cue_list& cues = edit->get_cues();
+    const Vector<cel*> cels{edit->get_edit_cel_p(video), edit->get_edit_cel_p(audio)};
+    EXPECT_TRUE(cues.add_cue_point("celcue", 4, video, 0, cels, true));
+    cues.get_cue_point(0, 0)->setFlags(CueFlag::kAttached | CueFlag::kInside);
+    EXPECT_TRUE(cues.add_cue_point("attached", 5, audio, 0, cels, true));
+    cues.add_cue_point(marker("any", 6, kAnyCueChan));
+    edit->set_cel_cues_loaded(true);
+    edit->resetChangeDescription();
+    edit->set_dirty(false);
+    return edit;
+}
+
+} // namespace
+
+TEST(EditCues, CelCuesComeOffAndTheOthersStay) {
+    const EditPtr edit = cuedEdit();
+    EXPECT_TRUE(edit->cel_cues_off());
+    EXPECT_FALSE(edit->get_cel_cues_loaded());
+    EXPECT_EQ(texts(edit->get_cues()), "attached any ");
+    EXPECT_EQ(edit->getChangeDescription().type(), kCuesChanged);
+    EXPECT_TRUE(edit->get_dirty());
+    edit->set_dirty(false);
+    EXPECT_FALSE(edit->delete_all_cel_cues() || edit->deleteCues(7) || edit->deleteCue(2));
+    EXPECT_FALSE(edit->get_dirty()) << "nothing changed";
+    EXPECT_TRUE(edit->deleteCues(-1));
+    EXPECT_EQ(edit->get_cues().get_num_cue_points(0), 0u);
+}
+
+TEST(EditCues, FollowACelThatIsReplaced) {
+    const EditPtr edit = cuedEdit();
+    auto other = edit->get_edit_cel_p(1)->copy();
+    cel::IdMap ids;
+    ASSERT_TRUE(other->insert(edit->get_edit_cel_p(0), {0, 3}, 0, ids));
+    ASSERT_TRUE(edit->set_edit_cel_p(1, other.release()));
+    EXPECT_TRUE(edit->updateCues());
+    EXPECT_DOUBLE_EQ(edit->get_cues().get_cue_point(1, 0)->editTime(), 8);
+}
+
+TEST(EditCues, OnlyKeptCuesAreStored) {
+    const EditPtr edit = cuedEdit();
+    edit->storeCues();
+    EXPECT_EQ(edit->get_cues().get_num_cue_points(0), 3u);
+    ASSERT_TRUE(edit->retrieveCues());
+    EXPECT_EQ(texts(edit->get_cues()), "attached any ");
+    EXPECT_EQ(edit->get_cues().get_cue_point(0, 0)->event().get_its_cel(), edit->get_edit_cel_p(1));
+    ASSERT_TRUE(edit->removeChan(edit->getId(1), false));
+    ASSERT_TRUE(edit->retrieveCues());
+    EXPECT_EQ(edit->get_cues().get_cue_point(0, 0)->event().get_its_cel(), nullptr) << "its cel is gone";
+    edit->objectStore().storeObject("CueId", std::make_unique<ChannelGroupList>());
+    EXPECT_FALSE(edit->retrieveCues());
+    EXPECT_EQ(texts(edit->get_cues()), "attached any ") << "a list that is none changes nothing";
 }

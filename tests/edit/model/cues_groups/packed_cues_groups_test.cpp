@@ -1,10 +1,7 @@
 #include "cue_fixture.h"
 #include "edit/model/channel_group_list.h"
-#include "support/memory_meter.h"
 
 #include <gtest/gtest.h>
-#include <limits>
-#include <random>
 
 using test::packed;
 using test::unpacked;
@@ -22,18 +19,6 @@ cue_list manyCues() {
         cue.setCode(-i);
         cue.setSecondTime(i + 0.5);
         list.add_cue_point(cue);
-    }
-    return list;
-}
-
-ChannelGroupList manyGroups() {
-    ChannelGroupList list;
-    for (int i = 0; i < 8; ++i) {
-        Vector<IdStamp> chans;
-        for (int n = 0; n < 2 + i; ++n) {
-            chans.push_back(IdStamp::fresh(IdStampMagic::Channel));
-        }
-        list.addGroup(chans, static_cast<ChannelGroup::eType>(i));
     }
     return list;
 }
@@ -174,83 +159,4 @@ TEST(PackedGroups, SmallGroupsAreDroppedAndBadFormsRefused) {
     PStream in(stream.bytes());
     ASSERT_TRUE(built->STRM_hierarchyUnpack(in));
     EXPECT_TRUE(dynamic_cast<const ChannelGroupList&>(*built) == read);
-}
-
-namespace {
-
-/// Unpacks, and sees that it takes no more memory than four times the input and a constant.
-template <typename List>
-bool unpackedWithinBounds(List& list, const std::vector<std::byte>& bytes) {
-    const test::MemoryMeter meter;
-    const bool good = unpacked(list, bytes);
-    EXPECT_LE(meter.peak(), 4 * bytes.size() + (64u << 10)) << bytes.size() << " bytes";
-    return good;
-}
-
-/// Ten million bytes, half of them random and half good forms with random damage, in pieces.
-template <typename List>
-void throwBytesAt(const List& good, unsigned seed) {
-    std::mt19937_64 random(seed);
-    const auto form = packed(good);
-    size_t read = 0;
-    for (size_t thrown = 0; thrown < 10'000'000;) {
-        std::vector<std::byte> bytes;
-        if (random() % 2 == 0) {
-            bytes.resize(1 + random() % 4096);
-            for (auto& byte : bytes) {
-                byte = static_cast<std::byte>(random());
-            }
-            bytes[std::min<size_t>(2, bytes.size() - 1)] = bytes[bytes.size() - 1] = std::byte{0};
-        } else {
-            bytes = form;
-            for (uint64_t n = random() % 4; n > 0; --n) {
-                bytes[random() % bytes.size()] = static_cast<std::byte>(random());
-            }
-        }
-        thrown += bytes.size();
-        List list;
-        if (unpackedWithinBounds(list, bytes)) {
-            List again;
-            ASSERT_TRUE(unpacked(again, packed(list))) << "seed " << seed << " at " << thrown;
-            ASSERT_EQ(packed(again), packed(list)) << "seed " << seed << " at " << thrown;
-            ++read;
-        }
-    }
-    EXPECT_GT(read, 100u) << "some of the damage leaves a good form";
-}
-
-} // namespace
-
-TEST(PackedForms, TheSmallestItemsTakeBoundedMemory) {
-    // What is smallest in a stream grows the most in memory.
-    cue_list cues;
-    cues.add_cue_point(test::marker("", 0));
-    auto many = packed(cues);
-    const std::vector<std::byte> cue(many.begin() + 4, many.end() - 4);
-    const std::vector<std::byte> end(many.end() - 4, many.end());
-    constexpr unsigned kItems = 50'000;
-    const auto repeated = [](const std::vector<std::byte>& item, const std::vector<std::byte>& tail) {
-        PStream stream;
-        stream.setUnsignedLong(kItems);
-        for (unsigned i = 0; i < kItems; ++i) {
-            stream.setRaw(item.data(), item.size());
-        }
-        stream.setRaw(tail.data(), tail.size());
-        return stream.bytes();
-    };
-    cue_list readCues;
-    EXPECT_TRUE(unpackedWithinBounds(readCues, repeated(cue, end)));
-    EXPECT_EQ(readCues.get_num_cue_points(0), kItems);
-
-    ChannelGroupList groups;
-    groups.addGroup({IdStamp::fresh(IdStampMagic::Channel), IdStamp::fresh(IdStampMagic::Channel)},
-                    ChannelGroup::eStereo);
-    many = packed(groups);
-    ChannelGroupList readGroups;
-    EXPECT_TRUE(unpackedWithinBounds(readGroups, repeated({many.begin() + 4, many.end()}, {})));
-}
-
-TEST(PackedForms, TenMillionRandomBytes) {
-    throwBytesAt(manyCues(), 11);
-    throwBytesAt(manyGroups(), 12);
 }

@@ -6,9 +6,9 @@
 
 /// Collects, a line each, what of a damaged file is lost. It reads the edit's header and store and changes
 /// nothing of them.
-class EditFile::Salvaging {
+class EditFile::Salvager {
 public:
-    Salvaging(std::vector<String>& lost, bool mayScan) : m_lost(lost), m_mayScan(mayScan) {}
+    Salvager(std::vector<String>& lost, bool mayScan) : m_lost(lost), m_mayScan(mayScan) {}
 
     /// True if a file without a whole table is searched for objects.
     [[nodiscard]] bool mayScan() const { return m_mayScan; }
