@@ -194,7 +194,8 @@ bool TagBag::Contents::unpack(const Entry& entry, Streamable& object) {
     } else if (objectStatus) {
         objectStatus =
             Qx::Status::failure(Qx::StatusCode::Damaged,
-                                who + " does not hold what an object of class " + quoted(object.layerName()) +
+                                "object " + quoted(entry.name) + " of " + path() +
+                                    " does not hold what an object of class " + quoted(object.layerName()) +
                                     " is made of; it was written by another program or another class");
     }
     return false;
