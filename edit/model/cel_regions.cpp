@@ -10,8 +10,12 @@ bool isUsableRange(const cel::Range& range) {
     return isUsableTime(range.start()) && isUsableTime(range.end()) && !isNotPast(range.end(), range.start());
 }
 
-/// A fresh stamp for what was copied or cut from an event: of one that shows an effect, a node's again.
+/// The stamp of what was copied or cut from an event. One that shows a channel has that channel's; any other
+/// gets a fresh one, of one that shows an effect a node's again.
 IdStamp freshLike(const IdStamp& old) {
+    if (old.valid() && old.getMagicType() == IdStampMagic::Channel) {
+        return old;
+    }
     const bool isEffect = old.valid() && old.getMagicType() == IdStampMagic::EffectNode;
     return IdStamp::fresh(isEffect ? IdStampMagic::EffectNode : IdStampMagic::Material);
 }
