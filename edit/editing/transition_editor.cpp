@@ -27,39 +27,6 @@ std::optional<Range> extentOf(const cookie& strip) {
     return extent.length() > kTimeTolerance ? std::optional(extent) : std::nullopt;
 }
 
-/// How long a clip that plays on to `time`, beyond an end of its own, would have nothing to play.
-double missingAt(const channel_event& in, double time, double needed, bool& known) {
-    if (in.strip.isBlack() || in.velocity == 0) {
-        return 0;
-    }
-    const std::optional<Range> extent = extentOf(in.strip);
-    known = extent.has_value();
-    if (!known) {
-        return 0;
-    }
-    const double strip = in.stripTime + (time - in.editTime) * in.velocity;
-    const double beyond = std::max({strip - extent->end(), extent->start() - strip, 0.0});
-    const double missing = beyond / std::abs(in.velocity);
-    return missing <= kTimeTolerance ? 0 : std::min(missing, needed);
-}
-
-TransitionHandles handlesIn(const cel& channel, int pair) {
-    TransitionHandles handles;
-    const channel_event* const its = channel.getChanEventPtr(2 * pair);
-    const channel_event* const out = channel.getChanEventPtr(2 * pair - 2);
-    const channel_event* const in = channel.getChanEventPtr(2 * pair + 2);
-    const double length = its[1].editTime - its[0].editTime;
-    if (out != nullptr && its[0].editTime - out[1].editTime <= kTimeTolerance) {
-        handles.needed[0] = length;
-        handles.missing[0] = missingAt(*out, its[1].editTime, length, handles.known[0]);
-    }
-    if (in != nullptr && in->editTime - its[1].editTime <= kTimeTolerance) {
-        handles.needed[1] = length;
-        handles.missing[1] = missingAt(*in, its[0].editTime, length, handles.known[1]);
-    }
-    return handles;
-}
-
 /// Number of the pair that shows a transition at a time; -1 if none does.
 int pairAt(Edit& edit, const cel& channel, double at) {
     const ce_handle in = channel.find_ceh(at, CE_IN_POINT);
@@ -245,7 +212,7 @@ bool Change::checkHandles() {
     while (pair > 0 && m_changed->getChanEventPtr(2 * pair)->id != m_result.event) {
         --pair;
     }
-    m_result.handles = handlesIn(*m_changed, pair);
+    m_result.handles = Transitions::handlesOf(*m_changed, pair, extentOf);
     m_result.notice.clear();
     String lacks;
     for (const int side : {0, 1}) {
@@ -354,7 +321,8 @@ ce_handle TransitionEditor::find(const EditPtr& edit, const IdStamp& chan, doubl
     return pair < 0 ? ce_handle() : ce_handle(content, 2 * pair);
 }
 
-TransitionHandles TransitionEditor::handlesOf(const EditPtr& edit, const IdStamp& chan, double at) {
+Transitions::Handles TransitionEditor::handlesOf(const EditPtr& edit, const IdStamp& chan, double at) {
     const ce_handle in = find(edit, chan, at);
-    return in.valid() != 0 ? handlesIn(*in.get_its_cel(), in.index() / 2) : TransitionHandles();
+    return in.valid() != 0 ? Transitions::handlesOf(*in.get_its_cel(), in.index() / 2, extentOf)
+                           : Transitions::Handles();
 }

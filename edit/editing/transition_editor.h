@@ -2,6 +2,7 @@
 
 #include "edit/model/cel.h"
 #include "edit/model/edit_ptr.h"
+#include "edit/model/transition.h"
 #include "platform/effects/effect_instance.h"
 
 /// Where a transition lies about the cut that it covers. Here it is four seconds long, and the cut of A and B
@@ -15,18 +16,6 @@ enum class TransitionAlign { Start, Centre, End };
 
 /// "start", "centre" (also "center") and "end", without regard to case. False, leaving `align`, for others.
 [[nodiscard]] QM_API bool transitionAlignFromText(std::string_view text, TransitionAlign& align);
-
-/// How much material a transition needs beyond the ends of the two clips that it joins, and what is missing.
-struct TransitionHandles {
-    double needed[2] = {
-        0, 0}; ///< seconds of edit time: of what goes out behind its cut, of what comes in before
-    double missing[2] = {0, 0}; ///< of those, what the material does not have
-    /// False where the length of the material cannot be told: nothing is said to be missing then.
-    bool known[2] = {true, true};
-    [[nodiscard]] bool enough() const {
-        return missing[0] <= Qx::kTimeTolerance && missing[1] <= Qx::kTimeTolerance;
-    }
-};
 
 /// Lays, changes and takes out transitions: event pairs between the clips that they join, on the clips' own
 /// channel (video or audio), whose effect has two inputs that are not wired.
@@ -54,11 +43,11 @@ public:
     /// The outcome. The default is that of an operation that did nothing.
     struct Result {
         bool done = false;
-        String reason;             ///< why it was refused: one line for a person
-        String notice;             ///< what a person should know of one that was done; mostly empty
-        IdStamp event;             ///< of the transition: the stamp of its in event and of its node
-        cel::Range range;          ///< where it lies, or lay
-        TransitionHandles handles; ///< what it needs
+        String reason;                ///< why it was refused: one line for a person
+        String notice;                ///< what a person should know of one that was done; mostly empty
+        IdStamp event;                ///< of the transition: the stamp of its in event and of its node
+        cel::Range range;             ///< where it lies, or lay
+        Transitions::Handles handles; ///< what it needs
     };
 
     /// Lays a transition over the cut at `at` between two clips, or a clip and black or nothing (a fade in or
@@ -81,7 +70,7 @@ public:
     /// The in event of the transition that plays at a time; invalid if none does.
     [[nodiscard]] static ce_handle find(const EditPtr& edit, const IdStamp& chan, double at);
     /// What the transition that plays at a time needs.
-    [[nodiscard]] static TransitionHandles handlesOf(const EditPtr& edit, const IdStamp& chan, double at);
+    [[nodiscard]] static Transitions::Handles handlesOf(const EditPtr& edit, const IdStamp& chan, double at);
 
     TransitionEditor() = delete;
 };

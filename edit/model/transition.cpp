@@ -47,6 +47,23 @@ void append(Events& events, const Pair& pair) {
     events.insert(events.end(), pair.begin(), pair.end());
 }
 
+/// How long a clip that plays on to `time`, beyond an end of its own, would have nothing to play.
+double missingAt(const channel_event& in, double time, double needed,
+                 const Transitions::MaterialExtent& extentOf, bool& known) {
+    if (in.strip.isBlack() || in.velocity == 0) {
+        return 0;
+    }
+    const std::optional<cel::Range> extent = extentOf(in.strip);
+    known = extent.has_value();
+    if (!known) {
+        return 0;
+    }
+    const double strip = in.stripTime + (time - in.editTime) * in.velocity;
+    const double beyond = std::max({strip - extent->end(), extent->start() - strip, 0.0});
+    const double missing = beyond / std::abs(in.velocity);
+    return missing <= kTolerance ? 0 : std::min(missing, needed);
+}
+
 } // namespace
 
 bool Transitions::isTransition(TagBag& objects, const channel_event& in, bool missingToo) {
@@ -132,4 +149,21 @@ bool Transitions::resolve(cel& channel, int pair, double at) {
     }
     const int before = outIsThere ? 1 : 0;
     return channel.replacePairs(pair - before, 1 + before + (inIsThere ? 1 : 0), events);
+}
+
+Transitions::Handles Transitions::handlesOf(const cel& channel, int pair, const MaterialExtent& extentOf) {
+    Handles handles;
+    const channel_event* const its = channel.getChanEventPtr(2 * pair);
+    const channel_event* const out = channel.getChanEventPtr(2 * pair - 2);
+    const channel_event* const in = channel.getChanEventPtr(2 * pair + 2);
+    const double length = its[1].editTime - its[0].editTime;
+    if (out != nullptr && its[0].editTime - out[1].editTime <= kTolerance) {
+        handles.needed[0] = length;
+        handles.missing[0] = missingAt(*out, its[1].editTime, length, extentOf, handles.known[0]);
+    }
+    if (in != nullptr && in->editTime - its[1].editTime <= kTolerance) {
+        handles.needed[1] = length;
+        handles.missing[1] = missingAt(*in, its[0].editTime, length, extentOf, handles.known[1]);
+    }
+    return handles;
 }

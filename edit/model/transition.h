@@ -3,6 +3,8 @@
 #include "edit/model/cel.h"
 #include "platform/store/tag_bag.h"
 
+#include <optional>
+
 /// Transitions as they lie in a cel: an event pair between the pairs of the two clips that it joins, touching
 /// both, whose strip is `effect_graph_cookie` and whose in event's stamp is that of an effect with two inputs
 /// which are not wired.
@@ -13,6 +15,20 @@
 ///
 /// What an edit has to say to it (undo, notification, orphans) is for the caller.
 namespace Transitions {
+
+/// Tells the span of an item that can be played, by the item's own clock; nothing where that is not known.
+using MaterialExtent = std::function<std::optional<cel::Range>(const cookie& strip)>;
+
+/// How much material a transition needs beyond the ends of the two clips that it joins, and what is missing.
+/// Index 0 is what goes out, behind its end; 1 what comes in, before its start.
+struct Handles {
+    double needed[2] = {0, 0};  ///< seconds of edit time
+    double missing[2] = {0, 0}; ///< of those, what the material does not have; 0 where that is not known
+    bool known[2] = {true, true};
+    [[nodiscard]] bool enough() const { return missing[0] <= 0 && missing[1] <= 0; }
+};
+/// For the transition of pair number `pair`. Black lacks nothing, and neither does a freeze.
+[[nodiscard]] QM_API Handles handlesOf(const cel& channel, int pair, const MaterialExtent& extentOf);
 
 /// True if an in event shows a transition: its node's inputs are its neighbours on the channel. `objects` is
 /// where its node lies. An event whose node is not there counts as one on a channel of pictures or sound, and is what
