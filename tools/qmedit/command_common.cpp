@@ -9,7 +9,9 @@
 const std::vector<CommandGroup>& allCommands() {
     static const std::vector<CommandGroup> groups{
         {"Look", {listCommand(), showCommand(), headerCommand(), diffCommand(), historyCommand()}},
-        {"Change", {newCommand(), applyCommand(), renameCommand(), markerCommand(), deleteCommand()}},
+        {"Change",
+         {newCommand(), applyCommand(), renameCommand(), markerCommand(), transitionCommand(),
+          deleteCommand()}},
         {"Go back", {backupCommand(), undoCommand(), redoCommand()}},
         {"Repair", {verifyCommand(), recoverCommand(), salvageCommand()}},
         {"Project", {purgeCommand(), flushCommand()}},
