@@ -108,7 +108,7 @@ int runDemo(String project) {
         {"show", evening.asString()},
         {"apply", "replace", "--from", evening.asString() + "@5s-9s", "--to", day.asString() + "@01:00:42:00",
          "--channels", "V"},
-        {"transition", "add", day.asString() + "@01:00:42:00", "--kind", "wipe:1", "--length", "1s",
+        {"transition", "add", day.asString() + "@01:00:46:00", "--kind", "wipe:1", "--length", "12f",
          "--align", "end"},
         {"show", day.asString()},
         {"flush"},
