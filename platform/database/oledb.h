@@ -25,6 +25,18 @@ public:
         Damaged = 3    ///< the file is no table of this kind, is damaged, or has other columns
     };
 
+    /// What is done with a sound table whose columns are others.
+    enum OtherColumns {
+        Refuse,   ///< the answer is `Damaged`
+        MakeAgain ///< one that has only some of the columns is of an earlier version: its records go
+    };
+    /// One field of a record and what its text is to be, without regard to the case of ASCII letters. In the
+    /// pattern '*' stands for any text, also an empty one, and '?' for one character.
+    struct Condition {
+        int column = 0;
+        String pattern;
+    };
+
     oledb();
     ~oledb();
     oledb(const oledb&) = delete;
@@ -32,7 +44,7 @@ public:
 
     /// Opens the table in a file, or makes it. Columns are matched by name without regard to case; their
     /// names may hold blanks. On a result other than 0 and 2 nothing is open.
-    OpenResult open(const String& path, const std::vector<String>& columns);
+    OpenResult open(const String& path, const std::vector<String>& columns, OtherColumns others = Refuse);
     void close();
     [[nodiscard]] bool isOpen() const;
     /// One sentence on the last failure.
@@ -57,6 +69,13 @@ public:
     void forEachRecord(
         const std::function<bool(const String& key, const std::vector<String>& fields)>& callback) const;
 
+    /// Hands over the records that match every condition, in the order of keys, until the callback answers
+    /// false. The callback must not use the table. Fails for a column that is none and where the table
+    /// cannot be read.
+    Qx::Status
+    select(const std::vector<Condition>& conditions,
+           const std::function<bool(const String& key, const std::vector<String>& fields)>& callback) const;
+
     /// Named values beside the records. False, leaving `value`, if there is none of that name.
     [[nodiscard]] bool getValue(const String& name, String& value) const;
     Qx::Status setValue(const String& name, const String& value);
@@ -78,6 +97,7 @@ public:
 
 private:
     class Connection;
+    [[nodiscard]] static bool isEarlier(const std::vector<String>& found, const std::vector<String>& columns);
     std::unique_ptr<Connection> m_connection;
     std::vector<String> m_columns;
     String m_error;
