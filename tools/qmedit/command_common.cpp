@@ -4,10 +4,11 @@
 
 const std::vector<Command>& allCommands() {
     static const std::vector<Command> commands{
-        importCommand(), exportCommand(), listCommand(),      showCommand(),    headerCommand(),
-        applyCommand(),  diffCommand(),   verifyCommand(),    salvageCommand(), historyCommand(),
-        backupCommand(), undoCommand(),   redoCommand(),      recoverCommand(), deleteCommand(),
-        flushCommand(),  demoCommand(),   completionCommand()};
+        importCommand(),    exportCommand(),  listCommand(),    findCommand(),   logCommand(),
+        showCommand(),      headerCommand(),  applyCommand(),   diffCommand(),   verifyCommand(),
+        upgradeCommand(),   salvageCommand(), historyCommand(), backupCommand(), undoCommand(),
+        redoCommand(),      recoverCommand(), deleteCommand(),  flushCommand(),  demoCommand(),
+        completionCommand()};
     return commands;
 }
 

@@ -3,6 +3,7 @@
 #include "tools/qmedit/console.h"
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/event_table.h"
+#include "tools/qmedit/label_table.h"
 #include "tools/qmedit/project_session.h"
 #include "tools/qmedit/track_picture.h"
 
@@ -40,6 +41,13 @@ int showEdit(const ShowOptions& options) {
     }
     const EditReport report = reportOf(*edit, session.sourceNamer());
     reportMissingShots(report);
+    if (!options.labels.empty() || !options.burnIn.empty()) {
+        EventLabels labels(*edit, [&session](const cookie& strip) {
+            EditPtr source;
+            return session.readEdit(strip, source) ? source : EditPtr();
+        });
+        return showLabels(report, options, labels);
+    }
     if (options.json) {
         writeOut(editJson(report));
         return kDone;
@@ -73,7 +81,15 @@ Command showCommand() {
              {.name = "--events",
               .value = &options->allEvents,
               .help = "List every event, however many there are",
-              .excludes = "--json"}},
+              .excludes = "--json"},
+             {.name = "--label",
+              .value = &options->labels,
+              .help = "List the events with these labels at their ends: KeyKode, 24P_Timecode, reelid, ...",
+              .form = "NAME"},
+             {.name = "--burnin",
+              .value = &options->burnIn,
+              .help = "What a burnt-in display reads at this timecode",
+              .form = "TIMECODE"}},
             "Example:\n  qmedit show E0001000 --events | less -R\n\n"
             "The picture is as wide as the terminal, or as $COLUMNS says.",
             [options, text] {

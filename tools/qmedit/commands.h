@@ -4,6 +4,7 @@
 #include "platform/base/qx_string.h"
 #include "platform/base/status.h"
 
+#include <string>
 #include <vector>
 
 struct Command;
@@ -18,11 +19,14 @@ enum ExitCode : int { kDone = 0, kFailed = 1, kWrongUsage = 2 };
 Command importCommand();
 Command exportCommand();
 Command listCommand();
+Command findCommand();
+Command logCommand();
 Command showCommand();
 Command headerCommand();
 Command applyCommand();
 Command diffCommand();
 Command verifyCommand();
+Command upgradeCommand();
 Command salvageCommand();
 Command historyCommand();
 Command backupCommand();
@@ -57,6 +61,8 @@ struct ShowOptions {
     cookie item;
     bool json = false;
     bool allEvents = false;
+    std::vector<std::string> labels = {}; ///< to be shown beside the events, in their place
+    std::string burnIn = {};              ///< a record timecode
 };
 int showEdit(const ShowOptions& options);
 /// Draws an edit on standard output, without its table of events.

@@ -3,6 +3,7 @@
 #include "edit/manager/edit_record.h"
 #include "edit/manager/leftovers.h"
 #include "edit/manager/revision_chain.h"
+#include "edit/material/log_attributes.h"
 #include "edit/persist/edit_init.h"
 #include "edit/persist/edit_salvage.h"
 #include "edit/project/project_details.h"
@@ -374,5 +375,5 @@ ProjectSession::Known ProjectSession::look(const cookie& item) const {
     if (const Qx::Status read = readEdit(item, edit); !read) {
         return {{}, read.reason(), false};
     }
-    return {edit->getName(), {}, edit->isDropFrame(false)};
+    return {edit->getAttribute(LogAttribute::kName), {}, edit->isDropFrame(false)};
 }
