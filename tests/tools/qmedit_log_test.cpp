@@ -34,6 +34,7 @@ TEST_F(QmeditLog, IsShownSetFoundAndTakenBack) {
     EXPECT_EQ(found[0]["cookie"], item);
     EXPECT_EQ(found[0]["24P reel"], "R 1");
     EXPECT_EQ(lines(run({"find", "type=shot"}).out), 3U) << "a heading and two shots";
+    EXPECT_EQ(lines(run({"find", "reel=r1", "type=shot"}).out), 2U) << "the reel came with the import";
     EXPECT_EQ(run({"find", "nothing=1"}).code, 2);
     EXPECT_EQ(run({"undo", item}).code, 0);
     EXPECT_EQ(lines(run({"find", "scene=12A"}).out), 1U);
