@@ -106,7 +106,7 @@ TEST_F(QmeditChange, PurgeTakesTheShotsThatNoStateOfAnEditPlays) {
     EXPECT_NE(listed.find(harbour + "  harbour"), String::npos) << listed;
     EXPECT_EQ(snapshot(), before);
 
-    const String second = imported(kShortList);
+    const String second = imported(kShortList, {"--new-shots"});
     std::filesystem::copy_file(fileOf(second), fileOf(second) + ".U1");
     std::filesystem::resize_file(fileOf(second) + ".U1", 3000);
     const test::ProgramResult refused = run({"purge"});

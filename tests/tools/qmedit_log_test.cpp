@@ -50,7 +50,7 @@ TEST_F(QmeditLog, ACurrentProjectNeedsNoUpgrade) {
     EXPECT_EQ(json[0]["outcome"], "current");
     EXPECT_EQ(snapshot(), before);
     EXPECT_EQ(run({"upgrade", "E0ZZ0000"}).code, 1);
-    EXPECT_EQ(run({"upgrade", "no cookie"}).code, 2);
+    EXPECT_EQ(run({"upgrade", "no such name"}).code, 1);
 }
 
 TEST_F(QmeditLog, LabelsStandBesideTheEvents) {
