@@ -257,7 +257,7 @@ bool Editor::Planner::addSourceSteps(Target target, const EditModule& destinatio
     if (!findLay(target, destination, lay)) {
         return false;
     }
-    const Edit& edit = *m_source.getEdit();
+    Edit& edit = *m_source.getEdit();
     const size_t index = addTarget(target);
     if (m_core == kCoreInsert) {
         addInsert(index, lay);

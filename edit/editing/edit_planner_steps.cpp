@@ -196,12 +196,17 @@ std::shared_ptr<cel> Editor::Planner::onFrames(const std::shared_ptr<cel>& part)
 
 /// A step that overwrites with a part of a channel, with the levels that are heard there. The step lies
 /// `lead` seconds behind a frame of the destination.
-void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, const IdStamp& chan,
+void Editor::Planner::addCopyStep(size_t target, double at, Edit& from, const IdStamp& chan,
                                   const Range& region, double lead) {
     Target& events = m_plan->targets[target];
-    std::shared_ptr<cel> part =
-        takePart(from.get_edit_cel_p(from.getIdx(chan)), region, isContinuous(events.type), lead);
+    const cel* const content = from.get_edit_cel_p(from.getIdx(chan));
     const bool refers = from.isShot() && from.get_cookie().isStorable() && &from != &*m_destination.getEdit();
+    editing_detail::WholeEnds ends;
+    if (content != nullptr && isContinuous(events.type) && !refers) {
+        ends = editing_detail::wholeEnds(*content, region, from.objectStore());
+    }
+    std::shared_ptr<cel> part = takePart(ends.channel != nullptr ? ends.channel.get() : content, region,
+                                         isContinuous(events.type), lead);
     if (refers && part != nullptr) {
         part = referTo(from.get_cookie(), *part, region.start());
     }
@@ -215,6 +220,11 @@ void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, co
     }
     addStep(kCoreReplace, target, at, region.length(), part);
     Step& step = m_plan->steps.back();
+    if (!refers && content != nullptr) {
+        takeObjects(step, from, *content, region);
+        step.blackBefore = ends.blackBefore;
+        step.blackAfter = ends.blackAfter;
+    }
     if (events.type.type != AudioChan || !step.withLevels) {
         return;
     }
@@ -228,6 +238,24 @@ void Editor::Planner::addCopyStep(size_t target, double at, const Edit& from, co
     } else if (events.levels.valid() || events.needsLevels) {
         step.levels = AudLevelsCel::create();
         step.levels.replaceClipNodes(AudCel(part, IdStamp()));
+    }
+}
+
+/// Copies what is bound to the events of a step's part. It is the plan's own: what the operation does to the
+/// source meanwhile changes nothing of it.
+void Editor::Planner::takeObjects(Step& step, Edit& from, const cel& content, const Range& region) {
+    TagBag& objects = from.objectStore();
+    std::vector<EventObjects::Bound> bound;
+    EventObjects::listBound(content, objects, region, bound);
+    for (EventObjects::Bound& event : bound) {
+        const Range range(event.range.start() - region.start(), event.range.end() - region.start());
+        event.range = changesRate() ? Range(rounded(range.start()), rounded(range.end())) : range;
+        if (step.objects == nullptr) {
+            step.objects = std::make_shared<TagBag>();
+        }
+        if (EventObjects::copy(objects, event.id, *step.objects, event.id)) {
+            step.bound.push_back(event);
+        }
     }
 }
 

@@ -80,7 +80,7 @@ bool Editor::Planner::planInterTrack() {
 /// A step that lays a region of one channel at the same times of another, as far as that reaches: no channel
 /// becomes longer. False with the refusal set if something would be left out so.
 bool Editor::Planner::addFittingStep(const IdStamp& from, const IdStamp& to, const Range& region) {
-    const Edit& edit = *m_destination.getEdit();
+    Edit& edit = *m_destination.getEdit();
     const cel* const content = edit.get_edit_cel_p(edit.getIdx(from));
     const double reach = std::clamp(endOf(to), region.start(), region.end());
     Target target;

@@ -1,6 +1,7 @@
 #include "edit/editing/editor.h"
 
 #include "edit/editing/detail/cue_follower.h"
+#include "edit/editing/detail/object_follower.h"
 #include "edit/manager/edit_manager.h"
 #include "edit/model/cue_list.h"
 #include "edit/model/edit_keys.h"
@@ -57,8 +58,9 @@ Editor::Result Editor::applyInternal(const EditModule& source, const EditModule&
         performEdit(op, result);
     }
     result.m_type = edit.getNumChans() == numChans ? m_type : kChansInserted;
-    result.m_notice =
-        m_notice + (m_notice.empty() || m_clipboardNotice.empty() ? "" : "; ") + m_clipboardNotice;
+    for (const String* const notice : {&m_notice, &m_effectsNotice, &m_clipboardNotice}) {
+        result.m_notice += (result.m_notice.empty() || notice->empty() ? "" : "; ") + *notice;
+    }
     doPostEditTasks(result);
     return result;
 }
@@ -97,19 +99,23 @@ bool Editor::makePlan(const EditModule& source, edit_operation op) {
     return m_plan != nullptr;
 }
 
-/// Makes the revision that undo goes back to. False, with nothing changed, if the manager has the edit and
-/// cannot.
-bool Editor::backUp() {
-    const EditPtr& edit = m_destination.getEdit();
+bool editing_detail::makeRevision(const EditPtr& edit, Qx::Status& refusal) {
     const cookie item = edit->get_cookie();
     const bool managed = edit_manager::theEditManager() != nullptr && edit_manager::get_present(item) &&
                          edit_manager::openEdit(item, eOpenExisting) == edit;
-    if (managed && (m_flags & NoBackup) == 0) {
+    if (managed) {
         if (const Qx::Status kept = edit_manager::backup_edit(item); !kept) {
-            m_refusal = kept.retold("the edit " + item.asString() +
-                                    " cannot be backed up, so nothing was changed: " + kept.reason());
+            refusal = kept.retold("the edit " + item.asString() +
+                                  " cannot be backed up, so nothing was changed: " + kept.reason());
             return false;
         }
+    }
+    return true;
+}
+
+bool Editor::backUp() {
+    if ((m_flags & NoBackup) == 0 && !editing_detail::makeRevision(m_destination.getEdit(), m_refusal)) {
+        return false;
     }
     const bool together = config_int("undo_clipboard", 1) != 0;
     if (m_clipboardReady && together) {
@@ -139,10 +145,14 @@ void Editor::perform(edit_operation op, Result& result) {
     doClipboardEditing(op);
     autoAddLevels();
     CueFollower cues(*m_destination.getEdit(), *m_plan, op);
-    makeChanges(op, cues);
+    ObjectFollower objects(*m_destination.getEdit(), *m_plan, op,
+                           m_source == m_destination.getEdit() ? nullptr : &m_map);
+    makeChanges(op, cues, objects);
     cues.follow();
     padTracksWithBlack(op);
     simplifyBlack();
+    objects.finish();
+    m_effectsNotice = objects.notice();
     m_destination.getEdit()->get_cues().update_edit_time();
     verifyTracks();
     m_destination.getEdit()->verifyAudioNodes();

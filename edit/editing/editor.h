@@ -65,8 +65,19 @@
 /// what moves is heard as before. A levels channel is added where the source has levels and the destination
 /// has none. `ReplaceMaterial` leaves the levels.
 ///
-/// **Effects** bound to events, objects of the edit's store under the event's stamp, are copied with the
-/// events, and bound to both parts of an event that is cut in two.
+/// **Effects** bound to events, graphs in the edit's store under the event's stamp, are copied with the events,
+/// all nodes of them. An event that is cut in two leaves both parts with a graph of their own, each with its part
+/// of the keyframes. Inputs of what is copied to another edit name the channels there that correspond; those
+/// that have none are not wired. What loses its event is noted in the edit's `OrphanedComponentList`.
+///
+/// **Transitions** (edit/model/transition.h) stay while both their clips do. One that is cut through, that
+/// something comes to lie beside, or a clip of which goes, is taken out first: the clip that stays plays on
+/// alone to the cut, and `Result::notice` says so. A clip may be trimmed at the transition by a removal: the
+/// transition then joins what is left of it. Here '-' is the transition of A and B:
+///
+///     AAAA----BBBB    Insert "cc" at 6    AAAAAAccBBBBBB
+///     AAAA----BBBB    Remove [2, 4)       AA----BBBB
+///     AAAA----BBBB    Remove [0, 4)       BBBBBBBB
 ///
 /// **Cues** that are attached follow their events, by `SwapTracks` and `MoveTrack` also to the other channel,
 /// and go with an event that goes; a cue that is attached to nothing stays where it is.
@@ -122,7 +133,7 @@ public:
         /// Its sentence: one line for a person, empty when it was done.
         [[nodiscard]] const String& reason() const { return m_status.reason(); }
         /// What a person should know of an operation that was done: one line; empty when it was done just as
-        /// asked. It tells that cuts were moved to whole frames (see Frames).
+        /// asked. It tells that cuts were moved to whole frames (see Frames) and transitions taken out.
         [[nodiscard]] const String& notice() const { return m_notice; }
 
     private:
@@ -172,6 +183,7 @@ private:
     struct Plan;
     class Planner;
     class CueFollower;
+    class ObjectFollower;
     using SrcToDestChanMap = std::map<IdStamp, IdStamp>;
 
     explicit Editor(unsigned flags);
@@ -190,8 +202,7 @@ private:
     void performEdit(const EditModule& source, edit_operation op, Result& result);
     void performEdit(edit_operation op, Result& result);
     void perform(edit_operation op, Result& result);
-    void makeChanges(edit_operation op, CueFollower& cues);
-    void bindEffects(const cel::IdMap& copied, const cel::Splits& splits);
+    void makeChanges(edit_operation op, CueFollower& cues, ObjectFollower& objects);
     void padTracksWithBlack(edit_operation op);
     void simplifyBlack();
     void noteTouched(const IdStamp& chan, const cel::Range& span);
@@ -220,4 +231,5 @@ private:
     Qx::Status m_refusal;
     String m_notice;
     String m_clipboardNotice;
+    String m_effectsNotice;
 };

@@ -2,6 +2,7 @@
 #include "edit/manager/edit_manager.h"
 #include "edit/model/cue_list.h"
 #include "edit/model/edit_keys.h"
+#include "platform/effects/orphaned_component_list.h"
 #include "platform/services/log.h"
 
 #include <algorithm>
@@ -14,22 +15,40 @@ namespace {
 
 /// Takes out what the clipboard holds, with the objects bound to its events.
 void clearClipboard(Edit& clipboard) {
-    clipboard.removeChans(false);
     clipboard.get_cues().delete_all_cues();
     for (const String& name : clipboard.objectStore().names()) {
-        if (IdStamp(name).valid() && IdStamp(name).getMagicType() == IdStampMagic::Material) {
+        const IdStamp id{std::string_view(name)};
+        const bool isOfEvent = id.valid() && (id.getMagicType() == IdStampMagic::Material ||
+                                              id.getMagicType() == IdStampMagic::EffectNode);
+        if (isOfEvent || name == OrphanedComponentList::Id) {
             clipboard.objectStore().removeObject(name);
         }
     }
+    clipboard.removeChans(false);
 }
 
-/// Binds copies of the objects of a cel's events in another edit.
-void copyEffects(const cel& events, TagBag& from, TagBag& to) {
-    for (int i = 0; i < events.numEvents() && from.getNumObjects() > 0; ++i) {
-        const String name = events.getChanEventPtr(i)->id.asString();
-        const Streamable* const object = from.contains(name) ? from.openObject(name) : nullptr;
-        if (object != nullptr) {
-            to.storeObject(name, object->clone());
+/// What is bound to events that were put into the clipboard; it is copied when all channels are there.
+struct Kept {
+    IdStamp chan;
+    std::vector<EventObjects::Bound> bound;
+};
+
+/// Binds copies of what the edit has for them to the events of the clipboard.
+void copyEffects(Edit& edit, Edit& clipboard, const std::vector<Kept>& kept, const StampMap& channels) {
+    for (const Kept& part : kept) {
+        const cel* const content = clipboard.get_edit_cel_p(clipboard.getIdx(part.chan));
+        cel::IdMap same;
+        for (const EventObjects::Bound& event : part.bound) {
+            same.emplace(event.id, event.id);
+        }
+        if (content == nullptr || same.empty()) {
+            continue;
+        }
+        EventObjects::bindCopies(edit.objectStore(), part.bound, clipboard.objectStore(),
+                                 {*content, {content->get_start_time(), content->get_end_time()}}, same,
+                                 channels);
+        for (const EventObjects::Bound& event : part.bound) {
+            static_cast<void>(EventObjects::unwireMissing(clipboard, event.id));
         }
     }
 }
@@ -60,6 +79,8 @@ void Editor::doClipboardEditing(edit_operation op) {
     const std::lock_guard<criticalSection> hold(clipboard->section());
     clearClipboard(*clipboard);
     clipboard->setFrameRate(edit.getFrameRate());
+    std::vector<Kept> bound;
+    StampMap channels;
     for (size_t i = 0; i < m_plan->targets.size(); ++i) {
         const Target& target = m_plan->targets[i];
         const cel* const events = celOf(target.chan);
@@ -80,12 +101,22 @@ void Editor::doClipboardEditing(edit_operation op) {
         if (isContinuous(target.type)) {
             content->fillToTime(start);
         }
-        const std::shared_ptr<cel> part = makePart(events, {from, to}, isContinuous(target.type));
+        editing_detail::WholeEnds ends;
+        if (isContinuous(target.type)) {
+            ends = editing_detail::wholeEnds(*events, {from, to}, edit.objectStore());
+        }
+        const std::shared_ptr<cel> part = makePart(ends.channel != nullptr ? ends.channel.get() : events,
+                                                   {from, to}, isContinuous(target.type));
         if (part == nullptr || !content->weld(part.get(), start)) {
             continue;
         }
-        copyEffects(*part, edit.objectStore(), clipboard->objectStore());
         const IdStamp kept = setCel(*clipboard, target.type, std::move(content));
+        Kept& its = bound.emplace_back(Kept{kept, {}});
+        EventObjects::listBound(*events, edit.objectStore(), {from, to}, its.bound);
+        for (EventObjects::Bound& event : its.bound) {
+            event.range = {event.range.start() - m_plan->at, event.range.end() - m_plan->at};
+        }
+        channels[target.chan] = kept;
         const AudLevelsCel levels = edit.getLevelsCel(target.levels);
         if (kept.valid() && !levels.is_dummy()) {
             AudLevelsCel copy = AudLevelsCel::create();
@@ -93,6 +124,7 @@ void Editor::doClipboardEditing(edit_operation op) {
             clipboard->addLevelsChan(kept, copy, false);
         }
     }
+    copyEffects(edit, *clipboard, bound, channels);
     if (clipboard->getNumChans() == 0) {
         // Nothing was there; an edit without channels cannot be stored.
         setCel(*clipboard, {VideoChan, Edit_Chan_SubType::NONE}, nullptr);

@@ -1,30 +1,12 @@
 #include "edit/editing/detail/cue_follower.h"
 #include "edit/editing/detail/edit_op_performer.h"
+#include "edit/editing/detail/object_follower.h"
 #include "platform/base/ole_splat.h"
 #include "platform/services/log.h"
 
 #include <algorithm>
 
 using Op = edit_operation;
-
-namespace {
-
-/// Binds copies of the objects that `from` has for some events to the events that were made of them.
-template <typename Stamps>
-void copyObjects(TagBag& from, TagBag& to, const Stamps& stamps) {
-    if (from.getNumObjects() == 0) {
-        return;
-    }
-    for (const auto& [old, made] : stamps) {
-        const String name = old.asString();
-        const Streamable* const object = from.contains(name) ? from.openObject(name) : nullptr;
-        if (object != nullptr) {
-            to.storeObject(made.asString(), object->clone());
-        }
-    }
-}
-
-} // namespace
 
 bool Editor::EditOpPerformer::doEdit(cel& content, const Step& step, cel::IdMap& copied,
                                      cel::Splits& splits) const {
@@ -56,7 +38,7 @@ void Editor::EditOpPerformer::doLevels(AudLevelsCel& content, const Step& step) 
 }
 
 /// Makes the plan's changes, in order, and sees to what hangs on the events.
-void Editor::makeChanges(edit_operation op, CueFollower& cues) {
+void Editor::makeChanges(edit_operation op, CueFollower& cues, ObjectFollower& objects) {
     const EditOpPerformer performer(op, {m_plan->at, m_plan->at + m_plan->length});
     const Edit& edit = *m_destination.getEdit();
     for (const Step& step : m_plan->steps) {
@@ -69,6 +51,7 @@ void Editor::makeChanges(edit_operation op, CueFollower& cues) {
         if (step.core != kCoreRemove && editing_detail::isContinuous(target.type)) {
             content->fillToTime(step.at);
         }
+        objects.beforeStep(*content, step);
         cel::IdMap copied;
         cel::Splits splits;
         if (!performer.doEdit(*content, step, copied, splits)) {
@@ -77,14 +60,8 @@ void Editor::makeChanges(edit_operation op, CueFollower& cues) {
         }
         AudLevelsCel levels = edit.getLevelsCel(target.levels);
         EditOpPerformer::doLevels(levels, step);
-        bindEffects(copied, splits);
+        objects.afterStep(*content, step, copied, splits);
         cues.noteCopies(target.chan, copied);
         noteTouched(target.chan, {std::min(step.at, end), step.core == kCoreRemove ? step.at : step.end()});
     }
-}
-
-void Editor::bindEffects(const cel::IdMap& copied, const cel::Splits& splits) {
-    TagBag& store = m_destination.getEdit()->objectStore();
-    copyObjects(m_source->objectStore(), store, copied);
-    copyObjects(store, store, splits);
 }

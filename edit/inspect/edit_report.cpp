@@ -4,8 +4,10 @@
 #include "edit/model/channel_event.h"
 #include "edit/model/cue_list.h"
 #include "edit/model/managed_cel.h"
+#include "platform/effects/special_effects.h"
 #include "platform/media/timecode.h"
 #include "platform/services/current_project.h"
+#include "platform/store/tag.h"
 
 #include <algorithm>
 #include <cmath>
@@ -88,7 +90,38 @@ private:
     bool m_lastValid = false;
 };
 
-void takePairs(const cel& content, double quarterFrame, SourceTable& table, std::vector<PairReport>& pairs) {
+TransitionKind kindOf(const Fx::EffectKind& kind) {
+    if (kind.effectClass == Fx::EffectClass::TextureWipe ||
+        kind.effectClass == Fx::EffectClass::DissolveWipe) {
+        return TransitionKind::Wipe;
+    }
+    return kind.typeId == Fx::kDissolve    ? TransitionKind::Dissolve
+           : kind.typeId == Fx::kDip       ? TransitionKind::Dip
+           : kind.typeId == Fx::kCrossFade ? TransitionKind::CrossFade
+                                           : TransitionKind::Other;
+}
+
+/// What an edit says of the effect that a pair shows.
+void takeEffect(const Edit& edit, PairReport& pair) {
+    const Tag<EffectInstance> effect = edit.openObject<EffectInstance>(pair.id);
+    if (!effect || effect->kind() == nullptr) {
+        return;
+    }
+    pair.effect = String(effect->kind()->name);
+    pair.isTransition = effect->isTransition();
+    if (!pair.isTransition) {
+        return;
+    }
+    pair.transition = kindOf(*effect->kind());
+    if (const auto* const wipe = dynamic_cast<const TextureWipeEffect*>(&*effect)) {
+        pair.wipe = wipe->getPatternCode();
+    } else if (const auto* const legacy = dynamic_cast<const DissolveWipeEffect*>(&*effect)) {
+        pair.wipe = static_cast<unsigned>(legacy->getPattern());
+    }
+}
+
+void takePairs(const Edit& edit, const cel& content, double quarterFrame, SourceTable& table,
+               std::vector<PairReport>& pairs) {
     pairs.reserve(static_cast<size_t>(content.numPairs()));
     for (int i = 0; i + 1 < content.numEvents(); i += 2) {
         const channel_event* in = content.getChanEventPtr(i);
@@ -108,7 +141,19 @@ void takePairs(const cel& content, double quarterFrame, SourceTable& table, std:
                          {out->level, out->code, out->rampCurve},
                          in->id,
                          TransitionKind::Cut,
+                         0,
+                         false,
+                         {},
                          {}});
+        PairReport& pair = pairs.back();
+        if (in->strip.isEffectGraph()) {
+            takeEffect(edit, pair);
+        } else if (pairs.size() > 1 && pairs[pairs.size() - 2].isTransition) {
+            const PairReport& before = pairs[pairs.size() - 2];
+            const bool meets = std::abs(before.out - pair.in) <= Qx::kTimeTolerance;
+            pair.transition = meets ? before.transition : TransitionKind::Cut;
+            pair.wipe = meets ? before.wipe : 0;
+        }
     }
 }
 
@@ -214,7 +259,7 @@ EditReport reportOf(const Edit& edit, const SourceNamer& namer) {
         channel.type = edit.getChanType(i);
         channel.subtype = edit.getChanSubtype(i);
         if (const cel* content = edit.get_edit_cel_p(i); content != nullptr) {
-            takePairs(*content, quarterFrame, table, channel.pairs);
+            takePairs(edit, *content, quarterFrame, table, channel.pairs);
         }
         report.channels.push_back(std::move(channel));
     }
@@ -223,10 +268,20 @@ EditReport reportOf(const Edit& edit, const SourceNamer& namer) {
     return report;
 }
 
-const char* transitionText(TransitionKind kind) {
-    switch (kind) {
+String transitionText(const PairReport& pair) {
+    switch (pair.transition) {
     case TransitionKind::Cut:
         return "cut";
+    case TransitionKind::Dissolve:
+        return "dissolve";
+    case TransitionKind::Wipe:
+        return String::format("wipe %u", pair.wipe);
+    case TransitionKind::Dip:
+        return "dip";
+    case TransitionKind::CrossFade:
+        return "cross-fade";
+    case TransitionKind::Other:
+        return "transition";
     }
     return "cut";
 }

@@ -32,7 +32,7 @@ struct SourceReport {
 };
 
 /// How a pair begins where another one ends.
-enum class TransitionKind { Cut };
+enum class TransitionKind { Cut, Dissolve, Wipe, Dip, CrossFade, Other };
 
 /// One pair of a channel.
 struct PairReport {
@@ -55,8 +55,12 @@ struct PairReport {
     End begin;
     End end;
     IdStamp id; ///< of its in event; it stays through trims and moves
+    /// How it comes in; of a pair that is a transition itself, what it is.
     TransitionKind transition = TransitionKind::Cut;
-    String event; ///< its number in the list that it was imported from; empty where there is none
+    unsigned wipe = 0; ///< code of the pattern of a wipe
+    bool isTransition = false;
+    String effect; ///< of a pair that shows an effect, the name of its kind; empty for one that is not known
+    String event;  ///< its number in the list that it was imported from; empty where there is none
 };
 
 struct QM_API ChannelReport {
@@ -118,8 +122,8 @@ using SourceNamer = std::function<void(SourceReport&)>;
 /// it with other threads holds its section.
 [[nodiscard]] QM_API EditReport reportOf(const Edit& edit, const SourceNamer& namer);
 
-/// "cut".
-[[nodiscard]] QM_API const char* transitionText(TransitionKind kind);
+/// "cut", "dissolve", "wipe 201", "dip", "cross-fade", "transition".
+[[nodiscard]] QM_API String transitionText(const PairReport& pair);
 
 /// A word for the kind: "shot", "media", "black", "effect", "alias", "input", "magic".
 [[nodiscard]] QM_API const char* sourceKindText(SourceKind kind);

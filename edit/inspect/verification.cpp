@@ -1,11 +1,14 @@
 #include "edit/inspect/verification.h"
 
+#include "edit/inspect/effect_check.h"
 #include "edit/manager/folder_names.h"
 #include "edit/persist/edit_salvage.h"
 #include "platform/services/edit_filenames.h"
 #include "platform/services/files.h"
 
 #include <algorithm>
+#include <map>
+#include <optional>
 
 namespace {
 
@@ -38,12 +41,28 @@ public:
 
 private:
     void add(const cookie& item, const String& name);
+    [[nodiscard]] std::optional<cel::Range> extentOf(const cookie& strip);
 
     const String& m_folder;
     const std::vector<cookie>& m_items;
     std::vector<VerifiedFile>& m_files;
     const std::function<void(const String&)>& m_checking;
+    std::map<cookie, std::optional<cel::Range>> m_extents; ///< of items that were asked for
 };
+
+/// What an item of the folder has to play; nothing for one whose file is not there or does not read.
+std::optional<cel::Range> Verifier::extentOf(const cookie& strip) {
+    const auto [known, isNew] = m_extents.try_emplace(strip);
+    if (isNew && strip.isStorable()) {
+        const EditPtr item(new Edit);
+        const String path = Qx::joinPath(m_folder, strip.asString() + getEditFilenameExt());
+        if (item->readFile(Qx::widen(path), eOpenExisting) == Edit::kReadOk &&
+            item->getEndTime() - item->getStartTime() > Qx::kTimeTolerance) {
+            known->second = cel::Range(item->getStartTime(), item->getEndTime());
+        }
+    }
+    return known->second;
+}
 
 void Verifier::add(const cookie& item, const String& name) {
     if (!m_items.empty() && std::find(m_items.begin(), m_items.end(), item) == m_items.end()) {
@@ -61,7 +80,12 @@ void Verifier::add(const cookie& item, const String& name) {
     for (int tries = 0; tries < kTries; ++tries) {
         const Qx::FileInfo before = Qx::askFile(path).info();
         file.faults.clear();
-        verifyEditFile(path, file.faults);
+        EditPtr read;
+        verifyEditFile(path, file.faults, &read);
+        if (read.valid()) {
+            checkEffects(
+                *read, [this](const cookie& strip) { return extentOf(strip); }, file.faults);
+        }
         if (file.faults.empty()) {
             break;
         }

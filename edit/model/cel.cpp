@@ -112,6 +112,32 @@ bool cel::setEvent(int index, const channel_event& event) {
     return true;
 }
 
+bool cel::replacePairs(int pair, int count, std::span<const channel_event> events) {
+    if (pair < 0 || count < 0 || pair > numPairs() || count > numPairs() - pair || m_events.size() % 2 != 0) {
+        return false;
+    }
+    Events block(events.begin(), events.end());
+    const size_t first = 2 * static_cast<size_t>(pair);
+    const size_t last = first + 2 * static_cast<size_t>(count);
+    if (!checkAndSettle(block)) {
+        return false;
+    }
+    if (!block.empty()) {
+        TimeLayer layer(timeBefore(first), timeFrom(last));
+        const bool fits = !(block.front().editTime < timeBefore(first) - kTolerance) &&
+                          !(block.back().editTime > timeFrom(last) + kTolerance);
+        for (channel_event& event : block) {
+            event.editTime = layer.lay(event.editTime);
+        }
+        if (!fits) {
+            return false;
+        }
+    }
+    m_events.splice(first, last, block);
+    changedNow();
+    return true;
+}
+
 void cel::set_resolution(double quantum) {
     if (std::isfinite(quantum) && quantum >= 0 && quantum != m_resolution) {
         m_resolution = quantum;

@@ -6,8 +6,12 @@ using namespace cel_detail;
 
 namespace {
 
-/// A fresh stamp for what was copied or cut from an event: of one that shows an effect, a node's again.
+/// The stamp of what was copied or cut from an event. One that shows a channel has that channel's; any other
+/// gets a fresh one, of one that shows an effect a node's again.
 IdStamp freshLike(const IdStamp& old) {
+    if (old.valid() && old.getMagicType() == IdStampMagic::Channel) {
+        return old;
+    }
     const bool isEffect = old.valid() && old.getMagicType() == IdStampMagic::EffectNode;
     return IdStamp::fresh(isEffect ? IdStampMagic::EffectNode : IdStampMagic::Material);
 }

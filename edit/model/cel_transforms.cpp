@@ -126,9 +126,13 @@ bool isStill(const channel_event& out, const channel_event& next) {
 /// True if nothing is seen or heard of the cut between two pairs.
 bool playsThrough(const channel_event& in, const channel_event& out, const channel_event& next,
                   const channel_event& nextOut) {
-    return in.strip == next.strip && in.velocity == next.velocity && in.code == next.code &&
-           isStill(out, next) && std::abs(stripAt(in, next.editTime) - next.stripTime) <= kTolerance &&
-           in.level == out.level && in.level == next.level && in.level == nextOut.level;
+    const auto isMaterial = [](const channel_event& event) {
+        return event.id.getMagicType() == IdStampMagic::Material;
+    };
+    return isMaterial(in) && isMaterial(next) && in.strip == next.strip && in.velocity == next.velocity &&
+           in.code == next.code && isStill(out, next) &&
+           std::abs(stripAt(in, next.editTime) - next.stripTime) <= kTolerance && in.level == out.level &&
+           in.level == next.level && in.level == nextOut.level;
 }
 
 /// Extent of a pair with half the overlap and, if asked for, its fades on either side.

@@ -3,6 +3,7 @@
 #include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_keys.h"
+#include "edit/model/event_objects.h"
 #include "platform/store/tag_bag.h"
 
 #include <unordered_set>
@@ -104,6 +105,7 @@ void Edit::celReplaced(const cel* from, cel* to) {
 void Edit::channelRemoved(const IdStamp& chan, int index) {
     // While the edit is read, the store holds the groups of what is being read already.
     if (!m_loading) {
+        EventObjects::dropChannel(*this, chan);
         for (ChannelGroupList* list : {retrieveGroupsList(), retrieveDefaultGroupsList()}) {
             if (list != nullptr) {
                 list->removeMember(chan);
@@ -128,6 +130,7 @@ void Edit::allChannelsRemoved() {
         cels.insert(get_edit_cel_p(i));
     }
     if (!m_loading) {
+        EventObjects::dropChannel(*this, IdStamp());
         for (ChannelGroupList* list : {retrieveGroupsList(), retrieveDefaultGroupsList()}) {
             for (size_t i = 0; list != nullptr && list->size() > 0 && i < chans.size(); ++i) {
                 list->removeMember(chans[i]);
@@ -141,6 +144,7 @@ void Edit::allChannelsRemoved() {
 }
 
 void Edit::channelRenamed(const IdStamp& from, const IdStamp& to) {
+    EventObjects::renameChannel(*this, from, to);
     for (ChannelGroupList* list : {retrieveGroupsList(), retrieveDefaultGroupsList()}) {
         if (list != nullptr) {
             list->replaceMember(from, to);

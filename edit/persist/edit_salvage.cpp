@@ -285,7 +285,7 @@ void EditFile::convert(Edit& edit, std::vector<String>& lost) {
     }
 }
 
-bool verifyEditFile(const String& path, std::vector<String>& faults) {
+bool verifyEditFile(const String& path, std::vector<String>& faults, EditPtr* read) {
     EditPtr edit;
     std::vector<String> found;
     bool isRefused = false;
@@ -294,6 +294,9 @@ bool verifyEditFile(const String& path, std::vector<String>& faults) {
     if (!status) {
         faults.push_back(status.reason());
         return !isRefused;
+    }
+    if (read != nullptr) {
+        *read = edit;
     }
     // Objects that nothing above reads are sound unless their class is known and refuses them.
     TagBag& store = edit->objectStore();

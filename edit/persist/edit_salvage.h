@@ -15,7 +15,9 @@
 ///
 /// A file that could not be read at all, or was written by a later version, has that as its fault, and the
 /// result is false: it may be sound. Safe on any thread.
-QM_API bool verifyEditFile(const String& path, std::vector<String>& faults);
+///
+/// `read`, if given, receives the edit as far as it could be read, null if it could not.
+QM_API bool verifyEditFile(const String& path, std::vector<String>& faults, EditPtr* read = nullptr);
 
 /// Makes an edit of all that is sound of a damaged object store. One damaged object costs that object: a
 /// channel, the levels of a channel, the cues, the groups. Without its header the edit has the properties of

@@ -33,7 +33,7 @@ constexpr size_t kLongNumber = 6;
 struct KeptType {
     EdlType type = EdlType::Cut;
     int wipe = 0;
-    int duration = 0;
+    int duration = 0; ///< frames
     [[nodiscard]] bool isTransition() const { return type == EdlType::Dissolve || type == EdlType::Wipe; }
     [[nodiscard]] bool isKey() const { return type == EdlType::Key || type == EdlType::KeyOut; }
 };
@@ -53,11 +53,8 @@ KeptType keptType(const String& text) {
 struct Lead {
     KeptType type; ///< of the clip below
     bool zeroLength = false;
-    bool named = false; ///< the record before the clip's says of which reel
-    bool black = false;
-    size_t source = kNoClip; ///< of a line of no length that is not black
-    int64_t sourceFrame = 0;
-    bool asWritten = true; ///< a line of no length says what it said in the list
+    bool named = false;     ///< the record before the clip's is that of the line of no length
+    bool asWritten = false; ///< which says what it said in the list
     size_t clip = kNoClip;
 };
 
@@ -70,10 +67,10 @@ private:
     void takeRecords();
     Qx::Status checkProgramme();
     void findLeads();
-    void findTransition(size_t clip, const KeptType& type);
+    void findTransition(size_t clip);
     void findKey(size_t clip, const KeptType& type);
     void dropForeground(ExportClip& clip);
-    [[nodiscard]] bool outgoingFrame(const ExportClip& clip, Lead& lead) const;
+    [[nodiscard]] bool isOutgoingAsWritten(const ExportClip& clip, const EdlRecord& outgoing) const;
     [[nodiscard]] size_t clipOfRecord(size_t record) const;
     void addEvents();
     void addEvent(size_t clip);
@@ -166,59 +163,54 @@ size_t EdlExporter::clipOfRecord(size_t record) const {
     return clip == kNoClip || m_isLead[clip] ? kNoClip : clip;
 }
 
-// The source frame at which what plays before a clip goes on, if on every track it is the source named.
-bool EdlExporter::outgoingFrame(const ExportClip& clip, Lead& lead) const {
-    const String& named = m_records[clip.record - 1].reel;
-    EdlChannels found = 0;
-    const auto [first, last] = m_byEnd.equal_range(clip.recordIn);
-    for (auto place = first; place != last; ++place) {
-        const ExportClip& other = m_clips[place->second];
-        if ((other.channels & clip.channels) == 0) {
-            continue;
-        }
-        if (m_sources[other.source].reel != named || (found != 0 && other.sourceNext() != lead.sourceFrame)) {
-            return false;
-        }
-        found |= other.channels;
-        lead.asWritten = lead.asWritten && isAsImported(other);
-        lead.sourceFrame = other.sourceNext();
-        lead.source = other.source;
+// True if the line of no length above a transition says what gives way to it. It may name a frame that a clip which
+// plays as it was imported does not quite reach.
+bool EdlExporter::isOutgoingAsWritten(const ExportClip& clip, const EdlRecord& outgoing) const {
+    const detail::ExportTransition& transition = clip.transition;
+    if (transition.outgoing == detail::kNoSource) {
+        return outgoing.reel == "BL" || outgoing.reel == "BLACK";
     }
-    return (found & clip.channels) == clip.channels;
+    if (m_sources[transition.outgoing].reel != outgoing.reel || !outgoing.times) {
+        return false;
+    }
+    if (outgoing.times->shown == transition.outgoingFrame) {
+        return true;
+    }
+    const auto [first, last] = m_byEnd.equal_range(clip.recordIn);
+    return std::any_of(first, last, [&](const auto& place) {
+        const ExportClip& before = m_clips[place.second];
+        return (before.channels & clip.channels) != 0 && before.source == transition.outgoing &&
+               before.sourceNext() == transition.outgoingFrame && isAsImported(before);
+    });
 }
 
-void EdlExporter::findTransition(size_t index, const KeptType& type) {
+void EdlExporter::findTransition(size_t index) {
     const ExportClip& clip = m_clips[index];
+    const detail::ExportTransition& transition = clip.transition;
     const size_t record = clip.record;
-    Lead lead;
-    lead.type = type;
-    lead.named = record > 0 && m_records[record - 1].number == m_records[record].number &&
-                 m_records[record - 1].typeText == "C";
-    bool good = type.duration <= clip.recordOut - clip.recordIn;
-    if (!lead.named) {
-        lead.zeroLength = lead.black = true;
-    } else if (!m_records[record - 1].events.empty()) {
-        lead.clip = clipOfRecord(record - 1);
-        good = good && lead.clip != kNoClip && m_clips[lead.clip].recordOut == clip.recordIn;
-    } else {
-        lead.zeroLength = true;
-        lead.black = m_records[record - 1].reel == "BL" || m_records[record - 1].reel == "BLACK";
-        const bool isHanging = m_records[record - 1].isHanging;
-        good = good && (lead.black || isHanging || outgoingFrame(clip, lead));
-        lead.asWritten = lead.black || isHanging || lead.asWritten;
-    }
-    if (!good) {
-        m_report.addLoss(0,
-                         "event " + m_records[record].number + ": a " +
-                             (type.type == EdlType::Wipe ? "wipe" : "dissolve") +
-                             String::format(" of %d frames is not written, as what it led from has changed",
-                                            type.duration));
+    Lead& lead = m_leads[index];
+    lead.type = {transition.type, transition.wipe, static_cast<int>(transition.length)};
+    lead.zeroLength = true;
+    const bool isPair = record != kNoRecord && record > 0 && m_firstOfRecord[record] == index &&
+                        keptType(m_records[record].typeText).isTransition() &&
+                        m_records[record - 1].number == m_records[record].number &&
+                        m_records[record - 1].typeText == "C";
+    if (!isPair) {
         return;
     }
-    if (lead.clip != kNoClip) {
-        m_isLead[lead.clip] = true;
+    if (m_records[record - 1].events.empty()) {
+        lead.named = true;
+        lead.asWritten = isOutgoingAsWritten(clip, m_records[record - 1]);
+        return;
     }
-    m_leads[index] = lead;
+    const size_t above = clipOfRecord(record - 1);
+    if (above != kNoClip && m_clips[above].recordOut == clip.recordIn &&
+        m_clips[above].source == transition.outgoing &&
+        m_clips[above].sourceNext() == transition.outgoingFrame) {
+        lead.zeroLength = false;
+        lead.clip = above;
+        m_isLead[above] = true;
+    }
 }
 
 void EdlExporter::findKey(size_t index, const KeptType& type) {
@@ -257,15 +249,16 @@ void EdlExporter::findLeads() {
         }
     }
     for (size_t i = 0; i < m_clips.size(); ++i) {
+        if (m_clips[i].transition.type != EdlType::Cut) {
+            findTransition(i);
+            continue;
+        }
         const size_t record = m_clips[i].record;
         if (record == kNoRecord || m_firstOfRecord[record] != i) {
             dropForeground(m_clips[i]);
             continue;
         }
-        const KeptType type = keptType(m_records[record].typeText);
-        if (type.isTransition()) {
-            findTransition(i, type);
-        } else if (type.isKey()) {
+        if (const KeptType type = keptType(m_records[record].typeText); type.isKey()) {
             findKey(i, type);
         }
     }
@@ -340,6 +333,9 @@ void EdlExporter::keepNotes(ExportLine& line, size_t record, bool first) {
     if (record == kNoRecord) {
         return;
     }
+    // What a transition was called says nothing of the cut in its place.
+    const bool wasTransition =
+        line.event.type == EdlType::Cut && keptType(m_records[record].typeText).isTransition();
     std::string_view rest = m_records[record].notes;
     while (!rest.empty()) {
         const size_t end = rest.find('\n');
@@ -347,7 +343,8 @@ void EdlExporter::keepNotes(ExportLine& line, size_t record, bool first) {
         rest.remove_prefix(end == std::string_view::npos ? rest.size() : end + 1);
         const detail::NoteKind kind = detail::parseNote(note).kind;
         const bool once = kind == detail::NoteKind::Marker || kind == detail::NoteKind::Split;
-        if (detail::isWritableNote(note) && (first || !once) && m_markers->keeps(note)) {
+        const bool isStale = wasTransition && kind == detail::NoteKind::EffectName;
+        if (!isStale && detail::isWritableNote(note) && (first || !once) && m_markers->keeps(note)) {
             line.event.notes += (line.event.notes.empty() ? "" : "\n") + String(note);
         }
     }
@@ -363,22 +360,28 @@ void EdlExporter::addLead(std::vector<ExportLine>& lines, const ExportClip& clip
         m_eventRecord.push_back(above.record);
         return;
     }
+    const detail::ExportTransition& transition = clip.transition;
     ExportLine& line = lines.emplace_back();
     EdlEvent& event = line.event;
-    event.reel = lead.named ? m_records[clip.record - 1].reel : String("BL");
+    event.reel = "BL";
     event.channels = clip.channels;
-    event.sourceIn = event.sourceOut = lead.sourceFrame;
+    event.sourceIn = event.sourceOut = transition.outgoingFrame;
     event.recordIn = event.recordOut = m_start + clip.recordIn;
     event.recordDrop = m_drop;
     event.sourceDrop = m_drop;
-    if (lead.named && lead.asWritten && m_records[clip.record - 1].times) {
-        event.sourceIn = m_records[clip.record - 1].times->sourceIn;
-        event.sourceOut = m_records[clip.record - 1].times->sourceOut;
-    }
-    if (lead.source != kNoClip) {
-        line.source = &m_sources[lead.source];
+    if (transition.outgoing != detail::kNoSource) {
+        line.source = &m_sources[transition.outgoing];
         line.name = line.source->name;
+        event.reel = line.source->reel;
         event.sourceDrop = line.source->drop;
+    }
+    if (lead.asWritten) {
+        const EdlRecord& written = m_records[clip.record - 1];
+        event.reel = written.reel;
+        if (written.times) {
+            event.sourceIn = written.times->sourceIn;
+            event.sourceOut = written.times->sourceOut;
+        }
     }
     keepNotes(line, lead.named ? clip.record - 1 : kNoRecord, true);
     m_eventRecord.push_back(clip.record);

@@ -6,7 +6,9 @@
 #include "edit/model/edit_keys.h"
 #include "interchange/edl/edl_records.h"
 #include "interchange/marker_colour.h"
+#include "platform/effects/special_effects.h"
 #include "platform/services/files.h"
+#include "platform/store/tag_bag.h"
 
 #include <cmath>
 #include <unordered_map>
@@ -34,13 +36,15 @@ public:
 
 private:
     void findSources();
-    void addOutgoingSides();
+    /// Notes that so many record frames of the source of an event are played on a track.
+    void useSource(size_t event, EdlChannels channel, double from, double velocity, int64_t length);
     [[nodiscard]] std::string keyOf(size_t index) const;
-    size_t sourceOf(const EdlClip& clip);
+    size_t sourceOf(size_t event);
     void buildShot(size_t index);
     void buildSequence(const String& name);
     void buildChannels(Edit& edit);
-    [[nodiscard]] Qx::Ptr<cel> buildCel(const EdlTrack* track);
+    [[nodiscard]] Qx::Ptr<cel> buildCel(Edit& edit, const EdlTrack* track);
+    void addTransition(Edit& edit, cel& content, EdlChannels channel, const EdlClip& clip);
     void addCues(Edit& edit);
     String shownName(const String& name, int line);
     [[nodiscard]] EditPtr newEdit(const cookie& item, bool original) const;
@@ -137,49 +141,46 @@ std::string EdlImporter::keyOf(size_t index) const {
 }
 
 // The number of the source that an event plays.
-size_t EdlImporter::sourceOf(const EdlClip& clip) {
-    size_t& known = m_sourceOfEvent[clip.event];
+size_t EdlImporter::sourceOf(size_t event) {
+    size_t& known = m_sourceOfEvent[event];
     if (known != kNoSource) {
         return known;
     }
-    known = m_byName.try_emplace(keyOf(clip.event), m_sources.size()).first->second;
+    known = m_byName.try_emplace(keyOf(event), m_sources.size()).first->second;
     if (known == m_sources.size()) {
-        m_sources.push_back({clip.event, 0, INFINITY, -INFINITY});
+        m_sources.push_back({event, 0, INFINITY, -INFINITY});
     }
     return known;
+}
+
+void EdlImporter::useSource(size_t event, EdlChannels channel, double from, double velocity, int64_t length) {
+    Source& source = m_sources[sourceOf(event)];
+    source.channels |= channel == kEdlPicture2 ? kEdlPicture : channel;
+    // In reverse the out is the frame below the last one shown; a freeze shows one frame.
+    const double last = from + velocity * static_cast<double>(length);
+    source.in = std::min({source.in, from, std::max(0.0, last + (velocity < 0 ? 1.0 : 0.0))});
+    source.out = std::max({source.out, from + (velocity > 0 ? 0.0 : 1.0), last});
 }
 
 void EdlImporter::findSources() {
     m_sourceOfEvent.assign(m_list.events.size(), kNoSource);
     for (const EdlTrack& track : m_programme.tracks) {
+        const EdlClip* before = nullptr;
         for (const EdlClip& clip : track.clips) {
-            if (clip.black) {
-                continue;
+            if (!clip.black) {
+                useSource(clip.event, track.channel, clip.sourceIn, clip.velocity,
+                          clip.recordOut - clip.recordIn);
             }
-            Source& source = m_sources[sourceOf(clip)];
-            source.channels |= track.channel == kEdlPicture2 ? kEdlPicture : track.channel;
-            // In reverse the out is the frame below the last one shown; a freeze shows one frame.
-            const double last = clip.sourceOut();
-            source.in = std::min({source.in, clip.sourceIn, last + (clip.velocity < 0 ? 1.0 : 0.0)});
-            source.out = std::max({source.out, clip.sourceIn + (clip.velocity > 0 ? 0.0 : 1.0), last});
-        }
-    }
-    addOutgoingSides();
-}
-
-// The outgoing side of a transition runs on under it, behind its source out.
-void EdlImporter::addOutgoingSides() {
-    for (size_t i = 1; i < m_list.events.size(); ++i) {
-        const EdlEvent& event = m_list.events[i];
-        const EdlEvent& outgoing = m_list.events[i - 1];
-        const bool isTransition = event.type == EdlType::Dissolve || event.type == EdlType::Wipe;
-        if (event.role != EdlRole::Incoming || !isTransition || outgoing.isBlack() || outgoing.speed) {
-            continue;
-        }
-        if (const auto known = m_byName.find(keyOf(i - 1)); known != m_byName.end()) {
-            Source& source = m_sources[known->second];
-            source.in = std::min(source.in, static_cast<double>(outgoing.sourceIn));
-            source.out = std::max(source.out, static_cast<double>(outgoing.sourceOut + event.duration));
+            // What gives way in a transition plays on under it.
+            const bool isBefore = before != nullptr && before->recordOut == clip.recordIn && !before->black;
+            if (clip.outgoing && !clip.outgoing->black) {
+                useSource(clip.outgoing->event, track.channel, clip.outgoing->frame, clip.outgoing->velocity,
+                          clip.transition);
+            } else if (clip.transition > 0 && !clip.outgoing && isBefore) {
+                useSource(before->event, track.channel, before->sourceIn, before->velocity,
+                          before->recordOut - before->recordIn + clip.transition);
+            }
+            before = &clip;
         }
     }
 }
@@ -218,16 +219,43 @@ void EdlImporter::buildShot(size_t index) {
     m_result.shots.push_back(std::move(shot));
 }
 
-Qx::Ptr<cel> EdlImporter::buildCel(const EdlTrack* track) {
+// The transition at the start of a clip: an event pair between those that it joins.
+void EdlImporter::addTransition(Edit& edit, cel& content, EdlChannels channel, const EdlClip& clip) {
+    const EdlEvent& event = m_list.events[clip.event];
+    const double from = m_list.rate.toSeconds(clip.recordIn);
+    const double to = m_list.rate.toSeconds(clip.recordIn + clip.transition);
+    if (clip.outgoing) {
+        // Of no length: it plays under the transition only.
+        const EdlOutgoing& outgoing = *clip.outgoing;
+        addPair(content, outgoing.black ? black_cookie : provisionalCookie(m_sourceOfEvent[outgoing.event]),
+                from, from, outgoing.black ? 0.0 : seconds(outgoing.frame), outgoing.velocity);
+    }
+    const bool isWipe = event.type == EdlType::Wipe;
+    std::unique_ptr<EffectInstance> effect =
+        Fx::makeEffect(!isPicture(channel) ? Fx::kCrossFade : (isWipe ? Fx::kWipe : Fx::kDissolve));
+    if (auto* const wipe = dynamic_cast<TextureWipeEffect*>(effect.get())) {
+        wipe->setPatternCode(static_cast<uint32_t>(event.wipe));
+    }
+    const IdStamp id = IdStamp::fresh(IdStampMagic::EffectNode);
+    edit.objectStore().storeObject(id, std::move(effect));
+    content.add_event({from, 0, effect_graph_cookie, 1.0F, CE_IN_POINT, id, 0});
+    content.add_event({to, to - from, effect_graph_cookie, 1.0F, CE_OUT_POINT, channel_event::newId(), 0});
+}
+
+Qx::Ptr<cel> EdlImporter::buildCel(Edit& edit, const EdlTrack* track) {
     auto content = std::make_shared<cel>();
     if (track == nullptr) {
         return content;
     }
     content->reserve(static_cast<int>(track->clips.size()));
     for (const EdlClip& clip : track->clips) {
+        if (clip.transition > 0) {
+            addTransition(edit, *content, track->channel, clip);
+        }
         const cookie strip = clip.black ? black_cookie : provisionalCookie(m_sourceOfEvent[clip.event]);
-        addPair(*content, strip, m_list.rate.toSeconds(clip.recordIn), m_list.rate.toSeconds(clip.recordOut),
-                clip.black ? 0.0 : seconds(clip.sourceIn), clip.velocity);
+        const double shown = clip.sourceIn + clip.velocity * static_cast<double>(clip.transition);
+        addPair(*content, strip, m_list.rate.toSeconds(clip.recordIn + clip.transition),
+                m_list.rate.toSeconds(clip.recordOut), clip.black ? 0.0 : seconds(shown), clip.velocity);
         const channel_event in = content->get_event(content->numEvents() - 2);
         m_records[clip.event].events.push_back(in.id);
     }
@@ -247,7 +275,7 @@ void EdlImporter::buildChannels(Edit& edit) {
             }
         }
         const Edit::ChanType type{isPicture(channel) ? VideoChan : AudioChan, Edit_Chan_SubType::NONE};
-        edit.setupEditChannel(type, buildCel(found));
+        edit.setupEditChannel(type, buildCel(edit, found));
     }
 }
 
@@ -284,7 +312,6 @@ void EdlImporter::buildSequence(const String& name) {
         m_records[i].notes = event.notes;
         m_records[i].times = {event.sourceIn, event.sourceOut, event.recordOut - event.recordIn,
                               m_programme.firstFrames[i]};
-        m_records[i].isHanging = m_programme.hanging[i];
     }
     EditPtr sequence = newEdit(provisionalCookie(m_sources.size()), false);
     buildChannels(*sequence);

@@ -45,9 +45,6 @@ void readField(EdlRecord& record, char tag, std::string_view value) {
     case 'T':
         record.times = timesOf(value);
         break;
-    case 'H':
-        record.isHanging = true;
-        break;
     case 'N':
         record.notes += record.notes.empty() ? "" : "\n";
         record.notes += value;
@@ -75,9 +72,6 @@ String packEdlRecords(const std::vector<EdlRecord>& records) {
             appendLine(text, 'T',
                        std::to_string(times.sourceIn) + " " + std::to_string(times.sourceOut) + " " +
                            std::to_string(times.length) + " " + std::to_string(times.shown));
-        }
-        if (record.isHanging) {
-            appendLine(text, 'H', "");
         }
         Qx::forEachLine(record.notes, [&](std::string_view line) { appendLine(text, 'N', line); });
     }

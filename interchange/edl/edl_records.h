@@ -43,7 +43,6 @@ struct EdlRecord {
         bool operator==(const Times&) const = default;
     };
     std::optional<Times> times;
-    bool isHanging = false; ///< names an outgoing side that nothing before it plays
     bool operator==(const EdlRecord&) const = default;
 };
 
@@ -54,7 +53,6 @@ struct EdlRecord {
 ///     S00000000-00000000-00000000         an event's stamp, in any number
 ///     V047.6                              the digits of its speed
 ///     T90000 90025 25 90000               source in, source out, record length, first frame shown
-///     H                                   a hanging outgoing side
 ///     N* FROM CLIP NAME: x                a note line, in any number
 QM_INTERCHANGE_API String packEdlRecords(const std::vector<EdlRecord>& records);
 

@@ -4,6 +4,7 @@
 #include "platform/media/timecode.h"
 
 #include <algorithm>
+#include <bit>
 #include <cmath>
 #include <map>
 
@@ -18,6 +19,22 @@ int64_t recordLength(const EdlEvent& event) {
 // Source frames a record frame. The speed counts the labels of a second, as timecode does: 24 at 23.976.
 double velocityOf(const EdlEvent& event, Qx::FrameRate rate) {
     return event.speed ? event.speed->framesPerSecond / rate.nominal() : 1.0;
+}
+
+bool isTransition(const EdlEvent& event) {
+    return event.type == EdlType::Dissolve || event.type == EdlType::Wipe;
+}
+
+// True if an outgoing side names the source of what plays before it. It need not repeat the name.
+bool isSourceOf(const EdlEvent& outgoing, const EdlEvent& before) {
+    return outgoing.reel == before.reel &&
+           (outgoing.clipName.empty() || before.clipName.empty() || outgoing.clipName == before.clipName);
+}
+
+String transitionName(const EdlEvent& event) {
+    return event.type == EdlType::Wipe
+               ? String::format("the wipe of pattern %03d and %d frames", event.wipe, event.duration)
+               : String::format("the dissolve of %d frames", event.duration);
 }
 
 // The source frame that an event shows first. At a speed the M2 names it where it names one of the span.
@@ -87,6 +104,7 @@ private:
     static EdlClip tailOf(EdlClip clip, int64_t from) {
         clip.sourceIn += clip.velocity * static_cast<double>(from - clip.recordIn);
         clip.recordIn = from;
+        clip.transition = 0;
         return clip;
     }
 
@@ -107,11 +125,14 @@ private:
     void layEvent(size_t index);
     void layOn(EdlChannels channel, const EdlClip& clip);
     void checkTransition(size_t index);
-    void reportTransition(const EdlEvent& event, const EdlEvent* outgoing);
+    void reportKey(const EdlEvent& event);
+    void holdTransitions(std::vector<EdlClip>& clips, std::vector<int>& numHeld);
+    void reportUnheld(const std::vector<int>& numHeld);
+    [[nodiscard]] bool joins(const EdlClip* before, const EdlEvent& outgoing) const;
+    [[nodiscard]] std::optional<EdlOutgoing> ownOutgoing(const EdlClip& clip, const EdlClip* before) const;
     void checkDurations(const EdlEvent& event);
     void checkJoin(size_t index, EdlChannels channels);
     [[nodiscard]] EdlClip clipOf(size_t index) const;
-    [[nodiscard]] const EdlEvent* outgoingOf(size_t index) const;
     const EdlList& m_list;
     bool m_strict;
     LossReport& m_report;
@@ -197,10 +218,6 @@ void TrackBuilder::findPositions() {
     }
 }
 
-const EdlEvent* TrackBuilder::outgoingOf(size_t index) const {
-    return m_list.events[index].role == EdlRole::Incoming ? &m_list.events[index - 1] : nullptr;
-}
-
 EdlClip TrackBuilder::clipOf(size_t index) const {
     const EdlEvent& event = m_list.events[index];
     EdlClip clip;
@@ -209,6 +226,7 @@ EdlClip TrackBuilder::clipOf(size_t index) const {
     clip.recordOut = clip.recordIn + recordLength(event);
     clip.black = event.isBlack();
     clip.velocity = clip.black ? 1.0 : velocityOf(event, m_list.rate);
+    clip.transition = isTransition(event) ? event.duration : 0;
     clip.sourceIn = static_cast<double>(event.sourceIn);
     if (!clip.black) {
         clip.sourceIn = static_cast<double>(firstFrameOf(event, m_list.rate));
@@ -240,28 +258,83 @@ void TrackBuilder::checkDurations(const EdlEvent& event) {
     }
 }
 
-void TrackBuilder::reportTransition(const EdlEvent& event, const EdlEvent* outgoing) {
-    const bool fromBlack = outgoing == nullptr || outgoing->isBlack();
-    String what;
-    switch (event.type) {
-    case EdlType::Cut:
-    case EdlType::KeyBackground:
-        return;
-    case EdlType::Dissolve:
-        what = event.isBlack() ? "a fade out" : (fromBlack ? "a fade in" : "a dissolve");
-        what += String::format(" of %d frames became a cut", event.duration);
-        break;
-    case EdlType::Wipe:
-        what =
-            String::format("a wipe of pattern %03d and %d frames became a cut", event.wipe, event.duration);
-        break;
-    case EdlType::Key:
-    case EdlType::KeyOut:
-        what = String::format("a key %s with a fade of %d frames became a clip on the second picture track",
-                              event.type == EdlType::Key ? "in" : "out", event.duration);
-        break;
+void TrackBuilder::reportKey(const EdlEvent& event) {
+    if (event.type == EdlType::Key || event.type == EdlType::KeyOut) {
+        m_report.addLoss(event.line,
+                         String::format("a key %s with a fade of %d frames became a clip on the "
+                                        "second picture track",
+                                        event.type == EdlType::Key ? "in" : "out", event.duration));
     }
-    m_report.addLoss(event.line, std::move(what));
+}
+
+// True if an outgoing side goes on where a clip ends: at the frame that it reaches, or that its line names. At
+// a speed the two may be a frame apart.
+bool TrackBuilder::joins(const EdlClip* before, const EdlEvent& outgoing) const {
+    if (outgoing.isBlack() || before == nullptr || before->black) {
+        return outgoing.isBlack() && (before == nullptr || before->black);
+    }
+    const EdlEvent& event = m_list.events[before->event];
+    const auto frame = static_cast<double>(outgoing.sourceIn);
+    const double tolerance = before->velocity == 1.0 ? 0.0 : 1.0;
+    const bool isWhole = before->recordOut == m_programme.positions[before->event] + recordLength(event);
+    return isSourceOf(outgoing, event) && (std::abs(frame - before->sourceOut()) <= tolerance ||
+                                           (isWhole && outgoing.sourceIn == event.sourceOut));
+}
+
+// What gives way to a clip where it is not what plays before it on the track.
+std::optional<EdlOutgoing> TrackBuilder::ownOutgoing(const EdlClip& clip, const EdlClip* before) const {
+    const bool isPaired = m_list.events[clip.event].role == EdlRole::Incoming;
+    if (!isPaired) {
+        return before == nullptr || before->black ? std::nullopt : std::optional(EdlOutgoing());
+    }
+    const size_t index = clip.event - 1;
+    const EdlEvent& outgoing = m_list.events[index];
+    const bool isLine = recordLength(outgoing) > 0; // plays by itself, up to the transition
+    if (isLine ? before != nullptr && before->event == index : joins(before, outgoing)) {
+        return std::nullopt;
+    }
+    EdlOutgoing own;
+    own.black = outgoing.isBlack();
+    own.event = before != nullptr && !before->black && isSourceOf(outgoing, m_list.events[before->event])
+                    ? before->event
+                    : index;
+    own.velocity = own.black ? 1.0 : velocityOf(outgoing, m_list.rate);
+    own.frame = static_cast<double>(isLine ? outgoing.sourceOut : firstFrameOf(outgoing, m_list.rate));
+    return own;
+}
+
+// `numHeld` counts for each event the tracks on which its transition is held.
+void TrackBuilder::holdTransitions(std::vector<EdlClip>& clips, std::vector<int>& numHeld) {
+    for (size_t i = 0; i < clips.size(); ++i) {
+        EdlClip& clip = clips[i];
+        if (clip.transition == 0) {
+            continue;
+        }
+        const EdlEvent& event = m_list.events[clip.event];
+        const EdlClip* const before =
+            i > 0 && clips[i - 1].recordOut == clip.recordIn ? &clips[i - 1] : nullptr;
+        const int64_t length = clip.recordOut - clip.recordIn;
+        if (clip.transition > length && numHeld[clip.event] == 0) {
+            m_report.addLoss(event.line,
+                             transitionName(event) + String::format(" is shortened to %lld, as its "
+                                                                    "clip is no longer",
+                                                                    static_cast<long long>(length)));
+        }
+        clip.transition = std::min(clip.transition, length);
+        clip.outgoing = ownOutgoing(clip, before);
+        ++numHeld[clip.event];
+    }
+}
+
+void TrackBuilder::reportUnheld(const std::vector<int>& numHeld) {
+    for (size_t i = 0; i < numHeld.size(); ++i) {
+        const EdlEvent& event = m_list.events[i];
+        if (isTransition(event) && event.duration > 0 && recordLength(event) > 0 &&
+            numHeld[i] < std::popcount(event.channels)) {
+            m_report.addLoss(event.line,
+                             transitionName(event) + " is left out where another event covers its start");
+        }
+    }
 }
 
 void TrackBuilder::checkTransition(size_t index) {
@@ -269,11 +342,11 @@ void TrackBuilder::checkTransition(size_t index) {
     if (event.duration <= recordLength(event)) {
         return;
     }
-    const String what = String::format("the transition of %d frames is longer than its clip", event.duration);
     if (m_strict) {
-        m_badLines.add(event.line, what + "; shorten it or import without the strict mode");
-    } else {
-        m_report.addWarning(event.line, what);
+        m_badLines.add(event.line,
+                       String::format("the transition of %d frames is longer than its clip; shorten it or "
+                                      "import without the strict mode",
+                                      event.duration));
     }
 }
 
@@ -285,7 +358,6 @@ void TrackBuilder::checkJoin(size_t index, EdlChannels channels) {
         const EdlClip* const last = lane == m_lanes.end() ? nullptr : lane->second.last();
         const bool meets = last != nullptr && last->recordOut == m_programme.positions[index];
         if (!meets || m_list.events[last->event].reel != event.reel) {
-            m_programme.hanging[index] = true;
             m_report.addWarning(event.line,
                                 meets ? "the outgoing side is of another reel than what plays before it"
                                       : "the outgoing side does not start where the event before it ends");
@@ -318,7 +390,7 @@ void TrackBuilder::layEvent(size_t index) {
     }
     checkDurations(event);
     checkTransition(index);
-    reportTransition(event, outgoingOf(index));
+    reportKey(event);
     if (event.channels == 0) {
         m_report.addLoss(event.line, "the event is on no track and is left out");
         return;
@@ -340,7 +412,6 @@ void TrackBuilder::layEvent(size_t index) {
 
 Qx::Status TrackBuilder::lay(EdlProgramme& programme) {
     findPositions();
-    m_programme.hanging.assign(m_list.events.size(), false);
     for (const EdlEvent& event : m_list.events) {
         m_programme.firstFrames.push_back(firstFrameOf(event, m_list.rate));
     }
@@ -357,11 +428,14 @@ Qx::Status TrackBuilder::lay(EdlProgramme& programme) {
     if (!m_badLines.empty()) {
         return m_badLines.refuse(m_report);
     }
+    std::vector<int> numHeld(m_list.events.size(), 0);
     for (const auto& [channel, lane] : m_lanes) {
         if (!lane.empty()) {
             m_programme.tracks.push_back({channel, lane.clips()});
+            holdTransitions(m_programme.tracks.back().clips, numHeld);
         }
     }
+    reportUnheld(numHeld);
     programme = std::move(m_programme);
     return {};
 }

@@ -3,8 +3,18 @@
 #include "interchange/edl/edl_reader.h"
 #include "interchange/export.h"
 
+#include <optional>
+
 /// Lays the events of a list on tracks.
 namespace interchange {
+
+/// What gives way in a transition where it is not what ends there on the track.
+struct EdlOutgoing {
+    bool black = true;
+    size_t event = 0; ///< index of one that plays its source; none for black
+    double frame = 0; ///< the source frame at which the transition begins
+    double velocity = 1;
+};
 
 /// A span of one track that plays a part of one event. Record times are frames from the programme's start,
 /// source times frames from midnight.
@@ -15,6 +25,10 @@ struct EdlClip {
     double sourceIn = 0; ///< the source frame shown at `recordIn`; between frames where a speed trims it so
     double velocity = 1; ///< source frames a record frame
     bool black = false;
+    /// Record frames at its start over which what plays before it on the track, or black, gives way to it. At
+    /// most its length; 0 for a cut.
+    int64_t transition = 0;
+    std::optional<EdlOutgoing> outgoing; ///< of the transition
 
     [[nodiscard]] double sourceOut() const {
         return sourceIn + velocity * static_cast<double>(recordOut - recordIn);
@@ -34,8 +48,6 @@ struct EdlProgramme {
     std::vector<int64_t> positions;
     /// Likewise the source frame that is shown first.
     std::vector<int64_t> firstFrames;
-    /// Likewise true for the line of an outgoing side that names other than what ends there.
-    std::vector<bool> hanging;
 };
 
 /// Lays every event on its tracks in record order.
@@ -48,9 +60,10 @@ struct EdlProgramme {
 ///     over it        bb
 ///     result      aaabbaaa
 ///
-/// A transition becomes a cut where it starts: the incoming side begins at its record in, the outgoing side
-/// ends there. A key's foreground goes to the second picture track. Both are losses in the report. Durations
-/// that do not agree, transitions that do not meet and events without length draw warnings; the record side
+/// A transition lies at the start of its incoming side. Where the outgoing side is not what ends there, the clip
+/// says what it is. A transition that another event cuts short, or that is longer than its clip, is held as far
+/// as its clip goes: a loss in the report, as is one whose start is covered. A key's foreground goes to the second
+/// picture track. Durations that do not agree, transitions that do not meet and events without length draw warnings; the record side
 /// is trusted for the position and the source side for its in point.
 ///
 /// Programmes that run over midnight: where an event does, or where the list steps back by more than 12 hours

@@ -8,6 +8,8 @@
 #include "edit/model/cel.h"
 #include "edit/model/cue_list.h"
 #include "edit/model/edit_keys.h"
+#include "platform/effects/effect_instance.h"
+#include "platform/store/tag.h"
 #include "support/recording_log.h"
 #include "support/temporary_folder.h"
 
@@ -100,6 +102,10 @@ std::string meaning(ImportedList& list, bool withSecondPicture = true) {
             text += " " + Qx::doubleToText(in.editTime) + "-" +
                     Qx::doubleToText(content.get_event(i + 1).editTime);
             text += " x" + Qx::doubleToText(in.velocity) + " " + Qx::doubleToText(in.stripTime);
+            if (const Tag<EffectInstance> effect = list.edit().openObject<EffectInstance>(in.id)) {
+                text += " by " + std::string(effect->kind()->typeId) + " " +
+                        Qx::doubleToText(effect->getNumberAt("pattern", 0));
+            }
             const EditPtr shot = list.options.source(in.strip);
             if (shot.valid()) {
                 const configb& source = std::as_const(*shot).Opts();
@@ -291,14 +297,42 @@ TEST(EdlExport, ChangedEventsAreNotedAfresh) {
     EXPECT_EQ(text.find("sea\n* TO"), String::npos) << text;
 }
 
-TEST(EdlExport, ATransitionWithoutItsOutgoingSideIsReported) {
+// As in an edit that no list was read into: nothing but what lies on its channels says what is written.
+TEST(EdlExport, TransitionsAreWrittenAsTheyLie) {
+    const std::string text = "TITLE: all kinds\nFCM: NON-DROP FRAME\n"
+                             "001 BL B C 00:00:00:00 00:00:00:00 10:00:00:00 10:00:00:00\n"
+                             "001 R1 B D 010 00:01:00:00 00:01:02:00 10:00:00:00 10:00:02:00\n"
+                             "002 R1 V C 00:01:02:00 00:01:02:00 10:00:02:00 10:00:02:00\n"
+                             "002 R2 V W201 025 00:02:00:00 00:02:01:00 10:00:02:00 10:00:03:00\n"
+                             "003 R9 A C 00:09:00:00 00:09:00:00 10:00:02:00 10:00:02:00\n"
+                             "003 R2 A D 005 00:02:00:00 00:02:01:00 10:00:02:00 10:00:03:00\n"
+                             "004 R2 V C 00:02:01:00 00:02:01:00 10:00:03:00 10:00:03:00\n"
+                             "004 R3 V D 012 00:03:00:00 00:03:04:00 10:00:03:00 10:00:05:00\n"
+                             "M2 R3 050.0 00:03:00:00\n"
+                             "005 R3 V C 00:03:04:00 00:03:04:00 10:00:05:00 10:00:05:00\n"
+                             "005 BL V D 025 00:00:00:00 00:00:01:00 10:00:05:00 10:00:06:00\n";
+    ImportedList list(text);
+    list.edit().Opts().remove(EdlKey::kEvents);
+    EXPECT_EQ(folded(list.exported()), text);
+    EXPECT_TRUE(list.report.losses().empty()) << list.report.lines().front();
+    // R1 plays on under the wipe, and R9, of which nothing else is used, under the dissolve of the sound.
+    EXPECT_DOUBLE_EQ(list.shot(0).get_edit_cel_p(0)->get_event(1).editTime, 63);
+    EXPECT_DOUBLE_EQ(list.shot(3).get_edit_cel_p(0)->get_event(0).editTime, 540);
+    ASSERT_TRUE(list.content(0).get_event(4).strip.isEffectGraph());
+    list.edit()
+        .openObject<EffectInstance>(list.content(0).get_event(4).id)
+        ->setParameter("opacity", Fx::ParameterValue::ofNumber(0.5));
+    (void)list.exported();
+    EXPECT_TRUE(list.lost("the settings of a transition"));
+}
+
+TEST(EdlExport, ATransitionThatWentIsACut) {
     ImportedList list(kFull);
     ASSERT_TRUE(list.content(0).remove({0.0, 2.48}));
     const String text = list.exported();
     EXPECT_EQ(text.find(" D    012"), String::npos) << text;
-    EXPECT_TRUE(list.lost("event 002: a dissolve of 12 frames")) << text;
     EXPECT_NE(text.find("002  SC00.JPG V     C        00:00:00:12 00:00:02:00 10:00:00:00 10:00:01:13\n"
-                        "* FROM CLIP NAME: sea\n"),
+                        "* FROM CLIP NAME: sea\n007"),
               String::npos)
         << text;
 }

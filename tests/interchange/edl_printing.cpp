@@ -24,6 +24,15 @@ std::string channelName(EdlChannels channel) {
 std::string printClip(const EdlList& list, const EdlClip& clip) {
     const EdlEvent& event = list.events[clip.event];
     std::string line = " " + std::to_string(clip.recordIn) + "-" + std::to_string(clip.recordOut);
+    if (clip.transition > 0) {
+        line += " " + std::string(event.typeText().substr(0, event.typeText().rfind(' '))) + " of " +
+                std::to_string(clip.transition);
+    }
+    if (clip.outgoing) {
+        const EdlOutgoing& out = *clip.outgoing;
+        line += out.black ? " out of black"
+                          : " out of " + list.events[out.event].reel + " from " + Qx::doubleToText(out.frame);
+    }
     if (clip.black) {
         return line + " black\n";
     }

@@ -87,8 +87,8 @@ int importExample(const char* name, const String& project, cookie& item) {
     return code;
 }
 
-/// The typical request: material of one edit replaces a span of another, which is kept, taken back and
-/// brought again, and goes out to other tools.
+/// The typical request: material of one edit replaces a span of another and comes in by a wipe, which is kept,
+/// taken back and brought again, and goes out to other tools.
 int runDemo(String project) {
     if (project.empty()) {
         if (const Qx::Status made = makeFolder(project); !made) {
@@ -108,6 +108,9 @@ int runDemo(String project) {
         {"show", evening.asString()},
         {"apply", "replace", "--from", evening.asString() + "@5s-9s", "--to", day.asString() + "@01:00:42:00",
          "--channels", "V"},
+        {"transition", "add", day.asString() + "@01:00:42:00", "--kind", "wipe:1", "--length", "1s",
+         "--align", "end"},
+        {"show", day.asString()},
         {"flush"},
         {"undo", day.asString()},
         {"redo", day.asString()},
@@ -133,7 +136,7 @@ int runDemo(String project) {
 Command demoCommand() {
     const auto project = std::make_shared<String>();
     return {"demo",
-            "Import two examples, cut one into the other, undo, redo, export",
+            "Import two examples, cut one into the other, lay a wipe, undo, redo, export",
             {projectOption(*project)},
             "Example:\n  qmedit demo\n\n"
             "Without --project a fresh folder is made for temporary files; it is kept, and named at the end.",

@@ -29,6 +29,7 @@ Command newCommand();
 Command applyCommand();
 Command renameCommand();
 Command markerCommand();
+Command transitionCommand();
 Command purgeCommand();
 Command diffCommand();
 Command verifyCommand();

@@ -55,7 +55,8 @@ Json pairJson(const EditReport& report, const PairReport& pair) {
     json["speed"] = pair.velocity;
     json["fade_in"] = report.frames(pair.fadeIn);
     json["fade_out"] = report.frames(pair.fadeOut);
-    json["transition"] = transitionText(pair.transition);
+    json["transition"] = transitionText(pair);
+    json["effect"] = textOrNull(pair.effect, !pair.effect.empty());
     json["reel"] = textOrNull(source.reel, !source.reel.empty());
     json["event"] = textOrNull(pair.event, !pair.event.empty());
     return json;

@@ -105,18 +105,18 @@ Line Table::lineOf(const ChannelReport& channel, size_t index) const {
     line.cells[Number] = String::format("%zu", index + 1);
     line.cells[RecordIn] = m_report.recordTimecode(pair.in);
     line.cells[RecordOut] = m_report.recordTimecode(pair.out);
-    if (source.kind != SourceKind::Black) {
+    if (source.kind != SourceKind::Black && source.kind != SourceKind::Effect) {
         line.cells[SourceIn] = m_report.sourceTimecode(source, pair.stripIn);
         line.cells[SourceOut] = m_report.sourceTimecode(source, pair.stripOut);
     }
     line.cells[Length] = shortLength(m_report, pair.out - pair.in);
     if (m_all) {
         line.cells[Event] = m_console.safe(pair.event);
-        line.cells[Transition] = transitionText(pair.transition);
+        line.cells[Transition] = transitionText(pair);
         line.cells[Reel] =
             safe_text::fitted(m_console.safe(source.reel), kMostReelColumns, m_console.ellipsis());
     }
-    line.name = m_labels[pair.source];
+    line.name = pair.effect.empty() ? m_labels[pair.source] : effectLabel(pair);
     line.notes = pairNotes(m_report, pair);
     line.ink = inkOf(source);
     return line;

@@ -136,6 +136,7 @@ private:
     void addRule(const Lanes* above, const Lanes* below);
     Lanes addChannel(const ChannelReport& channel);
     void drawPair(const ChannelReport& channel, size_t index, Row& row, Lanes& lanes);
+    void drawTransition(const PairReport& pair, Row& row, Lanes& lanes);
     void drawFill(const PairReport& pair, int from, int to, Ink ink, Row& row);
     [[nodiscard]] Ink inkOf(const ChannelReport& channel, const SourceReport& source, size_t index) const;
     void addLegend();
@@ -274,7 +275,7 @@ void Picture::drawFill(const PairReport& pair, int from, int to, Ink ink, Row& r
     }
     m_showsFade = m_showsFade || first > from || last < to;
     m_showsBlack = m_showsBlack || ink == Ink::Black;
-    const String& label = m_labels[pair.source];
+    const String label = pair.effect.empty() ? m_labels[pair.source] : effectLabel(pair);
     const int room = last - first;
     // Black is known by its shade; a part of the word would hide it.
     if (ink == Ink::Black && safe_text::columns(label) > room) {
@@ -286,8 +287,33 @@ void Picture::drawFill(const PairReport& pair, int from, int to, Ink ink, Row& r
                 safe_text::fitted(label, room, room < kRoomForEllipsis ? "" : m_console.ellipsis()), ink);
 }
 
+// Its ends are the clips' too: they bear its sign, so that it is seen however short it is.
+void Picture::drawTransition(const PairReport& pair, Row& row, Lanes& lanes) {
+    const int in = columnOf(pair.in);
+    const int out = columnOf(pair.out);
+    for (int i = in; i <= out; ++i) {
+        row.set(i, m_signs.fadeIn, Ink::Effect);
+        lanes.covered[static_cast<size_t>(i)] = lanes.covered[static_cast<size_t>(i)] || i < out;
+    }
+    for (const int column : {in, out}) {
+        lanes.edge[static_cast<size_t>(column)] = lanes.stem[static_cast<size_t>(column)] = true;
+    }
+    const String label = " " + transitionText(pair) + " ";
+    if (const int room = out - in - 1; safe_text::columns(label) <= room) {
+        row.setText(in + 1 + (room - safe_text::columns(label)) / 2, label, Ink::Effect);
+    }
+    m_showsFade = true;
+}
+
 void Picture::drawPair(const ChannelReport& channel, size_t index, Row& row, Lanes& lanes) {
     const PairReport& pair = channel.pairs[index];
+    if (pair.isTransition) {
+        drawTransition(pair, row, lanes);
+        return;
+    }
+    if (m_report.frames(pair.in) == m_report.frames(pair.out)) {
+        return; // seen under transitions only
+    }
     const int in = columnOf(pair.in);
     const int out = columnOf(pair.out);
     const bool narrow = in == out;
@@ -335,7 +361,7 @@ void Picture::addLegend() {
     add(m_showsCut, m_signs.cut, "cut");
     add(m_showsDense, m_signs.denseCut, "several cuts");
     add(m_showsBlack, m_signs.black, "black");
-    add(m_showsFade, m_signs.fadeIn, "fade or dissolve");
+    add(m_showsFade, m_signs.fadeIn, "fade or transition");
     add(m_showsGap, "blank", "gap");
     add(!m_report.cues.empty(), m_signs.cue, "marker");
     String line;
@@ -408,6 +434,10 @@ String sourceLabel(const SourceReport& source, const Console& console) {
         return source.name.empty() ? source.strip.asString() : console.safe(source.name);
     }
     return sourceKindText(source.kind);
+}
+
+String effectLabel(const PairReport& pair) {
+    return pair.isTransition ? transitionText(pair) : pair.effect.lower();
 }
 
 String trackPicture(const EditReport& report, const Console& console) {

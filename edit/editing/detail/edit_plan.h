@@ -3,6 +3,8 @@
 #include "edit/editing/editor.h"
 #include "edit/model/aud_levels_cel.h"
 #include "edit/model/cel.h"
+#include "edit/model/event_objects.h"
+#include "platform/store/tag_bag.h"
 
 #include <array>
 #include <vector>
@@ -23,10 +25,14 @@ struct Editor::Target {
 struct Editor::Step {
     edit_operation core = edit_operation::NoOperation; ///< `kCoreReplace` and its like
     size_t target = 0;
-    double at = 0;                   ///< where it begins in the destination
-    double length = 0;               ///< of what is laid or removed
-    std::shared_ptr<const cel> part; ///< what is laid, from 0 to `length`
-    AudLevelsCel levels;             ///< its levels; an invalid one for none
+    double at = 0;                          ///< where it begins in the destination
+    double length = 0;                      ///< of what is laid or removed
+    std::shared_ptr<const cel> part;        ///< what is laid, from 0 to `length`
+    std::shared_ptr<TagBag> objects;        ///< what is bound to events of the part; null for nothing
+    std::vector<EventObjects::Bound> bound; ///< those, with where the whole of each would lie in the part
+    bool blackBefore = false;               ///< the transition that the part begins with leads from black
+    bool blackAfter = false;                ///< the one that it ends with leads to black
+    AudLevelsCel levels;                    ///< its levels; an invalid one for none
     cel::Range levelsRange;
     bool withLevels = true;
     [[nodiscard]] double end() const { return at + length; }
@@ -88,13 +94,14 @@ private:
     size_t addTarget(Target target);
     void addStep(edit_operation core, size_t target, double at, double length,
                  std::shared_ptr<const cel> part = nullptr);
-    void addCopyStep(size_t target, double at, const Edit& from, const IdStamp& chan, const Range& region,
+    void addCopyStep(size_t target, double at, Edit& from, const IdStamp& chan, const Range& region,
                      double lead = 0);
     void addBlackStep(edit_operation core, size_t target, double at, double length);
     [[nodiscard]] bool mustHoldEnd(const Target& target, double to) const;
     bool destinationRegion(const EditModule& destination, const IdStamp& chan, Range& region);
     Range sourceRegion(const Range& exact);
     std::shared_ptr<cel> takePart(const cel* content, const Range& region, bool fillGaps, double lead);
+    void takeObjects(Step& step, Edit& from, const cel& content, const Range& region);
     std::shared_ptr<cel> onFrames(const std::shared_ptr<cel>& part);
     bool checkSteps();
     bool checkStep(const Step& step);
@@ -125,6 +132,16 @@ inline constexpr std::array<Edit::ChanType, 3> kChannelKinds = {
     Edit::ChanType{VideoChan, Edit_Chan_SubType::ALIAS}, Edit::ChanType{VideoChan, Edit_Chan_SubType::NONE},
     Edit::ChanType{AudioChan, Edit_Chan_SubType::NONE}};
 
+/// What a part of a channel is to be made of, so that no transition reaches out of it.
+struct WholeEnds {
+    /// The channel with each transition that does taken out: what is left of it shows the one clip that stays. Null
+    /// when the channel itself will do.
+    std::unique_ptr<cel> channel;
+    bool blackBefore = false; ///< the part begins with a transition from black, which stays
+    bool blackAfter = false;  ///< it ends with one to black
+};
+/// `objects` is where the transitions' nodes lie.
+[[nodiscard]] WholeEnds wholeEnds(const cel& source, const cel::Range& region, TagBag& objects);
 /// A cel of the content of `source` from `region.start()` on, `region.length()` long and beginning at 0, with
 /// black where nothing lies if `fillGaps`. A null source gives a black or empty one.
 [[nodiscard]] std::shared_ptr<cel> makePart(const cel* source, const cel::Range& region, bool fillGaps);
@@ -137,6 +154,9 @@ inline constexpr std::array<Edit::ChanType, 3> kChannelKinds = {
 /// Gives an audio channel without levels a levels channel that says what its clips' own levels say. The null
 /// stamp if that is not possible.
 IdStamp addLevels(Edit& edit, const IdStamp& audio);
+/// Makes the revision of an edit that undo goes back to; nothing for one that the manager does not have. False, with the
+/// refusal and nothing changed, if the manager cannot.
+[[nodiscard]] bool makeRevision(const EditPtr& edit, Qx::Status& refusal);
 /// True if an edit may be changed by the current user.
 [[nodiscard]] bool isWritable(const Edit& edit);
 /// A time rounded to whole frames; as it is for an unknown rate.

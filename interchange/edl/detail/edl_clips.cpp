@@ -3,7 +3,10 @@
 #include "edit/model/aud_levels_cel.h"
 #include "edit/model/cel.h"
 #include "edit/model/managed_cel.h"
+#include "interchange/edl/detail/edl_line.h"
+#include "platform/effects/special_effects.h"
 #include "platform/media/timecode.h"
+#include "platform/store/tag.h"
 #include "platform/store/tag_bag.h"
 
 #include <algorithm>
@@ -17,6 +20,8 @@ namespace {
 // Of a frame: what the rounding of times in seconds may leave.
 constexpr double kFrameTolerance = 1e-3;
 constexpr int kWrittenAudio = 4;
+constexpr int64_t kLongestTransition = 999;
+constexpr uint32_t kGreatestWipe = 999;
 
 } // namespace
 
@@ -75,16 +80,63 @@ void EdlClips::reportEvent(const channel_event& in, const channel_event& out, co
     }
 }
 
+String EdlClips::whereIs(int chan, const channel_event& in) const {
+    return m_edit.getChanDisplayName(m_edit.getId(chan)) + " at " + timeText(m_rate.toFrames(in.editTime));
+}
+
+// What a list can say of the transition of a pair. Nothing for an effect that is none.
+std::optional<EdlClips::Waiting> EdlClips::takeTransition(int chan, const channel_event& in,
+                                                          const channel_event& out) {
+    const String where = whereIs(chan, in);
+    const Tag<EffectInstance> effect = m_edit.openObject<EffectInstance>(in.id);
+    if (!effect || !effect->isTransition()) {
+        return std::nullopt;
+    }
+    Waiting waiting;
+    waiting.recordIn = frames(in.editTime, where, "start");
+    waiting.recordOut = frames(out.editTime, where, "end");
+    waiting.seconds = out.editTime - in.editTime;
+    ExportTransition& transition = waiting.transition;
+    transition.length = waiting.recordOut - waiting.recordIn;
+    if (transition.length <= 0 || transition.length > kLongestTransition) {
+        m_report.addLoss(0, where +
+                                String::format(": a transition of %lld frames is written as a cut, as a list "
+                                               "holds 1 to 999",
+                                               static_cast<long long>(transition.length)));
+        transition.length = 0;
+        return waiting;
+    }
+    transition.type = EdlType::Dissolve;
+    const std::string_view kind = effect->kind()->typeId;
+    size_t said = 0; // of the parameters that were set
+    if (const auto* const wipe = dynamic_cast<const TextureWipeEffect*>(&*effect)) {
+        const uint32_t code = wipe->getPatternCode();
+        transition.type = EdlType::Wipe;
+        transition.wipe = static_cast<int>(std::min(code, kGreatestWipe));
+        said = wipe->findParameter("pattern") != nullptr ? 1 : 0;
+        if (code > kGreatestWipe) {
+            m_report.addLoss(0, where + ": a wipe's pattern is beyond the codes of a list; 999 is written");
+        }
+    } else if (kind != Fx::kDissolve && kind != Fx::kCrossFade) {
+        m_report.addLoss(0, where + ": a transition \"" + String(effect->kind()->name) +
+                                "\" is written as a dissolve");
+    }
+    if (effect->parameters().size() > said) {
+        m_report.addLoss(0, where + ": the settings of a transition are not written");
+    }
+    return waiting;
+}
+
 bool EdlClips::takePair(int chan, const channel_event& in, const channel_event& out, ExportClip& clip,
-                        EdlSources& sources) {
-    String where =
-        m_edit.getChanDisplayName(m_edit.getId(chan)) + " at " + timeText(m_rate.toFrames(in.editTime));
+                        EdlSources& sources, const Waiting* waiting) {
+    const String where = whereIs(chan, in);
     if (!canShow(in, where)) {
         return false;
     }
     reportEvent(in, out, where);
-    clip.recordIn = frames(in.editTime, where, "start");
+    clip.recordIn = waiting != nullptr ? waiting->recordIn : frames(in.editTime, where, "start");
     clip.recordOut = frames(out.editTime, where, "end");
+    clip.transition = waiting != nullptr ? waiting->transition : ExportTransition();
     if (clip.recordOut <= clip.recordIn) {
         m_report.addLoss(0, where + ": a clip of less than a frame is left out");
         return false;
@@ -92,7 +144,8 @@ bool EdlClips::takePair(int chan, const channel_event& in, const channel_event& 
     clip.source = sources.find(in.strip);
     if (!in.strip.isBlack()) {
         const int64_t day = Qx::framesPerDay(m_rate, sources[clip.source].drop);
-        clip.sourceIn = frames(in.stripTime, where, "source in");
+        const double under = waiting != nullptr ? waiting->seconds : 0.0;
+        clip.sourceIn = frames(in.stripTime - in.velocity * under, where, "source in");
         clip.velocity = in.velocity;
         if (clip.sourceIn < 0 || clip.sourceIn >= day) {
             m_report.addLoss(0, where + ": its source in lies outside the 24 hours of timecode");
@@ -104,14 +157,83 @@ bool EdlClips::takePair(int chan, const channel_event& in, const channel_event& 
     return true;
 }
 
+// True for an event that begins a pair of no length from which a transition leads.
+bool EdlClips::leadsFrom(const cel& content, int event) const {
+    if (event + 2 >= content.numEvents()) {
+        return false;
+    }
+    const double in = content.getChanEventPtr(event)->editTime;
+    const channel_event& next = *content.getChanEventPtr(event + 2);
+    return m_rate.toFrames(in) == m_rate.toFrames(content.getChanEventPtr(event + 1)->editTime) &&
+           m_rate.toFrames(next.editTime) == m_rate.toFrames(in) && next.strip.isEffectGraph();
+}
+
+// A transition to which nothing follows leads to black.
+void EdlClips::toBlack(const Waiting& waiting, EdlChannels channel, EdlSources& sources) {
+    ExportClip clip;
+    clip.channels = channel;
+    clip.recordIn = waiting.recordIn;
+    clip.recordOut = waiting.recordOut;
+    clip.transition = waiting.transition;
+    clip.source = sources.find(black_cookie);
+    m_clips.push_back(clip);
+}
+
+// Sound has no wipes: one that came from a list, as long as it was, is what the list calls it.
+void EdlClips::sayAsListed(ExportClip& clip) const {
+    ExportTransition& transition = clip.transition;
+    if (clip.record == kNoRecord || transition.type != EdlType::Dissolve ||
+        (clip.channels & (kEdlPicture | kEdlPicture2)) != 0) {
+        return;
+    }
+    const std::string_view text = (*m_records)[clip.record].typeText;
+    const size_t blank = text.find(' ');
+    if (text.starts_with('W') && blank != std::string_view::npos &&
+        digitsValue(text.substr(blank + 1)) == transition.length) {
+        transition.type = EdlType::Wipe;
+        transition.wipe = std::max(0, digitsValue(text.substr(1, blank - 1)));
+    }
+}
+
 void EdlClips::collectChannel(int chan, EdlChannels channel, EdlSources& sources) {
     const cel* const content = m_edit.get_edit_cel_p(chan);
+    std::optional<Waiting> waiting;
+    std::optional<ExportClip> before; // what a transition that follows leads from
     for (int i = 0; content != nullptr && i + 1 < content->numEvents(); i += 2) {
+        const channel_event& in = *content->getChanEventPtr(i);
+        const channel_event& out = *content->getChanEventPtr(i + 1);
+        if (waiting && m_rate.toFrames(in.editTime) != waiting->recordOut) {
+            toBlack(*waiting, channel, sources);
+            waiting.reset();
+        }
         ExportClip clip;
         clip.channels = channel;
-        if (takePair(chan, *content->getChanEventPtr(i), *content->getChanEventPtr(i + 1), clip, sources)) {
-            m_clips.push_back(clip);
+        if (!waiting && leadsFrom(*content, i) && canShow(in, whereIs(chan, in))) {
+            clip.source = sources.find(in.strip);
+            clip.recordIn = clip.recordOut = m_rate.toFrames(in.editTime);
+            clip.sourceIn = frames(in.stripTime, whereIs(chan, in), "source in");
+            before = clip;
+            continue;
         }
+        std::optional<Waiting> transition;
+        if (in.strip.isEffectGraph() && !waiting) {
+            transition = takeTransition(chan, in, out);
+        }
+        if (transition) {
+            if (before && before->recordOut == transition->recordIn && !sources[before->source].black) {
+                transition->transition.outgoing = before->source;
+                transition->transition.outgoingFrame = before->sourceNext();
+            }
+            waiting = transition;
+        } else if (takePair(chan, in, out, clip, sources, waiting ? &*waiting : nullptr)) {
+            sayAsListed(clip);
+            m_clips.push_back(clip);
+            before = clip;
+            waiting.reset();
+        }
+    }
+    if (waiting) {
+        toBlack(*waiting, channel, sources);
     }
 }
 
@@ -119,7 +241,8 @@ void EdlClips::collectChannel(int chan, EdlChannels channel, EdlSources& sources
 // others. A copy of no line joins the first that lacks its track.
 void EdlClips::merge() {
     const auto span = [](const ExportClip& clip) {
-        return std::make_tuple(clip.recordIn, clip.recordOut, clip.source, clip.sourceIn, clip.velocity);
+        return std::make_tuple(clip.recordIn, clip.recordOut, clip.source, clip.sourceIn, clip.velocity,
+                               clip.transition);
     };
     std::sort(m_clips.begin(), m_clips.end(), [&](const ExportClip& a, const ExportClip& b) {
         return std::make_tuple(span(a), a.record, a.channels) <
@@ -151,6 +274,7 @@ void EdlClips::merge() {
 }
 
 std::vector<ExportClip> EdlClips::collect(const std::vector<EdlRecord>& records, EdlSources& sources) {
+    m_records = &records;
     for (size_t i = 0; i < records.size(); ++i) {
         for (const IdStamp& stamp : records[i].events) {
             m_recordOf.emplace(stamp, i);
