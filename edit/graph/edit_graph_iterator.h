@@ -259,6 +259,10 @@ private:
 /// the channel itself.
 [[nodiscard]] QM_API IdStamp findTopTrack(const EditPtr& edit, const IdStamp& track, double time);
 
+/// The channel of an edit that is shown by a pair which plays it, at a time of the edit: that of the same type and
+/// place as the pair's, else the first of the type, or the topmost effects channel over it. Null for an edit without.
+[[nodiscard]] QM_API IdStamp findShownTrack(const CelEventPair& pair, const EditPtr& inner, double time);
+
 /// Appends the channels of the material that is seen or heard on a channel at a time, by index.
 QM_API void listMaterialSourceTracks(Vector<int>& tracks, const EditPtr& edit, const IdStamp& track,
                                      double time);

@@ -23,12 +23,12 @@ int placeAmongKind(const Edit& edit, const IdStamp& track) {
     return -1;
 }
 
-/// The channel of an edit that plays where another edit's channel shows it: that of the same place among its
-/// type, else the first, with the effects that lie over it.
-IdStamp trackShownBy(const CelEventPair& outer, const EditPtr& inner, double time) {
-    const Edit_Chan_Type type = outer.getChanType() == AudioChan ? AudioChan : VideoChan;
-    const int wanted = outer.getEdit().valid() && outer.getChanSubType() == Edit_Chan_SubType::NONE
-                           ? placeAmongKind(*outer.getEdit(), outer.trackId())
+} // namespace
+
+IdStamp findShownTrack(const CelEventPair& pair, const EditPtr& inner, double time) {
+    const Edit_Chan_Type type = pair.getChanType() == AudioChan ? AudioChan : VideoChan;
+    const int wanted = pair.getEdit().valid() && pair.getChanSubType() == Edit_Chan_SubType::NONE
+                           ? placeAmongKind(*pair.getEdit(), pair.trackId())
                            : 0;
     int chan = inner->getFirstChan(type, Edit_Chan_SubType::NONE);
     const int first = chan;
@@ -38,8 +38,6 @@ IdStamp trackShownBy(const CelEventPair& outer, const EditPtr& inner, double tim
     const IdStamp track = inner->getId(chan != NO_CHAN ? chan : first);
     return type == VideoChan ? findTopTrack(inner, track, time) : track;
 }
-
-} // namespace
 
 IdStamp findTopTrack(const EditPtr& edit, const IdStamp& track, double time) {
     IdStamp top = track;
@@ -222,7 +220,7 @@ void EditGraphIterator::traverseGhostAliasing(CelEventPair& pair, double& time, 
             pair.stripTime(), pair.editTime(), static_cast<float>(pair.inH().get_strip_velocity()));
         time = into.applyTo(time);
         hold(inner);
-        pair = CelEventPair(inner, trackShownBy(pair, inner, time), time);
+        pair = CelEventPair(inner, findShownTrack(pair, inner, time), time);
         traverseTrackAliasing(pair, time, transforms);
     }
 }
