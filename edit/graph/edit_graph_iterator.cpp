@@ -120,6 +120,7 @@ void EditGraphIterator::initFromPair(CelEventPair pair, bool keepsMaterial) {
 
 void EditGraphIterator::copyFrom(const EditGraphIterator& other, int flags) {
     setFlags(flags);
+    m_stack.clear();
     m_time = other.m_time;
     m_rootTrackId = other.m_rootTrackId;
     m_rootEdit = other.m_rootEdit;
@@ -140,6 +141,14 @@ void EditGraphIterator::copyFrom(const EditGraphIterator& other, int flags) {
         m_stack.push_back(std::make_unique<ItorStackEntry>(*other.entryAt(level)));
     }
     m_current = other.m_current - first;
+    m_numTransforms = other.m_numTransforms;
+}
+
+void EditGraphIterator::countTransforms() {
+    m_numTransforms = m_above.size();
+    for (int level = 0; level <= m_current; ++level) {
+        m_numTransforms += m_stack[static_cast<size_t>(level)]->transforms.size();
+    }
 }
 
 void EditGraphIterator::clear() {
@@ -148,6 +157,7 @@ void EditGraphIterator::clear() {
     }
     m_above.clear();
     m_held.clear();
+    m_numTransforms = 0;
 }
 
 void EditGraphIterator::invalidate() {
@@ -195,6 +205,7 @@ void EditGraphIterator::addStackItem(EntryPtr entry) {
         m_above.insert(m_above.end(), left->transforms.begin(), left->transforms.end());
         recycle(std::move(left));
     }
+    m_numTransforms += entry->transforms.size();
     m_stack[static_cast<size_t>(m_current)] = std::move(entry);
 }
 
@@ -202,7 +213,9 @@ bool EditGraphIterator::moveBack() {
     if (!m_valid || !m_bidirectional || m_current < 1) {
         return false;
     }
-    recycle(std::move(m_stack[static_cast<size_t>(m_current)]));
+    EntryPtr left = std::move(m_stack[static_cast<size_t>(m_current)]);
+    m_numTransforms -= left->transforms.size();
+    recycle(std::move(left));
     --m_current;
     return true;
 }
@@ -300,6 +313,9 @@ double EditGraphIterator::getEditEndTime() const {
 }
 
 double EditGraphIterator::mapToLevel(double time, int level) const {
+    if (m_numTransforms == 0) {
+        return time;
+    }
     for (const EditByRefTimeTransform& transform : m_above) {
         time = transform.applyTo(time);
     }
@@ -312,7 +328,7 @@ double EditGraphIterator::mapToLevel(double time, int level) const {
 }
 
 double EditGraphIterator::applyTimeTransformsStackTo(double time, bool inverse) const {
-    if (!m_valid || m_current < 0) {
+    if (!m_valid || m_current < 0 || m_numTransforms == 0) {
         return time;
     }
     if (!inverse) {

@@ -212,6 +212,7 @@ private:
     void restore(const EditGraphIteratorState& state);
     void copyFrom(const EditGraphIterator& other, int flags);
     void clear();
+    void countTransforms();
 
     [[nodiscard]] ItorStackEntry* entryAt(int level) const;
     [[nodiscard]] EffectInstance* currentEffect() const;
@@ -230,6 +231,7 @@ private:
     void traverseTrackAliasing(CelEventPair& pair, double time, Transforms& transforms);
     void traverseGhostAliasing(CelEventPair& pair, double& time, Transforms& transforms);
     void narrowExtents(double a, double b, const Transforms& transforms);
+    void narrowToGap(const IdStamp& track);
     void constrainMorphologyExtents(const CelEventPair& pair, double time, const Transforms& transforms);
     void hold(const EditPtr& edit);
 
@@ -241,8 +243,9 @@ private:
     void visit(const std::function<void(const EditGraphIterator&)>& visitor, EditGraph::Trail& trail);
 
     Vector<EntryPtr> m_stack;
-    Vector<EntryPtr> m_spares; ///< entries that were left, for the next steps
-    Transforms m_above;        ///< the mappings of levels that are not kept, outermost first
+    Vector<EntryPtr> m_spares;  ///< entries that were left, for the next steps
+    Transforms m_above;         ///< the mappings of levels that are not kept, outermost first
+    size_t m_numTransforms = 0; ///< in `m_above` and the stack
     int m_current = -1;
     double m_time = Qx::kNoTime;
     IdStamp m_rootTrackId;

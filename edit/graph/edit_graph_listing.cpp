@@ -4,6 +4,7 @@
 #include "platform/effects/effect_graph.h"
 
 #include <algorithm>
+#include <limits>
 #include <set>
 
 using EditGraph::Trail;
@@ -48,8 +49,29 @@ void EditGraphIterator::visit(const std::function<void(const EditGraphIterator&)
         if (moveToInput(i)) {
             visit(visitor, trail);
             static_cast<void>(moveBack());
+        } else {
+            narrowToGap(effect->getInputTrackId(i));
         }
     }
+}
+
+/// Narrows the extents to where a channel of the present edit shows nothing, if it shows nothing here.
+void EditGraphIterator::narrowToGap(const IdStamp& track) {
+    const EditPtr edit = getCurrentPosEdit();
+    cel* const content = track.getMagicType() == IdStampMagic::Channel ? edit->getCel(track) : nullptr;
+    if (content == nullptr) {
+        return;
+    }
+    const double time = applyTimeTransformsStackTo(m_time, false);
+    const CelEventPair before(edit, content, time);
+    if (before.containsEditTime(time)) {
+        return;
+    }
+    const ce_handle next =
+        before.valid() ? ce_handle(content, before.getCelIdx() + 2) : content->get_start_ceh();
+    constexpr double kEver = std::numeric_limits<double>::infinity();
+    narrowExtents(before.valid() ? before.endEditTime() : -kEver,
+                  next.valid() != 0 ? next.get_edit_time() : kEver, {});
 }
 
 void EditGraphIterator::visitBelow(const std::function<void(const EditGraphIterator&)>& visitor) const {

@@ -14,6 +14,7 @@ bool EditGraphIterator::search(const IdStamp& id, SearchType type) {
     const bool found = m_bidirectional ? biDirectionalSearch(id, type, trail)
                                        : searchInternal(EditGraphIterator(*this, getIterationFlags()), id,
                                                         m_current, 0, trail);
+    countTransforms();
     if (!found) {
         m_extents = before;
         trail.tellIfExhausted();
@@ -134,6 +135,7 @@ bool EditGraphIterator::searchNext() {
         Trail trail;
         if (searchInternal(EditGraphIterator(*this, 0), sought, m_current, static_cast<unsigned>(from),
                            trail)) {
+            countTransforms();
             return true;
         }
         trail.tellIfExhausted();

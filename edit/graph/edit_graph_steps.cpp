@@ -193,7 +193,7 @@ void EditGraphIterator::traverseTrackAliasing(CelEventPair& pair, double time, T
         const EditPtr& edit = pair.getEdit();
         narrowExtents(pair.editTime(), pair.endEditTime(), transforms);
         const IdStamp shown = getAliasedTrackId(pair);
-        if (!edit.valid() || !edit->chanValid(shown)) {
+        if (!shown.valid() || !edit.valid() || !edit->chanValid(shown)) {
             return;
         }
         if (shown == pair.trackId() || hops > edit->getNumChans()) {

@@ -113,8 +113,14 @@ TEST_F(Graph, WalksFromAnEffectToWhatItsInputsShow) {
     Vector<IdStamp> roots;
     findAllRootNodeChans(edit, 4.5, roots);
     EXPECT_EQ(roots, Vector<IdStamp>{top});
+    EXPECT_EQ(EditGraphIterator(edit, top, 8.5, kUp).calculateMorphologyExtentsExplicit(),
+              EditGraphIterator::Extents(8, 10))
+        << "nothing on the second channel";
     // A single level is kept otherwise.
     EditGraphIterator one(edit, top, 4.5, 0);
+    one = at;
+    EXPECT_EQ(one, at);
+    one = EditGraphIterator(edit, top, 4.5, 0);
     ASSERT_TRUE(one.moveToInput(1) && one.moveToInput(0));
     EXPECT_EQ(one.getStackDepth(), 1);
     EXPECT_FALSE(one.moveBack());
