@@ -20,9 +20,6 @@ void ItorStackEntry::setFromUtr(const CelEventPair& pair, double) {
     } else {
         node = pair.getEffectHandle();
     }
-    if (!node.valid()) {
-        node = Tag<FXGraphNodeBase>(); // asked of often: a tag without an object looks for it each time
-    }
 }
 
 void ItorStackEntry::setFromNode(const ItorStackEntry& owner, const Tag<FXGraphNodeBase>& node) {
