@@ -151,9 +151,9 @@ public:
     /// @}
 
     /// \name Searching
-    /// From the present level downwards, inputs in their order, `kMostSearchLevels` deep; a search that would go
-    /// deeper says so in the log and gives that way up. Every place is searched once, so loops end and the effort
-    /// grows with the number of nodes.
+    /// From the present level downwards, inputs in their order, `kMostSearchLevels` deep. Where a search would go deeper
+    /// or comes to a loop it gives that way up and says so in the log. Every place is searched once, so the effort
+    /// grows with the number of nodes, not with that of the ways to them.
     /// @{
     /// Moves to what is sought. A search that is not bidirectional compares stamps of nodes, whatever the type, and
     /// follows no edits within edits. False, staying, when it is not found.

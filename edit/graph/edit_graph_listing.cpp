@@ -40,7 +40,8 @@ bool playsSomething(const CelEventPair& pair) {
 } // namespace
 
 void EditGraphIterator::visit(const std::function<void(const EditGraphIterator&)>& visitor, Trail& trail) {
-    if (m_current >= kMostSearchLevels || !trail.enter(*this, m_current)) {
+    const Trail::Stay stay(trail, *this, m_current);
+    if (!stay || m_current >= kMostSearchLevels) {
         return;
     }
     visitor(*this);
@@ -78,7 +79,6 @@ void EditGraphIterator::visitBelow(const std::function<void(const EditGraphItera
     EditGraphIterator walker(EditGraphIterator(*this, 0), kBidirectional);
     Trail trail;
     walker.visit(visitor, trail);
-    trail.tellIfExhausted();
 }
 
 void EditGraphIterator::findInputTracksRaw(Vector<int>& tracks) const {
@@ -163,7 +163,6 @@ EditGraphIterator::Extents EditGraphIterator::calculateMorphologyExtentsExplicit
     EditGraphIterator walker(EditGraphIterator(*this, 0), getIterationFlags() | kBidirectional);
     Trail trail;
     walker.visit([](const EditGraphIterator&) {}, trail);
-    trail.tellIfExhausted();
     m_extents = walker.m_extents;
     return m_extents;
 }

@@ -17,7 +17,6 @@ bool EditGraphIterator::search(const IdStamp& id, SearchType type) {
     countTransforms();
     if (!found) {
         m_extents = before;
-        trail.tellIfExhausted();
     }
     return found;
 }
@@ -57,7 +56,14 @@ bool EditGraphIterator::biDirectionalSearch(const IdStamp& id, SearchType type, 
         return true;
     }
     const EffectInstance* const effect = currentEffect();
-    if (effect == nullptr || !trail.enter(*this, m_current)) {
+    if (effect == nullptr) {
+        return false;
+    }
+    const Trail::Stay stay(trail, *this, m_current);
+    if (!stay) {
+        if (trail.takeAbort()) {
+            herc_printf("EditGraphIterator::biDirectionalSearch() : Search aborted\n");
+        }
         return false;
     }
     for (unsigned i = 0; i < effect->getNumTrackInputs(); ++i) {
@@ -86,7 +92,11 @@ bool EditGraphIterator::searchInternal(const EditGraphIterator& from, const IdSt
         putEntryAt(depth, from);
         return true;
     }
-    if (firstInput == 0 && !trail.enter(from, depth)) {
+    const Trail::Stay stay(trail, from, depth);
+    if (!stay) {
+        if (trail.takeAbort()) {
+            herc_printf("EditGraphIterator::searchInternal() : Search aborted\n");
+        }
         return false;
     }
     for (unsigned i = firstInput; i < node->getNumTrackInputs(); ++i) {
@@ -138,6 +148,5 @@ bool EditGraphIterator::searchNext() {
             countTransforms();
             return true;
         }
-        trail.tellIfExhausted();
     }
 }

@@ -182,6 +182,9 @@ TEST_F(Graph, EndsAtLoops) {
         log.clear();
         EditGraphIterator at(edit, top, 0.5, flags);
         EXPECT_FALSE(at.search(IdStamp::fresh(IdStampMagic::EffectNode), EditGraphIterator::NodeId));
+        EXPECT_EQ(log.log(), String("EditGraphIterator::") +
+                                 (flags == kUp ? "biDirectionalSearch" : "searchInternal") +
+                                 "() : Search aborted\n");
         EXPECT_EQ(at.getStackDepth(), 1);
         Vector<int> tracks;
         at.findMaterialTracks(tracks);
