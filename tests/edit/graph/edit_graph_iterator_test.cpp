@@ -136,6 +136,71 @@ TEST_F(Graph, RefusesTheNeighboursThatATransitionHasNot) {
     EXPECT_TRUE(EditGraphIterator(edit, last, 3, kUp).moveToInput(0));
 }
 
+TEST_F(Graph, TakesWhatATransitionsInputsSay) {
+    const IdStamp other = chan(edit, "EEEEEE");
+    const IdStamp v1 = chan(edit, "CCxxDD");
+    const Tag<FXGraphNodeBase> dissolve = CelEventPair(edit, v1, 3).getEffectHandle();
+    const struct {
+        IdStamp inputs[2];
+        const char* shows; ///< '-' for a refusal
+    } cases[] = {{{previousInputId, nextInputId}, "CD"},
+                 {{nextInputId, previousInputId}, "DC"},
+                 {{other, nextInputId}, "ED"},
+                 {{IdStamp(), other}, "-E"}};
+    for (const auto& c : cases) {
+        for (const unsigned input : {0u, 1u}) {
+            static_cast<void>(dissolve->setInputTrackId(input, c.inputs[input]));
+        }
+        for (const unsigned input : {0u, 1u}) {
+            EditGraphIterator at(edit, v1, 3, kUp);
+            EXPECT_EQ(at.moveToInput(input) ? shown(at) : '-', c.shows[input]) << c.shows;
+        }
+    }
+}
+
+TEST_F(Graph, NarrowsTheExtentsToWhereMaterialIs) {
+    chan(make(4), "AAA");
+    const IdStamp v1 = chan(edit, "44xxBB");
+    for (const bool detects : {false, true}) {
+        const int flags = detects ? kUp | EditGraphIterator::kMaterialShortfallDetection : kUp;
+        for (const double time : {2.5, 3.5}) {
+            EditGraphIterator at(edit, v1, time, flags);
+            ASSERT_TRUE(at.moveToInput(0));
+            EXPECT_EQ(at.getExtents(), !detects   ? EditGraphIterator::Extents(2, 4)
+                                       : time < 3 ? EditGraphIterator::Extents(2, 3)
+                                                  : EditGraphIterator::Extents(3, 4));
+        }
+    }
+}
+
+TEST_F(Graph, MultipliesOpacitiesAndKnowsCompoundEffects) {
+    const IdStamp v1 = chan(edit, "AAAA");
+    std::unique_ptr<EffectInstance> made = Fx::makeEffect(Fx::kTint);
+    ASSERT_TRUE(made->setInputTrackId(0, v1) &&
+                made->setParameter("opacity", Fx::ParameterValue::ofNumber(0.25)));
+    const IdStamp member = IdStamp::fresh(IdStampMagic::EffectNode);
+    edit->objectStore().storeObject(member, std::move(made));
+    const IdStamp top = fx({member}, 4, Fx::kMosaic);
+    const Tag<EffectInstance> head(edit->objectStore(), node);
+    ASSERT_TRUE(head->setCompoundMembers({&member, 1}));
+    ASSERT_TRUE(head->setKeyframe("opacity", 0, Fx::ParameterValue::ofNumber(1)) &&
+                head->setKeyframe("opacity", 2, Fx::ParameterValue::ofNumber(0)));
+    EditGraphIterator at(edit, top, 1, kUp);
+    EXPECT_TRUE(at.isCompoundEffectHead());
+    EXPECT_DOUBLE_EQ(at.getCompoundAlpha(), 0.125);
+    ASSERT_TRUE(at.moveToInput(0) && at.moveToInput(0));
+    EXPECT_EQ(shown(at), 'A');
+    EXPECT_DOUBLE_EQ(at.getAlphaAt(1.5), 0.0625);
+    EXPECT_FALSE(at.moveBackToCompoundEffect()) << "material is no member";
+    ASSERT_TRUE(at.moveBack());
+    EXPECT_DOUBLE_EQ(at.getCompoundAlpha(), 0.125);
+    ASSERT_TRUE(at.moveBackToCompoundEffect());
+    EXPECT_EQ(at.getStackDepth(), 1);
+    Vector<FXGraphNodeBase*> components;
+    at.findAllComponents(components);
+    EXPECT_EQ(components.size(), 2u);
+}
+
 TEST_F(Graph, MapsTimesIntoNestedEdits) {
     chan(make(1), "AABBCC");
     const EditPtr middle = make(2);
