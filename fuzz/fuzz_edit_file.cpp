@@ -3,7 +3,7 @@
 #include "edit/model/cel.h"
 #include "edit/model/edit.h"
 #include "platform/services/log.h"
-#include "tests/support/memory_file.h"
+#include "fuzz/memory_file.h"
 
 #include <cstdlib>
 

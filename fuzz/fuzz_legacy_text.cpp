@@ -4,7 +4,7 @@
 #include "edit/model/edit.h"
 #include "platform/services/log.h"
 #include "platform/store/text_file.h"
-#include "tests/support/memory_file.h"
+#include "fuzz/memory_file.h"
 
 #include <cstdlib>
 

@@ -16,23 +16,6 @@
 
 namespace {
 
-SourceKind kindOf(const cookie& strip) {
-    if (strip.isBlack()) {
-        return SourceKind::Black;
-    }
-    if (strip.isEffectGraph()) {
-        return SourceKind::Effect;
-    }
-    if (strip.isInput()) {
-        return SourceKind::Input;
-    }
-    if (strip.isMagic()) {
-        return SourceKind::Magic;
-    }
-    const bool media = strip.type() == Cookie_Type::Video || strip.type() == Cookie_Type::Sound;
-    return media ? SourceKind::Media : SourceKind::Shot;
-}
-
 /// Numbers the sources of one edit in the order in which they are met.
 class SourceTable {
 public:
@@ -51,7 +34,7 @@ public:
         }
         const auto [place, added] = m_strips.try_emplace(event.strip, m_sources.size());
         if (added) {
-            m_sources.push_back({event.strip, kindOf(event.strip), {}, {}, m_dropFrame, {}, {}});
+            m_sources.push_back({event.strip, sourceKindOf(event.strip), {}, {}, m_dropFrame, {}, {}});
             if (m_namer && m_sources.back().kind == SourceKind::Shot) {
                 m_namer(m_sources.back());
             }
@@ -157,34 +140,6 @@ void takePairs(const Edit& edit, const cel& content, double quarterFrame, Source
     }
 }
 
-/// `ChannelReport::place` of every channel, by index.
-std::vector<String> placesOf(const Edit& edit) {
-    std::vector<String> places(static_cast<size_t>(edit.getNumChans()));
-    std::map<String, int> count;
-    for (int i = 0; i < edit.getNumChans(); ++i) {
-        const Edit_Chan_Type type = edit.getChanType(i);
-        if (type == NoChan) {
-            continue;
-        }
-        const Edit_Chan_SubType subtype = edit.getChanSubtype(i);
-        const auto letter = static_cast<char>(Edit::edit_chan_letter_from_type(type, subtype));
-        const String kind = subtype == Edit_Chan_SubType::ALIAS ? String("FX") : String(1, letter);
-        String& place = places[static_cast<size_t>(i)];
-        place = kind + std::to_string(++count[kind]);
-        const int levels = type == AudioChan ? edit.getIdx(edit.getAudCel(edit.getId(i)).getLevelsChanID())
-                                             : static_cast<int>(NO_CHAN);
-        if (levels != NO_CHAN) {
-            places[static_cast<size_t>(levels)] = place + " levels";
-        }
-    }
-    for (String& place : places) {
-        if (place.empty()) {
-            place = "levels " + std::to_string(++count["levels"]); // of no audio channel
-        }
-    }
-    return places;
-}
-
 /// The timecode of edit time 0: what an import found, else the elapsed time's origin.
 void takeTimecode(const Edit& edit, EditReport& report) {
     report.dropFrame = edit.isDropFrame(Qx::currentProject().dropFrame);
@@ -214,6 +169,50 @@ void takeGroups(const Edit& edit, std::vector<GroupReport>& groups) {
 }
 
 } // namespace
+
+SourceKind sourceKindOf(const cookie& strip) {
+    if (strip.isBlack()) {
+        return SourceKind::Black;
+    }
+    if (strip.isEffectGraph()) {
+        return SourceKind::Effect;
+    }
+    if (strip.isInput()) {
+        return SourceKind::Input;
+    }
+    if (strip.isMagic()) {
+        return SourceKind::Magic;
+    }
+    const bool media = strip.type() == Cookie_Type::Video || strip.type() == Cookie_Type::Sound;
+    return media ? SourceKind::Media : SourceKind::Shot;
+}
+
+std::vector<String> placesOf(const Edit& edit) {
+    std::vector<String> places(static_cast<size_t>(edit.getNumChans()));
+    std::map<String, int> count;
+    for (int i = 0; i < edit.getNumChans(); ++i) {
+        const Edit_Chan_Type type = edit.getChanType(i);
+        if (type == NoChan) {
+            continue;
+        }
+        const Edit_Chan_SubType subtype = edit.getChanSubtype(i);
+        const auto letter = static_cast<char>(Edit::edit_chan_letter_from_type(type, subtype));
+        const String kind = subtype == Edit_Chan_SubType::ALIAS ? String("FX") : String(1, letter);
+        String& place = places[static_cast<size_t>(i)];
+        place = kind + std::to_string(++count[kind]);
+        const int levels = type == AudioChan ? edit.getIdx(edit.getAudCel(edit.getId(i)).getLevelsChanID())
+                                             : static_cast<int>(NO_CHAN);
+        if (levels != NO_CHAN) {
+            places[static_cast<size_t>(levels)] = place + " levels";
+        }
+    }
+    for (String& place : places) {
+        if (place.empty()) {
+            place = "levels " + std::to_string(++count["levels"]); // of no audio channel
+        }
+    }
+    return places;
+}
 
 char ChannelReport::letter() const {
     return static_cast<char>(Edit::edit_chan_letter_from_type(type, subtype));

@@ -125,5 +125,9 @@ using SourceNamer = std::function<void(SourceReport&)>;
 /// "cut", "dissolve", "wipe 201", "dip", "cross-fade", "transition".
 [[nodiscard]] QM_API String transitionText(const PairReport& pair);
 
+/// `ChannelReport::place` of every channel, by index.
+[[nodiscard]] QM_API std::vector<String> placesOf(const Edit& edit);
+/// What an item is by its cookie; an alias, which the event tells, is left out.
+[[nodiscard]] QM_API SourceKind sourceKindOf(const cookie& strip);
 /// A word for the kind: "shot", "media", "black", "effect", "alias", "input", "magic".
 [[nodiscard]] QM_API const char* sourceKindText(SourceKind kind);

@@ -1,5 +1,6 @@
 #include "edit/manager/edit_record.h"
 
+#include "edit/material/log_attributes.h"
 #include "platform/media/time_def.h"
 #include "platform/services/current_project.h"
 
@@ -48,6 +49,45 @@ time_def recordTimes() {
     return {Qx::FrameRate(project.frameRateCode), project.dropFrame};
 }
 
+/// The columns of the log attributes that an edit's own header and labels tell, the name apart.
+struct LogColumn {
+    LogAttribute attribute;
+    projdb::Column column;
+};
+constexpr LogColumn kLogColumns[] = {
+    {LogAttribute::kDate, projdb::Date},
+    {LogAttribute::kScene, projdb::Scene},
+    {LogAttribute::kShot, projdb::Shot},
+    {LogAttribute::kWho, projdb::Who},
+    {LogAttribute::kDescription, projdb::Description},
+    {LogAttribute::kNotes, projdb::Notes},
+    {LogAttribute::kCookie, projdb::Cookie},
+    {LogAttribute::kReel, projdb::Reel},
+    {LogAttribute::kSoundStart, projdb::SoundStart},
+    {LogAttribute::kSoundReel, projdb::SoundReel},
+    {LogAttribute::kAudioQuality, projdb::AudioQuality},
+    {LogAttribute::kCompressionFormat, projdb::CompressionFormat},
+    {LogAttribute::kFrameOrigin, projdb::FrameOrigin},
+    {LogAttribute::kPulldown, projdb::Pulldown},
+    {LogAttribute::kSequence, projdb::Sequence},
+    {LogAttribute::kStart24PCode, projdb::Start24PCode},
+    {LogAttribute::kEnd24PCode, projdb::End24PCode},
+    {LogAttribute::k24PReel, projdb::Reel24P},
+    {LogAttribute::kStartKeycode, projdb::StartKeycode},
+    {LogAttribute::kEndKeycode, projdb::EndKeycode},
+    {LogAttribute::kStartCamcode, projdb::StartCamcode},
+    {LogAttribute::kEndCamcode, projdb::EndCamcode},
+    {LogAttribute::kCamReel, projdb::CamReel},
+    {LogAttribute::kCamDate, projdb::CamDate},
+    {LogAttribute::kLabReel, projdb::LabReel},
+    {LogAttribute::kCompReel, projdb::CompReel},
+    {LogAttribute::kStartInkcode, projdb::StartInkcode},
+    {LogAttribute::kEndInkcode, projdb::EndInkcode},
+    {LogAttribute::kSourceFormat, projdb::SourceFormat},
+    {LogAttribute::kReelType, projdb::ReelType},
+    {LogAttribute::kFilmDuration, projdb::FilmDuration},
+};
+
 } // namespace
 
 projdb::Record editRecordOf(const Edit& edit, const Qx::FileInfo* file) {
@@ -60,13 +100,16 @@ projdb::Record editRecordOf(const Edit& edit, const Qx::FileInfo* file) {
     record[projdb::Chans] = chansOf(edit);
     record[projdb::StartTime] = recordTimes().asString(start);
     record[projdb::EndTime] = recordTimes().asString(end);
-    record[projdb::Name] = edit.getName();
+    record[projdb::Name] = edit.getAttribute(LogAttribute::kName);
     record[projdb::Rate] = edit.getFrameRate().asString();
     record[projdb::Duration] = Qx::doubleToText(end - start);
     record[projdb::NumChans] = std::to_string(edit.getNumChans());
     record[projdb::Created] = std::to_string(edit.getCreationTime());
     record[projdb::Modified] = std::to_string(edit.getModificationTime());
     record[projdb::Owner] = edit.getOwner();
+    for (const LogColumn& row : kLogColumns) {
+        record[row.column] = edit.getAttribute(row.attribute);
+    }
     if (file != nullptr) {
         stampRecord(record, *file);
     }

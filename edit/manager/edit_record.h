@@ -20,7 +20,7 @@ enum EditRecordFlags : int {
 /// channel; a single one is "a1", "f1". So the letter in upper case stands for what `EditInfo` asks.
 ///
 /// "start time" and "end time" are timecode at the current project's rate and drop-frame setting, rounded to
-/// frames; the hours go on from 24, and a time below 0 has a '-' in front. `file` is what the
+/// frames; the hours go on from 24, and a time below 0 has a '-' in front. The columns of the log attributes have what `Edit::getAttribute` answers. `file` is what the
 /// edit was read from or written to; null when the edit differs from its file or has none.
 [[nodiscard]] QM_API projdb::Record editRecordOf(const Edit& edit, const Qx::FileInfo* file);
 

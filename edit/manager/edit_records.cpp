@@ -134,24 +134,6 @@ bool refreshRecord(projdb& records, const cookie& item, projdb::Record& record) 
     return false;
 }
 
-/// The items of the project: those with a file, and those of which only backups are there at the moment.
-Qx::Status listItems(std::set<cookie>& items) {
-    std::vector<String> names;
-    if (const Qx::FileError error = Qx::fileSystem().list(Qx::currentProject().folder(), names)) {
-        return error.status();
-    }
-    constexpr size_t kTextSize = 8;
-    for (const String& name : names) {
-        const cookie item{std::string_view(name).substr(0, kTextSize)};
-        const String rest = name.substr(std::min(kTextSize, name.size()));
-        const bool isEdit = rest == getEditFilenameExt() || rest.starts_with(getEditFilenameExt() + ".U");
-        if (item.is_valid() && isEdit) {
-            items.insert(item);
-        }
-    }
-    return {};
-}
-
 void removeRecordsBut(projdb& records, const std::set<cookie>& items) {
     ManagerState& state = managerState();
     Vector<cookie> gone;
@@ -169,6 +151,23 @@ void removeRecordsBut(projdb& records, const std::set<cookie>& items) {
 }
 
 } // namespace
+
+Qx::Status listItems(std::set<cookie>& items) {
+    std::vector<String> names;
+    if (const Qx::FileError error = Qx::fileSystem().list(Qx::currentProject().folder(), names)) {
+        return error.status();
+    }
+    constexpr size_t kTextSize = 8;
+    for (const String& name : names) {
+        const cookie item{std::string_view(name).substr(0, kTextSize)};
+        const String rest = name.substr(std::min(kTextSize, name.size()));
+        const bool isEdit = rest == getEditFilenameExt() || rest.starts_with(getEditFilenameExt() + ".U");
+        if (item.is_valid() && isEdit) {
+            items.insert(item);
+        }
+    }
+    return {};
+}
 
 void storeRecords() {
     ManagerState& state = managerState();

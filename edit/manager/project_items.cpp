@@ -2,6 +2,7 @@
 
 #include "edit/manager/edit_record.h"
 #include "edit/manager/revision_chain.h"
+#include "edit/material/log_attributes.h"
 #include "edit/model/edit.h"
 #include "edit/model/edit_keys.h"
 #include "edit/persist/edit_salvage.h"

@@ -1,5 +1,7 @@
 #include "edit/material/label_kinds.h"
 
+#include "edit/model/edit.h"
+
 #include <cstdio>
 
 namespace {
@@ -79,6 +81,10 @@ const char* UserLabelSpec::UserString() const {
     std::snprintf(text, sizeof text, "%s on %s", UserLabelType_to_UserString(type),
                   MediumRollId_to_UserString(roll).c_str());
     return text;
+}
+
+edit_label FM_get_edit_label(const EditPtr& edit, const UserLabelSpec& spec) {
+    return edit.valid() ? edit->get_label_(spec.type, spec.roll) : edit_label();
 }
 
 int uifLabelText(VagueUIFLabel kind) {

@@ -1,7 +1,8 @@
 #pragma once
 
+#include "edit/model/edit_ptr.h"
 #include "platform/base/export.h"
-#include "platform/media/label.h"
+#include "platform/media/edit_label.h"
 #include "platform/media/medium_roll.h"
 
 /// The labels that tools of the user interface let their users choose among: a timecode, a key number, an ink
@@ -52,6 +53,10 @@ struct QM_API UserLabelSpec {
     [[nodiscard]] const char* UserString() const;
     bool operator==(const UserLabelSpec&) const = default;
 };
+
+/// The edit's label of that kind on that roll (`Edit::get_label_`); not valid if it has none, and for a null
+/// handle.
+[[nodiscard]] QM_API edit_label FM_get_edit_label(const EditPtr& edit, const UserLabelSpec& spec);
 
 /// \name Lookups in the table of kinds
 /// Thread-safe; texts live as long as the process.

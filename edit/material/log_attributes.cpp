@@ -62,8 +62,8 @@ constexpr AttributeRow kRows[] = {
 static_assert(std::size(kRows) == LogAttributes::kLast);
 
 const AttributeRow* rowOf(Attribute attribute) {
-    return attribute >= LogAttributes::kFirst && attribute <= LogAttributes::kLast ? &kRows[attribute - 1]
-                                                                                   : nullptr;
+    const auto number = static_cast<uint32_t>(attribute);
+    return number >= LogAttributes::kFirst && number <= LogAttributes::kLast ? &kRows[number - 1] : nullptr;
 }
 
 const char* persistentText(const AttributeRow& row) {
@@ -72,7 +72,7 @@ const char* persistentText(const AttributeRow& row) {
 
 } // namespace
 
-String LogAttributes::Map::find(LogAttribute attribute) const {
+String LogAttributeMap::find(LogAttribute attribute) const {
     const auto found = m_texts.find(attribute);
     return found == m_texts.end() ? String() : found->second;
 }

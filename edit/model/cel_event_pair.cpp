@@ -110,12 +110,13 @@ CelEventPair::Range CelEventPair::editRange(RangeType type) const {
     if (!valid()) {
         return Editable::invalidRange();
     }
-    if (type != WithFades) {
+    const uint16_t fadeIn = getAudioFadeInQFrames();
+    const uint16_t fadeOut = getAudioFadeOutQFrames();
+    if (type != WithFades || (fadeIn == 0 && fadeOut == 0)) {
         return {editTime(), endEditTime()};
     }
     const double quarterFrame = Qx::projectFrameRate().frameDuration() / 4;
-    return {editTime() - getAudioFadeInQFrames() * quarterFrame,
-            endEditTime() + getAudioFadeOutQFrames() * quarterFrame};
+    return {editTime() - fadeIn * quarterFrame, endEditTime() + fadeOut * quarterFrame};
 }
 
 CelEventPair::StripRange CelEventPair::stripRange(RangeType type) const {

@@ -2,6 +2,7 @@
 
 #include "edit/model/cue_list.h"
 #include "edit/model/detail/channel_set.h"
+#include "edit/model/detail/edit_labels.h"
 #include "edit/model/edit_keys.h"
 #include "platform/base/critical_section.h"
 #include "platform/notify/val_server.h"
@@ -56,6 +57,7 @@ void Edit::init() {
     m_cues.delete_all_cues();
     m_celCuesLoaded = false;
     m_channels->clear();
+    m_upgrade.reset();
     initHeader();
     m_changes.setValue(kInitial);
     m_dirty = false;
@@ -72,6 +74,7 @@ EditPtr Edit::copy() const {
     twin->m_currentTime = m_currentTime;
     twin->m_markTime = m_markTime;
     twin->clear_cache_flags();
+    twin->m_labels = m_labels ? std::make_unique<Labels>(*m_labels) : nullptr;
     for (const String& name : m_store.names()) {
         const ChannelSet::Channel* const channel = m_channels->find(IdStamp(name));
         if (name == EditHeaderProxy::EditHeaderId || name == EditKeys::kCues ||

@@ -16,12 +16,16 @@
 #include <atomic>
 #include <memory>
 #include <optional>
+#include <vector>
 
 // Whoever uses one of these includes the header that is named after it.
 class AudCel;
 class AudLevelsCel;
 class ChannelGroupList;
 class FXGraphNodeBase;
+class LogAttributeMap;
+class MediumRoll;
+class QxUMID;
 class TagBag;
 class TextFile;
 class VFXCel;
@@ -31,6 +35,12 @@ class cel;
 class configb;
 class criticalSection;
 class cue_list;
+class edit_label;
+struct EditUpgrade;
+struct MediumRollIdent;
+struct ShotVideoMetadata;
+enum UserLabelType : int32_t;
+enum class LogAttribute : uint32_t;
 template <typename T>
 class Tag;
 template <typename T>
@@ -522,6 +532,8 @@ public:
     /// True until a read succeeds, for an edit that was made to be read.
     [[nodiscard]] bool isBad() const { return m_bad; }
     [[nodiscard]] bool isLoading() const { return m_loading; }
+    /// What reading the edit did to bring it up to date; null if it was current.
+    [[nodiscard]] const EditUpgrade* lastUpgrade() const { return m_upgrade.get(); }
     [[nodiscard]] size_t getNumStoredObjects() const;
     /// The objects bound to the edit.
     [[nodiscard]] TagBag& objectStore() { return m_store; }
@@ -534,6 +546,69 @@ public:
     /// The effect node bound to an event, whatever channel that is on; a tag that names nothing for an invalid
     /// handle and an event without one.
     [[nodiscard]] Tag<FXGraphNodeBase> getVideoNodeForEvent(const ce_handle& event) const;
+    /// @}
+
+    /// \name Labels and rolls (edit_labels.cpp)
+    /// A label says which number of a film or tape stands at a time of the edit; a roll says what is written on
+    /// the can that such numbers count along. Both are read out of the header when they are first asked for
+    /// ("LABEL%d", "MEDIUMROLL%d"); what does not read is logged and kept in the header. After writing these
+    /// keys through `Opts` call `clear_cache_flags`. Setters refuse a read-only edit, put the change into the
+    /// header at once and record a change of type `kPropertiesChanged`; what they are asked to set and is
+    /// there already is no change, and true.
+    /// @{
+    static constexpr size_t kMostLabels = 16;
+    static constexpr size_t kMostRolls = 8;
+    /// The labels, in the order of the header. Valid until the next change of labels.
+    [[nodiscard]] const std::vector<edit_label>& labels() const;
+    /// The first label of a kind (or of any) on a roll; a roll number of 0 stands for any. Of the primary
+    /// medium it is, in want of one of its own, the first label of that kind on any roll. An edit that keeps
+    /// no timecode of itself answers with its start timecode, in its own frames or in 24. Not valid when there
+    /// is none.
+    [[nodiscard]] edit_label get_label_(UserLabelType type, const MediumRollIdent& roll) const;
+    /// Adds a label, or puts it in the place of the one of its kind on its roll. False for one that is not
+    /// valid, or is one too many.
+    bool setLabel(const edit_label& wanted);
+    /// False if there is no label of exactly this kind on exactly this roll.
+    bool removeLabel(UserLabelType type, const MediumRollIdent& roll);
+    /// Gives the edit those labels of a new edit that it does not have: its own timecode, in its frames (roll
+    /// 8, 1) and in 24 (roll 14, 1), both by its start timecode. They follow when that changes. False if it
+    /// has them.
+    bool give_new_edit_all_its_labels();
+    /// The rolls, in the order of the header; none for an edit of a revision below 160. Valid until the next
+    /// change of rolls.
+    [[nodiscard]] const std::vector<MediumRoll>& rolls() const;
+    /// What is written on a roll; empty when the edit has no such roll.
+    [[nodiscard]] String get_reelid(const MediumRollIdent& roll) const;
+    /// Adds the roll when the edit has none such and the text is not empty. False for a text that no reel id
+    /// can be (`MediumRoll`), for a medium or number that is none, for one roll too many, and for one of the
+    /// first two rolls while these have the edit's own reel id.
+    bool set_reelid(const MediumRollIdent& roll, const String& text);
+    /// "reelid", the reel that the material as such is on; the first two rolls have it too. Empty.
+    [[nodiscard]] String get_Natural_reelid() const;
+    /// False for a text that no reel id can be.
+    bool set_Natural_reelid(const String& text);
+    /// @}
+
+    /// \name Log attributes and origin (defined in edit/material)
+    /// @{
+    /// What the edit says of a log attribute: the header's text, else what follows from its labels, times and
+    /// kind; empty when it says nothing.
+    [[nodiscard]] String getAttribute(LogAttribute attribute) const;
+    /// Writes a user's text for an attribute into the header, a reel through `set_Natural_reelid`. Texts are
+    /// cut at 1 MiB. False, changing nothing, for an attribute that users cannot change or that is not kept
+    /// in the header, for a reel that cannot be one, and for a read-only edit.
+    bool setAttribute(LogAttribute attribute, const String& text);
+    /// The same for many: all of them or none. Together they are one change of type `kPropertiesChanged`
+    /// (`kNameChanged` for the name alone), which is announced; nothing is when every text is there already.
+    bool setAttributes(const LogAttributeMap& attributes);
+    /// The identifier of the material that a channel came from; one that is not valid if none is kept.
+    [[nodiscard]] QxUMID getTrackOriginInfo_UMID(const IdStamp& chan) const;
+    /// Keeps it with the channel; one that is not valid takes it away. Another one records a change of type
+    /// `kPropertiesChanged`. False for an unknown stamp and a read-only edit.
+    bool setTrackOriginInfo(const IdStamp& chan, const QxUMID& umid);
+    /// What is known of a shot's pictures, "SHOT_VIDEO"; not valid if nothing. The setter writes the header.
+    [[nodiscard]] ShotVideoMetadata getShotVideoMetadata() const;
+    void setShotVideoMetadata(const ShotVideoMetadata& metadata);
     /// @}
 
     /// \name Cues (edit_cues.cpp)
@@ -647,13 +722,16 @@ private:
 
     /// \name Upgrades
     /// The steps that bring an edit of an older revision, or one from a legacy text, to the current model.
-    /// Each repairs what it can and none fails the read; a step that cannot act on what it finds logs one
-    /// line.
+    /// Each repairs what it can, notes what it did in `lastUpgrade`, and none fails the read; what it could
+    /// not bring up to date is noted too and logged.
     /// @{
     /// Runs the steps that the edit's revision asks for. False if it is current.
     bool doEditConversions();
-    /// For a shot: the picture format that its standard had would become its shot video metadata. The table
-    /// of output formats is not part of this library, so a shot keeps the metadata that it has.
+    /// Starts the notes of an upgrade.
+    void beginUpgrade(int from);
+    void noteUpgrade(String what);
+    void noteNotUpgraded(const char* step, const String& what);
+    /// A shot gets the picture format that its standard had in the project's line structure, 4:2:2 packed.
     void updateLegacyFormat(const Qx::Ed2Support::TVStd& standard);
     /// Removes effects channels in which nothing but black lies; they were hidden and carried no effect.
     /// Effects channels with content stay.
@@ -661,8 +739,8 @@ private:
     /// Gives channel stamps, levels channels included, the magic type of a channel; the other bits stay
     /// unless that stamp is taken. Events that show such a channel follow.
     void utilizeMagicIdStampsForChannelIds();
-    /// Material nodes of effect graphs would become transient. Effect graphs are not read here; they stay in
-    /// the file as they are.
+    /// The nodes that stood for material in effect graphs are made from the events themselves: objects that
+    /// are stored under the stamps of events of material go.
     void makeMaterialNodesTransient();
     /// Every event gets an identity of its own; a log line tells how many were given.
     void validateUTRIDs();
@@ -670,15 +748,37 @@ private:
     void removeShotSoundRamps();
     /// Every audio event plays at speed 1.
     void initialiseAudioVarispeeds();
-    /// Labels of older revisions would move to the rolls of current ones. Labels are carried along as the
-    /// header texts that they are.
+    /// The timecode of a third sound roll becomes that of the second where the primary medium has none, and
+    /// edits and their ghosts get the labels of a new edit.
     void updateLegacyFileLabels();
-    /// Maps times from the rate that a standard named to the one that it stands for, and sets the source
-    /// medium. The duration of a shot's source is its end time as it is: no translation between media is
-    /// made, and no film-sync playback factor is derived.
+    /// Maps times from the rate that a standard named to the one that it stands for, all channels or none, and
+    /// sets the source medium; of a shot also its duration and how fast its sound plays.
     void updateLegacyFrameRate(const Qx::Ed2Support::TVStd& standard);
+    void updateLegacyMedium(const Qx::Ed2Support::TVStd& standard);
     /// Effects of older revisions would be replaced. They stay as they are.
     void replaceLegacyEffects();
+    /// @}
+
+    /// \name Labels and rolls in the header
+    /// @{
+    /// What was read of them; in a file of its own.
+    struct Labels;
+    void build_labels() const;
+    void read_labels_from_config() const;
+    /// Writes the labels that are marked to be saved. Nothing for an edit without a cookie, or a magic one
+    /// other than black and the clipboard. `revision` is the one that is written.
+    void write_labels_to_config(int revision);
+    void build_rolls() const;
+    void write_rolls_to_config();
+    [[nodiscard]] edit_label ownTimecode(const MediumRollIdent& roll) const;
+    bool putLabel(const edit_label& wanted);
+    /// Writes the reel id, in the rolls that have it too.
+    void putNaturalReelid(const String& text);
+    void labelsChanged();
+    /// The start timecode is another: labels that tell it follow.
+    void ownTimecodeChanged();
+    /// Drops what was read of the header; with `all` also what is not in it yet.
+    void dropLabels(bool all);
     /// @}
 
     [[nodiscard]] bool isReadOnlyForUser() const;
@@ -787,6 +887,8 @@ private:
     static constexpr uint64_t kNeverFound = UINT64_MAX;
     mutable std::atomic<ChannelGroupList*> m_groups{nullptr};
     mutable std::atomic<uint64_t> m_groupsFoundAt{kNeverFound}; ///< the store's departures at the time
+    mutable std::unique_ptr<Labels> m_labels;
+    std::shared_ptr<EditUpgrade> m_upgrade;
     ValServer<EditModification>& m_changes;
     Qx::Status m_fileStatus;
     criticalSection& m_section;

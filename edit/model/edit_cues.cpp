@@ -150,4 +150,9 @@ void Edit::channelRenamed(const IdStamp& from, const IdStamp& to) {
             list->replaceMember(from, to);
         }
     }
+    const String origin = m_header.getString(String(EditKeys::kTrackOrigin) + from.asString());
+    if (!origin.empty()) {
+        m_header.remove(String(EditKeys::kTrackOrigin) + from.asString());
+        m_header.setString(String(EditKeys::kTrackOrigin) + to.asString(), origin);
+    }
 }

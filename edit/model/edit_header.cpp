@@ -46,6 +46,7 @@ void Edit::initHeader() {
     EditKeys::kOwner.set(m_header, PermissionsManager::getCurrentUser());
 
     clear_cache_flags();
+    dropLabels(true);
     m_entireMedium = 0;
     m_revision = static_cast<uint32_t>(kCurrentRevision);
     m_frameRate = Qx::FrameRate(project.frameRateCode);
@@ -59,6 +60,7 @@ void Edit::clear_cache_flags() {
     m_revision = kRevisionUnknown;
     m_sourceMedium.reset();
     m_transfer.reset();
+    dropLabels(false);
     dropDerivedValues();
 }
 
@@ -257,6 +259,7 @@ void Edit::setFrameRate(Qx::FrameRate rate) {
     }
     m_frameRate = rate;
     m_frameRateValid = true;
+    ownTimecodeChanged();
 }
 
 double Edit::get_frame_time() const {
@@ -314,6 +317,7 @@ int64_t Edit::getStartTimecode() const {
 
 void Edit::setStartTimecode(int64_t frames) {
     EditKeys::kStartTimecode.set(m_header, frames);
+    ownTimecodeChanged();
 }
 
 double Edit::getTimecodeOrigin() const {
@@ -327,6 +331,7 @@ bool Edit::isDropFrame(bool otherwise) const {
 
 void Edit::setDropFrame(bool dropFrame) {
     EditKeys::kDropFrame.set(m_header, dropFrame);
+    ownTimecodeChanged();
 }
 
 String Edit::getOwner() const {

@@ -94,8 +94,18 @@ inline constexpr Row kTable[] = {
     {"tvtype", Type::Text},
     {"quality", Type::Int},
     {"quality_string", Type::Text},
+    {"TRANSFER_FILM_SPEED", Type::Double, 24},
+    {"FILM_SYNC_FACTOR", Type::Double, 1},
+    // Labels, rolls and where it comes from
     {"numLabels_", Type::Int},
     {"LABEL", Type::Text, 0, Role::Content, Form::Numbered},
+    {"LabelUnread", Type::Text, 0, Role::Content, Form::Numbered},
+    {"NUM_MEDIUMROLLS", Type::Int},
+    {"MEDIUMROLL", Type::Text, 0, Role::Content, Form::Numbered},
+    {"RollUnread", Type::Text, 0, Role::Content, Form::Numbered},
+    {"reelid", Type::Text},
+    {"SHOT_VIDEO", Type::Text},
+    {"TrackOrigin ", Type::Text},
 };
 
 /// The name of a row, with the type that its value is read and written as. One whose name or type is that of
@@ -216,6 +226,15 @@ inline constexpr Key<int> kQuality{"quality"};
 inline constexpr Key<String> kQualityText{"quality_string"};
 inline constexpr Key<int> kNumLabels{"numLabels_"};
 inline constexpr Key<String> kLabel{"LABEL"};
+inline constexpr Key<String> kLabelUnread{"LabelUnread"}; ///< labels that did not read, by a counter
+inline constexpr Key<int> kNumMediumRolls{"NUM_MEDIUMROLLS"};
+inline constexpr Key<String> kMediumRoll{"MEDIUMROLL"};
+inline constexpr Key<String> kRollUnread{"RollUnread"}; ///< rolls that did not read, by a counter
+inline constexpr Key<String> kReelId{"reelid"};
+inline constexpr Key<double> kFilmSpeed{"TRANSFER_FILM_SPEED"};   ///< frames a second in the camera
+inline constexpr Key<double> kFilmSyncFactor{"FILM_SYNC_FACTOR"}; ///< see `Qx::FilmSync`
+inline constexpr Key<String> kShotVideo{"SHOT_VIDEO"};            ///< a `ShotVideoMetadata`
+inline constexpr Key<String> kTrackOrigin{"TrackOrigin "};        ///< followed by a channel's stamp
 
 /// The name of the header and the line that ends it in a text.
 inline constexpr const char* kHeaderName = "EDIT";

@@ -1,6 +1,8 @@
+#include "edit/model/edit_upgrade.h"
 #include "edit/persist/detail/edit_file.h"
 #include "edit/persist/detail/legacy_upgrades.h"
 #include "edit/persist/revision_history.h"
+#include "platform/services/log.h"
 
 namespace {
 
@@ -10,6 +12,25 @@ constexpr int kMediumFilm23 = 23;
 constexpr int kPlainAudioMedium = 2;
 
 } // namespace
+
+void Edit::beginUpgrade(int from) {
+    m_upgrade = std::make_shared<EditUpgrade>();
+    m_upgrade->from = from;
+    m_upgrade->to = kCurrentEditRevision;
+}
+
+void Edit::noteUpgrade(String what) {
+    if (m_upgrade != nullptr) {
+        m_upgrade->done.push_back(std::move(what));
+    }
+}
+
+void Edit::noteNotUpgraded(const char* step, const String& what) {
+    herc_printf("Edit::%s( %s ) - %s\n", step, get_cookie_str().c_str(), what.c_str());
+    if (m_upgrade != nullptr) {
+        m_upgrade->notDone.push_back(what);
+    }
+}
 
 bool Edit::doEditConversions() {
     // The steps in their order, each with the first revision in which its work is done already.
@@ -22,7 +43,15 @@ bool Edit::doEditConversions() {
         {220, [](Edit& edit, const Standard&) { edit.removeHiddenFXTracks(); }},
         {230, [](Edit& edit, const Standard&) { edit.utilizeMagicIdStampsForChannelIds(); }},
         {230, [](Edit& edit, const Standard&) { edit.makeMaterialNodesTransient(); }},
-        {240, [](Edit& edit, const Standard&) { edit.updateChannelGroups(); }},
+        {240,
+         [](Edit& edit, const Standard&) {
+             const unsigned before = edit.numGroups();
+             edit.updateChannelGroups();
+             if (const unsigned now = edit.numGroups(); now > before) {
+                 edit.noteUpgrade(
+                     countedText(static_cast<int>(now - before), "channel group", " came out of a text"));
+             }
+         }},
         {300, [](Edit& edit, const Standard&) { edit.validateUTRIDs(); }},
         {310, [](Edit& edit, const Standard&) { edit.removeShotSoundRamps(); }},
         {310, [](Edit& edit, const Standard&) { edit.initialiseAudioVarispeeds(); }},
@@ -35,6 +64,7 @@ bool Edit::doEditConversions() {
     if (revision >= kFirstCurrentRevision) {
         return false;
     }
+    beginUpgrade(revision);
     clear_cache_flags();
     Qx::Ed2Support::TVStd standard =
         Qx::Ed2Support::getTvStandard(EditKeys::kTvType.get(m_header), EditKeys::kFrameRate.get(m_header));
@@ -51,6 +81,7 @@ bool Edit::doEditConversions() {
         }
     }
     set_ed2_revision(kCurrentEditRevision);
+    dropLabels(false); // what of them is read depends on the revision
     flags.restore(*this);
     return true;
 }

@@ -118,6 +118,7 @@ Qx::Status EditFile::readLegacy(Edit& edit, const String& path) {
     const Quiet quiet(edit);
     reset(edit);
     edit.m_initialising = true;
+    edit.beginUpgrade(0);
     const Qx::Ed2Support::TVStd named = getNamedStandard(file);
     putFrameRateBack(file);
     unsigned after = 0;

@@ -80,6 +80,7 @@ Edit::ReadFileRC Edit::readFile(const WString& path, eEditOpenBehaviour behaviou
         EditFile::reset(*this);
     }
     m_storedCels.reset();
+    m_upgrade.reset();
 
     ReadFileRC result = kReadFailed;
     const String name = Qx::fileNameOf(file);

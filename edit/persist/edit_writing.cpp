@@ -127,7 +127,7 @@ bool Edit::store(const WString& path) {
 }
 
 void Edit::updateHeaderBeforeWrite() {
-    // Labels are header keys and are carried along as they stand.
+    write_labels_to_config(get_ed2_revision());
     EditFile::updateHeader(*this, m_header, EditFile::storedChannels(*this));
 }
 

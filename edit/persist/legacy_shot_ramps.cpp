@@ -1,4 +1,7 @@
+#include "edit/persist/detail/legacy_upgrades.h"
+
 #include "edit/model/aud_levels_cel.h"
+#include "edit/model/ce_handle.h"
 #include "edit/model/cel.h"
 #include "edit/model/edit.h"
 #include "platform/media/frame_rate.h"
@@ -15,7 +18,8 @@ public:
     RampsToNodes(Edit& edit, const IdStamp& audio)
         : m_edit(edit), m_audio(audio), m_quarterFrame(Qx::projectFrameRate().frameDuration() * 0.25) {}
 
-    void convert(cel& content) {
+    /// How many ramps there were.
+    int convert(cel& content) {
         for (int i = 0; i + 1 < content.numEvents(); i += 2) {
             const channel_event in = content.get_event(i);
             const channel_event out = content.get_event(i + 1);
@@ -24,6 +28,7 @@ public:
             }
             if (in.level != out.level) {
                 ramp(in, out);
+                ++m_converted;
                 ce_handle(&content, i).set_strip_level(1);
                 ce_handle(&content, i + 1).set_strip_level(1);
             } else if (m_levels.valid() && m_last) {
@@ -34,6 +39,7 @@ public:
             m_levels.simplify();
             m_edit.init_dirty();
         }
+        return m_converted;
     }
 
 private:
@@ -82,6 +88,7 @@ private:
     double m_quarterFrame;
     AudLevelsCel m_levels;
     std::optional<size_t> m_last;
+    int m_converted = 0;
 };
 
 bool hasLevelsTracks(const Edit& edit) {
@@ -101,13 +108,18 @@ void Edit::removeShotSoundRamps() {
     }
     Vector<IdStamp> chans;
     getChans(chans, AudioChan);
+    int converted = 0;
     try {
         for (const IdStamp& chan : chans) {
             if (cel* content = getCel(chan)) {
-                RampsToNodes(*this, chan).convert(*content);
+                converted += RampsToNodes(*this, chan).convert(*content);
             }
         }
     } catch (const std::logic_error& error) {
         LogBoth("Failed converting audio levels, %s\n", error.what());
+        noteNotUpgraded("removeShotSoundRamps", String("some level ramps stay: ") + error.what());
+    }
+    if (converted > 0) {
+        noteUpgrade(countedText(converted, "level ramp", " became nodes of levels channels"));
     }
 }

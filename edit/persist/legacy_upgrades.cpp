@@ -2,34 +2,21 @@
 #include "edit/persist/detail/ed2_names.h"
 
 #include "edit/model/aud_levels_cel.h"
+#include "edit/model/ce_handle.h"
+#include "edit/model/cel.h"
 #include "edit/model/edit.h"
 #include "edit/model/managed_cel.h"
 #include "edit/persist/detail/edit_file.h"
-#include "platform/services/current_project.h"
+#include "platform/media/edit_label.h"
+#include "platform/media/picture_format.h"
 #include "platform/services/log.h"
 
+#include <bit>
+#include <map>
 #include <set>
+#include <vector>
 
 namespace {
-
-constexpr int kMediumRateWith1001 = 3;
-constexpr int kMediumRateWhole = 2;
-
-// One line for a step that cannot act on what it found.
-void notDone(const Edit& edit, const char* step, const char* what) {
-    herc_printf("Edit::%s( %s ) - %s\n", step, edit.get_cookie_str().c_str(), what);
-}
-
-template <typename Visit>
-void forEachCel(Edit& edit, Edit_Chan_Type type, Visit visit) {
-    Vector<IdStamp> chans;
-    edit.getChans(chans, type);
-    for (const IdStamp& chan : chans) {
-        if (cel* content = edit.getCel(chan)) {
-            visit(chan, *content);
-        }
-    }
-}
 
 bool showsEffects(Edit& edit) {
     bool found = false;
@@ -41,50 +28,34 @@ bool showsEffects(Edit& edit) {
     return found;
 }
 
-// Every event's times are multiplied by `factor` and the cel becomes one of whole frames of `frame` seconds.
-Qx::Ptr<cel> scaled(const cel& from, double factor, double frame) {
-    cel result;
-    result.reserve(from.numPairs());
-    for (int i = 0; i < from.numEvents(); ++i) {
-        channel_event event = from.get_event(i);
-        event.editTime *= factor;
-        event.stripTime *= factor;
-        if (!result.add_event(event)) {
-            return nullptr;
-        }
-    }
-    result.set_resolution(frame);
-    Qx::Ptr<cel> whole = result.quantise();
-    if (whole != nullptr) {
-        whole->editChannelInfo(from.editChannelName(), from.editChannelId(), from.editChannelSubType(),
-                               from.editChannelMaterialInfo());
-        whole->setChanged(true);
-    }
-    return whole;
-}
+/// Stamps that were met: a table of twice their number, of which the null stamp marks a free place.
+class SeenStamps {
+public:
+    /// Room for so many.
+    explicit SeenStamps(size_t count) : m_slots(std::bit_ceil(2 * count + 16)) {}
 
-void scaleTimes(Edit& edit, double factor, double frame) {
-    for (int i = 0; i < edit.getNumChans(); ++i) {
-        const IdStamp chan = edit.getId(i);
-        if (const cel* content = edit.get_edit_cel_p(i)) {
-            if (const Qx::Ptr<cel> whole = scaled(*content, factor, frame)) {
-                edit.set_edit_cel_p(i, whole->copy().release());
-            } else {
-                notDone(edit, "updateLegacyFrameRate", "a channel's times do not map; they stay");
+    /// False if a stamp, which is not null, was added before.
+    bool add(const IdStamp& id) {
+        constexpr uint64_t kOdd = 0x9E3779B97F4A7C15u;
+        size_t at = static_cast<size_t>(std::hash<IdStamp>()(id) * kOdd >> 32);
+        for (at &= m_slots.size() - 1; m_slots[at].valid(); at = (at + 1) & (m_slots.size() - 1)) {
+            if (m_slots[at] == id) {
+                return false;
             }
-        } else if (AudLevelsCel levels = edit.getLevelsCel(chan); levels.valid()) {
-            AudLevelsCel::Store nodes;
-            for (const auto& node : levels.getNodeStore().nodes()) {
-                nodes.insertNode(node.time * factor, node.level);
-            }
-            levels.changeNodeStore() = nodes;
         }
+        m_slots[at] = id;
+        return true;
     }
-    edit.get_cues().rescale(factor, factor);
-    edit.convertCues();
-}
+
+private:
+    std::vector<IdStamp> m_slots;
+};
 
 } // namespace
+
+String countedText(int count, const char* noun, const char* what) {
+    return String::format("%d %s%s", count, noun, count == 1 ? "" : "s") + what;
+}
 
 Qx::Ed2Support::TVStd getNamedStandard(const TextFile& file) {
     // Only the header's own lines count: a text further on may begin with anything.
@@ -120,18 +91,30 @@ void RememberedFlags::restore(Edit& edit) const {
 }
 
 void Edit::updateLegacyFormat(const Qx::Ed2Support::TVStd& standard) {
-    if (get_log_type() == kLogShot && standard.known()) {
-        notDone(*this, "updateLegacyFormat", "no table of picture formats; the shot's format stays as it is");
+    if (get_log_type() != kLogShot) {
+        return;
+    }
+    const LineStructure lines = Qx::projectLineStructure();
+    for (const Qx::OutputFormat& format : Qx::outputFormats()) {
+        if (format.formatCode == standard.formatCode && format.lines == lines) {
+            setShotVideoMetadata({format.width, format.height, lines, ShotVideoMetadata::kPixelYUY2});
+            noteUpgrade("its pictures are " + getShotVideoMetadata().asString());
+            return;
+        }
     }
 }
 
 void Edit::removeHiddenFXTracks() {
     Vector<IdStamp> chans;
+    int removed = 0;
     getChans(chans, VideoChan, Edit_Chan_SubType::ALIAS);
     for (const IdStamp& chan : chans) {
         if (getChanSubtype(chan) == Edit_Chan_SubType::ALIAS && isEmpty(chan)) {
-            removeChan(chan, false);
+            removed += removeChan(chan, false) ? 1 : 0;
         }
+    }
+    if (removed > 0) {
+        noteUpgrade(countedText(removed, "hidden effects channel", " without an effect went"));
     }
 }
 
@@ -171,96 +154,128 @@ void Edit::utilizeMagicIdStampsForChannelIds() {
         }
     });
     init_dirty();
+    noteUpgrade(countedText(static_cast<int>(renamed.size()), "channel", " got a stamp of a channel"));
 }
 
 void Edit::makeMaterialNodesTransient() {
-    if (showsEffects(*this)) {
-        notDone(*this, "makeMaterialNodesTransient", "effect graphs of this revision are kept as they are");
+    // Few objects are stored under stamps, so these are looked for among the events and not the other way.
+    std::map<IdStamp, bool> isMaterial;
+    for (const String& name : m_store.names()) {
+        if (const IdStamp id{std::string_view(name)}; id.valid() && getIdx(id) == NO_CHAN) {
+            isMaterial.emplace(id, false);
+        }
+    }
+    if (isMaterial.empty()) {
+        return;
+    }
+    std::set<IdStamp> others; // of what is no material
+    forEachCel(*this, AnyChan, [&](const IdStamp&, const cel& content) {
+        for (int i = 0; i < content.numEvents(); ++i) {
+            const auto found = isMaterial.find(content.getChanEventPtr(i)->id);
+            if (found == isMaterial.end()) {
+                continue;
+            }
+            found->second = true;
+            if (const cookie& strip = content.getChanEventPtr(i & ~1)->strip;
+                strip.isMagic() || strip.isAlias()) {
+                others.insert(found->first);
+            }
+        }
+    });
+    int removed = 0;
+    for (const auto& [id, plays] : isMaterial) {
+        if (plays && !others.contains(id)) {
+            removed += m_store.removeObject(id.asString()) ? 1 : 0;
+        }
+    }
+    if (removed > 0) {
+        noteUpgrade(countedText(removed, "stored node", " of material went: it is made from its event"));
     }
 }
 
 void Edit::validateUTRIDs() {
-    std::set<IdStamp> seen;
+    size_t events = 0;
+    forEachCel(*this, VideoChan | AudioChan, [&events](const IdStamp&, const cel& content) {
+        events += static_cast<size_t>(content.numEvents());
+    });
+    SeenStamps seen(events);
     int fixed = 0;
     forEachCel(*this, VideoChan | AudioChan, [&](const IdStamp&, cel& content) {
         for (int i = 0; i < content.numEvents(); ++i) {
-            channel_event event = content.get_event(i);
-            const cookie strip = content.get_event(i & ~1).strip;
-            const bool wrongKind = !strip.isMagic() && event.id.getMagicType() != IdStampMagic::Material;
-            if (!event.id.valid() || wrongKind || seen.contains(event.id)) {
-                event.id = channel_event::newId();
-                fixed += content.setEvent(i, event) ? 1 : 0;
+            const IdStamp id = content.getChanEventPtr(i)->id;
+            const bool wrongKind = !content.getChanEventPtr(i & ~1)->strip.isMagic() &&
+                                   id.getMagicType() != IdStampMagic::Material;
+            if (id.valid() && !wrongKind && seen.add(id)) {
+                continue;
             }
-            seen.insert(event.id);
+            channel_event event = content.get_event(i);
+            event.id = channel_event::newId();
+            fixed += content.setEvent(i, event) ? 1 : 0;
+            seen.add(event.id);
         }
     });
     if (fixed > 0) {
         init_dirty();
         herc_printf("Edit::validateUTRIDs() : Fixed %d invalid IDs in '%s' (%s)\n", fixed, getName().c_str(),
                     get_cookie_str().c_str());
+        noteUpgrade(countedText(fixed, "event", " got an identity of its own"));
     }
 }
 
 void Edit::initialiseAudioVarispeeds() {
-    forEachCel(*this, AudioChan, [](const IdStamp&, cel& content) {
+    int changed = 0;
+    forEachCel(*this, AudioChan, [&changed](const IdStamp&, cel& content) {
         for (int i = 0; i < content.numEvents(); ++i) {
             if (content.get_event(i).velocity != 1.0) {
                 ce_handle(&content, i).set_strip_velocity(1.0);
+                ++changed;
             }
         }
     });
+    if (changed > 0) {
+        noteUpgrade(countedText(changed, "sound event", " plays at speed 1"));
+    }
 }
 
 void Edit::updateLegacyFileLabels() {
-    if (m_header.contains(EditKeys::kNumLabels) ||
-        m_header.contains(EditKeys::numbered(EditKeys::kLabel, 0))) {
-        notDone(*this, "updateLegacyFileLabels", "labels are kept as the texts that they are");
-    }
-}
-
-void Edit::updateLegacyFrameRate(const Qx::Ed2Support::TVStd& standard) {
-    Qx::FrameRate to(standard.frameRateCode);
-    if (standard.frameRateCode == Qx::FrameRate::Fps23_976) {
-        to = Qx::FrameRate(Qx::FrameRate::Fps24);
-    } else if (standard.frameRateCode == Qx::FrameRate::Fps30) {
-        to = Qx::FrameRate(Qx::FrameRate::Fps29_97);
-    }
-    if (!to.valid()) {
-        notDone(*this, "updateLegacyFrameRate", "the edit names no frame rate; its times stay as they are");
-        return;
-    }
-    if (to.code() != standard.frameRateCode) {
-        const double factor = to.frameDuration() / Qx::FrameRate(standard.frameRateCode).frameDuration();
-        scaleTimes(*this, factor, to.frameDuration());
-        setFrameRate(to);
-    }
-    const edit_log_type_t type = get_log_type();
-    if (type == kLogShot) {
-        if (const cel* first = get_edit_cel_p(0)) {
-            setSourceMediumDuration(first->get_end_time());
-        }
-        setSourceMedium(standard.mediumCode);
-        EditKeys::kTransferAudioMedium.set(m_header,
-                                           to.denominator() == 1001 ? kMediumRateWith1001 : kMediumRateWhole);
-        notDone(*this, "updateLegacyFrameRate", "no film-sync playback factor is derived for the shot");
-        return;
-    }
-    setSourceMedium(Qx::currentProject().defaultEditMedium);
-    if (type != kLogGhost3 && type != kLogGhost5) {
-        return;
-    }
-    forEachCel(*this, AnyChan, [](const IdStamp&, cel& content) {
-        for (int i = 0; i + 1 < content.numEvents(); i += 2) {
-            const channel_event in = content.get_event(i);
-            if (!in.strip.isMagic() && content.get_event(i + 1).level != in.level) {
-                ce_handle(&content, i + 1).set_strip_level(in.level);
+    constexpr MediumRollIdent primary{kPrimaryMedium, 2};
+    constexpr MediumRollIdent second{kSoundMedium, 2};
+    constexpr MediumRollIdent third{kSoundMedium, 3};
+    const auto timecodeOf = [this](const MediumRollIdent& roll) {
+        for (const edit_label& label : labels()) {
+            if (label.get_MediumRoll() == roll && label.user_type() == kTimecodeLabelType) {
+                return label;
             }
         }
-    });
+        return edit_label();
+    };
+    if (edit_label sound = timecodeOf(third); !timecodeOf(primary).is_valid() && sound.is_valid()) {
+        sound.set_MediumRoll(second);
+        sound.set_channels(edit_label::kAllChannels);
+        setLabel(sound);
+        const String reelId = get_reelid(third);
+        if (!reelId.empty() && set_reelid(second, reelId)) {
+            set_reelid(third, String());
+        }
+        removeLabel(kTimecodeLabelType, third);
+        noteUpgrade("the timecode of sound roll 3 became that of sound roll 2");
+    }
+    const edit_log_type_t type = get_log_type();
+    if (const edit_label own = timecodeOf({kEditMedium, 1});
+        type == kLogEdit && own.is_valid() && own.first().scale().rate.nominal() == own.rate().nominal() &&
+        !m_header.contains(EditKeys::kStartTimecode)) {
+        const label start = own.labelAt(0);
+        EditKeys::kStartTimecode.set(m_header, start.frames());
+        EditKeys::kDropFrame.set(m_header, start.scale().dropFrame);
+        noteUpgrade("its start timecode is that of its label, " + start.asString());
+    }
+    if ((type == kLogEdit || type == kLogGhost3 || type == kLogGhost5) && give_new_edit_all_its_labels()) {
+        noteUpgrade("it got the labels of its own timecode, in its frames and in 24");
+    }
 }
 
 void Edit::replaceLegacyEffects() {
     if (showsEffects(*this)) {
-        notDone(*this, "replaceLegacyEffects", "effects of this revision are kept as they are");
+        noteNotUpgraded("replaceLegacyEffects", "effects of this revision are kept as they are");
     }
 }

@@ -8,9 +8,52 @@
 namespace {
 
 /// In the order of the columns.
-constexpr const char* kNames[projdb::kNumColumns] = {
-    "Type",     "Flags",   "chans",    "start time", "end time",  "name",      "rate",  "duration",
-    "channels", "created", "modified", "owner",      "file size", "file time", "damage"};
+constexpr const char* kNames[projdb::kNumColumns] = {"Type",
+                                                     "Flags",
+                                                     "chans",
+                                                     "start time",
+                                                     "end time",
+                                                     "name",
+                                                     "rate",
+                                                     "duration",
+                                                     "channels",
+                                                     "created",
+                                                     "modified",
+                                                     "owner",
+                                                     "file size",
+                                                     "file time",
+                                                     "damage",
+                                                     "date",
+                                                     "scene",
+                                                     "shot",
+                                                     "who",
+                                                     "description",
+                                                     "notes",
+                                                     "cookie",
+                                                     "reel",
+                                                     "snd start",
+                                                     "snd reel",
+                                                     "aud qual",
+                                                     "Compression Format",
+                                                     "frame origin",
+                                                     "pulldown",
+                                                     "sequence",
+                                                     "start 24P code",
+                                                     "end 24P code",
+                                                     "24P reel",
+                                                     "start keycode",
+                                                     "end keycode",
+                                                     "start camcode",
+                                                     "end camcode",
+                                                     "cam reel",
+                                                     "cam_date",
+                                                     "lab reel",
+                                                     "comp reel",
+                                                     "start inkcode",
+                                                     "end inkcode",
+                                                     "Source Format",
+                                                     "Reel Type",
+                                                     "film duration"};
 
 std::vector<String> columnNames() {
     return {std::begin(kNames), std::end(kNames)};
@@ -55,7 +98,7 @@ Qx::Status projdb::open(const String& folder) {
         return Qx::Status::failure("there is no project folder to keep records in");
     }
     const String path = Qx::joinPath(folder, kFileName);
-    RecordTable::OpenResult result = m_table->open(path, columnNames());
+    RecordTable::OpenResult result = m_table->open(path, columnNames(), RecordTable::MakeAgain);
     if (result == RecordTable::Damaged) {
         const String damage = m_table->lastError();
         if (Qx::Status status = setAside(path, m_table->companions()); !status) {
@@ -63,7 +106,7 @@ Qx::Status projdb::open(const String& folder) {
         }
         herc_printf("projdb: %s; it was set aside as %s.DAMAGED and is made again from the edits\n",
                     damage.c_str(), kFileName);
-        result = m_table->open(path, columnNames());
+        result = m_table->open(path, columnNames(), RecordTable::MakeAgain);
     }
     m_isNew = result == RecordTable::Made;
     return m_table->isOpen() ? Qx::Status() : Qx::Status::failure(m_table->lastError());
@@ -107,6 +150,17 @@ Qx::Status projdb::removeAll() {
 
 void projdb::forEach(const std::function<bool(const cookie& item, const Record& record)>& callback) const {
     m_table->forEachRecord([&](const String& key, const std::vector<String>& fields) {
+        const cookie item{std::string_view(key)};
+        return !item.is_valid() || callback(item, recordOf(fields));
+    });
+}
+
+Qx::Status
+projdb::select(const std::vector<RecordTable::Condition>& conditions,
+               const std::function<bool(const cookie& item, const Record& record)>& callback) const {
+    std::vector<RecordTable::Condition> sound = conditions;
+    sound.push_back({Damage, String()});
+    return m_table->select(sound, [&](const String& key, const std::vector<String>& fields) {
         const cookie item{std::string_view(key)};
         return !item.is_valid() || callback(item, recordOf(fields));
     });

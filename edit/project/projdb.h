@@ -35,6 +35,38 @@ public:
                   ///< from; empty while the row tells what no file says yet
         FileTime,
         Damage, ///< "damage": why the file cannot be read; then the other columns but the file's are empty
+        /// The log of the item, under the field names of the log attributes ("scene", "snd reel", ...).
+        Date, ///< when it was made: ISO 8601, UTC
+        Scene,
+        Shot,
+        Who,
+        Description,
+        Notes,
+        Cookie,
+        Reel,
+        SoundStart,
+        SoundReel,
+        AudioQuality,
+        CompressionFormat,
+        FrameOrigin,
+        Pulldown,
+        Sequence,
+        Start24PCode,
+        End24PCode,
+        Reel24P,
+        StartKeycode,
+        EndKeycode,
+        StartCamcode,
+        EndCamcode,
+        CamReel,
+        CamDate,
+        LabReel,
+        CompReel,
+        StartInkcode,
+        EndInkcode,
+        SourceFormat,
+        ReelType,
+        FilmDuration,
         kNumColumns
     };
 
@@ -56,8 +88,8 @@ public:
     /// With another kind of table than the platform's own, which is closed.
     explicit projdb(std::unique_ptr<RecordTable> table = RecordTable::make());
 
-    /// Opens the records of the project in a folder, or makes them. A file that is damaged, or of another
-    /// version, is set aside as "Project.db.DAMAGED", over an earlier one, and an empty one made: `isNew` is
+    /// Opens the records of the project in a folder, or makes them. Those of an earlier version, which had
+    /// fewer columns, are emptied. A file that is damaged, or of a later version, is set aside as "Project.db.DAMAGED", over an earlier one, and an empty one made: `isNew` is
     /// then true. Fails, with nothing open, when the file system refuses; the text says why.
     Qx::Status open(const String& folder);
     void close();
@@ -82,6 +114,12 @@ public:
     [[nodiscard]] size_t numRecords() const { return m_table->numRecords(); }
     /// Every record, by cookies, until the callback answers false. It must not use the records.
     void forEach(const std::function<bool(const cookie& item, const Record& record)>& callback) const;
+
+    /// The records whose fields match every condition, by cookies, until the callback answers false. Those of
+    /// files that cannot be read match nothing. The callback must not use the records. A failure names what
+    /// the table refused.
+    Qx::Status select(const std::vector<RecordTable::Condition>& conditions,
+                      const std::function<bool(const cookie& item, const Record& record)>& callback) const;
 
     /// Named values. False, leaving `value`, if there is none of that name.
     [[nodiscard]] bool getValue(const String& name, String& value) const {

@@ -195,6 +195,7 @@ void EdlImporter::buildShot(size_t index) {
                                                      : event.reel;
     EditKeys::kName.set(shot.Opts(), shownName(name, event.line));
     shot.Opts().setString(EdlKey::kReel, event.reel);
+    EditKeys::kReelId.set(shot.Opts(), event.reel);
     EditKeys::kDropFrame.set(shot.Opts(), event.sourceDrop);
     if (!event.sourceFile.empty()) {
         shot.Opts().setString(EdlKey::kSourceFile, event.sourceFile);

@@ -1,5 +1,6 @@
 #include "platform/database/oledb.h"
 
+#include <algorithm>
 #include <mutex>
 #include <sqlite3.h>
 
@@ -155,7 +156,17 @@ private:
 oledb::oledb() = default;
 oledb::~oledb() = default;
 
-oledb::OpenResult oledb::open(const String& path, const std::vector<String>& columns) {
+/// True if a table has a key and only some of the columns.
+bool oledb::isEarlier(const std::vector<String>& found, const std::vector<String>& columns) {
+    const auto isKnown = [&columns](const String& name) {
+        return std::any_of(columns.begin(), columns.end(),
+                           [&name](const String& column) { return String::equalNoCase(column, name); });
+    };
+    return found.size() <= columns.size() && found.front() == "key" &&
+           std::all_of(found.begin() + 1, found.end(), isKnown);
+}
+
+oledb::OpenResult oledb::open(const String& path, const std::vector<String>& columns, OtherColumns others) {
     const Hold hold(m_section);
     close();
     auto connection = std::make_unique<Connection>();
@@ -167,7 +178,10 @@ oledb::OpenResult oledb::open(const String& path, const std::vector<String>& col
     if (!connection->open(path, found)) {
         return refuse(isDamage(connection->code()) ? Damaged : NotOpened);
     }
-    const bool made = found.empty();
+    bool made = found.empty();
+    if (!made && others == MakeAgain && isEarlier(found, columns) && connection->isSound()) {
+        made = connection->execute("DROP TABLE records");
+    }
     if (made && !connection->make(columns)) {
         return refuse(isDamage(connection->code()) ? Damaged : NotOpened);
     }
@@ -330,6 +344,72 @@ void oledb::forEachRecord(const Visitor& callback) const {
         }
     }
     all.reset();
+}
+
+namespace {
+
+/// A pattern as LIKE has it.
+String likePattern(const String& pattern) {
+    String text;
+    for (const char c : pattern) {
+        switch (c) {
+        case '*':
+            text += '%';
+            break;
+        case '?':
+            text += '_';
+            break;
+        case '%':
+        case '_':
+        case '\\':
+            text += '\\';
+            [[fallthrough]];
+        default:
+            text += c;
+        }
+    }
+    return text;
+}
+
+} // namespace
+
+Qx::Status oledb::select(const std::vector<Condition>& conditions, const Visitor& callback) const {
+    const Hold hold(m_section);
+    if (m_connection == nullptr) {
+        return Qx::Status::failure(kNotOpen);
+    }
+    String sql = "SELECT * FROM records";
+    std::vector<String> patterns;
+    for (const Condition& condition : conditions) {
+        if (condition.column < 0 || condition.column >= std::ssize(m_columns)) {
+            return Qx::Status::failure(Qx::StatusCode::BadArgument, "the table has no such column");
+        }
+        const bool isExact = condition.pattern.find_first_of("*?") == String::npos;
+        patterns.push_back(isExact ? condition.pattern : likePattern(condition.pattern));
+        sql += (patterns.size() == 1 ? " WHERE " : " AND ") +
+               quoted(m_columns[static_cast<size_t>(condition.column)]) +
+               String::format(isExact ? " = ?%zu COLLATE NOCASE" : " LIKE ?%zu ESCAPE '\\'", patterns.size());
+    }
+    const auto refused = [this] {
+        return Qx::Status::failure("cannot look records up: " + m_connection->message());
+    };
+    Statement found;
+    if (!found.prepare(m_connection->m_database, sql + " ORDER BY \"key\"")) {
+        return refused();
+    }
+    for (size_t i = 0; i < patterns.size(); ++i) {
+        found.bind(static_cast<int>(i) + 1, patterns[i]);
+    }
+    std::vector<String> fields(m_columns.size());
+    while (found.step()) {
+        for (size_t i = 0; i < fields.size(); ++i) {
+            fields[i] = found.text(static_cast<int>(i) + 1);
+        }
+        if (!callback(found.text(0), fields)) {
+            return {};
+        }
+    }
+    return found.reset() == SQLITE_OK ? Qx::Status() : refused();
 }
 
 bool oledb::getValue(const String& name, String& value) const {

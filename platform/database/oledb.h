@@ -9,7 +9,8 @@ public:
     oledb();
     ~oledb() override;
 
-    OpenResult open(const String& path, const std::vector<String>& columns) override;
+    OpenResult open(const String& path, const std::vector<String>& columns,
+                    OtherColumns others = Refuse) override;
     void close() override;
     [[nodiscard]] bool isOpen() const override;
     [[nodiscard]] String lastError() const override;
@@ -23,6 +24,7 @@ public:
     Qx::Status removeAllRecords() override;
     [[nodiscard]] size_t numRecords() const override;
     void forEachRecord(const Visitor& callback) const override;
+    Qx::Status select(const std::vector<Condition>& conditions, const Visitor& callback) const override;
     [[nodiscard]] bool getValue(const String& name, String& value) const override;
     Qx::Status setValue(const String& name, const String& value) override;
     [[nodiscard]] int64_t versionOfOthers() const override;
@@ -33,6 +35,7 @@ private:
     void end(bool drops) override;
 
     class Connection;
+    [[nodiscard]] static bool isEarlier(const std::vector<String>& found, const std::vector<String>& columns);
     std::unique_ptr<Connection> m_connection;
     std::vector<String> m_columns;
     String m_error;

@@ -25,6 +25,18 @@ public:
         Damaged = 3    ///< the file is no table of this kind, is damaged, or has other columns
     };
 
+    /// What is done with a sound table whose columns are others.
+    enum OtherColumns {
+        Refuse,   ///< the answer is `Damaged`
+        MakeAgain ///< one that has only some of the columns is of an earlier version: its records go
+    };
+    /// One field of a record and what its text is to be, without regard to the case of ASCII letters. In the
+    /// pattern '*' stands for any text, also an empty one, and '?' for one character.
+    struct Condition {
+        int column = 0;
+        String pattern;
+    };
+
     RecordTable() = default;
     virtual ~RecordTable() = default;
     RecordTable(const RecordTable&) = delete;
@@ -35,7 +47,8 @@ public:
 
     /// Opens the table in a file, or makes it. Columns are matched by name without regard to case; their
     /// names may hold blanks. On a result other than 0 and 2 nothing is open.
-    virtual OpenResult open(const String& path, const std::vector<String>& columns) = 0;
+    virtual OpenResult open(const String& path, const std::vector<String>& columns,
+                            OtherColumns others = Refuse) = 0;
     virtual void close() = 0;
     [[nodiscard]] virtual bool isOpen() const = 0;
     /// One sentence on the last failure of `open`.
@@ -61,6 +74,10 @@ public:
     /// use the table.
     using Visitor = std::function<bool(const String& key, const std::vector<String>& fields)>;
     virtual void forEachRecord(const Visitor& callback) const = 0;
+    /// Hands over the records that match every condition, in the order of keys, until the callback answers
+    /// false. The callback must not use the table. Fails for a column that is none and where the table
+    /// cannot be read.
+    virtual Qx::Status select(const std::vector<Condition>& conditions, const Visitor& callback) const = 0;
 
     /// Named values beside the records. False, leaving `value`, if there is none of that name.
     [[nodiscard]] virtual bool getValue(const String& name, String& value) const = 0;

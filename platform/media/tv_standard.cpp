@@ -15,6 +15,7 @@ constexpr int kFormat625 = 1;
 constexpr int kFormat525 = 2;
 constexpr int kMediumVideo625 = 1;
 constexpr int kMediumVideo525 = 3;
+constexpr int kMediumFilm23 = 23;
 constexpr int kMediumFilm24 = 24;
 
 constexpr Standard kStandards[] = {
@@ -76,6 +77,25 @@ String tvStdTextForProject() {
     default:
         return {};
     }
+}
+
+FrameRate mediumFrameRate(int mediumCode) {
+    switch (mediumCode) {
+    case kMediumVideo625:
+        return FrameRate(FrameRate::Fps25);
+    case kMediumVideo525:
+        return FrameRate(FrameRate::Fps29_97);
+    case kMediumFilm23:
+        return FrameRate(FrameRate::Fps23_976);
+    case kMediumFilm24:
+        return FrameRate(FrameRate::Fps24);
+    default:
+        return {};
+    }
+}
+
+bool isFilmMedium(int mediumCode) {
+    return mediumCode == kMediumFilm23 || mediumCode == kMediumFilm24;
 }
 
 } // namespace Qx::Ed2Support

@@ -27,6 +27,11 @@ QM_API TVStd tvStdFromText(std::string_view text);
 /// frame rate. With a rate that no text stands for only the rate is told; one that is not known when neither
 /// tells anything.
 QM_API TVStd getTvStandard(std::string_view text, int frameRateCode);
+/// The frames a second of a medium as a standard names it: 25 for 1, 29.97 for 3, 24 for 24, and 23.976 for 23,
+/// which is film at 24 whose sound was taken at the slower speed; `Unknown` for any other.
+QM_API FrameRate mediumFrameRate(int mediumCode);
+/// True for the media 23 and 24.
+QM_API bool isFilmMedium(int mediumCode);
 /// The text of the current project's standard; empty for a rate that has none.
 QM_API String tvStdTextForProject();
 

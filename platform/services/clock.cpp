@@ -1,6 +1,7 @@
 #include "platform/services/clock.h"
 
 #include <chrono>
+#include <ctime>
 #include <mutex>
 #include <utility>
 
@@ -34,6 +35,17 @@ int64_t nowSeconds() {
 Clock setClock(Clock clock) {
     const std::lock_guard hold(clockState().mutex);
     return std::exchange(clockState().clock, std::move(clock));
+}
+
+String isoTimeText(int64_t seconds) {
+    const auto time = static_cast<std::time_t>(seconds);
+    std::tm fields{};
+    char text[32];
+    if (gmtime_r(&time, &fields) == nullptr ||
+        std::strftime(text, sizeof text, "%Y-%m-%dT%H:%M:%SZ", &fields) == 0) {
+        return {};
+    }
+    return text;
 }
 
 } // namespace Qx

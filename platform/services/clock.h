@@ -1,6 +1,7 @@
 #pragma once
 
 #include "platform/base/export.h"
+#include "platform/base/qx_string.h"
 
 #include <cstdint>
 #include <functional>
@@ -17,5 +18,8 @@ QM_API int64_t nowSeconds();
 /// Puts another clock in place and returns the one before; an empty one restores the machine's. A clock is
 /// called under a lock: it must not ask for the time itself.
 QM_API Clock setClock(Clock clock);
+
+/// "2026-11-21T11:30:00Z" for seconds since 1970, UTC; empty for a time that has no date.
+QM_API String isoTimeText(int64_t seconds);
 
 } // namespace Qx

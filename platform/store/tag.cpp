@@ -1,5 +1,7 @@
 #include "platform/store/tag.h"
 
+#include "platform/store/detail/tag_bag_contents.h"
+
 #include <utility>
 
 TagTypeId::TagTypeId(std::string_view id) : m_id(id.empty() ? nullptr : std::make_shared<const String>(id)) {}
@@ -30,7 +32,9 @@ TagBase::TagBase(TagBag& bag, const IdStamp& id) {
 Streamable* TagBase::find() const {
     m_object = nullptr;
     if (TagBag* const its = bag()) {
-        m_object = its->contains(m_id) ? its->openObject(m_id) : nullptr;
+        TagBag::Contents::Entry* const entry = its->m_contents->find(m_id.asText());
+        const bool isLive = entry != nullptr && entry->lent == nullptr && entry->owned != nullptr;
+        m_object = isLive ? entry->owned.get() : entry != nullptr ? its->openObject(m_id) : nullptr;
         m_foundAt = m_life->departures;
     }
     return m_object;

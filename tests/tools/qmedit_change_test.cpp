@@ -35,10 +35,19 @@ TEST_F(QmeditChange, EveryChangeCanBeUndoneAndRedone) {
         {"marker", "move", m_edit + "@4s", "1"},
         {"marker", "remove", m_edit, "1"},
         {"apply", "lift", "--to", m_edit + "@1s-2s"},
+        {"transition", "add", m_edit + "@3s", "--kind", "dissolve", "--length", "12f", "--align", "start"},
+        {"transition", "set", m_edit + "@3.2s", "--kind", "wipe:1"},
+        {"transition", "remove", m_edit + "@10:00:03:00"},
     };
     for (const std::vector<std::string>& change : changes) {
         SCOPED_TRACE(change[0] + " " + change[1]);
         const nlohmann::json before = content();
+        if (change[0] == "transition") {
+            std::vector<std::string> trial = change;
+            trial.emplace_back("--dry-run");
+            done(trial);
+            EXPECT_EQ(content(), before);
+        }
         done(change);
         const nlohmann::json after = content();
         EXPECT_NE(before, after);
@@ -106,7 +115,7 @@ TEST_F(QmeditChange, PurgeTakesTheShotsThatNoStateOfAnEditPlays) {
     EXPECT_NE(listed.find(harbour + "  harbour"), String::npos) << listed;
     EXPECT_EQ(snapshot(), before);
 
-    const String second = imported(kShortList);
+    const String second = imported(kShortList, {"--new-shots"});
     std::filesystem::copy_file(fileOf(second), fileOf(second) + ".U1");
     std::filesystem::resize_file(fileOf(second) + ".U1", 3000);
     const test::ProgramResult refused = run({"purge"});

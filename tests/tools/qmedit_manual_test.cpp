@@ -41,7 +41,7 @@ std::vector<Example> examplesOf(const std::string& path) {
 
 /// A line without what differs from run to run: dates, and the sizes of files beside them.
 std::string comparable(const std::string& line) {
-    static const std::regex date("[0-9]{4}-[0-9]{2}-[0-9]{2} [0-9]{2}:[0-9]{2}( +[0-9]+ )?");
+    static const std::regex date("[0-9]{4}-[0-9]{2}-[0-9]{2}( [0-9]{2}:[0-9]{2}( +[0-9]+ )?|T[0-9:]{8}Z)");
     return std::regex_replace(line, date, "DATE");
 }
 

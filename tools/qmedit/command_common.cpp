@@ -8,12 +8,13 @@
 
 const std::vector<CommandGroup>& allCommands() {
     static const std::vector<CommandGroup> groups{
-        {"Look", {listCommand(), showCommand(), headerCommand(), diffCommand(), historyCommand()}},
+        {"Look",
+         {listCommand(), showCommand(), findCommand(), headerCommand(), diffCommand(), historyCommand()}},
         {"Change",
-         {newCommand(), applyCommand(), renameCommand(), markerCommand(), transitionCommand(),
+         {newCommand(), applyCommand(), renameCommand(), markerCommand(), transitionCommand(), logCommand(),
           deleteCommand()}},
         {"Go back", {backupCommand(), undoCommand(), redoCommand()}},
-        {"Repair", {verifyCommand(), recoverCommand(), salvageCommand()}},
+        {"Repair", {verifyCommand(), upgradeCommand(), recoverCommand(), salvageCommand()}},
         {"Project", {purgeCommand(), flushCommand()}},
         {"Other tools", {importCommand(), exportCommand()}},
         {"Help", {helpCommand(), demoCommand(), completionCommand()}},

@@ -4,6 +4,7 @@
 #include "tools/qmedit/edit_json.h"
 #include "tools/qmedit/event_numbers.h"
 #include "tools/qmedit/event_table.h"
+#include "tools/qmedit/label_table.h"
 #include "tools/qmedit/project_session.h"
 #include "tools/qmedit/track_picture.h"
 
@@ -45,6 +46,13 @@ int showEdit(const ShowOptions& options) {
     EditReport report = reportOf(*edit, session.sourceNamer());
     addEventNumbers(report, *edit);
     reportMissingShots(report);
+    if (!options.labels.empty() || !options.burnIn.empty()) {
+        EventLabels labels(*edit, [&session](const cookie& strip) {
+            EditPtr source;
+            return session.readEdit(strip, source) ? source : EditPtr();
+        });
+        return showLabels(report, options, labels);
+    }
     if (options.json) {
         writeOut(editJson(report));
         return kDone;
@@ -71,7 +79,15 @@ Command showCommand() {
         {.name = "--events",
          .value = &options->allEvents,
          .help = "List every event, however many there are, with its number in an imported list and its reel",
-         .excludes = "--json"}};
+         .excludes = "--json"},
+        {.name = "--label",
+         .value = &options->labels,
+         .help = "List the events with these labels at their ends: KeyKode, 24P_Timecode, reelid, ...",
+         .form = "NAME"},
+        {.name = "--burnin",
+         .value = &options->burnIn,
+         .help = "What a burnt-in display reads at this timecode",
+         .form = "TIMECODE"}};
     for (CommandOption& option : options->console.options()) {
         given.push_back(std::move(option));
     }

@@ -5,6 +5,7 @@
 #include "platform/base/status.h"
 #include "tools/qmedit/console.h"
 
+#include <string>
 #include <vector>
 
 struct Command;
@@ -20,6 +21,8 @@ enum ExitCode : int { kDone = 0, kFailed = 1, kWrongUsage = 2 };
 Command importCommand();
 Command exportCommand();
 Command listCommand();
+Command findCommand();
+Command logCommand();
 Command showCommand();
 Command headerCommand();
 Command newCommand();
@@ -30,6 +33,7 @@ Command transitionCommand();
 Command purgeCommand();
 Command diffCommand();
 Command verifyCommand();
+Command upgradeCommand();
 Command salvageCommand();
 Command historyCommand();
 Command backupCommand();
@@ -73,6 +77,8 @@ struct ShowOptions {
     bool json = false;
     bool allEvents = false;
     Console::Wish console;
+    std::vector<std::string> labels = {}; ///< to be shown beside the events, in their place
+    std::string burnIn = {};              ///< a record timecode
 };
 int showEdit(const ShowOptions& options);
 /// Draws an edit on standard output, without its table of events.

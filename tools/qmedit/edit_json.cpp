@@ -1,9 +1,9 @@
 #include "tools/qmedit/edit_json.h"
 
 #include "interchange/marker_colour.h"
+#include "platform/services/clock.h"
 
 #include <cmath>
-#include <ctime>
 #include <nlohmann/json.hpp>
 
 namespace {
@@ -254,14 +254,7 @@ String reportJson(const std::vector<std::pair<const char*, String>>& texts,
 }
 
 String isoTime(int64_t seconds) {
-    const auto time = static_cast<std::time_t>(seconds);
-    std::tm fields{};
-    char text[32];
-    if (gmtime_r(&time, &fields) == nullptr ||
-        std::strftime(text, sizeof text, "%Y-%m-%dT%H:%M:%SZ", &fields) == 0) {
-        return {};
-    }
-    return text;
+    return Qx::isoTimeText(seconds);
 }
 
 String verifyJson(const std::vector<VerifiedFile>& files) {

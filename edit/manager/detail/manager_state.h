@@ -250,3 +250,6 @@ void storeRecords();
 /// The record of an item as its edit in memory, else its file, says it; without a file, what is recorded.
 /// False if there is none. Not under the manager's lock.
 [[nodiscard]] bool currentRecord(const cookie& item, projdb::Record& record);
+/// The items of the current project: those with a file, and those of which only backups are there at the
+/// moment.
+Qx::Status listItems(std::set<cookie>& items);

@@ -1,5 +1,7 @@
 #include "edit/manager/edit_info.h"
 #include "edit/manager/edit_record.h"
+#include "edit/manager/edit_search.h"
+#include "edit/material/log_attributes.h"
 #include "edit/model/cel.h"
 #include "edit/project/projdb.h"
 #include "tests/edit/manager/managed_project.h"
@@ -316,3 +318,79 @@ TEST(ProjectRecords, OfAnotherRateAreDropped) {
 }
 
 } // namespace
+
+TEST(ProjectRecords, HaveAColumnForEveryAttributeThatIsKeptInThem) {
+    const ManagedProject project;
+    const projdb* const records = edit_manager::get_projdb();
+    for (uint32_t number = 1; number <= LogAttributes::kLast; ++number) {
+        const char* const field = LogAttributes::getProjDBFieldNameForAttrib(LogAttribute{number});
+        EXPECT_EQ(field != nullptr && records->columnIndex(field) >= 0,
+                  LogAttributes::isStoredInProjectDatabase(LogAttribute{number}))
+            << number;
+    }
+}
+
+TEST(ProjectRecords, FindItemsByTheirLogs) {
+    const ManagedProject project;
+    const char* const logs[][3] = {
+        {"12", "A001", "wide"}, {"12A", "a002", "50% _close_"}, {"13", "B001", ""}};
+    for (int i = 0; i < 3; ++i) {
+        const cookie item(Cookie_Type::Edit, i + 1, 0);
+        makeEdit(item, 1, 0);
+        const EditPtr edit(item, eOpenExisting);
+        LogAttributes::Map map;
+        map.add(LogAttributes::kScene, logs[i][0]);
+        map.add(LogAttributes::kReel, logs[i][1]);
+        map.add(LogAttributes::kDescription, logs[i][2]);
+        ASSERT_TRUE(edit->setAttributes(map));
+    }
+    ASSERT_TRUE(edit_manager::flush_changes());
+    project.write("E0009000.qme", "no edit");
+    edit_manager::close_all_edits();
+    ASSERT_TRUE(edit_manager::update_projdb());
+    const struct {
+        std::vector<String> conditions;
+        const char* found; ///< "!" where it is refused
+    } cases[] = {
+        {{"scene=12"}, "1"},         {{"scene=12*"}, "12"},          {{"Scene=12?"}, "2"},
+        {{"reel=A*"}, "12"},         {{"reel=a*", "scene=12"}, "1"}, {{"description=?*"}, "12"},
+        {{"description=50%*"}, "2"}, {{"description=% *"}, ""},      {{"description=*_close_"}, "2"},
+        {{"type=edit"}, "123"},      {{"snd_reel=*"}, "123"},        {{"snd reel=R*"}, ""},
+        {{"cookie=e0002000"}, "2"},  {{"date=20*Z"}, "123"},         {{"scene"}, "!"},
+        {{"nothing=1"}, "!"},        {{"scene=12", "=1"}, "!"},      {{}, "123"},
+    };
+    test::FaultyFileSystem system;
+    for (const auto& c : cases) {
+        std::vector<FoundEdit> found;
+        const Qx::Status looked = findEdits(c.conditions, found);
+        String text = looked ? "" : "!";
+        for (const FoundEdit& edit : found) {
+            text += std::to_string(edit.item.word(0));
+        }
+        EXPECT_EQ(text, c.found) << (c.conditions.empty() ? String() : c.conditions.front());
+    }
+    EXPECT_EQ(system.count("open read E000"), 0U) << "no edit file was opened";
+}
+
+// Many items, so that a look-up which reads edits, or is not linear, shows.
+TEST(ProjectRecords, FindAmongManyItems) {
+    const ManagedProject project;
+    projdb* const records = edit_manager::get_projdb();
+    constexpr int kItems = 10000;
+    {
+        projdb::Transaction all(*records);
+        for (int i = 0; i < kItems; ++i) {
+            projdb::Record record;
+            record[projdb::Type] = "shot";
+            record[projdb::Name] = String::format("%d/%d", i / 10, i % 10);
+            record[projdb::Scene] = std::to_string(i / 10);
+            record[projdb::Reel] = String::format("%c%03d", 'A' + i % 26, i / 26);
+            record[projdb::Date] = "2026-11-22T00:00:00Z";
+            ASSERT_TRUE(records->put(cookie(Cookie_Type::Edit, i + 1, 0), record));
+        }
+        ASSERT_TRUE(all.commit());
+    }
+    std::vector<FoundEdit> found;
+    ASSERT_TRUE(findEdits({"scene=12*", "reel=A*"}, found));
+    EXPECT_EQ(found.size(), 3u) << "scenes 12 and 120 to 129, every 26th reel: items 1222, 1248 and 1274";
+}
