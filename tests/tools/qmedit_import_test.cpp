@@ -55,16 +55,15 @@ TEST_F(Qmedit, RateOfTheFirstImportBecomesTheProjects) {
 
 TEST_F(Qmedit, LossesGoToStandardErrorAndStrictRefusesThem) {
     const std::string list = "001  R1 V C        00:00:00:00 00:00:02:00 00:00:00:00 00:00:02:00\n"
-                             "002  R1 V C        00:00:02:00 00:00:02:00 00:00:02:00 00:00:02:00\n"
-                             "002  R2 V W001 024 00:00:00:00 00:00:02:00 00:00:02:00 00:00:04:00\n";
-    const String path = folder.write("wipe.edl", list);
+                             "002  R2 NONE C     00:00:00:00 00:00:02:00 00:00:02:00 00:00:04:00\n";
+    const String path = folder.write("trackless.edl", list);
     const test::ProgramResult strict = run({"import", path, "--strict"});
     EXPECT_EQ(strict.code, 1);
     EXPECT_TRUE(strict.out.empty());
     EXPECT_TRUE(snapshot().empty());
     const test::ProgramResult result = run({"import", path});
     EXPECT_EQ(result.code, 0);
-    EXPECT_NE(result.err.find("wipe.edl:3: loss"), String::npos) << result.err;
+    EXPECT_NE(result.err.find("trackless.edl:2: loss"), String::npos) << result.err;
     EXPECT_EQ(lines(result.out), 1u);
 }
 
@@ -153,7 +152,7 @@ TEST_F(Qmedit, DemoMakesAProjectThatStaysAndNamesIt) {
     const String kept = folder.path() + "/quillmarch-demo-";
     const size_t named = result.out.find(kept, result.out.find("The project is kept in "));
     ASSERT_NE(named, String::npos) << result.out;
-    for (const char* said : {"apply replace", "undid 'replace'", "redid 'replace'", "1 to undo, 0 to redo"}) {
+    for (const char* said : {"apply replace", "undid 'effects'", "redid 'effects'", "2 to undo, 0 to redo"}) {
         EXPECT_NE(result.out.find(said), String::npos) << said;
     }
     const String made = result.out.substr(named, result.out.find_first_of(" .\n", named) - named);
@@ -164,8 +163,10 @@ TEST_F(Qmedit, DemoMakesAProjectThatStaysAndNamesIt) {
     EXPECT_EQ(edit.at("duration"), 52 * 25);
     EXPECT_EQ(edit.at("cues").size(), 3u);
     const auto& picture = edit.at("channels").at(0).at("pairs");
-    ASSERT_EQ(picture.size(), 15u);
-    EXPECT_EQ(picture.at(12).at("name"), "last customers");
+    ASSERT_EQ(picture.size(), 17u);
+    EXPECT_EQ(picture.at(5).at("transition"), "dissolve");
+    EXPECT_EQ(picture.at(13).at("name"), "last customers");
+    EXPECT_EQ(picture.at(14).at("transition"), "wipe 1");
     EXPECT_TRUE(std::filesystem::exists((made + "/market_day_recut.edl").c_str()));
 }
 

@@ -56,12 +56,6 @@ String checkKind(const std::string& kind) {
                : "'" + kind + "' is no kind of transition; write " + kKinds + ", with a code of SMPTE 258M";
 }
 
-String checkAlign(const std::string& align) {
-    TransitionAlign unused = TransitionAlign::Centre;
-    return transitionAlignFromText(align, unused) ? String()
-                                                  : "'" + align + "' is none of start, centre, end";
-}
-
 TransitionAlign alignOf(const TransitionArguments& arguments) {
     TransitionAlign align = TransitionAlign::Centre;
     static_cast<void>(transitionAlignFromText(arguments.align, align));
@@ -272,7 +266,7 @@ std::vector<CommandOption> optionsOf(const Arguments& arguments, bool changes, b
                            .value = &arguments->align,
                            .help = "Where it lies about the cut: start, centre or end there (else centre)",
                            .form = "ALIGN",
-                           .check = checkAlign});
+                           .choices = {"start", "centre", "end"}});
     }
     if (changes) {
         options.push_back({.name = "--without-handles",
