@@ -156,9 +156,9 @@ size_t EdlImporter::sourceOf(size_t event) {
 void EdlImporter::useSource(size_t event, EdlChannels channel, double from, double velocity, int64_t length) {
     Source& source = m_sources[sourceOf(event)];
     source.channels |= channel == kEdlPicture2 ? kEdlPicture : channel;
-    // In reverse the out is the frame below the last one shown; a freeze shows one frame.
+    // A freeze shows one frame. In reverse the time runs down to the start of the last frame and a frame beyond it.
     const double last = from + velocity * static_cast<double>(length);
-    source.in = std::min({source.in, from, std::max(0.0, last + (velocity < 0 ? 1.0 : 0.0))});
+    source.in = std::min({source.in, from, std::max(0.0, last)});
     source.out = std::max({source.out, from + (velocity > 0 ? 0.0 : 1.0), last});
 }
 
