@@ -75,8 +75,8 @@ QM_API bool bringBack(Edit& edit, const IdStamp& orphan, const IdStamp& chan);
 /// The graphs of all orphans go. Returns how many there were.
 QM_API size_t removeOrphans(Edit& edit);
 
-/// A channel gets another stamp: inputs that name it, and events that show it, name that one.
-QM_API void renameChannel(Edit& edit, const IdStamp& from, const IdStamp& to);
+/// Channels get other stamps: inputs that name one of `renamed`, and events that show it, name what it gives.
+QM_API void renameChannels(Edit& edit, const StampMap& renamed);
 /// A channel goes, or all do for a null stamp: what is bound to its events becomes orphans, inputs that name it are unwired and
 /// events that show it become black.
 QM_API void dropChannel(Edit& edit, const IdStamp& chan);

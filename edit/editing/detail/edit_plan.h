@@ -134,8 +134,9 @@ struct WholeEnds {
     bool blackBefore = false; ///< the part begins with a transition from black, which stays
     bool blackAfter = false;  ///< it ends with one to black
 };
-/// `objects` is where the transitions' nodes lie.
-[[nodiscard]] WholeEnds wholeEnds(const cel& source, const cel::Range& region, TagBag& objects);
+/// `objects` is where the transitions' nodes lie. With `materialOnly` no transition stays.
+[[nodiscard]] WholeEnds wholeEnds(const cel& source, const cel::Range& region, TagBag& objects,
+                                  bool materialOnly = false);
 /// A cel of the content of `source` from `region.start()` on, `region.length()` long and beginning at 0, with
 /// black where nothing lies if `fillGaps`. A null source gives a black or empty one.
 [[nodiscard]] std::shared_ptr<cel> makePart(const cel* source, const cel::Range& region, bool fillGaps);

@@ -22,6 +22,7 @@ public:
 
 private:
     void takeOut(cel& content, const Step& step, int pair, double at);
+    void keepEffects(cel& content, const Step& step);
     void settleBlackSides(cel& content, const Step& step) const;
     void retargetAliases(cel& content, const cel::Range& span) const;
 
