@@ -123,6 +123,9 @@ WholeEnds wholeEnds(const cel& source, const cel::Range& region, TagBag& objects
             continue;
         }
         const Place place(source, pair);
+        if (isBefore(place.to, region.start())) {
+            continue;
+        }
         const bool atStart = !isBefore(region.start(), place.from) && isBefore(region.start(), place.to);
         const bool atEnd = !isBefore(place.to, region.end()) && isBefore(place.from, region.end());
         double at = place.middleWithin(region);
@@ -222,8 +225,8 @@ void Editor::ObjectFollower::afterStep(cel& content, const Step& step, const cel
     settleBlackSides(content, step);
 }
 
-/// An effect has no material: one that only the material of was to change is shown still, and an event that had
-/// none has that of the source.
+/// An effect has no material: one that only the material of was to change is shown still, and an event that
+/// had none has that of the source.
 void Editor::ObjectFollower::keepEffects(cel& content, const Step& step) {
     TagBag& objects = m_edit.objectStore();
     const auto [first, last] = pairsTouching(content, {step.at, step.end()});

@@ -12,9 +12,9 @@
 using namespace test;
 using Op = edit_operation;
 
-// Effects and transitions under the operations. An edit has an effects channel, "E", and two video channels; a
-// letter is a clip, '-' a transition, 'e' an effect whose opacity rises from 0 to 1 over its length and whose
-// input is the first video channel through a second node.
+// Effects and transitions under the operations. An edit has an effects channel, "E", and two video channels;
+// a letter is a clip, '-' a transition, 'e' an effect whose opacity rises from 0 to 1 over its length and
+// whose input is the first video channel through a second node.
 
 namespace {
 
