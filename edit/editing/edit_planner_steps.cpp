@@ -203,7 +203,7 @@ void Editor::Planner::addCopyStep(size_t target, double at, Edit& from, const Id
     const bool refers = from.isShot() && from.get_cookie().isStorable() && &from != &*m_destination.getEdit();
     editing_detail::WholeEnds ends;
     if (content != nullptr && isContinuous(events.type) && !refers) {
-        ends = editing_detail::wholeEnds(*content, region, from.objectStore());
+        ends = editing_detail::wholeEnds(*content, region, from.objectStore(), m_op == Op::ReplaceMaterial);
     }
     std::shared_ptr<cel> part = takePart(ends.channel != nullptr ? ends.channel.get() : content, region,
                                          isContinuous(events.type), lead);

@@ -65,10 +65,11 @@
 /// what moves is heard as before. A levels channel is added where the source has levels and the destination
 /// has none. `ReplaceMaterial` leaves the levels.
 ///
-/// **Effects** bound to events, graphs in the edit's store under the event's stamp, are copied with the events,
-/// all nodes of them. An event that is cut in two leaves both parts with a graph of their own, each with its part
-/// of the keyframes. Inputs of what is copied to another edit name the channels there that correspond; those
-/// that have none are not wired. What loses its event is noted in the edit's `OrphanedComponentList`.
+/// **Effects** bound to events, graphs in the edit's store under the event's stamp, are copied with the
+/// events, all nodes of them. An event that is cut in two leaves both parts with a graph of their own, each
+/// with its part of the keyframes. Inputs of what is copied to another edit name the channels there that
+/// correspond; those that have none are not wired. What loses its event is noted in the edit's
+/// `OrphanedComponentList`.
 ///
 /// **Transitions** (edit/model/transition.h) stay while both their clips do. One that is cut through, that
 /// something comes to lie beside, or a clip of which goes, is taken out first: the clip that stays plays on

@@ -1,6 +1,7 @@
 #include "edit/editing/detail/object_follower.h"
 
 #include "edit/model/transition.h"
+#include "platform/effects/fx_graph_node_base.h"
 
 #include <algorithm>
 #include <cmath>
@@ -114,7 +115,7 @@ std::function<Range(const Range&)> placesBefore(edit_operation core, const Range
 
 namespace editing_detail {
 
-WholeEnds wholeEnds(const cel& source, const cel::Range& region, TagBag& objects) {
+WholeEnds wholeEnds(const cel& source, const cel::Range& region, TagBag& objects, bool materialOnly) {
     WholeEnds ends;
     const auto [first, last] = pairsTouching(source, region);
     for (int pair = last - 1; pair >= first; --pair) {
@@ -122,18 +123,24 @@ WholeEnds wholeEnds(const cel& source, const cel::Range& region, TagBag& objects
             continue;
         }
         const Place place(source, pair);
-        const bool atStart = !isBefore(region.start(), place.from) && isBefore(region.start(), place.to);
-        const bool atEnd = !isBefore(place.to, region.end()) && isBefore(place.from, region.end());
-        const bool fromBlack = atStart && place.out == nullptr && !isBefore(place.from, region.start());
-        const bool toBlack = atEnd && place.in == nullptr && !isBefore(region.end(), place.to);
-        ends.blackBefore = ends.blackBefore || fromBlack;
-        ends.blackAfter = ends.blackAfter || toBlack;
-        if ((!atStart || fromBlack) && (!atEnd || toBlack)) {
+        if (isBefore(place.to, region.start())) {
             continue;
         }
-        const double at = atStart && atEnd ? place.middleWithin(region)
-                          : atStart        ? std::max(region.start(), place.from)
-                                           : std::min(region.end(), place.to);
+        const bool atStart = !isBefore(region.start(), place.from) && isBefore(region.start(), place.to);
+        const bool atEnd = !isBefore(place.to, region.end()) && isBefore(place.from, region.end());
+        double at = place.middleWithin(region);
+        if (!materialOnly) {
+            const bool fromBlack = atStart && place.out == nullptr && !isBefore(place.from, region.start());
+            const bool toBlack = atEnd && place.in == nullptr && !isBefore(region.end(), place.to);
+            ends.blackBefore = ends.blackBefore || fromBlack;
+            ends.blackAfter = ends.blackAfter || toBlack;
+            if ((!atStart || fromBlack) && (!atEnd || toBlack)) {
+                continue;
+            }
+            if (atStart != atEnd) {
+                at = atStart ? std::max(region.start(), place.from) : std::min(region.end(), place.to);
+            }
+        }
         ends.channel = ends.channel != nullptr ? std::move(ends.channel) : source.copy();
         static_cast<void>(Transitions::resolve(*ends.channel, pair, at));
     }
@@ -212,7 +219,40 @@ void Editor::ObjectFollower::afterStep(cel& content, const Step& step, const cel
     if (step.part != nullptr && m_channels != nullptr) {
         retargetAliases(content, span);
     }
+    if (m_op == edit_operation::ReplaceMaterial && !isContinuous(m_plan.targets[step.target].type)) {
+        keepEffects(content, step);
+    }
     settleBlackSides(content, step);
+}
+
+/// An effect has no material: one that only the material of was to change is shown still, and an event that
+/// had none has that of the source.
+void Editor::ObjectFollower::keepEffects(cel& content, const Step& step) {
+    TagBag& objects = m_edit.objectStore();
+    const auto [first, last] = pairsTouching(content, {step.at, step.end()});
+    for (int pair = first; pair < last; ++pair) {
+        channel_event in = content.get_event(2 * pair);
+        channel_event out = content.get_event(2 * pair + 1);
+        if (in.id.getMagicType() == IdStampMagic::Channel) {
+            continue;
+        }
+        if (Tag<FXGraphNodeBase>(objects, in.id).valid()) {
+            in.strip = out.strip = effect_graph_cookie;
+            static_cast<void>(content.setEvent(2 * pair, in) && content.setEvent(2 * pair + 1, out));
+            continue;
+        }
+        for (const Bound& event : step.bound) {
+            const Range whole(event.range.start() + step.at, event.range.end() + step.at);
+            if (in.strip == effect_graph_cookie && !isBefore(in.editTime, whole.start()) &&
+                !isBefore(whole.end(), out.editTime) &&
+                EventObjects::copy(*step.objects, event.id, objects, in.id,
+                                   m_channels != nullptr ? *m_channels : StampMap())) {
+                EventObjects::keepPart(objects, in.id, whole, {in.editTime, out.editTime});
+                static_cast<void>(m_channels != nullptr && EventObjects::unwireMissing(m_edit, in.id) > 0);
+                break;
+            }
+        }
+    }
 }
 
 /// Events that show a channel of the source show the one that corresponds, or are black.

@@ -30,14 +30,14 @@ enum class TransitionAlign { Start, Centre, End };
 /// rounded to whole frames. A cut is found from any time within half a frame of it.
 ///
 /// An operation is whole or not at all, is backed up, announced once (`kEffectsChanged`) and undone like
-/// those of `Editor`, whose flags `ExactTimes` and `NoBackup` it takes. It never shortens what was asked for: what needs
-/// more material than there is, is refused and says how much is missing.
+/// those of `Editor`, whose flags `ExactTimes` and `NoBackup` it takes. It never shortens what was asked for:
+/// what needs more material than there is, is refused and says how much is missing.
 ///
 /// Threads as for `Editor`.
 class QM_API TransitionEditor {
 public:
-    /// Besides flags of `Editor`: what the material has is not asked for. For who builds an edit whose material
-    /// is not there yet.
+    /// Besides flags of `Editor`: what the material has is not asked for. For who builds an edit whose
+    /// material is not there yet.
     static constexpr unsigned WithoutHandles = 256;
 
     /// The outcome. The default is that of an operation that did nothing.
@@ -51,14 +51,14 @@ public:
     };
 
     /// Lays a transition over the cut at `at` between two clips, or a clip and black or nothing (a fade in or
-    /// out). `effect` is copied; it has to be a transition (`EffectInstance::isTransition`), one of sound for an
-    /// audio channel. Refused where no cut is, where a transition lies, and when it would reach beyond either
-    /// clip or need more material than there is.
+    /// out). `effect` is copied; it has to be a transition (`EffectInstance::isTransition`), one of sound for
+    /// an audio channel. Refused where no cut is, where a transition lies, and when it would reach beyond
+    /// either clip or need more material than there is.
     static Result add(const EditPtr& edit, const IdStamp& chan, double at, const EffectInstance& effect,
                       double length, TransitionAlign align = TransitionAlign::Centre, unsigned flags = 0);
 
-    /// Changes the transition that plays at `at`: its effect, unless that is null; its length, unless that is 0;
-    /// and lays it about the cut that was in its middle as `align` says, unless it keeps its length and
+    /// Changes the transition that plays at `at`: its effect, unless that is null; its length, unless that is
+    /// 0; and lays it about the cut that was in its middle as `align` says, unless it keeps its length and
     /// `align` is `Centre`. The event keeps its stamp.
     static Result set(const EditPtr& edit, const IdStamp& chan, double at, const EffectInstance* effect,
                       double length, TransitionAlign align = TransitionAlign::Centre, unsigned flags = 0);

@@ -100,9 +100,9 @@ public:
     /// Overwrites one event in place, that one alone; its time becomes that of a neighbour within the
     /// tolerance. False if the result would not be consistent.
     bool setEvent(int index, const channel_event& event);
-    /// Puts other pairs, in points and out points in turn, in the place of `count` pairs from `pair` on; nothing
-    /// moves. `pair` may be the number of pairs, `count` and `events` nothing. False if the result would not be
-    /// consistent.
+    /// Puts other pairs, in points and out points in turn, in the place of `count` pairs from `pair` on;
+    /// nothing moves. `pair` may be the number of pairs, `count` and `events` nothing. False if the result
+    /// would not be consistent.
     bool replacePairs(int pair, int count, std::span<const channel_event> events);
     /// @}
 
@@ -177,9 +177,10 @@ public:
     ///   point's, and the events at the cuts get fresh ones; `splits`, when given, receives the in point's
     ///   stamp and the fresh one of each further piece's in point, so that an effect can be bound to all.
     ///
-    /// - Events that are copied out of a source get fresh stamps, but for one that shows a channel, whose stamp
-    ///   is that channel's and stays; `ids` receives the stamp of each and the fresh one: of a pair that several gaps took a piece of (`materialOnly`), that of the first piece,
-    ///   from which the others count as split.
+    /// - Events that are copied out of a source get fresh stamps, but for one that shows a channel, whose
+    ///   stamp is that channel's and stays; `ids` receives the stamp of each and the fresh one: of a pair
+    ///   that several gaps took a piece of (`materialOnly`), that of the first piece, from which the others
+    ///   count as split.
     ///
     /// - Velocity stays; the strip time of a piece's out point is where its in point and velocity lead.
     ///

@@ -144,7 +144,10 @@ void Edit::allChannelsRemoved() {
 }
 
 void Edit::channelRenamed(const IdStamp& from, const IdStamp& to) {
-    EventObjects::renameChannel(*this, from, to);
+    // Who renames many while the edit is read tells of all of them at once.
+    if (!m_loading) {
+        EventObjects::renameChannels(*this, {{from, to}});
+    }
     for (ChannelGroupList* list : {retrieveGroupsList(), retrieveDefaultGroupsList()}) {
         if (list != nullptr) {
             list->replaceMember(from, to);

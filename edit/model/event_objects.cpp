@@ -36,7 +36,9 @@ void forPairs(const cel& content, const Range& span, Visit visit) {
         if (in[0].editTime > span.end() + kTimeTolerance) {
             break;
         }
-        visit(in[0], in[1]);
+        if (in[1].editTime >= span.start() - kTimeTolerance) {
+            visit(in[0], in[1]);
+        }
     }
 }
 
@@ -122,18 +124,19 @@ void forNodes(Edit& edit, Visit visit) {
     }
 }
 
-/// Gives the events that show a channel another stamp, or makes them black.
-void renameAliases(Edit& edit, const IdStamp& from, const IdStamp& to) {
+/// Gives the events that show a channel another stamp, or makes them black for a null one.
+void renameAliases(Edit& edit, const StampMap& renamed) {
     for (int i = 0; i < edit.getNumChans(); ++i) {
         cel* const content = edit.get_edit_cel_p(i);
         for (int at = 0; content != nullptr && at + 1 < content->numEvents(); at += 2) {
-            channel_event in = content->get_event(at);
-            if (in.id != from) {
+            const auto found = renamed.find(content->getChanEventPtr(at)->id);
+            if (found == renamed.end()) {
                 continue;
             }
+            channel_event in = content->get_event(at);
             channel_event out = content->get_event(at + 1);
-            in.id = to.valid() ? to : channel_event::newId();
-            if (!to.valid()) {
+            in.id = found->second.valid() ? found->second : channel_event::newId();
+            if (!found->second.valid()) {
                 in.strip = out.strip = black_cookie;
             }
             static_cast<void>(content->setEvent(at, in) && content->setEvent(at + 1, out));
@@ -315,10 +318,9 @@ size_t EventObjects::removeOrphans(Edit& edit) {
     return count;
 }
 
-void EventObjects::renameChannel(Edit& edit, const IdStamp& from, const IdStamp& to) {
-    const StampMap renamed{{from, to}};
+void EventObjects::renameChannels(Edit& edit, const StampMap& renamed) {
     forNodes(edit, [&](FXGraphNodeBase& node) { node.renameReferences(renamed); });
-    renameAliases(edit, from, to);
+    renameAliases(edit, renamed);
 }
 
 void EventObjects::dropChannel(Edit& edit, const IdStamp& chan) {
@@ -332,7 +334,7 @@ void EventObjects::dropChannel(Edit& edit, const IdStamp& chan) {
         unwire(node, [&](const IdStamp& track) { return !chan.valid() || track == chan; });
     });
     if (chan.valid()) {
-        renameAliases(edit, chan, IdStamp());
+        renameAliases(edit, {{chan, IdStamp()}});
     }
 }
 

@@ -30,14 +30,14 @@ struct Bound {
 QM_API void listBound(const cel& content, const TagBag& objects, const cel::Range& span,
                       std::vector<Bound>& bound);
 
-/// Binds a copy of what `from` has for an event to another stamp in `to`, which may be the same store. Channels
-/// that the graph names become what `channels` gives for them. False when nothing is bound to the event or it
-/// cannot be copied.
+/// Binds a copy of what `from` has for an event to another stamp in `to`, which may be the same store.
+/// Channels that the graph names become what `channels` gives for them. False when nothing is bound to the
+/// event or it cannot be copied.
 QM_API bool copy(TagBag& from, const IdStamp& event, TagBag& to, const IdStamp& made,
                  const StampMap& channels = {});
 
-/// What is bound to an event becomes that of the part `part` of where it played, `whole`, which may reach beyond
-/// it: what is seen at each moment stays.
+/// What is bound to an event becomes that of the part `part` of where it played, `whole`, which may reach
+/// beyond it: what is seen at each moment stays.
 QM_API void keepPart(TagBag& objects, const IdStamp& event, const cel::Range& whole, const cel::Range& part);
 
 /// A change of one channel, for `follow`.
@@ -68,17 +68,17 @@ QM_API void bindCopies(TagBag& from, std::span<const Bound> laid, TagBag& to, co
 QM_API bool orphan(Edit& edit, const Bound& event);
 /// An event is gone whose graph lives on in a copy: the nodes go, but for those that others name.
 QM_API void remove(Edit& edit, const IdStamp& event);
-/// Brings an orphan back: as an event over the span where it applied, on an effects channel, or as a transition over
-/// the one cut within that span on any other. False, with nothing changed, when it is no orphan or its place
-/// is not free.
+/// Brings an orphan back: as an event over the span where it applied, on an effects channel, or as a
+/// transition over the one cut within that span on any other. False, with nothing changed, when it is no
+/// orphan or its place is not free.
 QM_API bool bringBack(Edit& edit, const IdStamp& orphan, const IdStamp& chan);
 /// The graphs of all orphans go. Returns how many there were.
 QM_API size_t removeOrphans(Edit& edit);
 
-/// A channel gets another stamp: inputs that name it, and events that show it, name that one.
-QM_API void renameChannel(Edit& edit, const IdStamp& from, const IdStamp& to);
-/// A channel goes, or all do for a null stamp: what is bound to its events becomes orphans, inputs that name it are unwired and
-/// events that show it become black.
+/// Channels get other stamps: inputs that name one of `renamed`, and events that show it, name what it gives.
+QM_API void renameChannels(Edit& edit, const StampMap& renamed);
+/// A channel goes, or all do for a null stamp: what is bound to its events becomes orphans, inputs that name
+/// it are unwired and events that show it become black.
 QM_API void dropChannel(Edit& edit, const IdStamp& chan);
 /// Unwires the inputs of a graph that name a channel which the edit has not. Returns how many.
 QM_API size_t unwireMissing(Edit& edit, const IdStamp& head);

@@ -30,9 +30,9 @@ struct Handles {
 /// For the transition of pair number `pair`. Black lacks nothing, and neither does a freeze.
 [[nodiscard]] QM_API Handles handlesOf(const cel& channel, int pair, const MaterialExtent& extentOf);
 
-/// True if an in event shows a transition: its node's inputs are its neighbours on the channel. `objects` is
-/// where its node lies. An event whose node is not there counts as one on a channel of pictures or sound, and is what
-/// `missingToo` says.
+/// True if an in event of a channel of pictures or sound shows a transition: its node's inputs are its
+/// neighbours on the channel. `objects` is where its node lies; `missingToo` is the answer for an effect whose
+/// node is not there.
 [[nodiscard]] QM_API bool isTransition(TagBag& objects, const channel_event& in, bool missingToo = true);
 
 /// Lays a transition over [from, to], which holds the cut at `cut` and may begin or end there. The clips that
@@ -42,9 +42,9 @@ struct Handles {
 ///     AAAAAABBBBBB    cut 6, [6, 8)    AAAAAA--BBBB
 ///     BBBBBB          cut 0, [0, 2)    --BBBB          from black
 ///
-/// `id` becomes the in event's stamp. False, with nothing changed, where no cut is, where a transition lies beside it,
-/// and for a span that is no longer than the tolerance, does not hold the cut, or reaches beyond either clip or
-/// into a gap. A clip may be left with no length: it then lies wholly under transitions.
+/// `id` becomes the in event's stamp. False, with nothing changed, where no cut is, where a transition lies
+/// beside it, and for a span that is no longer than the tolerance, does not hold the cut, or reaches beyond
+/// either clip or into a gap. A clip may be left with no length: it then lies wholly under transitions.
 [[nodiscard]] QM_API bool lay(cel& channel, double cut, double from, double to, const IdStamp& id);
 
 /// Takes out the transition of pair number `pair`: what is before it is lengthened to `at`, what is behind it

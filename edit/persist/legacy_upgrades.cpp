@@ -5,6 +5,7 @@
 #include "edit/model/ce_handle.h"
 #include "edit/model/cel.h"
 #include "edit/model/edit.h"
+#include "edit/model/event_objects.h"
 #include "edit/model/managed_cel.h"
 #include "edit/persist/detail/edit_file.h"
 #include "platform/media/edit_label.h"
@@ -144,15 +145,7 @@ void Edit::utilizeMagicIdStampsForChannelIds() {
             setAudCel(audio);
         }
     });
-    forEachCel(*this, AnyChan, [&renamed](const IdStamp&, cel& content) {
-        for (int i = 0; i < content.numEvents(); ++i) {
-            channel_event event = content.get_event(i);
-            if (const auto found = renamed.find(event.id); found != renamed.end()) {
-                event.id = found->second;
-                content.setEvent(i, event);
-            }
-        }
-    });
+    EventObjects::renameChannels(*this, renamed);
     init_dirty();
     noteUpgrade(countedText(static_cast<int>(renamed.size()), "channel", " got a stamp of a channel"));
 }

@@ -2,7 +2,7 @@
 
 namespace {
 
-const bool registered = [] {
+const bool kPairsRegistered = [] {
     Streamable::registerBuilder(AttribValuePairList::kForm.name, []() -> std::unique_ptr<Streamable> {
         return std::make_unique<AttribValuePairList>();
     });

@@ -10,7 +10,6 @@ constexpr std::string_view kProgress = "progress";
 constexpr std::string_view kOpacity = "opacity";
 /// Name, kind, count and a switch.
 constexpr size_t kLeastParameter = 4 + 1 + 4 + 1;
-constexpr size_t kLongestName = 256;
 
 bool isNumber(Fx::ParameterKind kind) {
     return kind == Fx::ParameterKind::Number || kind == Fx::ParameterKind::Switch ||
@@ -84,8 +83,8 @@ bool EffectInstance::accepts(std::string_view name, const Fx::ParameterValue& va
     if (const Fx::EffectParameter* const its = findParameter(name)) {
         return its->kind() == value.kind() && value.isUsable();
     }
-    return !name.empty() && name.size() <= kLongestName && Qx::isUtf8(name) && value.isUsable() &&
-           m_parameters.size() < kMostParameters;
+    return !name.empty() && name.size() <= Fx::kLongestParameterName && Qx::isUtf8(name) &&
+           value.isUsable() && m_parameters.size() < kMostParameters;
 }
 
 bool EffectInstance::setParameter(std::string_view name, const Fx::ParameterValue& value) {

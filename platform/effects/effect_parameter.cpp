@@ -11,7 +11,6 @@ namespace {
 
 constexpr double kGreatestNumber = 1e12;
 constexpr size_t kLongestText = size_t{16} << 20;
-constexpr size_t kLongestName = 256;
 /// A time, an interpolation and a switch.
 constexpr size_t kLeastKeyframe = 8 + 1 + 1;
 /// How many keyframes beyond a span values inside it depend on: the one that it is reached from and, for the
@@ -291,7 +290,7 @@ EffectParameter EffectParameter::unpack(PStream& stream) {
     EffectParameter read(stream.getString(), {});
     const uint8_t kind = stream.getCookedChar();
     const uint32_t count = stream.getCount(kLeastKeyframe);
-    if (read.m_name.empty() || read.m_name.size() > kLongestName || !Qx::isUtf8(read.m_name) ||
+    if (read.m_name.empty() || read.m_name.size() > Fx::kLongestParameterName || !Qx::isUtf8(read.m_name) ||
         kind < static_cast<uint8_t>(ParameterKind::Number) ||
         kind > static_cast<uint8_t>(ParameterKind::File)) {
         stream.fail();

@@ -14,6 +14,9 @@ class PStream;
 /// The parameters of effects: values, their courses over time, and the forms that kinds of effect give them.
 namespace Fx {
 
+/// Bytes in the name of a parameter, at most.
+inline constexpr size_t kLongestParameterName = 256;
+
 /// The numbers live in files: do not change them.
 enum class ParameterKind : uint8_t {
     Number = 1,

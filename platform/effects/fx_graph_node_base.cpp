@@ -6,7 +6,7 @@
 namespace {
 
 constexpr size_t kLongestTypeId = 1024;
-constexpr size_t kLongestName = 1024;
+constexpr size_t kLongestNodeName = 1024;
 constexpr size_t kPackedStamp = 12;
 /// The bits of the byte that tells about a node, and of that before each input. They live in files.
 constexpr uint8_t kExplicitInputs = 1;
@@ -53,7 +53,7 @@ String FXGraphNodeBase::getName() const {
 }
 
 bool FXGraphNodeBase::setName(std::string_view name) {
-    if (!isPlainText(name, kLongestName)) {
+    if (!isPlainText(name, kLongestNodeName)) {
         return false;
     }
     m_name = String(name);
@@ -158,7 +158,7 @@ void FXGraphNodeBase::STRM_layerUnpack(size_t layer, uint8_t, uint8_t, PStream& 
     for (IdStamp& member : members) {
         member.unpack(stream);
     }
-    if (type.empty() || !isPlainText(type, kLongestTypeId) || !isPlainText(name, kLongestName) ||
+    if (type.empty() || !isPlainText(type, kLongestTypeId) || !isPlainText(name, kLongestNodeName) ||
         flags > kExplicitInputs || members.size() > kMostMembers || hasTwins(members) ||
         std::find(members.begin(), members.end(), IdStamp()) != members.end()) {
         stream.fail();

@@ -9,7 +9,7 @@ namespace {
 constexpr uint8_t kStampRevision = 2;
 constexpr size_t kPackedEntry = 1 + 12 + 8 + 8;
 
-const bool registered = [] {
+const bool kOrphansRegistered = [] {
     Streamable::registerBuilder(OrphanedComponentList::kForm.name, []() -> std::unique_ptr<Streamable> {
         return std::make_unique<OrphanedComponentList>();
     });

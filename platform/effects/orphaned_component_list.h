@@ -25,15 +25,16 @@ public:
     [[nodiscard]] Range getRangeFor(const Tag<FXGraphNodeBase>& node) const;
     /// False for a node that is not listed. The order of the others stays.
     bool remove(const Tag<FXGraphNodeBase>& node);
-    /// Appends the nodes whose range holds `t`, in the order of the list: from its start to before its end, both
-    /// with the tolerance of times.
+    /// Appends the nodes whose range holds `t`, in the order of the list: from its start to before its end,
+    /// both with the tolerance of times.
     void findIntersecting(double t, Vector<IdStamp>& nodes) const;
     [[nodiscard]] unsigned size() const { return static_cast<unsigned>(m_entries.size()); }
     /// The node at a place from 0; the null stamp beyond the end.
     [[nodiscard]] IdStamp operator[](size_t index) const;
 
     [[nodiscard]] const TagTypeId& tagTypeId() const override;
-    /// Packed: a count, then for each entry a byte that is 2, the stamp, and the start and the end of its range.
+    /// Packed: a count, then for each entry a byte that is 2, the stamp, and the start and the end of its
+    /// range.
     void pack(PStream& stream) const override;
     /// Ends that arrive in the wrong order are exchanged. On a bad stream the list is as it was.
     void unpack(PStream& stream) override;

@@ -15,7 +15,7 @@ Json levelJson(float level) {
     return Qx::textToDouble(levelText(level), value) ? Json(value) : Json();
 }
 
-Json pairJson(const EditReport& report, const PairReport& pair) {
+Json differingPairJson(const EditReport& report, const PairReport& pair) {
     Json json = Json::parse(pairJsonText(report, pair));
     json["level_in"] = levelJson(pair.begin.level);
     json["level_out"] = levelJson(pair.end.level);
@@ -65,8 +65,9 @@ Json channelJson(const ChannelDiff& channel, const EditReport& before, const Edi
                     {"to_s", span.to}};
     });
     json["removed"] =
-        listJson(channel.removed, [&](const PairReport& pair) { return pairJson(before, pair); });
-    json["added"] = listJson(channel.added, [&](const PairReport& pair) { return pairJson(after, pair); });
+        listJson(channel.removed, [&](const PairReport& pair) { return differingPairJson(before, pair); });
+    json["added"] =
+        listJson(channel.added, [&](const PairReport& pair) { return differingPairJson(after, pair); });
     json["moved"] = movedJson(channel.moved, before);
     return json;
 }

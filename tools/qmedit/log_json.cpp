@@ -6,7 +6,7 @@ namespace {
 
 using Json = nlohmann::ordered_json;
 
-String dumped(const Json& value) {
+String logDumped(const Json& value) {
     return String(value.dump(-1, ' ', false, Json::error_handler_t::replace));
 }
 
@@ -15,7 +15,7 @@ template <class Range, class ToJson>
 String lines(const Range& range, const ToJson& toJson) {
     String out = "[";
     for (const auto& element : range) {
-        out += (out.size() == 1 ? "\n  " : ",\n  ") + dumped(toJson(element));
+        out += (out.size() == 1 ? "\n  " : ",\n  ") + logDumped(toJson(element));
     }
     return out + (out.size() == 1 ? "]\n" : "\n]\n");
 }
@@ -39,7 +39,7 @@ String attributesJson(const LogAttributes::Map& attributes) {
     for (const auto& [attribute, text] : attributes) {
         json[LogAttributes::getPersistableString(attribute)] = static_cast<const std::string&>(text);
     }
-    return dumped(json) + "\n";
+    return logDumped(json) + "\n";
 }
 
 String foundJson(const std::vector<FoundEdit>& found) {

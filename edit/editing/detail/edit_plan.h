@@ -134,14 +134,15 @@ inline constexpr std::array<Edit::ChanType, 3> kChannelKinds = {
 
 /// What a part of a channel is to be made of, so that no transition reaches out of it.
 struct WholeEnds {
-    /// The channel with each transition that does taken out: what is left of it shows the one clip that stays. Null
-    /// when the channel itself will do.
+    /// The channel with each transition that does taken out: what is left of it shows the one clip that
+    /// stays. Null when the channel itself will do.
     std::unique_ptr<cel> channel;
     bool blackBefore = false; ///< the part begins with a transition from black, which stays
     bool blackAfter = false;  ///< it ends with one to black
 };
-/// `objects` is where the transitions' nodes lie.
-[[nodiscard]] WholeEnds wholeEnds(const cel& source, const cel::Range& region, TagBag& objects);
+/// `objects` is where the transitions' nodes lie. With `materialOnly` no transition stays.
+[[nodiscard]] WholeEnds wholeEnds(const cel& source, const cel::Range& region, TagBag& objects,
+                                  bool materialOnly = false);
 /// A cel of the content of `source` from `region.start()` on, `region.length()` long and beginning at 0, with
 /// black where nothing lies if `fillGaps`. A null source gives a black or empty one.
 [[nodiscard]] std::shared_ptr<cel> makePart(const cel* source, const cel::Range& region, bool fillGaps);
@@ -154,8 +155,8 @@ struct WholeEnds {
 /// Gives an audio channel without levels a levels channel that says what its clips' own levels say. The null
 /// stamp if that is not possible.
 IdStamp addLevels(Edit& edit, const IdStamp& audio);
-/// Makes the revision of an edit that undo goes back to; nothing for one that the manager does not have. False, with the
-/// refusal and nothing changed, if the manager cannot.
+/// Makes the revision of an edit that undo goes back to; nothing for one that the manager does not have.
+/// False, with the refusal and nothing changed, if the manager cannot.
 [[nodiscard]] bool makeRevision(const EditPtr& edit, Qx::Status& refusal);
 /// True if an edit may be changed by the current user.
 [[nodiscard]] bool isWritable(const Edit& edit);

@@ -8,8 +8,8 @@
 /// between `beforeStep` and `afterStep`, and `finish` comes when the channels are as they are to be.
 class Editor::ObjectFollower {
 public:
-    /// `channels` tells which channels of the source correspond to which here; null when the source is the edit
-    /// itself.
+    /// `channels` tells which channels of the source correspond to which here; null when the source is the
+    /// edit itself.
     ObjectFollower(Edit& edit, const Plan& plan, edit_operation op, const SrcToDestChanMap* channels);
 
     /// Takes out the transitions that the step would leave without a clip, and notes what it may change.
@@ -22,6 +22,7 @@ public:
 
 private:
     void takeOut(cel& content, const Step& step, int pair, double at);
+    void keepEffects(cel& content, const Step& step);
     void settleBlackSides(cel& content, const Step& step) const;
     void retargetAliases(cel& content, const cel::Range& span) const;
 

@@ -7,13 +7,14 @@
 #include <algorithm>
 #include <cmath>
 #include <optional>
+#include <random>
 
 using namespace test;
 using Op = edit_operation;
 
-// Effects and transitions under the operations. An edit has an effects channel, "E", and two video channels; a
-// letter is a clip, '-' a transition, 'e' an effect whose opacity rises from 0 to 1 over its length and whose
-// input is the first video channel through a second node.
+// Effects and transitions under the operations. An edit has an effects channel, "E", and two video channels;
+// a letter is a clip, '-' a transition, 'e' an effect whose opacity rises from 0 to 1 over its length and
+// whose input is the first video channel through a second node.
 
 namespace {
 
@@ -274,6 +275,57 @@ protected:
 TEST_F(EffectsTest, OperationsKeepWhatIsSeenAndAreUndone) {
     for (const Case& its : kCases) {
         check(its);
+    }
+}
+
+/// Whatever is done in whatever order, an edit's graphs hang together, and so does a copy of it.
+TEST_F(EffectsTest, RandomOperationsLeaveNothingLoose) {
+    constexpr unsigned kSeed = 20250;
+    constexpr int kRuns = 60;
+    constexpr int kSteps = 25;
+    std::mt19937 random(kSeed);
+    const auto below = [&](int end) { return static_cast<int>(random() % static_cast<unsigned>(end)); };
+    for (int run = 0; run < kRuns; ++run) {
+        SCOPED_TRACE(String::format("seed %u, run %d", kSeed, run));
+        const EditPtr edit =
+            editOf({"E  eeeeee eeee", "V AAAAAABBBBBBBBCCCC", "V GGGGGGGGGGGGGGGGGG", "E   eeee"});
+        const EditPtr source = editOf({"E eeee  ee", "V ddddffffgg"}, 901);
+        addEffects(edit, {6, 14});
+        addEffects(source, {4});
+        std::string done;
+        for (int step = 0; step < kSteps && !HasFailure(); ++step) {
+            const Op op = static_cast<Op>(1 + below(kNumEditOperations - 1));
+            const auto marks = [&] {
+                const double in = below(40) / 2.0;
+                return Marks{in, in + 0.5 + below(12) / 2.0};
+            };
+            EditModule from = moduleOf(below(3) == 0 ? edit : source, marks());
+            EditModule to = moduleOf(edit, marks());
+            for (int chan = 0; chan < edit->getNumChans(); ++chan) {
+                to.selectChan(edit->getId(chan), op == Op::SwapTracks || below(4) != 0);
+            }
+            const unsigned flags = Editor::NoBackup | Editor::NoNewChannels;
+            done += Editor::apply(from, to, op, flags).valid()
+                        ? String::format(" %s", editOperationName(op).data())
+                        : String();
+            ASSERT_EQ(faultsOf(*edit), "") << done;
+            if (below(4) == 0) {
+                // Half of the cuts that are tried are none, or have no room.
+                const IdStamp chan = edit->getId(edit->getFirstChan(VideoChan, Edit_Chan_SubType::NONE));
+                const auto kind = Fx::makeEffect(below(2) == 0 ? Fx::kDissolve : Fx::kWipe);
+                const cel& content = *edit->get_edit_cel_p(edit->getIdx(chan));
+                const int event = content.numEvents() > 0 ? below(content.numEvents()) : 0;
+                const double at = content.get_event(event).editTime;
+                if (below(3) == 0) {
+                    TransitionEditor::remove(edit, chan, at, kBuilding & ~TransitionEditor::WithoutHandles);
+                } else {
+                    TransitionEditor::add(edit, chan, at, *kind, 0.5 + below(4) / 2.0,
+                                          static_cast<TransitionAlign>(below(3)), kBuilding);
+                }
+                ASSERT_EQ(faultsOf(*edit), "") << done;
+            }
+        }
+        EXPECT_EQ(stateOf(*edit->copy()), stateOf(*edit));
     }
 }
 

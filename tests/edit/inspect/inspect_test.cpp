@@ -2,6 +2,8 @@
 #include "edit/inspect/usage.h"
 #include "edit/inspect/verification.h"
 #include "edit/manager/edit_manager.h"
+#include "edit/model/transition.h"
+#include "platform/effects/effect_instance.h"
 #include "tests/edit/manager/managed_project.h"
 #include "tests/support/edit_builder.h"
 
@@ -157,6 +159,38 @@ TEST(Inspect, VerifiesAProjectAndTellsWhoPlaysWhat) {
     ASSERT_EQ(users.size(), 2U); // one plays it, one may
     EXPECT_TRUE(users[0].edit == items[1] && users[0].problem.empty());
     EXPECT_TRUE(users[1].edit == items[2] && !users[1].problem.empty());
+}
+
+TEST(Inspect, VerifiesThatTransitionsHaveTheirMaterial) {
+    const test::ManagedProject project;
+    const cookie shot("E0001000");
+    const cookie sequence("E0002000");
+    ASSERT_TRUE(test::ManagedProject::save("cut", shot));
+    ASSERT_TRUE(test::ManagedProject::save("cut", sequence));
+    const EditPtr source(shot, eOpenExisting);
+    const double end = 6;
+    source->get_edit_cel_p(source->addChan(VideoChan))->appendEventPair(black_cookie, 0, 0, end);
+    source->init_dirty();
+    ASSERT_TRUE(edit_manager::flush_edit(shot));
+    const EditPtr edit(sequence, eOpenExisting);
+    cel& content = *edit->get_edit_cel_p(edit->addChan(VideoChan));
+    const IdStamp id = IdStamp::fresh(IdStampMagic::EffectNode);
+    content.appendEventPair(shot, 0, 0, end - 1);
+    content.appendEventPair(black_cookie, 0, end - 1, 4);
+    for (const double length : {1.0, 3.0}) {
+        const int lain = content.find_ceh(end - 1, CE_IN_POINT).index() / 2;
+        ASSERT_TRUE(length == 1 || Transitions::resolve(content, lain, end - 1));
+        ASSERT_TRUE(Transitions::lay(content, end - 1, end - 1, end - 1 + length, id));
+        edit->objectStore().storeObject(id, Fx::makeEffect(Fx::kDissolve));
+        edit->init_dirty();
+        ASSERT_TRUE(edit_manager::flush_edit(sequence));
+        std::vector<VerifiedFile> files;
+        ASSERT_TRUE(verifyProject(project.folder(), {sequence}, files));
+        ASSERT_EQ(files.size(), 1U);
+        EXPECT_EQ(files[0].faults.size(), length == 1 ? 0U : 1U);
+        EXPECT_TRUE(length == 1 || files[0].faults[0].find("lacks 2 s") != String::npos)
+            << files[0].faults[0];
+    }
 }
 
 } // namespace
