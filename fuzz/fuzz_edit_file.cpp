@@ -2,8 +2,8 @@
 
 #include "edit/model/cel.h"
 #include "edit/model/edit.h"
-#include "platform/services/log.h"
 #include "fuzz/memory_file.h"
+#include "platform/services/log.h"
 
 #include <cstdlib>
 

@@ -2,9 +2,9 @@
 
 #include "edit/model/cue_list.h"
 #include "edit/model/edit.h"
+#include "fuzz/memory_file.h"
 #include "platform/services/log.h"
 #include "platform/store/text_file.h"
-#include "fuzz/memory_file.h"
 
 #include <cstdlib>
 
