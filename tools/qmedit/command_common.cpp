@@ -9,7 +9,8 @@
 const std::vector<CommandGroup>& allCommands() {
     static const std::vector<CommandGroup> groups{
         {"Look",
-         {listCommand(), showCommand(), findCommand(), headerCommand(), diffCommand(), historyCommand()}},
+         {listCommand(), showCommand(), graphCommand(), findCommand(), headerCommand(), diffCommand(),
+          historyCommand()}},
         {"Change",
          {newCommand(), applyCommand(), renameCommand(), markerCommand(), transitionCommand(), logCommand(),
           deleteCommand()}},

@@ -24,6 +24,7 @@ Command listCommand();
 Command findCommand();
 Command logCommand();
 Command showCommand();
+Command graphCommand();
 Command headerCommand();
 Command newCommand();
 Command applyCommand();
