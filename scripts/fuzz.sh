@@ -10,7 +10,7 @@ seconds=${1:-60}
 need $BUILD_PACKAGES $TEST_PACKAGES clang libclang-rt-14-dev
 mkdir -p build/fuzz/found
 say "Building the fuzz targets"
-if ! { CXX=clang++ cmake --preset asan -B build/fuzz -DQUILLMARCH_FUZZ=ON -DQUILLMARCH_TOOLS=ON -DQUILLMARCH_TESTS=ON &&
+if ! { CXX=clang++ cmake --preset asan -B build/fuzz -DQUILLMARCH_FUZZ=ON -DQUILLMARCH_UNITY=ON -DQUILLMARCH_TOOLS=ON -DQUILLMARCH_TESTS=ON &&
         cmake --build build/fuzz -j "$(jobs)" --target fuzz_targets; } >build/fuzz.log 2>&1; then
     tail -n 40 build/fuzz.log >&2
     fail "The fuzz targets could not be built; the lines above and build/fuzz.log say why."

@@ -211,6 +211,10 @@ Qx::Status RevisionChain::park(Qx::FileMoves& moves) const {
     for (size_t i = 0; status && i < numbers.size() && numbers[i] <= m_depth; ++i) {
         String parked = Qx::temporaryNameFor(path(numbers[i]));
         status = moves.move(path(numbers[i]), parked);
+        if (const int error = status.systemError(); error != 0) {
+            // The temporary name says nothing to whoever asked for a backup.
+            status = Qx::FileError{error, "set aside", path(numbers[i])}.status();
+        }
         moves.removeWhenFinished(std::move(parked));
     }
     return status;

@@ -237,8 +237,13 @@ int cel::chequerboard(cel** parts, int& numParts, int maxParts, double overlap, 
             continue;
         }
         const Range reach = reachOf(in, out, overlap, softCuts);
+        // Behind the end of a part, which may lie past the start by the tolerance, something must be left.
+        const bool hasLength = !isNotPast(out.editTime, in.editTime);
+        const auto isFree = [&](double end) {
+            return isNotPast(end, reach.start()) && !(hasLength && isNotPast(reach.end(), end));
+        };
         size_t part = 0;
-        while (part < made.size() && !isNotPast(reached[part], reach.start())) {
+        while (part < made.size() && !isFree(reached[part])) {
             ++part;
         }
         if (part == static_cast<size_t>(maxParts)) {

@@ -36,7 +36,7 @@ bool isRight(int field) {
     return field == Number || field == Length;
 }
 
-struct Line {
+struct TableLine {
     String cells[kNumFields];
     String name;
     String notes;
@@ -65,11 +65,11 @@ public:
 
 private:
     void addChannel(const ChannelReport& channel);
-    [[nodiscard]] Line lineOf(const ChannelReport& channel, size_t index) const;
-    [[nodiscard]] Line gapOf(const PairReport& before, const PairReport& after) const;
-    void findWidths(const std::vector<Line>& lines);
+    [[nodiscard]] TableLine lineOf(const ChannelReport& channel, size_t index) const;
+    [[nodiscard]] TableLine gapOf(const PairReport& before, const PairReport& after) const;
+    void findWidths(const std::vector<TableLine>& lines);
     [[nodiscard]] int columnsBeforeName() const;
-    void addLine(const Line& line);
+    void addLine(const TableLine& line);
     void addMore(int indent, size_t count);
     [[nodiscard]] Ink inkOf(const SourceReport& source) const;
     [[nodiscard]] size_t shown(size_t count) const { return m_all ? count : std::min(count, kMostEvents); }
@@ -98,10 +98,10 @@ Ink Table::inkOf(const SourceReport& source) const {
     return !source.problem.empty() ? Ink::Error : source.kind == SourceKind::Black ? Ink::Dim : Ink::None;
 }
 
-Line Table::lineOf(const ChannelReport& channel, size_t index) const {
+TableLine Table::lineOf(const ChannelReport& channel, size_t index) const {
     const PairReport& pair = channel.pairs[index];
     const SourceReport& source = m_report.sources[pair.source];
-    Line line;
+    TableLine line;
     line.cells[Number] = String::format("%zu", index + 1);
     line.cells[RecordIn] = m_report.recordTimecode(pair.in);
     line.cells[RecordOut] = m_report.recordTimecode(pair.out);
@@ -122,8 +122,8 @@ Line Table::lineOf(const ChannelReport& channel, size_t index) const {
     return line;
 }
 
-Line Table::gapOf(const PairReport& before, const PairReport& after) const {
-    Line line;
+TableLine Table::gapOf(const PairReport& before, const PairReport& after) const {
+    TableLine line;
     line.cells[RecordIn] = m_report.recordTimecode(before.out);
     line.cells[RecordOut] = m_report.recordTimecode(after.in);
     line.cells[Length] = shortLength(m_report, after.in - before.out);
@@ -140,11 +140,11 @@ int Table::columnsBeforeName() const {
     return columns;
 }
 
-void Table::findWidths(const std::vector<Line>& lines) {
+void Table::findWidths(const std::vector<TableLine>& lines) {
     for (int field = 0; field < kNumFields; ++field) {
         int& width = m_widths[field];
         width = 0;
-        for (const Line& line : lines) {
+        for (const TableLine& line : lines) {
             width = std::max(width, safe_text::columns(line.cells[field]));
         }
         const bool isTime = field >= RecordIn && field <= SourceOut;
@@ -160,7 +160,7 @@ void Table::findWidths(const std::vector<Line>& lines) {
     }
 }
 
-void Table::addLine(const Line& line) {
+void Table::addLine(const TableLine& line) {
     String text = " ";
     for (int field = 0; field < kNumFields; ++field) {
         if (m_widths[field] > 0) {
@@ -188,7 +188,7 @@ void Table::addChannel(const ChannelReport& channel) {
     m_text += "\n " + m_console.inked(Ink::Bold, name.empty() ? String("?") : name) +
               m_console.inked(Ink::Dim, count) + "\n";
     const size_t last = shown(pairs.size());
-    std::vector<Line> lines;
+    std::vector<TableLine> lines;
     lines.reserve(last);
     for (size_t i = 0; i < last; ++i) {
         if (i > 0 && pairs[i].in > pairs[i - 1].out + kTolerance) {
@@ -200,12 +200,12 @@ void Table::addChannel(const ChannelReport& channel) {
         return;
     }
     findWidths(lines);
-    Line heading;
+    TableLine heading;
     std::copy(std::begin(kHeadings), std::end(kHeadings), heading.cells);
     heading.name = "name";
     heading.isDim = true;
     addLine(heading);
-    for (const Line& line : lines) {
+    for (const TableLine& line : lines) {
         addLine(line);
     }
     if (last < pairs.size()) {
