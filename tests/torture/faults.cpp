@@ -118,7 +118,7 @@ public:
             // A refusal that stands in the answer itself, as in a list's row, tells too.
             const bool told = !met.result.err.empty() || met.result.out.find(m_cause) != String::npos;
             m_case.expect(found == m_reference.after || (!m_command.changes && found == m_reference.before) ||
-                              clipboardWasLeft(found, met),
+                              isLeftAsTold(found, met),
                           kind("says done, and it is not"), differenceOf(m_reference.after, found) + words());
             if (!m_command.changes && !told) {
                 m_case.expect(met.result.out == m_reference.out, kind("answers wrongly without a word"),
@@ -168,15 +168,19 @@ public:
     }
 
 private:
-    /// The clipboard may stay behind its edit, when the command says so.
-    [[nodiscard]] bool clipboardWasLeft(const ProjectStates& found, const Met& met) const {
-        static constexpr const char* kClipboard = "E00050HZ";
-        const auto others = [](ProjectStates states) {
-            std::erase_if(states, [](const auto& state) { return state.first.starts_with(kClipboard); });
-            return states;
+    /// The clipboard may stay behind its edit, and a deletion that was told to go on may make no milestone,
+    /// when the command says so.
+    [[nodiscard]] bool isLeftAsTold(const ProjectStates& found, const Met& met) const {
+        const String words = met.result.out + met.result.err;
+        const auto differOnlyIn = [&](const char* names) {
+            const auto others = [names](ProjectStates states) {
+                std::erase_if(states, [names](const auto& state) { return state.first.starts_with(names); });
+                return states;
+            };
+            return others(found) == others(m_reference.after);
         };
-        return (met.result.out + met.result.err).find(kClipboard) != std::string::npos &&
-               others(found) == others(m_reference.after);
+        return (words.find("E00050HZ") != String::npos && differOnlyIn("E00050HZ")) ||
+               (words.find("no milestone of") != String::npos && differOnlyIn("Milestones/"));
     }
 
     void judgeUnfinished(const ProjectStates& found) {
