@@ -7,11 +7,12 @@
 
 namespace {
 
-/// Copies the state that an item has to a milestone; one that cannot be read has none to keep.
+/// Copies the state that an item has to a milestone. One that is damaged or gone has none to keep; one that the
+/// system does not let read may have.
 Qx::Status keepMilestone(const ProjectSession& session, const cookie& item) {
     EditPtr edit;
-    if (!session.readEdit(item, edit)) {
-        return {};
+    if (const Qx::Status read = session.readEdit(item, edit); !read) {
+        return read.systemError() != 0 ? read : Qx::Status();
     }
     return MilestoneRing().makeMilestoneBackup(edit, ProjectSession::fileOf(item));
 }
