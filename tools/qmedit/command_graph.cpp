@@ -22,11 +22,9 @@ Qx::Status readChannel(const EditReport& report, const String& place, IdStamp& t
     if (place.empty()) {
         return {};
     }
-    for (const ChannelReport& channel : report.channels) {
-        if (!channel.isLevels() && String::equalNoCase(channel.place, place)) {
-            track = channel.id;
-            return {};
-        }
+    if (const ChannelReport* const channel = findChannel(report, place)) {
+        track = channel->id;
+        return {};
     }
     return Qx::Status::failure(Qx::StatusCode::NotFound,
                                report.item.asString() + " has no channel '" + place + "'");

@@ -79,16 +79,6 @@ Qx::Status readLength(const String& text, const EditReport& report, double& seco
                                    "' is no length; write frames (24f) or seconds (1s), at least a frame");
 }
 
-/// The channel that a place names: "V1", "a2".
-const ChannelReport* findChannel(const EditReport& report, const String& place) {
-    for (const ChannelReport& channel : report.channels) {
-        if (!channel.isLevels() && String::equalNoCase(channel.place, place)) {
-            return &channel;
-        }
-    }
-    return nullptr;
-}
-
 /// "dissolve of 1:00 at 01:00:04:00 on V1".
 String transitionLine(const EditReport& report, const ChannelReport& channel, const cel::Range& range,
                       const String& kind) {

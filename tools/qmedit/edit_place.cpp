@@ -67,3 +67,12 @@ Qx::Status parseEditTime(const String& text, const EditReport& report, double& s
                ? Qx::Status()
                : Qx::Status::failure("'" + text + "' is too great a time");
 }
+
+const ChannelReport* findChannel(const EditReport& report, const String& place) {
+    for (const ChannelReport& channel : report.channels) {
+        if (!channel.isLevels() && String::equalNoCase(channel.place, place)) {
+            return &channel;
+        }
+    }
+    return nullptr;
+}

@@ -18,3 +18,6 @@ Qx::Status parsePlace(const String& text, EditPlace& place);
 /// Reads a time of an edit: record timecode ("10:00:05:00", with ';' drop frame), frames ("125f") or seconds
 /// ("5s", "2.5s") from the edit's time 0, in a shot from its beginning. Gives seconds of edit time.
 Qx::Status parseEditTime(const String& text, const EditReport& report, double& seconds);
+
+/// The channel of a report that a place names, in any case: "V1", "a2". Null when there is none.
+[[nodiscard]] const ChannelReport* findChannel(const EditReport& report, const String& place);
